@@ -1,0 +1,7 @@
+#ifndef QV_COMMON_EXPORT_H
+#define QV_COMMON_EXPORT_H
+
+// Marks what programs that link the library may use; everything else stays inside it.
+#define QV_EXPORT __attribute__((visibility("default")))
+
+#endif

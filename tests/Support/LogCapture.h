@@ -1,0 +1,47 @@
+#ifndef QV_TESTS_SUPPORT_LOGCAPTURE_H
+#define QV_TESTS_SUPPORT_LOGCAPTURE_H
+
+#include <string>
+#include <vector>
+
+// One line of the library's log.
+struct tag_LogLine
+{
+    int iPriority;
+    std::string strTag;
+    std::string strText;
+
+    bool operator==(const tag_LogLine& other) const
+    {
+        return iPriority == other.iPriority && strTag == other.strTag && strText == other.strText;
+    }
+};
+std::ostream& operator<<(std::ostream& stream, const tag_LogLine& line);
+
+// Collects every log line for as long as the object lives.
+class CLogCapture
+{
+public:
+    CLogCapture();
+    ~CLogCapture();
+    CLogCapture(const CLogCapture&) = delete;
+    CLogCapture& operator=(const CLogCapture&) = delete;
+
+    const std::vector<tag_LogLine>& Lines() const { return m_vLines; }
+    // The texts of the lines with the priority, in order.
+    std::vector<std::string> Texts(int iPriority) const;
+    // How many lines have exactly this priority and text.
+    int Count(int iPriority, const std::string& strText) const;
+    bool Has(int iPriority, const std::string& strText) const
+    {
+        return Count(iPriority, strText) > 0;
+    }
+    void Clear() { m_vLines.clear(); }
+
+private:
+    static void Collect(void* pContext, int iPriority, const char* szTag, const char* szText);
+
+    std::vector<tag_LogLine> m_vLines;
+};
+
+#endif

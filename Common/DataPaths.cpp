@@ -24,9 +24,9 @@ enum PATH_INDEX
 };
 
 constexpr const char* DEVICE_PATHS[PATH_COUNT] = {
-    QV_DEVICE_ROOT "/databases/contacts2.db",     QV_DEVICE_ROOT "/files/pyfile.bin",
-    QV_DEVICE_ROOT "/files/PyFileMappint.bin",    QV_DEVICE_ROOT "/files/ContactsLocalizer.bin",
-    QV_DEVICE_ROOT "/files/ContactsReg.bin",      QV_DEVICE_ROOT "/files/memlock.ini",
+    QV_DEVICE_ROOT "/databases/contacts2.db",  QV_DEVICE_ROOT "/files/pyfile.bin",
+    QV_DEVICE_ROOT "/files/PyFileMappint.bin", QV_DEVICE_ROOT "/files/ContactsLocalizer.bin",
+    QV_DEVICE_ROOT "/files/ContactsReg.bin",   QV_DEVICE_ROOT "/files/memlock.ini",
 };
 constexpr size_t DEVICE_ROOT_LENGTH = sizeof(QV_DEVICE_ROOT) - 1;
 
@@ -59,9 +59,27 @@ int CDataPaths::SetRoot(const char* szRoot)
     return 0;
 }
 
-const char* CDataPaths::Database() { return PathOf(PATH_DATABASE); }
-const char* CDataPaths::PinyinSource() { return PathOf(PATH_PINYIN_SOURCE); }
-const char* CDataPaths::PinyinMapping() { return PathOf(PATH_PINYIN_MAPPING); }
-const char* CDataPaths::ContactRecords() { return PathOf(PATH_CONTACT_RECORDS); }
-const char* CDataPaths::ContactReg() { return PathOf(PATH_CONTACT_REG); }
-const char* CDataPaths::LockFile() { return PathOf(PATH_LOCK_FILE); }
+const char* CDataPaths::Database()
+{
+    return PathOf(PATH_DATABASE);
+}
+const char* CDataPaths::PinyinSource()
+{
+    return PathOf(PATH_PINYIN_SOURCE);
+}
+const char* CDataPaths::PinyinMapping()
+{
+    return PathOf(PATH_PINYIN_MAPPING);
+}
+const char* CDataPaths::ContactRecords()
+{
+    return PathOf(PATH_CONTACT_RECORDS);
+}
+const char* CDataPaths::ContactReg()
+{
+    return PathOf(PATH_CONTACT_REG);
+}
+const char* CDataPaths::LockFile()
+{
+    return PathOf(PATH_LOCK_FILE);
+}

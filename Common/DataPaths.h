@@ -16,12 +16,12 @@ public:
     static int SetRoot(const char* szRoot);
 
     // Paths of files that may or may not exist; valid until the next SetRoot.
-    static const char* Database();         // databases/contacts2.db
-    static const char* PinyinSource();     // files/pyfile.bin
-    static const char* PinyinMapping();    // files/PyFileMappint.bin
-    static const char* ContactRecords();   // files/ContactsLocalizer.bin
-    static const char* ContactReg();       // files/ContactsReg.bin
-    static const char* LockFile();         // files/memlock.ini
+    static const char* Database();       // databases/contacts2.db
+    static const char* PinyinSource();   // files/pyfile.bin
+    static const char* PinyinMapping();  // files/PyFileMappint.bin
+    static const char* ContactRecords(); // files/ContactsLocalizer.bin
+    static const char* ContactReg();     // files/ContactsReg.bin
+    static const char* LockFile();       // files/memlock.ini
 };
 
 #endif

@@ -40,7 +40,10 @@ constexpr int PY_FILE_SIZE = PY_WORD_COUNT * PY_RECORD_SIZE;
 static_assert(PY_FILE_SIZE == 709412, "the table is the file");
 
 // Classes of codes. A code is looked at in its low 16 bits.
-constexpr bool IsGBIndex(uint16_t uIndex) { return uIndex < PY_WORD_COUNT; }
+constexpr bool IsGBIndex(uint16_t uIndex)
+{
+    return uIndex < PY_WORD_COUNT;
+}
 constexpr bool IsHanZiCode(uint16_t uCode)
 {
     return IsGBIndex(static_cast<uint16_t>(uCode - LOC_HANZI_BASE));
@@ -55,7 +58,10 @@ constexpr bool IsDigitCode(uint16_t uCode)
 }
 
 // The low 16 bits of a code, which is all that a class or a record index is taken from.
-constexpr uint16_t CodeBits(wchar_t code) { return static_cast<uint16_t>(code); }
+constexpr uint16_t CodeBits(wchar_t code)
+{
+    return static_cast<uint16_t>(code);
+}
 
 // The record of a Chinese code; below PY_WORD_COUNT whenever IsHanZiCode holds.
 constexpr int HanZiRecord(wchar_t code)

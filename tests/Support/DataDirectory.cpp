@@ -35,7 +35,10 @@ void CDataDirectory::InstallPinyinTable() const
     fs::copy_file(QV_PYFILE, CDataPaths::PinyinSource(), fs::copy_options::overwrite_existing);
 }
 
-bool CDataDirectory::Exists(const std::string& strPath) { return fs::exists(strPath); }
+bool CDataDirectory::Exists(const std::string& strPath)
+{
+    return fs::exists(strPath);
+}
 
 std::string CDataDirectory::ReadBytes(const std::string& strPath)
 {

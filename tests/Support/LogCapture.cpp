@@ -10,9 +10,15 @@ std::ostream& operator<<(std::ostream& stream, const tag_LogLine& line)
     return stream << '[' << line.iPriority << ' ' << line.strTag << "] " << line.strText;
 }
 
-CLogCapture::CLogCapture() { CLogSink::Set(&CLogCapture::Collect, this); }
+CLogCapture::CLogCapture()
+{
+    CLogSink::Set(&CLogCapture::Collect, this);
+}
 
-CLogCapture::~CLogCapture() { CLogSink::Set(nullptr, nullptr); }
+CLogCapture::~CLogCapture()
+{
+    CLogSink::Set(nullptr, nullptr);
+}
 
 std::vector<std::string> CLogCapture::Texts(int iPriority) const
 {

@@ -1,0 +1,28 @@
+#ifndef QV_COMMON_FILEHELPERS_H
+#define QV_COMMON_FILEHELPERS_H
+
+#include "Common/Export.h"
+
+extern "C"
+{
+    // Writes the absolute path of the file that this library was loaded from to szPath: at most
+    // the path's bytes with an index up to iLastByte, decoded from UTF-8 as _mbstowcs does, without
+    // a terminator (clear szPath beforehand; iLastByte + 2 units are enough). hModule is ignored.
+    // 0, or -1 when the file is not found: no list of mappings, a line of that list above 1023
+    // bytes, a null szPath.
+    QV_EXPORT int GetModuleFileName(void* hModule, wchar_t* szPath, int iLastByte);
+
+    // Move or delete with the shell's "mv" and "rm -r" (directories go with all they hold) and
+    // wait for the command; always 1, whatever became of it. Paths are quoted: blanks, quotes, $
+    // or a leading dash are only ever part of a name. The command with its quoted paths must stay
+    // below 1024 bytes, else it is not run; neither is it for a null path.
+    QV_EXPORT int _MoveFile(const char* szSource, const char* szTarget);
+    QV_EXPORT int _DeleteFile(const char* szPath);
+
+    // The same for wide paths of any length; not run when memory runs out. A unit that has no
+    // UTF-8 form in Unicode2Utf8 stands as U+FFFD in the path.
+    QV_EXPORT int _wc_MoveFile(const wchar_t* szSource, const wchar_t* szTarget);
+    QV_EXPORT int _wc_DeleteFile(const wchar_t* szPath);
+}
+
+#endif

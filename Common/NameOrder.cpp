@@ -1,0 +1,64 @@
+#include "Common/NameOrder.h"
+
+#include "Common/WideString.h"
+#include "Core/LocalizerCodes.h"
+
+namespace
+{
+
+constexpr int COMPARE_EQUAL = 2; // of _CompareString: 1 before, 2 equal, 3 behind
+
+int BoundedLength(const wchar_t (&szName)[CONTACT_MAX_NAME + 1])
+{
+    int iLength = 0;
+    while (iLength <= CONTACT_MAX_NAME && szName[iLength] != 0)
+    {
+        ++iLength;
+    }
+    return iLength;
+}
+
+// -1, 0 or 1: which of two records a property of only one of them puts behind.
+int BehindByProperty(bool bHasA, bool bHasB)
+{
+    return static_cast<int>(bHasA) - static_cast<int>(bHasB);
+}
+
+// A letter and a Chinese character under one first letter: the letter goes first.
+int BehindByScript(wchar_t codeA, wchar_t codeB)
+{
+    if (IsHanZiCode(CodeBits(codeA)) && IsAlphaCode(CodeBits(codeB)))
+    {
+        return 1;
+    }
+    return IsAlphaCode(CodeBits(codeA)) && IsHanZiCode(CodeBits(codeB)) ? -1 : 0;
+}
+
+} // namespace
+
+int CompareNameText(const tag_ContactsStruct& a, const tag_ContactsStruct& b)
+{
+    return _CompareString(0, 0, a.szName, BoundedLength(a.szName), b.szName,
+                          BoundedLength(b.szName)) -
+           COMPARE_EQUAL;
+}
+
+bool NameSortsBehind(const tag_ContactsStruct& a, const tag_ContactsStruct& b)
+{
+    const wchar_t codeA = a.szLocalizerKey[0];
+    const wchar_t codeB = b.szLocalizerKey[0];
+    int iBehind = a.szName[0] == b.szName[0] ? BehindByScript(codeA, codeB) : 0;
+    if (iBehind == 0)
+    {
+        iBehind = BehindByProperty(a.szName[0] == NAME_EMPTY_MARK, b.szName[0] == NAME_EMPTY_MARK);
+    }
+    if (iBehind == 0)
+    {
+        iBehind = BehindByProperty(codeA == LOC_OTHER, codeB == LOC_OTHER);
+    }
+    if (iBehind == 0)
+    {
+        iBehind = BehindByProperty(IsDigitCode(CodeBits(codeA)), IsDigitCode(CodeBits(codeB)));
+    }
+    return iBehind != 0 ? iBehind > 0 : CompareNameText(a, b) > 0;
+}

@@ -1,0 +1,20 @@
+#ifndef QV_DBOPERATOR_DBOPERATORFACTORY_H
+#define QV_DBOPERATOR_DBOPERATORFACTORY_H
+
+#include "DBOperator/DBOperator.h"
+
+// Kinds of operators; any other value may come in as well.
+enum DB_OPERATOR_TYPE : int
+{
+    DB_OPERATOR_SQLITE = 0
+};
+
+class QV_EXPORT CDBOperatorFactory
+{
+public:
+    // A new operator, which the caller deletes; null for an unknown kind or without memory.
+    // Nothing is opened yet.
+    static CDBOperator* CreateDBOperator(DB_OPERATOR_TYPE eType);
+};
+
+#endif

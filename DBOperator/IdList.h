@@ -1,0 +1,39 @@
+#ifndef QV_DBOPERATOR_IDLIST_H
+#define QV_DBOPERATOR_IDLIST_H
+
+#include "Common/Export.h"
+
+#include <cstddef>
+
+// The ids that a query is limited to, as the text " in(1,2,3)".
+class QV_EXPORT CIdList
+{
+public:
+    static constexpr long MAX_IDS = 200;
+    // No further id is appended to a text of this many characters or more.
+    static constexpr size_t TEXT_LIMIT = 1798;
+    // What the text may take with its terminator: the last id may begin just below the limit.
+    static constexpr size_t TEXT_SIZE = TEXT_LIMIT + sizeof(",-2147483648)");
+
+    // The list of the lCount ids of pIds, each in the decimal form of its low 32 bits; without
+    // the ids that find no place, and empty (no limit) unless lCount is 1 to MAX_IDS.
+    CIdList(long lCount, const long long* pIds);
+
+    // Whether the count asks for a list at all.
+    static bool IsListed(long lCount) { return lCount >= 1 && lCount <= MAX_IDS; }
+    // Whether a read limited to these ids would see all of them: neither too many nor too long.
+    // False for a null pIds.
+    static bool CanListAll(long lCount, const long long* pIds);
+
+    bool IsEmpty() const { return m_szText[0] == '\0'; }
+    const char* Text() const { return m_szText; }
+
+private:
+    void Append(char cBefore, long long llId);
+
+    char m_szText[TEXT_SIZE];
+    size_t m_iLength;
+    long m_lWritten; // ids in the text
+};
+
+#endif

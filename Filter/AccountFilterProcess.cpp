@@ -1,0 +1,20 @@
+#include "Filter/AccountFilterProcess.h"
+
+#include "Filter/IdList.h"
+
+int AccountFilterProcess::IsSameAccount(int iID, const QVLong32* plList, int iNum)
+{
+    return IsInIdList(iID, plList, iNum) ? 1 : 0;
+}
+
+bool AccountFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                                 const CFilterChain& /*chain*/)
+{
+    const CAccountFilter& account = static_cast<const CAccountFilter&>(filter);
+    return IsSameAccount(account.GetAccountID(), record.lAccountID, CONTACT_MAX_ACCOUNTS) == 1;
+}
+
+int AccountFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)
+{
+    return FilterByRule(pInfo, chain, KIND, Keeps);
+}

@@ -1,0 +1,23 @@
+#ifndef QV_FILTER_ACCOUNTFILTERPROCESS_H
+#define QV_FILTER_ACCOUNTFILTERPROCESS_H
+
+#include "Filter/Filter.h"
+#include "Filter/FilterProcess.h"
+
+// Keeps the contacts that have data in the filter's account.
+class QV_EXPORT AccountFilterProcess : public FilterProcess
+{
+public:
+    static constexpr int KIND = FILTER_ACCOUNT;
+
+    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                      const CFilterChain& chain);
+
+    // 1 when iID stands among the iNum accounts at plList, else 0. The list ends at its first 0,
+    // which is itself compared: id 0 matches every list that has a 0.
+    static int IsSameAccount(int iID, const QVLong32* plList, int iNum);
+
+    int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
+};
+
+#endif

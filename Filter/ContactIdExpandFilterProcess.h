@@ -1,0 +1,19 @@
+#ifndef QV_FILTER_CONTACTIDEXPANDFILTERPROCESS_H
+#define QV_FILTER_CONTACTIDEXPANDFILTERPROCESS_H
+
+#include "Filter/Filter.h"
+#include "Filter/FilterProcess.h"
+
+// Removes the contact with the filter's id.
+class QV_EXPORT ContactIdExpandFilterProcess : public FilterProcess
+{
+public:
+    static constexpr int KIND = FILTER_CONTACT_ID_EXPAND;
+
+    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                      const CFilterChain& chain);
+
+    int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
+};
+
+#endif

@@ -1,0 +1,12 @@
+#include "Filter/FavouritesFilterProcess.h"
+
+bool FavouritesFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
+                                    const CFilterChain& /*chain*/)
+{
+    return (record.iFlags & CONTACT_FLAG_STARRED) != 0;
+}
+
+int FavouritesFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)
+{
+    return FilterByRule(pInfo, chain, KIND, Keeps);
+}

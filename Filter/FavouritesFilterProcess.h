@@ -1,0 +1,19 @@
+#ifndef QV_FILTER_FAVOURITESFILTERPROCESS_H
+#define QV_FILTER_FAVOURITESFILTERPROCESS_H
+
+#include "Filter/Filter.h"
+#include "Filter/FilterProcess.h"
+
+// Keeps the starred contacts.
+class QV_EXPORT FavouritesFilterProcess : public FilterProcess
+{
+public:
+    static constexpr int KIND = FILTER_FAVOURITES;
+
+    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                      const CFilterChain& chain);
+
+    int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
+};
+
+#endif

@@ -1,0 +1,114 @@
+#ifndef QV_FILTER_FILTER_H
+#define QV_FILTER_FILTER_H
+
+#include <cstdint>
+
+#include "Common/Export.h"
+
+// Kinds of filter. 3 and 4 belong to no filter.
+constexpr int FILTER_GROUP = 0;              // members of a group
+constexpr int FILTER_ACCOUNT = 1;            // contacts with data in an account
+constexpr int FILTER_PHONE = 2;              // contacts with a phone number
+constexpr int FILTER_FAVOURITES = 5;         // starred contacts
+constexpr int FILTER_GROUP_EXPAND = 6;       // contacts outside a group
+constexpr int FILTER_MAIL = 7;               // contacts with a mail address
+constexpr int FILTER_POSTAL = 8;             // contacts with a postal address
+constexpr int FILTER_ACCOUNT_EXPAND = 9;     // contacts not confined to the excluded accounts
+constexpr int FILTER_CONTACT_ID_EXPAND = 10; // all contacts but one
+constexpr int FILTER_ONLINE = 11;            // contacts that are online
+
+// Describes one condition on contacts; the filter processes apply it. A filter with one of the
+// kinds above must be of that kind's class, for the processes read its id through that class.
+// Filters of any other kind are ignored.
+class QV_EXPORT CFilter
+{
+public:
+    virtual ~CFilter();
+    CFilter(const CFilter&) = delete;
+    CFilter& operator=(const CFilter&) = delete;
+
+    int32_t m_iType; // FILTER_*
+
+protected:
+    explicit CFilter(int iType);
+};
+static_assert(sizeof(void*) != 4 || sizeof(CFilter) == 8, "part of the interface");
+
+class QV_EXPORT CGroupFilter : public CFilter
+{
+public:
+    explicit CGroupFilter(int iGroupID);
+    int GetGroupID() const { return m_iID; }
+
+    int32_t m_iID;
+};
+static_assert(sizeof(void*) != 4 || sizeof(CGroupFilter) == 12, "part of the interface");
+
+class QV_EXPORT CGroupExpandFilter : public CFilter
+{
+public:
+    explicit CGroupExpandFilter(int iGroupID);
+    int GetGroupID() const { return m_iID; }
+
+    int32_t m_iID;
+};
+
+class QV_EXPORT CAccountFilter : public CFilter
+{
+public:
+    explicit CAccountFilter(int iAccountID);
+    int GetAccountID() const { return m_iID; }
+
+    int32_t m_iID;
+};
+
+// All filters of this kind in a chain name the excluded accounts together.
+class QV_EXPORT CAccountExpandFilter : public CFilter
+{
+public:
+    explicit CAccountExpandFilter(int iAccountID);
+    int GetAccountID() const { return m_iID; }
+
+    int32_t m_iID;
+};
+
+class QV_EXPORT CContactIdExpandFilter : public CFilter
+{
+public:
+    explicit CContactIdExpandFilter(int iContactID);
+    int GetContactID() const { return m_iID; }
+
+    int32_t m_iID;
+};
+
+class QV_EXPORT CPhoneFilter : public CFilter
+{
+public:
+    CPhoneFilter();
+};
+
+class QV_EXPORT CMailFilter : public CFilter
+{
+public:
+    CMailFilter();
+};
+
+class QV_EXPORT CFavouritesFilter : public CFilter
+{
+public:
+    CFavouritesFilter();
+};
+
+class QV_EXPORT CPostalFilter : public CFilter
+{
+public:
+    CPostalFilter();
+};
+
+class QV_EXPORT OnlineFilter : public CFilter
+{
+public:
+    OnlineFilter();
+};
+
+#endif

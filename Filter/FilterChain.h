@@ -1,0 +1,33 @@
+#ifndef QV_FILTER_FILTERCHAIN_H
+#define QV_FILTER_FILTERCHAIN_H
+
+#include <utils/Vector.h>
+
+#include "Common/Export.h"
+#include "Filter/Filter.h"
+
+// An ordered list of filters that must all hold at once; an empty one lets every contact pass.
+// The chain owns its filters and cannot be copied. Reading it takes no lock.
+class QV_EXPORT CFilterChain
+{
+public:
+    CFilterChain();
+    ~CFilterChain(); // deletes every filter
+    CFilterChain(const CFilterChain&) = delete;
+    CFilterChain& operator=(const CFilterChain&) = delete;
+
+    // Appends the filter and owns it from then on, also when memory runs out: then the filter is
+    // deleted and GetFilterNum stays as it was. A null filter takes a place and is ignored.
+    void SetFilter(CFilter* pFilter);
+
+    int GetFilterNum() const;
+
+    // The filter at iNo, from 0 in the order of appending, still owned by the chain; null when
+    // there is no such place.
+    CFilter* GetFilterByNo(int iNo) const;
+
+private:
+    android::Vector<CFilter*> m_vFilters;
+};
+
+#endif

@@ -1,0 +1,18 @@
+#ifndef QV_FILTER_FILTERPROCESSFACTORY_H
+#define QV_FILTER_FILTERPROCESSFACTORY_H
+
+#include "Common/Export.h"
+
+class FilterProcess;
+
+class QV_EXPORT FilterProcessFactory
+{
+public:
+    // The pipeline of all ten processes: account, account expand, group, group expand, phone,
+    // mail, favourites, postal, contact id expand, online. Returns its first process, whose
+    // deletion deletes them all; null, with nothing kept, when one of them finds no memory, for a
+    // shorter pipeline would let through what the missing filter excludes.
+    static FilterProcess* CreateFilterProcess();
+};
+
+#endif

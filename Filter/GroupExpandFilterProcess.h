@@ -1,0 +1,19 @@
+#ifndef QV_FILTER_GROUPEXPANDFILTERPROCESS_H
+#define QV_FILTER_GROUPEXPANDFILTERPROCESS_H
+
+#include "Filter/Filter.h"
+#include "Filter/FilterProcess.h"
+
+// Removes the members of the filter's group.
+class QV_EXPORT GroupExpandFilterProcess : public FilterProcess
+{
+public:
+    static constexpr int KIND = FILTER_GROUP_EXPAND;
+
+    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                      const CFilterChain& chain);
+
+    int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
+};
+
+#endif

@@ -1,0 +1,23 @@
+#ifndef QV_FILTER_GROUPFILTERPROCESS_H
+#define QV_FILTER_GROUPFILTERPROCESS_H
+
+#include "Filter/Filter.h"
+#include "Filter/FilterProcess.h"
+
+// Keeps the members of the filter's group; group SECRET_GROUP_ID has the secret contacts.
+class QV_EXPORT GroupFilterProcess : public FilterProcess
+{
+public:
+    static constexpr int KIND = FILTER_GROUP;
+
+    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                      const CFilterChain& chain);
+
+    // 1 when iID stands among the iNum groups at plList, else 0. The list ends at its first 0,
+    // which is itself compared: id 0 matches every list that has a 0.
+    static int IsSameGroup(int iID, const QVLong32* plList, int iNum);
+
+    int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
+};
+
+#endif

@@ -1,0 +1,38 @@
+#ifndef QV_FILTER_IDLIST_H
+#define QV_FILTER_IDLIST_H
+
+#include "Core/ContactRecords.h"
+
+// The id lists of contact records: iNum elements, ending early at the first 0. A list that a
+// damaged record leaves without a 0 is never read beyond iNum. A null list is empty.
+
+// Whether iID stands in the list. Each element is compared before it can end the list, so 0
+// stands in every list that ends at a 0.
+inline bool IsInIdList(int iID, const QVLong32* plList, int iNum)
+{
+    for (int i = 0; plList != nullptr && i < iNum; ++i)
+    {
+        if (plList[i] == iID)
+        {
+            return true;
+        }
+        if (plList[i] == 0)
+        {
+            return false;
+        }
+    }
+    return false;
+}
+
+// How many ids stand before the list's end.
+inline int CountIds(const QVLong32* plList, int iNum)
+{
+    int iCount = 0;
+    while (plList != nullptr && iCount < iNum && plList[iCount] != 0)
+    {
+        ++iCount;
+    }
+    return iCount;
+}
+
+#endif

@@ -1,0 +1,12 @@
+#include "Filter/MailFilterProcess.h"
+
+bool MailFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
+                              const CFilterChain& /*chain*/)
+{
+    return (record.iFlags & CONTACT_FLAG_MAIL) != 0;
+}
+
+int MailFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)
+{
+    return FilterByRule(pInfo, chain, KIND, Keeps);
+}

@@ -1,0 +1,19 @@
+#ifndef QV_FILTER_MAILFILTERPROCESS_H
+#define QV_FILTER_MAILFILTERPROCESS_H
+
+#include "Filter/Filter.h"
+#include "Filter/FilterProcess.h"
+
+// Keeps the contacts that have a mail address.
+class QV_EXPORT MailFilterProcess : public FilterProcess
+{
+public:
+    static constexpr int KIND = FILTER_MAIL;
+
+    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                      const CFilterChain& chain);
+
+    int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
+};
+
+#endif

@@ -1,0 +1,12 @@
+#include "Filter/PhoneFilterProcess.h"
+
+bool PhoneFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
+                               const CFilterChain& /*chain*/)
+{
+    return (record.iFlags & CONTACT_FLAG_PHONE) != 0;
+}
+
+int PhoneFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)
+{
+    return FilterByRule(pInfo, chain, KIND, Keeps);
+}

@@ -1,0 +1,12 @@
+#include "Filter/PostalFilterProcess.h"
+
+bool PostalFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
+                                const CFilterChain& /*chain*/)
+{
+    return (record.iFlags & CONTACT_FLAG_ADDRESS) != 0;
+}
+
+int PostalFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)
+{
+    return FilterByRule(pInfo, chain, KIND, Keeps);
+}

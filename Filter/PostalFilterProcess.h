@@ -1,0 +1,19 @@
+#ifndef QV_FILTER_POSTALFILTERPROCESS_H
+#define QV_FILTER_POSTALFILTERPROCESS_H
+
+#include "Filter/Filter.h"
+#include "Filter/FilterProcess.h"
+
+// Keeps the contacts that have a postal address.
+class QV_EXPORT PostalFilterProcess : public FilterProcess
+{
+public:
+    static constexpr int KIND = FILTER_POSTAL;
+
+    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                      const CFilterChain& chain);
+
+    int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
+};
+
+#endif

@@ -37,7 +37,7 @@ class CFilterChain;
 class QV_EXPORT CMemManger
 {
 public:
-    CMemManger() = default;
+    CMemManger();
     // Closes open write mappings and releases a held lock.
     ~CMemManger();
     CMemManger(const CMemManger&) = delete;
@@ -74,8 +74,8 @@ public:
     void CloseWriteShareMem();
 
     // The store lock, held through this object. LockMemo does not wait: 1 when taken, 0 when
-    // anybody holds it; not called while this object holds it. UnlockMemo: 1 when released, 0
-    // when nothing was held or the release failed (the handle is kept then).
+    // anybody holds it, this object included, which then goes on holding it. UnlockMemo: 1 when
+    // released, 0 when nothing was held or the release failed (the handle is kept then).
     int LockMemo();
     int UnlockMemo();
 

@@ -33,10 +33,10 @@ extern "C"
     QV_EXPORT int _wprintf(const wchar_t* szFormat, ...);
 
     // Formats by the rules of the narrow vsprintf (%s takes a narrow string) and decodes the
-    // result into szTarget, with its terminator; szTarget needs room for as many units as the
-    // formatted text has bytes, and one. A text that does not decode ends before the offending
-    // character. Returns the formatted length in bytes plus 1, or -1 with szTarget untouched when
-    // formatting fails, the text has 1024 bytes or more, memory runs out, or an argument is null.
+    // result into szTarget, which needs room for the decoded text and its terminator. A text that
+    // does not decode ends before the offending character. Returns the formatted length in bytes
+    // plus 1, or -1 with szTarget untouched when formatting fails, the text has 1024 bytes or
+    // more, memory runs out, or an argument is null.
     QV_EXPORT int _u_wsprintf(wchar_t* szTarget, const wchar_t* szFormat, ...);
 }
 

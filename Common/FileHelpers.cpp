@@ -1,0 +1,271 @@
+#include "Common/FileHelpers.h"
+
+#include "Common/Utf8.h"
+#include "Common/WideString.h"
+
+#include <cstdint>
+#include <cstdio>
+#include <cstdlib>
+#include <cstring>
+
+namespace
+{
+
+constexpr const char* MAPS_FILE = "/proc/self/maps";
+constexpr const char* EXECUTABLE_MARK = " r-xp ";
+constexpr int MAX_MAPS_LINE = 1023;
+constexpr int MAX_MAPS_READ = MAX_MAPS_LINE + 2; // with its line end and the terminator
+
+constexpr size_t COMMAND_BYTES = 1024;
+constexpr const char* MOVE_WORDS = "mv";
+constexpr const char* DELETE_WORDS = "rm -r";
+constexpr size_t WORDS_ROOM = 8; // for the longest words and the terminator
+constexpr const char* ESCAPED_QUOTE = "'\\''";
+constexpr size_t ESCAPED_QUOTE_BYTES = 4;
+constexpr size_t QUOTING_BYTES = 5; // a blank, two quotes, "./"
+constexpr size_t MAX_UTF8_BYTES = 3;
+
+// A file of the C library, closed at the end of the scope.
+class CTextFile
+{
+public:
+    explicit CTextFile(const char* szPath) : m_pFile(std::fopen(szPath, "r")) {}
+    ~CTextFile()
+    {
+        if (m_pFile != nullptr)
+        {
+            std::fclose(m_pFile);
+        }
+    }
+    CTextFile(const CTextFile&) = delete;
+    CTextFile& operator=(const CTextFile&) = delete;
+
+    bool IsOpen() const { return m_pFile != nullptr; }
+
+    // The next line without its end; empty for one that does not fit. False at the file's end.
+    bool ReadLine(char* szLine, int iSize)
+    {
+        if (std::fgets(szLine, iSize, m_pFile) == nullptr)
+        {
+            return false;
+        }
+        char* pEnd = std::strchr(szLine, '\n');
+        if (pEnd == nullptr)
+        {
+            SkipLine();
+            pEnd = szLine;
+        }
+        *pEnd = 0;
+        return true;
+    }
+
+private:
+    void SkipLine()
+    {
+        int iByte = 0;
+        do
+        {
+            iByte = std::fgetc(m_pFile);
+        } while (iByte != '\n' && iByte != EOF);
+    }
+
+    FILE* m_pFile;
+};
+
+// The path in a line of the list of mappings when the line's range is executable and holds
+// uAddress, else null.
+const char* PathOfMapping(const char* szLine, uintptr_t uAddress)
+{
+    const char* szPath = std::strchr(szLine, '/');
+    unsigned long ulStart = 0;
+    unsigned long ulEnd = 0;
+    if (std::strstr(szLine, EXECUTABLE_MARK) == nullptr || szPath == nullptr ||
+        std::sscanf(szLine, "%lx-%lx ", &ulStart, &ulEnd) != 2)
+    {
+        return nullptr;
+    }
+    return ulStart <= uAddress && uAddress < ulEnd ? szPath : nullptr;
+}
+
+// A shell command, put together in memory of the caller's: words, then quoted paths.
+class CShellCommand
+{
+public:
+    CShellCommand(const char* szWords, char* szBuffer, size_t uSize)
+        : m_szBuffer(szBuffer), m_uSize(uSize)
+    {
+        m_szBuffer[0] = 0;
+        AddText(szWords);
+    }
+
+    // Between quotes only a quote means something to the shell; a name that starts with a dash
+    // would be an option of the command.
+    void AddPath(const char* szPath)
+    {
+        AddText(szPath[0] == '-' ? " './" : " '");
+        for (const char* p = szPath; *p != 0; ++p)
+        {
+            const char szByte[] = {*p, 0};
+            AddText(*p == '\'' ? ESCAPED_QUOTE : szByte);
+        }
+        AddText("'");
+    }
+
+    void Run() const
+    {
+        if (m_bFits)
+        {
+            // The callers report nothing of what becomes of the command.
+            const int iStatus = std::system(m_szBuffer);
+            static_cast<void>(iStatus);
+        }
+    }
+
+private:
+    void AddText(const char* szText)
+    {
+        const size_t uLength = std::strlen(szText);
+        m_bFits = m_bFits && uLength < m_uSize - m_uUsed;
+        if (m_bFits)
+        {
+            std::memcpy(m_szBuffer + m_uUsed, szText, uLength + 1);
+            m_uUsed += uLength;
+        }
+    }
+
+    char* m_szBuffer;
+    size_t m_uSize;
+    size_t m_uUsed = 0;
+    bool m_bFits = true;
+};
+
+// A wide path in UTF-8, released at the end of the scope; null when memory ran out.
+class CUtf8Path
+{
+public:
+    explicit CUtf8Path(const wchar_t* szPath)
+    {
+        const size_t uUnits = _wcslen(szPath);
+        m_szPath = static_cast<char*>(std::calloc(uUnits + 1, MAX_UTF8_BYTES));
+        if (m_szPath != nullptr)
+        {
+            _wcstombs(m_szPath, szPath, static_cast<int>(uUnits));
+        }
+    }
+    ~CUtf8Path() { std::free(m_szPath); }
+    CUtf8Path(const CUtf8Path&) = delete;
+    CUtf8Path& operator=(const CUtf8Path&) = delete;
+
+    const char* Get() const { return m_szPath; }
+
+private:
+    char* m_szPath;
+};
+
+// Room that a command needs for the path, however many quotes it has.
+size_t QuotedRoom(const char* szPath)
+{
+    return std::strlen(szPath) * ESCAPED_QUOTE_BYTES + QUOTING_BYTES;
+}
+
+void RunInBuffer(const char* szWords, const char* const* pPaths, int iPaths, char* szBuffer,
+                 size_t uSize)
+{
+    CShellCommand clCommand(szWords, szBuffer, uSize);
+    for (int i = 0; i < iPaths; ++i)
+    {
+        clCommand.AddPath(pPaths[i]);
+    }
+    clCommand.Run();
+}
+
+// Runs the words with the paths in a buffer that is large enough for any.
+void RunAnyLength(const char* szWords, const char* const* pPaths, int iPaths)
+{
+    size_t uSize = WORDS_ROOM;
+    for (int i = 0; i < iPaths; ++i)
+    {
+        if (pPaths[i] == nullptr)
+        {
+            return;
+        }
+        uSize += QuotedRoom(pPaths[i]);
+    }
+    char* szBuffer = static_cast<char*>(std::malloc(uSize));
+    if (szBuffer != nullptr)
+    {
+        RunInBuffer(szWords, pPaths, iPaths, szBuffer, uSize);
+    }
+    std::free(szBuffer);
+}
+
+} // namespace
+
+int GetModuleFileName(void* /*hModule*/, wchar_t* szPath, int iLastByte)
+{
+    CTextFile clMaps(MAPS_FILE);
+    if (szPath == nullptr || !clMaps.IsOpen())
+    {
+        return -1;
+    }
+    // A function of this file only: it lies in the library's text and no other library's function
+    // takes its place. A constant would lie in a mapping that current linkers do not make
+    // executable.
+    const uintptr_t uOwnText = reinterpret_cast<uintptr_t>(&PathOfMapping);
+    int iResult = -1;
+    char szLine[MAX_MAPS_READ];
+    while (clMaps.ReadLine(szLine, MAX_MAPS_READ))
+    {
+        const char* szFound = PathOfMapping(szLine, uOwnText);
+        if (szFound != nullptr)
+        {
+            _mbstowcs(szPath, szFound, iLastByte);
+            iResult = 0;
+        }
+    }
+    return iResult;
+}
+
+int _MoveFile(const char* szSource, const char* szTarget)
+{
+    if (szSource != nullptr && szTarget != nullptr)
+    {
+        const char* const pPaths[] = {szSource, szTarget};
+        char szCommand[COMMAND_BYTES];
+        RunInBuffer(MOVE_WORDS, pPaths, 2, szCommand, COMMAND_BYTES);
+    }
+    return 1;
+}
+
+int _DeleteFile(const char* szPath)
+{
+    if (szPath != nullptr)
+    {
+        char szCommand[COMMAND_BYTES];
+        RunInBuffer(DELETE_WORDS, &szPath, 1, szCommand, COMMAND_BYTES);
+    }
+    return 1;
+}
+
+int _wc_MoveFile(const wchar_t* szSource, const wchar_t* szTarget)
+{
+    if (szSource != nullptr && szTarget != nullptr)
+    {
+        const CUtf8Path clSource(szSource);
+        const CUtf8Path clTarget(szTarget);
+        const char* const pPaths[] = {clSource.Get(), clTarget.Get()};
+        RunAnyLength(MOVE_WORDS, pPaths, 2);
+    }
+    return 1;
+}
+
+int _wc_DeleteFile(const wchar_t* szPath)
+{
+    if (szPath != nullptr)
+    {
+        const CUtf8Path clPath(szPath);
+        const char* const pPaths[] = {clPath.Get()};
+        RunAnyLength(DELETE_WORDS, pPaths, 1);
+    }
+    return 1;
+}

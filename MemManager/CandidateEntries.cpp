@@ -1,0 +1,87 @@
+#include "MemManager/CandidateEntries.h"
+
+#include "Common/Log.h"
+#include "Filter/FilterChain.h"
+#include "Filter/FilterProcess.h"
+#include "Filter/FilterProcessFactory.h"
+#include "Filter/RecordTest.h"
+
+#include <memory>
+#include <new>
+
+namespace
+{
+
+// An entry's field of this text is one unit shorter than the record's.
+constexpr int ENTRY_MAX_RESERVED = 4;
+static_assert(sizeof(tag_LocalizerDetail::szReserved) / sizeof(wchar_t) == ENTRY_MAX_RESERVED + 1,
+              "room for a terminator");
+
+// Copies up to the terminator, at most iMax units: a damaged record may have none. The target is
+// zero-filled.
+void CopyText(wchar_t* szTarget, const wchar_t* szSource, int iMax)
+{
+    for (int i = 0; i < iMax && szSource[i] != 0; ++i)
+    {
+        szTarget[i] = szSource[i];
+    }
+}
+
+void FillEntry(const tag_ContactsStruct& record, tag_LocalizerDetail* pEntry)
+{
+    *pEntry = {};
+    pEntry->iContactID = record.iContactID;
+    pEntry->iSortIndex = record.iSortIndex;
+    CopyText(pEntry->szLocalizerKey, record.szLocalizerKey, CONTACT_MAX_KEY);
+    CopyText(pEntry->szReserved, record.szReserved, ENTRY_MAX_RESERVED);
+    pEntry->llLastTimeContacted = record.llLastTimeContacted;
+}
+
+} // namespace
+
+int CCandidateEntries::Select(const tag_ContactsStruct* pRecords, int iCount,
+                              const CFilterChain& chain, tag_LocalizerDetail* pEntries)
+{
+    const CRecordTest test(chain);
+    const bool bAll = chain.GetFilterNum() == 0;
+    int iKept = 0;
+    for (int i = 0; i < iCount; ++i)
+    {
+        if (bAll || test.Keeps(pRecords[i]))
+        {
+            FillEntry(pRecords[i], &pEntries[iKept++]);
+        }
+    }
+    return iKept;
+}
+
+void CCandidateEntries::NarrowCopy(tag_ContactsInfo* pCopy, CFilterChain& chain,
+                                   tag_LocalizerResult* pResult)
+{
+    const std::unique_ptr<FilterProcess> pPipeline(FilterProcessFactory::CreateFilterProcess());
+    if (pPipeline == nullptr || pPipeline->FilterRecord(pCopy, chain) != 0)
+    {
+        return;
+    }
+    const int iNum = pCopy->RecordNum;
+    LogFilterResult(iNum);
+    if (iNum == 0)
+    {
+        return;
+    }
+    pResult->pDetail = new (std::nothrow) tag_LocalizerDetail[static_cast<size_t>(iNum)];
+    if (pResult->pDetail == nullptr)
+    {
+        return;
+    }
+    pResult->iResultNum = iNum;
+    for (int i = 0; i < iNum; ++i)
+    {
+        FillEntry(pCopy->pContacts[i], &pResult->pDetail[i]);
+    }
+}
+
+void CCandidateEntries::LogFilterResult(int iNum)
+{
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts: CopyContactsResult Filter Result Num = %d\n", iNum);
+}

@@ -1,0 +1,31 @@
+#ifndef QV_MEMMANAGER_CANDIDATEENTRIES_H
+#define QV_MEMMANAGER_CANDIDATEENTRIES_H
+
+// The two ways from contact records to the entries that a search looks through. Both give the
+// same entries, in the records' order; they differ in what they may do with the records.
+
+#include "Core/ContactRecords.h"
+#include "Core/SearchRecords.h"
+
+class CFilterChain;
+
+class CCandidateEntries
+{
+public:
+    // Writes an entry for each of the iCount records that passes the chain, which has to be one
+    // that CRecordTest::CanTest accepts, and returns their number. The records are only read, so
+    // they may lie in a mapping; pEntries has room for iCount entries.
+    static int Select(const tag_ContactsStruct* pRecords, int iCount, const CFilterChain& chain,
+                      tag_LocalizerDetail* pEntries);
+
+    // Narrows the caller's copy of the records by the pipeline of filter processes and makes the
+    // entries of what is left, in a new array of pResult, which comes in empty. It stays empty
+    // when nothing is left, a process fails or memory runs out.
+    static void NarrowCopy(tag_ContactsInfo* pCopy, CFilterChain& chain,
+                           tag_LocalizerResult* pResult);
+
+    // The debug line that tells how many records the filters left.
+    static void LogFilterResult(int iNum);
+};
+
+#endif

@@ -1,12 +1,10 @@
 #ifndef QV_DBOPERATOR_IDLIST_H
 #define QV_DBOPERATOR_IDLIST_H
 
-#include "Common/Export.h"
-
 #include <cstddef>
 
 // The ids that a query is limited to, as the text " in(1,2,3)".
-class QV_EXPORT CIdList
+class CIdList
 {
 public:
     static constexpr long MAX_IDS = 200;
@@ -29,7 +27,7 @@ public:
     const char* Text() const { return m_szText; }
 
 private:
-    void Append(char cBefore, long long llId);
+    void Append(const char* szBefore, long long llId);
 
     char m_szText[TEXT_SIZE];
     size_t m_iLength;

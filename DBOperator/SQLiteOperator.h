@@ -47,7 +47,7 @@ public:
 private:
     int EnsureOpen();
     int QueryContactsCount(int* piCount);
-    int CountContacts(const CIdList& clIds, int& iCount);
+    int CountContacts(const CIdList& clIds, tag_ContactsInfo* pRecord);
     int ReadContacts(const CIdList& clIds, tag_ContactsInfo* pRecord);
     int ReadLocalizer(const CIdList& clIds, tag_ContactsInfo* pRecord);
     int ReadContactRow(int iContactID, tag_ContactsStruct* pContact, int& iFound);

@@ -1,0 +1,445 @@
+#include "DBOperator/SQLiteOperator.h"
+
+#include "Common/DataPaths.h"
+#include "Common/Log.h"
+#include "DBOperator/ContactRow.h"
+#include "DBOperator/IdList.h"
+#include "DBOperator/SqlStatement.h"
+#include "DBOperator/StatusIndex.h"
+
+#include <cstdio>
+#include <new>
+#include <unistd.h>
+
+namespace
+{
+
+constexpr char SELECT_COUNT[] =
+    "select count(*) from contacts where cast(exists(select _id from visible_contacts where "
+    "contacts._id = visible_contacts._id ) as integer)=1";
+constexpr char SELECT_CONTACTS[] =
+    "select _id,times_contacted,starred,has_phone_number,last_time_contacted,single_is_secret,"
+    "photo_file_id,status_update_id  from contacts where cast(exists(select _id from "
+    "visible_contacts where contacts._id = visible_contacts._id ) as integer)=1 ";
+constexpr char SELECT_LOCALIZER[] =
+    "select contact_id,display_name,localizerkey,group_id,account_id,hasMail,hasAddress from "
+    "localizer";
+constexpr char SELECT_ONLINE[] =
+    "select status_update_data_id from status_updates where status=\"online\"";
+constexpr char SELECT_CONTACT_BY_ID[] =
+    "select _id,times_contacted,starred,has_phone_number,last_time_contacted,single_is_secret,"
+    "photo_file_id  from contacts where _id = %d";
+constexpr char SELECT_LOCALIZER_BY_ID[] =
+    "select contact_id,display_name,localizerkey,group_id,account_id,hasMail,hasAddress from "
+    "localizer where contact_id = %d";
+constexpr char AND_ID[] = " and _id ";
+constexpr char WHERE_CONTACT_ID[] = " where contact_id ";
+
+constexpr size_t LIST_STATEMENT_SIZE =
+    sizeof(SELECT_CONTACTS) + sizeof(AND_ID) + CIdList::TEXT_SIZE;
+static_assert(sizeof(SELECT_LOCALIZER) + sizeof(WHERE_CONTACT_ID) <=
+                  sizeof(SELECT_CONTACTS) + sizeof(AND_ID),
+              "the contacts query is the longest");
+constexpr size_t ID_STATEMENT_SIZE = 200;
+static_assert(sizeof(SELECT_CONTACT_BY_ID) + sizeof("-2147483648") <= ID_STATEMENT_SIZE &&
+                  sizeof(SELECT_LOCALIZER_BY_ID) + sizeof("-2147483648") <= ID_STATEMENT_SIZE,
+              "any id fits");
+
+// A query, limited to the ids of a list when there is one.
+class CListStatement
+{
+public:
+    CListStatement(const char* szQuery, const char* szJoin, const CIdList& clIds)
+    {
+        std::snprintf(m_szText, sizeof(m_szText), "%s%s%s", szQuery, clIds.IsEmpty() ? "" : szJoin,
+                      clIds.Text());
+    }
+    const char* Text() const { return m_szText; }
+
+private:
+    char m_szText[LIST_STATEMENT_SIZE];
+};
+
+void LogReadCountTry(int iTry)
+{
+    QV_LOGE(DB_LOG_TAG,
+            " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select contacts count "
+            "sqlite3_step is busy try %d times",
+            iTry);
+}
+
+void LogGetCountTry(int iTry)
+{
+    QV_LOGE(DB_LOG_TAG,
+            " QV_Contacts>>QV_ContactsLocalize_SO>> sqlite3_step error result=%d first, and has "
+            "try %d times.",
+            SQLITE_BUSY, iTry);
+}
+
+int AllocateRecords(tag_ContactsInfo* pRecord)
+{
+    pRecord->pContacts =
+        new (std::nothrow) tag_ContactsStruct[static_cast<size_t>(pRecord->RecordNum)]();
+    if (pRecord->pContacts != nullptr)
+    {
+        return 0;
+    }
+    QV_LOGE(DB_LOG_TAG, "QV_Contacts>>QV_ContactsLocalize_SO>>ReadAllLocalizer  NEW MEM ERR!!!!!!");
+    pRecord->RecordNum = 0;
+    return -1;
+}
+
+// One record per row. Rows that came since the count find no record; records without a row,
+// because contacts went since the count, stay zero and find no name row later.
+void FillContacts(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
+{
+    int iFilled = 0;
+    int iRetCode = clRows.Step();
+    while (iRetCode == SQLITE_ROW && iFilled < pRecord->RecordNum)
+    {
+        tag_ContactsStruct* pContact = &pRecord->pContacts[iFilled++];
+        FillFromContactsRow(clRows, pContact);
+        pContact->iStatusUpdateID = clRows.Int(CONTACTS_STATUS_COLUMN);
+        iRetCode = clRows.Step();
+    }
+    if (iRetCode != SQLITE_DONE)
+    {
+        QV_LOGE(DB_LOG_TAG,
+                " QV_Contacts>>QV_ContactsLocalize_SO>> select from contacts sqlite3_step ERROR "
+                "result=%d",
+                iRetCode);
+    }
+}
+
+// Completes the records, in order, from the rows that belong to them; rows of other contacts are
+// passed over. Returns the number of records completed.
+int MergeLocalizer(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
+{
+    int iIndex = 0;
+    int iRetCode = clRows.Step();
+    while (iRetCode == SQLITE_ROW && iIndex < pRecord->RecordNum)
+    {
+        if (clRows.Int(LOCALIZER_ID_COLUMN) == pRecord->pContacts[iIndex].iContactID)
+        {
+            FillFromLocalizerRow(clRows, ROW_GROUPS, &pRecord->pContacts[iIndex++]);
+        }
+        iRetCode = clRows.Step();
+    }
+    if (iRetCode != SQLITE_DONE)
+    {
+        QV_LOGE(DB_LOG_TAG, "QV_Contacts>>QV_ContactsLocalize_SO>> "
+                            "SQLiteOperator>>ReadAllLocalizer: sqlite3_step  error from localizer");
+    }
+    return iIndex;
+}
+
+int RecordCount(const tag_ContactsInfo* pRecord)
+{
+    return pRecord->pContacts == nullptr ? 0 : pRecord->RecordNum;
+}
+
+void ClearOnline(tag_ContactsInfo* pRecord)
+{
+    for (int i = 0; i < RecordCount(pRecord); ++i)
+    {
+        pRecord->pContacts[i].iFlags &= ~CONTACT_FLAG_ONLINE;
+    }
+}
+
+// Marks the contacts of the current row and of all rows behind it.
+void MarkOnline(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
+{
+    const CStatusIndex clIndex(pRecord->pContacts, RecordCount(pRecord));
+    do
+    {
+        const int iStatusId = clRows.Int(0);
+        tag_ContactsStruct* pContact = clIndex.First(iStatusId);
+        if (pContact != nullptr)
+        {
+            QV_LOGD(DB_LOG_TAG, "CSQLiteOperator:Find one contact is sms online:statusid:%d\n",
+                    iStatusId);
+            pContact->iFlags |= CONTACT_FLAG_ONLINE;
+        }
+    } while (clRows.Step() == SQLITE_ROW);
+}
+
+} // namespace
+
+CSQLiteOperator::CSQLiteOperator() : m_pDB(nullptr) {}
+
+CSQLiteOperator::~CSQLiteOperator()
+{
+    if (m_pDB != nullptr)
+    {
+        close();
+    }
+}
+
+int CSQLiteOperator::open()
+{
+    if (m_pDB != nullptr)
+    {
+        return 0;
+    }
+    // sqlite3_open would make an empty database where there is none.
+    const char* szPath = CDataPaths::Database();
+    const int iRetCode = access(szPath, F_OK) == 0 ? sqlite3_open(szPath, &m_pDB) : SQLITE_CANTOPEN;
+    if (iRetCode == SQLITE_OK)
+    {
+        return 0;
+    }
+    close();
+    QV_LOGE(DB_LOG_TAG, "QV_Contacts>>QV_ContactsLocalize_SO>>CSQLiteOperator  open iRetCode = %d",
+            iRetCode);
+    return -1;
+}
+
+void CSQLiteOperator::close()
+{
+    sqlite3_close(m_pDB);
+    m_pDB = nullptr;
+}
+
+int CSQLiteOperator::GetContactsCount(int* piCount)
+{
+    QV_LOGD(DB_LOG_TAG,
+            "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> GetContactsCount begin");
+    const int iResult = QueryContactsCount(piCount);
+    QV_LOGD(DB_LOG_TAG,
+            "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> GetContactsCount end");
+    return iResult;
+}
+
+int CSQLiteOperator::ReadAllLocalizer(tag_ContactsInfo* pRecord, long lCount, long long* pIds)
+{
+    QV_LOGD(DB_LOG_TAG,
+            "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> ReadAllLocalizer begin");
+    if (pRecord == nullptr || (CIdList::IsListed(lCount) && pIds == nullptr))
+    {
+        QV_LOGE(DB_LOG_TAG, " QV_Contacts >>QV_ContactsLocalize_SO>>SQLiteOperator>> "
+                            "ReadAllLocalizer: the input param is wrong!");
+        return -1;
+    }
+    if (EnsureOpen() != 0)
+    {
+        return -1;
+    }
+    const CIdList clIds(lCount, pIds);
+    if (CountContacts(clIds, pRecord) != 0)
+    {
+        return -1;
+    }
+    if (pRecord->RecordNum == 0)
+    {
+        return 0;
+    }
+    if (AllocateRecords(pRecord) != 0 || ReadContacts(clIds, pRecord) != 0)
+    {
+        return -1;
+    }
+    return ReadLocalizer(clIds, pRecord);
+}
+
+int CSQLiteOperator::ReadContactsByID(int iContactID, tag_ContactsStruct* pContact, int& iFound)
+{
+    QV_LOGD(DB_LOG_TAG,
+            "QV_Contacts>>QV_ContactsLocalize_SO>> CSQLiteOperator ReadContactsByID iContactID = "
+            "%d\n",
+            iContactID);
+    if (pContact == nullptr || EnsureOpen() != 0 ||
+        ReadContactRow(iContactID, pContact, iFound) != 0 ||
+        ReadLocalizerRow(iContactID, pContact, iFound) != 0)
+    {
+        return -1;
+    }
+    close();
+    return 0;
+}
+
+int CSQLiteOperator::ReadAllSmsOnlineStatus(tag_ContactsInfo* pRecord, long /*lCount*/,
+                                            long long* /*pIds*/)
+{
+    if (pRecord == nullptr || EnsureOpen() != 0)
+    {
+        return -1;
+    }
+    CSqlStatement clRows(m_pDB);
+    int iRetCode =
+        clRows.PrepareBounded(SELECT_ONLINE, QV_LOG_DEBUG, "!!! SQLITE_BUSY: select count");
+    if (iRetCode != SQLITE_OK)
+    {
+        if (iRetCode != SQLITE_BUSY)
+        {
+            QV_LOGE(DB_LOG_TAG, " select contacts count ERROR result=%d", iRetCode);
+        }
+        return -1;
+    }
+    iRetCode = clRows.Step();
+    if (iRetCode != SQLITE_ROW && iRetCode != SQLITE_DONE)
+    {
+        return -1;
+    }
+    ClearOnline(pRecord);
+    if (iRetCode == SQLITE_ROW)
+    {
+        MarkOnline(clRows, pRecord);
+    }
+    return 0;
+}
+
+void CSQLiteOperator::ParseIDString(const char* szText, QVLong32* pIds, int iMax)
+{
+    ParseIdText(szText, pIds, iMax);
+}
+
+int CSQLiteOperator::EnsureOpen()
+{
+    return m_pDB != nullptr ? 0 : open();
+}
+
+int CSQLiteOperator::QueryContactsCount(int* piCount)
+{
+    if (piCount == nullptr || EnsureOpen() != 0)
+    {
+        return -1;
+    }
+    CSqlStatement clRow(m_pDB);
+    int iRetCode =
+        clRow.PrepareBounded(SELECT_COUNT, QV_LOG_ERROR,
+                             "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: GetContactsCount");
+    if (iRetCode != SQLITE_OK)
+    {
+        QV_LOGE(DB_LOG_TAG,
+                " QV_Contacts>>QV_ContactsLocalize_SO>> select contacts count ERROR result=%d",
+                iRetCode);
+        return -1;
+    }
+    iRetCode = clRow.StepBounded(LogGetCountTry);
+    if (iRetCode != SQLITE_ROW)
+    {
+        QV_LOGE(DB_LOG_TAG, " QV_Contacts>>QV_ContactsLocalize_SO>> sqlite3_step error result=%d",
+                iRetCode);
+        return -1;
+    }
+    *piCount = clRow.Int(0);
+    return 0;
+}
+
+// RecordNum becomes the number of contacts that the two record queries are expected to give.
+int CSQLiteOperator::CountContacts(const CIdList& clIds, tag_ContactsInfo* pRecord)
+{
+    const CListStatement clSql(SELECT_COUNT, AND_ID, clIds);
+    QV_LOGD(DB_LOG_TAG,
+            "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_3 = "
+            "%s\n",
+            clSql.Text());
+    CSqlStatement clRow(m_pDB);
+    int iRetCode =
+        clRow.PrepareBounded(clSql.Text(), QV_LOG_ERROR,
+                             "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: select count");
+    if (iRetCode != SQLITE_OK)
+    {
+        QV_LOGE(DB_LOG_TAG,
+                " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select contacts count "
+                "sqlite3_prepare ERROR result=%d",
+                iRetCode);
+        return -1;
+    }
+    iRetCode = clRow.StepBounded(LogReadCountTry);
+    if (iRetCode != SQLITE_ROW)
+    {
+        QV_LOGE(DB_LOG_TAG,
+                " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select contacts count "
+                "sqlite3_step ERROR result=%d",
+                iRetCode);
+        return -1;
+    }
+    const int iCount = clRow.Int(0);
+    if (iCount < 0)
+    {
+        QV_LOGE(DB_LOG_TAG,
+                " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select contacts count "
+                "sqlite3_column_int ERROR result=%d",
+                iCount);
+        return -1;
+    }
+    pRecord->RecordNum = iCount;
+    return 0;
+}
+
+int CSQLiteOperator::ReadContacts(const CIdList& clIds, tag_ContactsInfo* pRecord)
+{
+    const CListStatement clSql(SELECT_CONTACTS, AND_ID, clIds);
+    QV_LOGD(DB_LOG_TAG, "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_4 = %s\n",
+            clSql.Text());
+    CSqlStatement clRows(m_pDB);
+    const int iRetCode = clRows.PrepareUnbounded(
+        clSql.Text(), "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: select from contacts");
+    if (iRetCode != SQLITE_OK)
+    {
+        QV_LOGE(DB_LOG_TAG,
+                " QV_Contacts>>QV_ContactsLocalize_SO>> select from contacts ERROR result=%d",
+                iRetCode);
+        return -1;
+    }
+    FillContacts(clRows, pRecord);
+    return 0;
+}
+
+int CSQLiteOperator::ReadLocalizer(const CIdList& clIds, tag_ContactsInfo* pRecord)
+{
+    const CListStatement clSql(SELECT_LOCALIZER, WHERE_CONTACT_ID, clIds);
+    QV_LOGD(DB_LOG_TAG, "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_5 = %s\n",
+            clSql.Text());
+    CSqlStatement clRows(m_pDB);
+    if (clRows.PrepareUnbounded(clSql.Text(), "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: "
+                                              "select from localizer") != SQLITE_OK)
+    {
+        return -1;
+    }
+    const int iCompleted = MergeLocalizer(clRows, pRecord);
+    clRows.Finalize();
+    close();
+    if (iCompleted < pRecord->RecordNum)
+    {
+        QV_LOGE(DB_LOG_TAG, "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>>"
+                            "ReadAllLocalizer: iIndex < pRecord->RecordNum\n");
+        return -1;
+    }
+    return 0;
+}
+
+// A contact without a row is none; its name row may still be there.
+int CSQLiteOperator::ReadContactRow(int iContactID, tag_ContactsStruct* pContact, int& iFound)
+{
+    char szSql[ID_STATEMENT_SIZE];
+    std::snprintf(szSql, sizeof(szSql), SELECT_CONTACT_BY_ID, iContactID);
+    CSqlStatement clRow(m_pDB);
+    if (clRow.Prepare(szSql) != SQLITE_OK)
+    {
+        return -1;
+    }
+    iFound = clRow.Step() == SQLITE_ROW ? 1 : 0;
+    if (iFound == 1)
+    {
+        FillFromContactsRow(clRow, pContact);
+    }
+    return 0;
+}
+
+int CSQLiteOperator::ReadLocalizerRow(int iContactID, tag_ContactsStruct* pContact, int& iFound)
+{
+    char szSql[ID_STATEMENT_SIZE];
+    std::snprintf(szSql, sizeof(szSql), SELECT_LOCALIZER_BY_ID, iContactID);
+    CSqlStatement clRow(m_pDB);
+    if (clRow.Prepare(szSql) != SQLITE_OK)
+    {
+        return -1;
+    }
+    iFound = clRow.Step() == SQLITE_ROW ? 1 : 0;
+    if (iFound == 1 && clRow.Int(LOCALIZER_ID_COLUMN) == pContact->iContactID)
+    {
+        FillFromLocalizerRow(clRow, SINGLE_ROW_GROUPS, pContact);
+    }
+    return 0;
+}

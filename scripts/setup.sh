@@ -1,0 +1,45 @@
+#!/usr/bin/env bash
+# Installs what building and testing need and this machine lacks, from Debian's packages:
+#   scripts/setup.sh          compiler, build tools and libraries
+#   scripts/setup.sh --lint   also the formatter and the static checker
+# Touches neither apt nor the network when nothing is missing.
+set -euo pipefail
+
+packages=(
+    g++ cmake ninja-build python3
+    libsqlite3-dev libcli11-dev nlohmann-json3-dev
+    libgtest-dev libbenchmark-dev unicode-data
+)
+if [ "${1:-}" = --lint ]; then
+    packages+=(clang-format-14 clang-tidy-14)
+fi
+
+is_installed() {
+    [ "$(dpkg-query -W -f='${db:Status-Status}' "$1" 2>/dev/null || true)" = installed ]
+}
+
+missing=()
+for package in "${packages[@]}"; do
+    is_installed "$package" || missing+=("$package")
+done
+if [ "${#missing[@]}" -eq 0 ]; then
+    exit 0
+fi
+
+as_root=()
+if [ "$(id -u)" -ne 0 ]; then
+    if ! command -v sudo >/dev/null; then
+        echo "setup: missing packages: ${missing[*]}" >&2
+        echo "setup: run as root, or install sudo or these packages" >&2
+        exit 1
+    fi
+    as_root=(sudo)
+fi
+
+# Waits for another apt; never asks, and leaves services alone.
+apt=("${as_root[@]}" env DEBIAN_FRONTEND=noninteractive NEEDRESTART_SUSPEND=1
+     apt-get -q -o DPkg::Lock::Timeout=300)
+
+echo "setup: installing ${missing[*]}"
+"${apt[@]}" update || echo "setup: no fresh package lists, trying with those that are here" >&2
+"${apt[@]}" install -y --no-install-recommends "${missing[@]}"

@@ -8,7 +8,6 @@
 namespace
 {
 
-constexpr int MILLIS_PER_SECOND = 1000;
 constexpr int MICROS_PER_MILLI = 1000;
 constexpr int MICROS_PER_SECOND = 1000000;
 constexpr int FIRST_YEAR = 1900; // that a broken-down time counts from

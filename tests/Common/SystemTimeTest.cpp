@@ -3,7 +3,6 @@
 #include <gtest/gtest.h>
 
 #include <chrono>
-#include <climits>
 #include <cstdlib>
 #include <cstring>
 #include <ctime>

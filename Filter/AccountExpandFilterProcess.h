@@ -16,8 +16,8 @@ public:
 
     // 1 when a contact with the accounts at plList (at most iNum, ending at the first 0) is to go:
     // its one account is iID, or it has several and each is the id of a filter of this kind in the
-    // chain. Else 0. Unless there is exactly one account, their number is logged. The answer is the
-    // same when there is no memory for a list of the excluded accounts.
+    // chain. Else 0. Unless there is exactly one account, their number is logged. Allocates
+    // nothing.
     static int IsSameAccountEx(int iID, const QVLong32* plList, int iNum,
                                const CFilterChain& chain);
 

@@ -1,0 +1,64 @@
+#include "Filter/AccountExpandFilterProcess.h"
+
+#include "Common/Log.h"
+#include "Filter/FilterChain.h"
+#include "Filter/IdList.h"
+
+namespace
+{
+
+constexpr const char* LOG_TAG = "Filter/AccountExpandFilterProcess";
+
+// The chain itself is searched: it is as short as a list of its ids, and needs no memory.
+bool IsExcluded(QVLong32 lAccountID, const CFilterChain& chain)
+{
+    for (int k = 0; k < chain.GetFilterNum(); ++k)
+    {
+        const CFilter* pFilter = chain.GetFilterByNo(k);
+        if (pFilter != nullptr && pFilter->m_iType == FILTER_ACCOUNT_EXPAND &&
+            static_cast<const CAccountExpandFilter*>(pFilter)->GetAccountID() == lAccountID)
+        {
+            return true;
+        }
+    }
+    return false;
+}
+
+bool AreAllExcluded(const QVLong32* plAccounts, int iCount, const CFilterChain& chain)
+{
+    for (int i = 0; i < iCount; ++i)
+    {
+        if (!IsExcluded(plAccounts[i], chain))
+        {
+            return false;
+        }
+    }
+    return iCount > 0;
+}
+
+} // namespace
+
+int AccountExpandFilterProcess::IsSameAccountEx(int iID, const QVLong32* plList, int iNum,
+                                                const CFilterChain& chain)
+{
+    const int iCount = CountIds(plList, iNum);
+    if (iCount == 1)
+    {
+        return plList[0] == iID ? 1 : 0;
+    }
+    QV_LOGD(LOG_TAG, "QV_Contacts: IsSameAccountEx ACCOUNT SUM= %d\n", iCount);
+    return AreAllExcluded(plList, iCount, chain) ? 1 : 0;
+}
+
+bool AccountExpandFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                                       const CFilterChain& chain)
+{
+    const CAccountExpandFilter& account = static_cast<const CAccountExpandFilter&>(filter);
+    return IsSameAccountEx(account.GetAccountID(), record.lAccountID, CONTACT_MAX_ACCOUNTS,
+                           chain) == 0;
+}
+
+int AccountExpandFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)
+{
+    return FilterByRule(pInfo, chain, KIND, Keeps);
+}

@@ -1,0 +1,26 @@
+#include "Filter/OnlineFilterProcess.h"
+
+#include "Common/Log.h"
+
+namespace
+{
+
+constexpr const char* LOG_TAG = "Filter/OnlineFilterProcess";
+
+} // namespace
+
+bool OnlineFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
+                                const CFilterChain& /*chain*/)
+{
+    const bool bOnline = (record.iFlags & CONTACT_FLAG_ONLINE) != 0;
+    if (bOnline)
+    {
+        QV_LOGD(LOG_TAG, "OnlineFilterProcess: find one contact is  sms online\n");
+    }
+    return bOnline;
+}
+
+int OnlineFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)
+{
+    return FilterByRule(pInfo, chain, KIND, Keeps);
+}

@@ -1,0 +1,332 @@
+#include "Core/LocalizerLogic.h"
+
+#include "Common/DataPaths.h"
+#include "Common/Log.h"
+#include "Common/SystemTime.h"
+#include "DBOperator/DBOperator.h"
+#include "DBOperator/DBOperatorFactory.h"
+#include "LocalizerImpl/QVLocalizerManager.h"
+#include "LocalizerImpl/QVNumLocalizerManager.h"
+#include "LocalizerImpl/QVWordLocalizerManager.h"
+#include "MemManager/MemManger.h"
+
+#include <sys/stat.h>
+#include <unistd.h>
+
+#include <memory>
+#include <new>
+
+namespace
+{
+
+constexpr int MATCH_ANYWHERE = 1;
+
+// Size of a file, 0 when it is missing or empty.
+int FileSize(const char* szPath)
+{
+    struct stat info = {};
+    if (access(szPath, F_OK) != 0 || stat(szPath, &info) != 0)
+    {
+        return 0;
+    }
+    return static_cast<int>(info.st_size);
+}
+
+// Milliseconds since it was made.
+class CStopwatch
+{
+public:
+    int Elapsed() const
+    {
+        return static_cast<int>(static_cast<uint32_t>(GetTickCount()) -
+                                static_cast<uint32_t>(m_iStart));
+    }
+
+private:
+    int32_t m_iStart = GetTickCount();
+};
+
+// The matcher for a kind of input, null for an unknown kind or without memory.
+std::unique_ptr<CQVLocalizerManager> CreateMatcher(IME_SEARCH_TYPE eSearchType)
+{
+    using Owner = std::unique_ptr<CQVLocalizerManager>;
+    return eSearchType == IME_SEARCH_NUM
+               ? Owner(new (std::nothrow) CQVNumLocalizerManager(MATCH_ANYWHERE))
+               : Owner(new (std::nothrow) CQVWordLocalizerManager(MATCH_ANYWHERE));
+}
+
+bool IsKnownType(IME_SEARCH_TYPE eSearchType)
+{
+    return eSearchType == IME_SEARCH_WORD || eSearchType == IME_SEARCH_NUM ||
+           eSearchType == IME_SEARCH_SPECIAL;
+}
+
+// A result set of the store manager, released with the scope.
+class CResultOwner
+{
+public:
+    explicit CResultOwner(CMemManger& manager) : m_manager(manager) {}
+    ~CResultOwner()
+    {
+        if (m_pResult != nullptr)
+        {
+            m_manager.FreeSearchResult(m_pResult);
+        }
+    }
+    CResultOwner(const CResultOwner&) = delete;
+    CResultOwner& operator=(const CResultOwner&) = delete;
+
+    tag_LocalizerResult* Get() const { return m_pResult; }
+    tag_LocalizerResult** Receive() { return &m_pResult; }
+
+private:
+    CMemManger& m_manager;
+    tag_LocalizerResult* m_pResult = nullptr;
+};
+
+} // namespace
+
+int IsNeedReload()
+{
+    const int iMappingSize = FileSize(CDataPaths::PinyinMapping());
+    if (iMappingSize == 0)
+    {
+        return 1;
+    }
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts: IsNeedReload 2 size = %d\n", iMappingSize);
+    const int iRegSize = FileSize(CDataPaths::ContactReg());
+    if (iRegSize == 0)
+    {
+        return 1;
+    }
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts: IsNeedReload 4 size = %d\n", iRegSize);
+    return 0;
+}
+
+CLocalizerLogic::CLocalizerLogic()
+    : m_pclMemManger(nullptr),
+      m_pDBOperator(CDBOperatorFactory::CreateDBOperator(DB_OPERATOR_SQLITE))
+{
+    m_pclMemManger = new (std::nothrow) CMemManger;
+}
+
+CLocalizerLogic::~CLocalizerLogic()
+{
+    delete m_pclMemManger;
+    m_pclMemManger = nullptr;
+    delete m_pDBOperator;
+    m_pDBOperator = nullptr;
+}
+
+int CLocalizerLogic::MemInit(bool bForce)
+{
+    if (!bForce && IsNeedReload() == 0)
+    {
+        return 0;
+    }
+    if (m_pDBOperator == nullptr || m_pclMemManger == nullptr)
+    {
+        return -1;
+    }
+    const CStopwatch watch;
+    const int iRet = CQVLocalizerManager::InitMapFile();
+    if (iRet != 0)
+    {
+        return iRet;
+    }
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts: MemInit IFL_InitalMap time = %d\n", watch.Elapsed());
+
+    tag_ContactsInfo record = {};
+    const int iBuilt = BuildIndex(record);
+    delete[] record.pContacts;
+    return iBuilt;
+}
+
+// Reads, converts, sorts and writes the contacts; what it leaves in record the caller releases.
+int CLocalizerLogic::BuildIndex(tag_ContactsInfo& record)
+{
+    int iRet = ReadContacts(record);
+    if (iRet != 0)
+    {
+        return iRet;
+    }
+    const CStopwatch sortWatch;
+    if (record.pContacts != nullptr)
+    {
+        iRet = SortByStoredOrder(record, m_pclMemManger->GetSortType());
+        if (iRet != 0)
+        {
+            return iRet;
+        }
+    }
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts: MemInit IFL_PtrQuickSort time = %d\n", sortWatch.Elapsed());
+
+    const CStopwatch writeWatch;
+    iRet = m_pclMemManger->InitContactRecord(&record);
+    if (iRet == 0)
+    {
+        QV_LOGD(QV_LOG_TAG, "QV_Contacts: MemInit InitContactRecord time = %d\n",
+                writeWatch.Elapsed());
+    }
+    return iRet;
+}
+
+int CLocalizerLogic::ReadContacts(tag_ContactsInfo& record)
+{
+    const CStopwatch watch;
+    const int iRet = m_pDBOperator->ReadAllLocalizer(&record, 0, nullptr);
+    if (iRet != 0)
+    {
+        return iRet;
+    }
+    ReadOnlineStatus(record);
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts: MemInit ReadAllLocalizer time = %d\n", watch.Elapsed());
+    return 0;
+}
+
+// The contacts are worth having without their online state, so a failure is only logged.
+void CLocalizerLogic::ReadOnlineStatus(tag_ContactsInfo& record)
+{
+    const int iRet = m_pDBOperator->ReadAllSmsOnlineStatus(&record, 0, nullptr);
+    if (iRet != 0)
+    {
+        QV_LOGD(QV_LOG_TAG, "QV_Contacts: ReadAllSmsOnlineStatus  error = %d\n", iRet);
+    }
+}
+
+// Names become pinyin keys; by name first, which numbers the records, then by any other order.
+int CLocalizerLogic::SortByStoredOrder(tag_ContactsInfo& record, int iSortType)
+{
+    int iRet = CQVLocalizerManager::TransNameToPY(record.pContacts, record.RecordNum);
+    if (iRet == 0)
+    {
+        iRet = CQVLocalizerManager::LocalizerQuickSort(record.pContacts, record.RecordNum,
+                                                       STORE_ORDER_NAME);
+    }
+    if (iRet == 0 && iSortType != STORE_ORDER_NAME)
+    {
+        iRet =
+            CQVLocalizerManager::LocalizerQuickSort(record.pContacts, record.RecordNum, iSortType);
+    }
+    return iRet;
+}
+
+int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
+                            IME_SEARCH_TYPE eSearchType, CFilterChain* pFilterChain,
+                            int /*iReserved*/, tag_LocalizerResult** ppResult, long* pMask,
+                            wchar_t* szWordOut)
+{
+    if (pFilterChain == nullptr || ppResult == nullptr || m_pclMemManger == nullptr)
+    {
+        return -1;
+    }
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search Start\n");
+    CResultOwner copy(*m_pclMemManger);
+    tag_LocalizerResult* pSource = pLastResult;
+    int bTimeOrder = 0;
+    if (pLastResult == nullptr)
+    {
+        CopySource(eSearchType, *pFilterChain, copy.Receive());
+        pSource = copy.Get();
+        bTimeOrder = m_pclMemManger->GetSortType() == STORE_ORDER_TIME ? 1 : 0;
+    }
+    CResultOwner work(*m_pclMemManger);
+    int iRet = m_pclMemManger->NewSearchResult(pSource, work.Receive());
+    if (iRet != 0 || !IsKnownType(eSearchType))
+    {
+        return iRet;
+    }
+    const CStopwatch watch;
+    const std::unique_ptr<CQVLocalizerManager> matcher = CreateMatcher(eSearchType);
+    if (matcher == nullptr)
+    {
+        return -1;
+    }
+    iRet =
+        matcher->DoSearch(pSource, szInput, eSearchType, bTimeOrder, work.Get(), pMask, szWordOut);
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search IFL_Search time = %d\n", watch.Elapsed());
+    return iRet == 0 ? m_pclMemManger->CopySearchResult(work.Get(), ppResult) : iRet;
+}
+
+// The set to search when the caller gives none; a failure leaves it empty or null.
+void CLocalizerLogic::CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain,
+                                 tag_LocalizerResult** ppSource)
+{
+    const CStopwatch watch;
+    if (eSearchType == IME_SEARCH_SPECIAL)
+    {
+        m_pclMemManger->CopySpecialNumberRecord(ppSource);
+    }
+    else
+    {
+        m_pclMemManger->CopyContactsResult(chain, ppSource);
+    }
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search CopyContactsResult time = %d\n", watch.Elapsed());
+}
+
+int CLocalizerLogic::GetLocalizer(wchar_t* szDisplayName, wchar_t* szOut)
+{
+    return CQVLocalizerManager::GetLocalizerChars(szDisplayName, szOut);
+}
+
+int CLocalizerLogic::GetLocalizerBatch(tag_ContactsInfo* pInfo)
+{
+    return CQVLocalizerManager::GetLocalizerBatch(pInfo);
+}
+
+int CLocalizerLogic::GetLocalizerString(wchar_t* szInput, int iPos, wchar_t* szWord, wchar_t* szOut)
+{
+    return CQVLocalizerManager::GetLocalizerString(szInput, iPos, szWord, szOut);
+}
+
+int CLocalizerLogic::GetLocalizerString(long hMap, wchar_t* szDisplayName, wchar_t* szOut)
+{
+    return CQVLocalizerManager::GetLocalizerString(hMap, szDisplayName, szOut);
+}
+
+long CLocalizerLogic::CreatePinYinFileMapping()
+{
+    return CQVLocalizerManager::CreatePinYinFileMapping();
+}
+
+int CLocalizerLogic::ReleasePinYinFileMapping(long hMap)
+{
+    return CQVLocalizerManager::ReleasePinYinFileMapping(hMap);
+}
+
+int CLocalizerLogic::GetSearchResult(tag_LocalizerResult* pResult, int iStart, int iCount,
+                                     tag_LocalizerResult* pPage)
+{
+    return m_pclMemManger->GetSearchRecord(pResult, iStart, iCount, pPage);
+}
+
+int CLocalizerLogic::FreeSearchResult(tag_LocalizerResult* pResult)
+{
+    return m_pclMemManger->FreeSearchResult(pResult);
+}
+
+int CLocalizerLogic::GetFirstWordInfo(tag_LocalizerResult* pResult, int* piCounts)
+{
+    return m_pclMemManger->GetFirstWordInfo(pResult, piCounts);
+}
+
+int CLocalizerLogic::GetIndexByContactsId(tag_LocalizerResult* pResult, long iContactID)
+{
+    return m_pclMemManger->GetIndexByContactsId(pResult, iContactID);
+}
+
+int CLocalizerLogic::CreateFilterChain(int* piType, QVLong32* plID, int iNum,
+                                       CFilterChain** ppChain)
+{
+    return m_pclMemManger->CreateFilterChain(piType, plID, iNum, ppChain);
+}
+
+void CLocalizerLogic::SetSortType(int iSortType)
+{
+    m_pclMemManger->SetSortType(iSortType);
+}
+
+int CLocalizerLogic::GetSortType()
+{
+    return m_pclMemManger->GetSortType();
+}

@@ -1,0 +1,160 @@
+// The pinyin table: its shared file, its mapping, and what is asked of it.
+
+#include "Common/CommonQsort.h"
+#include "Common/DataPaths.h"
+#include "Common/Log.h"
+#include "Common/Utf8.h"
+#include "Common/WideString.h"
+#include "LocalizerImpl/PinyinTable.h"
+#include "LocalizerImpl/QVLocalizerManager.h"
+#include "LocalizerImpl/Syllables.h"
+#include "MemManager/MappingGuards.h"
+#include "MemManager/ShareMemory.h"
+
+#include <sys/mman.h>
+
+#include <algorithm>
+#include <cstdio>
+#include <cstring>
+#include <iterator>
+#include <memory>
+#include <new>
+
+namespace
+{
+
+struct CFileCloser
+{
+    void operator()(std::FILE* pFile) const { std::fclose(pFile); }
+};
+
+// Fills the buffer, PY_FILE_SIZE zeroed bytes, from the shipped table.
+bool ReadShippedTable(char* pBuffer)
+{
+    const std::unique_ptr<std::FILE, CFileCloser> file(
+        std::fopen(CDataPaths::PinyinSource(), "r+b"));
+    if (file == nullptr)
+    {
+        return false;
+    }
+    // A short file is no failure: the characters that it lacks have no readings.
+    static_cast<void>(std::fread(pBuffer, 1, PY_FILE_SIZE, file.get()));
+    return true;
+}
+
+} // namespace
+
+CPinyinTable::CPinyinTable()
+{
+    void* pMap = nullptr;
+    if (CQVLocalizerManager::MemInit(&pMap) == 0)
+    {
+        m_pRecords = static_cast<PYOFWORDS*>(pMap);
+    }
+}
+
+CPinyinTable::~CPinyinTable()
+{
+    CQVLocalizerManager::MemRelease(m_pRecords);
+}
+
+wchar_t RecordCharacter(const PYOFWORDS& record)
+{
+    char szKey[sizeof(record.szWord) + 1] = {};
+    std::memcpy(szKey, record.szWord, sizeof(record.szWord));
+    wchar_t szCharacter[sizeof(szKey)] = {};
+    _mbstowcs(szCharacter, szKey, static_cast<int>(sizeof(record.szWord)) - 1);
+    return szCharacter[0];
+}
+
+int CQVLocalizerManager::InitMapFile()
+{
+    const std::unique_ptr<char[]> buffer(new (std::nothrow) char[PY_FILE_SIZE]());
+    if (buffer == nullptr || !ReadShippedTable(buffer.get()))
+    {
+        return LOC_ERR_MAP;
+    }
+    CWriteMapping mapping(CDataPaths::PinyinMapping(), PY_FILE_SIZE);
+    if (!mapping.IsOpen())
+    {
+        return LOC_ERR_MAP;
+    }
+    std::memcpy(mapping.As<char>(), buffer.get(), PY_FILE_SIZE);
+    return 0;
+}
+
+int CQVLocalizerManager::MemInit(void** ppMap)
+{
+    if (ppMap == nullptr)
+    {
+        return LOC_ERR_PARAM;
+    }
+    *ppMap = OpenReadShareMemory(CDataPaths::PinyinMapping(), PY_FILE_SIZE);
+    return *ppMap == MAP_FAILED ? LOC_ERR_MAP : 0;
+}
+
+int CQVLocalizerManager::MemRelease(void* pMap)
+{
+    if (pMap != nullptr && pMap != MAP_FAILED)
+    {
+        CloseReadShareMemory(pMap, PY_FILE_SIZE);
+    }
+    return 0;
+}
+
+long CQVLocalizerManager::CreatePinYinFileMapping()
+{
+    void* pMap = nullptr;
+    const int iRet = MemInit(&pMap);
+    if (iRet != 0)
+    {
+        QV_LOGE(QV_LOG_TAG, "CQVLocalizerManager::CreatePinYinFileMapping memInit error code = %d",
+                iRet);
+        return -1;
+    }
+    return reinterpret_cast<long>(pMap);
+}
+
+int CQVLocalizerManager::ReleasePinYinFileMapping(long hMap)
+{
+    if (hMap > 0)
+    {
+        return MemRelease(reinterpret_cast<void*>(hMap));
+    }
+    QV_LOGE(QV_LOG_TAG, "CQVLocalizerManager::ReleasePinYinFileMapping the input mapping is %ld ",
+            hMap);
+    QV_LOGE(QV_LOG_TAG,
+            "CQVLocalizerManager::ReleasePinYinFileMapping the input mapping is wrong!");
+    return LOC_ERR_PARAM;
+}
+
+int CQVLocalizerManager::FindRecord(Common_Qsort& sorter, PYOFWORDS* pMap, const char* szKey)
+{
+    return sorter.Search_Bin(reinterpret_cast<char*>(pMap), PY_WORD_COUNT,
+                             const_cast<char*>(szKey), SORT_PYWORD, 0);
+}
+
+bool CQVLocalizerManager::IsEnglishWord(wchar_t unit)
+{
+    return (unit >= L'A' && unit <= L'Z') || (unit >= L'a' && unit <= L'z');
+}
+
+bool CQVLocalizerManager::IsDigitalChar(wchar_t unit)
+{
+    return unit >= L'0' && unit <= L'9';
+}
+
+bool CQVLocalizerManager::IsPyWords(wchar_t* szText)
+{
+    if (szText == nullptr)
+    {
+        return false;
+    }
+    // The syllables ascend, so the first one that is not below the text begins with it or none
+    // does.
+    const auto below = [](const wchar_t(&szSyllable)[PY_MAX_LETTERS + 1], const wchar_t* szWanted)
+    { return _wcscmp(szSyllable, szWanted) < 0; };
+    const auto* pSyllable =
+        std::lower_bound(std::begin(g_pyWords), std::end(g_pyWords), szText, below);
+    return pSyllable != std::end(g_pyWords) && _wcsncmp(*pSyllable, szText, _wcslen(szText)) == 0;
+}

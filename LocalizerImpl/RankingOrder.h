@@ -1,0 +1,18 @@
+#ifndef QV_LOCALIZERIMPL_RANKINGORDER_H
+#define QV_LOCALIZERIMPL_RANKINGORDER_H
+
+#include "Core/SearchRecords.h"
+
+#include <utils/Vector.h>
+
+#include <cstdint>
+
+// Brings the matches of one search, which stand in the order of their candidates, into ranking
+// order, in time proportional to their number when the candidates come in name order.
+// Matches equal in every key keep the order that LocalResultQuickSort leaves when it starts from
+// the order in which they were first found; pFirstSplits, one per match, is the split that first
+// found each. 0, or -1 with the vector unsorted when memory ran out.
+int RankMatches(android::Vector<_MatchResult>& vMatches, const uint16_t* pFirstSplits,
+                tag_LocalizerDetail* pDetail);
+
+#endif

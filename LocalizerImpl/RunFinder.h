@@ -1,0 +1,69 @@
+#ifndef QV_LOCALIZERIMPL_RUNFINDER_H
+#define QV_LOCALIZERIMPL_RUNFINDER_H
+
+#include "LocalizerImpl/PieceTable.h"
+
+#include <cstdint>
+
+// Finds the runs of a name's characters that a typed text spells, one piece per character.
+//
+// A split of a text of n characters is a number: bit b stands for a piece that begins at
+// character n - 1 - b, so bit n - 1 is always set. Larger numbers are tried later. Each split
+// counts at the leftmost character where it fits, and the largest split that fits anywhere
+// decides how the name matches.
+
+// How a name matches.
+struct tag_NameMatch
+{
+    int32_t iMatchType;
+    int32_t iMatchPos;
+    uint16_t uFirstSplit; // the smallest split that fits: when the name was first found
+};
+
+class CRunFinder
+{
+public:
+    // bAnywhere false: runs begin at a name's first character only.
+    CRunFinder(CPieceTable& table, bool bAnywhere) : m_table(table), m_bAnywhere(bAnywhere) {}
+
+    // Whether the text spells a run of the candidate's name; then match tells how, and the rows
+    // of the characters that took a last piece or stood behind a run are marked.
+    bool Find(const tag_LocalizerDetail& candidate, int32_t iCandidate, tag_NameMatch& match);
+
+private:
+    static constexpr int SPLIT_WORDS = (1 << (LOC_MAX_INPUT - 1)) / 64;
+
+    bool LeadsToEnd(int iStart);
+    void Extend(int iPiece, int iOffset, uint32_t uSplit, bool bAllFull);
+    void Record(int iPieces, int iLastOffset, uint32_t uSplit, bool bAllFull);
+    bool MarkSeen(uint32_t uSplit);
+
+    CPieceTable& m_table;
+    bool m_bAnywhere;
+    tag_PieceRow* m_apRows[CONTACT_MAX_KEY] = {};
+    int m_iLength = 0;
+    int m_iStart = 0;
+    int32_t m_iCandidate = 0;
+    uint32_t m_uLastSplit = 0;
+    uint64_t m_auSeen[SPLIT_WORDS] = {};
+    tag_NameMatch m_match = {};
+};
+
+// Number of codes of a name, at most CONTACT_MAX_KEY.
+inline int NameLength(const tag_LocalizerDetail& detail)
+{
+    int iLength = 0;
+    while (iLength < CONTACT_MAX_KEY && detail.szLocalizerKey[iLength] != 0)
+    {
+        ++iLength;
+    }
+    return iLength;
+}
+
+// The place of a run of iPieces characters from iStart on.
+constexpr int32_t MatchPosition(int iStart, int iPieces)
+{
+    return (iStart << 16) | (iStart + iPieces - 1);
+}
+
+#endif

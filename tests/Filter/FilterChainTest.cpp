@@ -155,13 +155,15 @@ TEST(FilterChainBuilder, KeepsWhatItMadeBeforeMemoryRanOut)
 {
     const int aiType[] = {3, FILTER_GROUP, FILTER_ONLINE};
     const QVLong32 alID[] = {0, 4, 0};
-    // The chain, the group filter, the chain's places, the online filter.
+    // Memory goes to the chain, the group filter, the chain's places and the online filter.
     const struct
     {
         int iGranted;
+        int iNum;
         int iResult;
         int iFilters; // -1: no chain
-    } CASES[] = {{0, -1, -1}, {1, -1, 0}, {2, -1, 0}, {3, -1, 1}, {4, 0, 2}};
+    } CASES[] = {{0, 3, -1, -1}, {1, 3, -1, 0}, {2, 3, -1, 0}, {2, 2, -1, 0},
+                 {3, 3, -1, 1},  {3, 2, 0, 1},  {4, 3, 0, 2}};
     for (const auto& item : CASES)
     {
         CFilterChain garbage;
@@ -169,7 +171,7 @@ TEST(FilterChainBuilder, KeepsWhatItMadeBeforeMemoryRanOut)
         int iResult = 0;
         {
             const CMemoryFailure failure(item.iGranted);
-            iResult = BuildFilterChain(aiType, alID, 3, &pChain);
+            iResult = BuildFilterChain(aiType, alID, item.iNum, &pChain);
         }
         ASSERT_NE(pChain, &garbage) << item.iGranted;
         const std::unique_ptr<CFilterChain> pOwned(pChain);

@@ -218,11 +218,9 @@ protected:
         Records vRecords = m_vRecords;
         int iCount = -1;
         EXPECT_EQ(RunPipeline(*m_pFirst, *MakeChain(vFilters), vRecords, &iCount), 0);
-        std::vector<int> vIDs;
-        for (int i = 0; i < iCount; ++i)
-        {
-            vIDs.push_back(vRecords[static_cast<size_t>(i)].iContactID);
-        }
+        std::vector<int> vIDs(static_cast<size_t>(iCount));
+        std::transform(vRecords.begin(), vRecords.begin() + iCount, vIDs.begin(),
+                       [](const tag_ContactsStruct& record) { return record.iContactID; });
         return vIDs;
     }
 

@@ -16,12 +16,12 @@ public:
     virtual int GetContactsCount(int* piCount) = 0;
 
     // Reads the visible contacts into a new array: those among the lCount ids of pIds when lCount
-    // is 1 to 200 (what CIdList::CanListAll calls listable, else only the first ones), all of them
-    // for any other lCount, when pIds is not looked at. pRecord->RecordNum and pContacts are
-    // overwritten, not released. Once an array was made it stays in pRecord, also when the result
-    // is -1, and the caller releases it with array delete. No visible contact is a success with
-    // RecordNum 0 and pContacts untouched. -1 for a null pRecord, or a null pIds that would be
-    // needed.
+    // is 1 to 200, all of them, without a look at pIds, for any other lCount. Ids whose text grows
+    // too long are cut off the end of the list; CIdList::CanListAll tells beforehand. RecordNum
+    // and pContacts are overwritten, not released. Once an array was made it stays in pRecord,
+    // also when the result is -1, and the caller releases it with array delete. No visible contact
+    // is a success with RecordNum 0 and pContacts untouched. -1 for a null pRecord, and for a null
+    // pIds that is needed.
     virtual int ReadAllLocalizer(tag_ContactsInfo* pRecord, long lCount, long long* pIds) = 0;
 
     // Fills the caller's zero-filled record with the contact, visible or not; iStatusUpdateID is

@@ -11,7 +11,7 @@ public:
     // No further id is appended to a text of this many characters or more.
     static constexpr size_t TEXT_LIMIT = 1798;
     // What the text may take with its terminator: the last id may begin just below the limit.
-    static constexpr size_t TEXT_SIZE = TEXT_LIMIT + sizeof(",-2147483648)");
+    static constexpr size_t TEXT_SIZE = TEXT_LIMIT - 1 + sizeof(",-2147483648)");
 
     // The list of the lCount ids of pIds, each in the decimal form of its low 32 bits; without
     // the ids that find no place, and empty (no limit) unless lCount is 1 to MAX_IDS.

@@ -7,6 +7,7 @@
 #include "DBOperator/SqlStatement.h"
 #include "DBOperator/StatusIndex.h"
 
+#include <algorithm>
 #include <cstdio>
 #include <new>
 #include <unistd.h>
@@ -135,7 +136,7 @@ int MergeLocalizer(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
 
 int RecordCount(const tag_ContactsInfo* pRecord)
 {
-    return pRecord->pContacts == nullptr ? 0 : pRecord->RecordNum;
+    return pRecord->pContacts == nullptr ? 0 : std::max(pRecord->RecordNum, 0);
 }
 
 void ClearOnline(tag_ContactsInfo* pRecord)

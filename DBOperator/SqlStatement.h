@@ -7,7 +7,7 @@
 constexpr const char* DB_LOG_TAG = "QV_ContactsLocalize_SO";
 
 // One compiled statement, released with the object. Results are SQLite's codes. The legacy
-// prepare is used: a step that fails for any reason but a busy database gives SQLITE_ERROR.
+// prepare is used, with which most failures of a step are a plain SQLITE_ERROR.
 class CSqlStatement
 {
 public:

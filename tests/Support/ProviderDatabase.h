@@ -10,10 +10,10 @@ struct sqlite3;
 struct tag_ProviderContact
 {
     int iId = 0;
-    std::string strName; // UTF-8
-    std::string strKey;  // localizer codes in UTF-8
-    std::string strGroups;
-    std::string strAccounts;
+    std::string strName{}; // UTF-8
+    std::string strKey{};  // localizer codes in UTF-8
+    std::string strGroups{};
+    std::string strAccounts{};
     long long llLastTime = 0;
     int iTimes = 0;
     int iStatusId = 0;
@@ -42,7 +42,7 @@ public:
     // iStatusId is not 0.
     void Put(const tag_ProviderContact& contact);
     // All of them in one transaction, or in the caller's when one is open.
-    void Put(const std::vector<tag_ProviderContact>& vContacts);
+    void PutAll(const std::vector<tag_ProviderContact>& vContacts);
     // Removes the contact from every table but status_updates.
     void Remove(int iId);
 

@@ -1,0 +1,423 @@
+#include "Common/DataPaths.h"
+#include "tests/DBOperator/ReaderFixture.h"
+
+#include <sqlite3.h>
+
+#include <filesystem>
+#include <fstream>
+
+namespace
+{
+
+using CHostileTest = CReaderTest;
+namespace fs = std::filesystem;
+
+sqlite3* g_pReaderDB = nullptr;
+
+// Gives the reader's own connection to the tests, and lets one of them bring its own count().
+int CatchConnection(sqlite3* pDB, char** /*pszError*/, const sqlite3_api_routines* /*pApi*/)
+{
+    g_pReaderDB = pDB;
+    return SQLITE_OK;
+}
+
+class CConnectionCatcher
+{
+public:
+    CConnectionCatcher() { sqlite3_auto_extension(Entry()); }
+    ~CConnectionCatcher() { sqlite3_cancel_auto_extension(Entry()); }
+
+private:
+    static void (*Entry())() { return reinterpret_cast<void (*)()>(&CatchConnection); }
+};
+
+void CountRow(sqlite3_context* /*pContext*/, int /*iValues*/, sqlite3_value** /*pValues*/) {}
+void NegativeCount(sqlite3_context* pContext)
+{
+    sqlite3_result_int(pContext, -3);
+}
+
+bool StartsWith(const std::string& strText, const std::string& strStart)
+{
+    return strText.compare(0, strStart.size(), strStart) == 0;
+}
+
+const std::string SQLSTAT_4 = "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_4";
+const std::string SQLSTAT_5 = "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_5";
+const std::string COUNT_PREPARE = " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select "
+                                  "contacts count sqlite3_prepare ERROR result=";
+const std::string COUNT_STEP = " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select "
+                               "contacts count sqlite3_step ERROR result=";
+const std::string COUNT_NEGATIVE = " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer "
+                                   "select contacts count sqlite3_column_int ERROR result=";
+const std::string OPEN_FAILED =
+    "QV_Contacts>>QV_ContactsLocalize_SO>>CSQLiteOperator  open iRetCode = 14";
+
+} // namespace
+
+TEST_F(CHostileTest, AMissingDatabaseIsNotCreated)
+{
+    fs::remove(CDataPaths::Database());
+    for (const bool bWithDirectory : {true, false})
+    {
+        if (!bWithDirectory)
+        {
+            fs::remove(fs::path(CDataPaths::Database()).parent_path());
+        }
+        CLogCapture log;
+        tag_ReadSet set;
+        tag_ContactsStruct record{};
+        int iCount = 42;
+        EXPECT_EQ(-1, m_clReader.open());
+        EXPECT_EQ(-1, ReadAll(set));
+        EXPECT_EQ(-1, m_clReader.GetContactsCount(&iCount));
+        EXPECT_EQ(-1, m_clReader.ReadContactsByID(1, &record, iCount));
+        EXPECT_EQ(-1, m_clReader.ReadAllSmsOnlineStatus(&set, 0, nullptr));
+        EXPECT_EQ(42, iCount);
+        EXPECT_EQ(nullptr, set.pContacts);
+        EXPECT_EQ(std::vector<std::string>(5, OPEN_FAILED), log.Texts(ERROR_LINE));
+        EXPECT_FALSE(fs::exists(CDataPaths::Database()));
+    }
+}
+
+TEST_F(CHostileTest, ADirectoryIsNoDatabase)
+{
+    fs::remove(CDataPaths::Database());
+    fs::create_directory(CDataPaths::Database());
+    tag_ReadSet set;
+    CLogCapture log;
+    EXPECT_EQ(-1, ReadAll(set));
+    EXPECT_EQ(std::vector<std::string>{OPEN_FAILED}, log.Texts(ERROR_LINE));
+}
+
+TEST_F(CHostileTest, AFileThatIsNoDatabaseFailsEveryRead)
+{
+    const std::string strRandom(5000, 'x');
+    for (const std::string& strBytes : {strRandom, std::string(), std::string("SQLite format 3")})
+    {
+        CDataDirectory::WriteBytes(CDataPaths::Database(), strBytes);
+        const std::string strCode = strBytes.empty() ? "1" : "26";
+        CSQLiteOperator clReader;
+        CLogCapture log;
+        tag_ReadSet set;
+        int iCount = 42;
+        EXPECT_EQ(-1, clReader.ReadAllLocalizer(&set, 0, nullptr));
+        EXPECT_EQ(-1, clReader.GetContactsCount(&iCount));
+        EXPECT_EQ(-1, clReader.ReadAllSmsOnlineStatus(&set, 0, nullptr));
+        EXPECT_EQ(42, iCount);
+        const std::vector<std::string> EXPECTED = {
+            COUNT_PREPARE + strCode,
+            " QV_Contacts>>QV_ContactsLocalize_SO>> select contacts count ERROR result=" + strCode,
+            " select contacts count ERROR result=" + strCode};
+        EXPECT_EQ(EXPECTED, log.Texts(ERROR_LINE));
+    }
+}
+
+TEST_F(CHostileTest, DamagedPagesEndTheReadWithoutACrash)
+{
+    std::vector<tag_ProviderContact> vContacts;
+    for (int i = 1; i <= 400; ++i)
+    {
+        vContacts.push_back({i, std::string(30, 'n'), "k", "1.2", "3"});
+    }
+    m_clProvider.PutAll(vContacts);
+    const std::string strWhole = CDataDirectory::ReadBytes(CDataPaths::Database());
+    for (size_t uAt = 100; uAt < strWhole.size(); uAt += 512)
+    {
+        std::string strDamaged = strWhole;
+        strDamaged.replace(uAt, std::min<size_t>(200, strWhole.size() - uAt), 200, '\xA5');
+        CDataDirectory::WriteBytes(CDataPaths::Database(), strDamaged);
+        CSQLiteOperator clReader;
+        CLogCapture log;
+        tag_ReadSet set;
+        const int iResult = clReader.ReadAllLocalizer(&set, 0, nullptr);
+        EXPECT_EQ(iResult != 0, log.Has(ERROR_LINE, LINE_MERGE_SHORT) || set.RecordNum == 0) << uAt;
+        clReader.ReadAllSmsOnlineStatus(&set, 0, nullptr);
+    }
+}
+
+TEST_F(CHostileTest, AMissingTableOrColumnNamesItsQuery)
+{
+    const struct
+    {
+        const char* szSql;
+        std::vector<std::string> vErrors;
+        bool bArray;
+    } CASES[] = {
+        {"alter table localizer drop column hasMail", {}, true},
+        {"drop table localizer", {}, true},
+        {"alter table contacts drop column photo_file_id",
+         {" QV_Contacts>>QV_ContactsLocalize_SO>> select from contacts ERROR result=1"},
+         true},
+        {"drop table visible_contacts", {COUNT_PREPARE + "1"}, false},
+    };
+    m_clProvider.PutAll({{1}, {2}});
+    for (const auto& one : CASES)
+    {
+        m_clProvider.Execute(one.szSql);
+        CSQLiteOperator clReader;
+        CLogCapture log;
+        tag_ReadSet set;
+        EXPECT_EQ(-1, clReader.ReadAllLocalizer(&set, 0, nullptr)) << one.szSql;
+        EXPECT_EQ(one.vErrors, log.Texts(ERROR_LINE)) << one.szSql;
+        EXPECT_EQ(one.bArray, set.pContacts != nullptr) << one.szSql;
+        EXPECT_EQ(one.bArray ? 2 : 0, set.RecordNum) << one.szSql;
+    }
+}
+
+// NULL, text, a blob, a real and a number of more than 32 bits in each column that can hold them.
+TEST_F(CHostileTest, TakesAnyTypeInAnyColumn)
+{
+    const char* const VALUES[] = {"null", "'text'", "x'E5BCA000FF'", "-1.5e300",
+                                  "-4611686018427387904"};
+    const char* const COLUMNS[][2] = {
+        {"contacts", "times_contacted"},  {"contacts", "starred"},
+        {"contacts", "has_phone_number"}, {"contacts", "last_time_contacted"},
+        {"contacts", "single_is_secret"}, {"contacts", "photo_file_id"},
+        {"contacts", "status_update_id"}, {"localizer", "display_name"},
+        {"localizer", "localizerkey"},    {"localizer", "group_id"},
+        {"localizer", "account_id"},      {"localizer", "hasMail"},
+        {"localizer", "hasAddress"}};
+    m_clProvider.PutAll({{1, "a"}, {2, "b"}});
+    for (const auto& column : COLUMNS)
+    {
+        for (const char* szValue : VALUES)
+        {
+            m_clProvider.Execute(std::string("update ") + column[0] + " set " + column[1] + "=" +
+                                 szValue);
+            tag_ReadSet set;
+            EXPECT_EQ(0, ReadAll(set)) << column[1] << szValue;
+            EXPECT_EQ((std::vector<int>{1, 2}), set.Ids()) << column[1] << szValue;
+            tag_ContactsStruct record{};
+            int iFound = 0;
+            EXPECT_EQ(0, m_clReader.ReadContactsByID(1, &record, iFound));
+        }
+    }
+    m_clProvider.Execute("update localizer set display_name=x'E5BCA000FF', localizerkey=null");
+    tag_ReadSet set;
+    EXPECT_EQ(0, ReadAll(set));
+    EXPECT_STREQ(L"\u5F20", set.pContacts[1].szName);
+}
+
+TEST_F(CHostileTest, TakesAnyTypeInTheIdColumns)
+{
+    m_clProvider.Execute("drop table contacts; drop table localizer; drop table visible_contacts;"
+                         "create table contacts as select null _id, 0 times_contacted, 0 starred, "
+                         "0 has_phone_number, 0 last_time_contacted, 0 single_is_secret, "
+                         "0 photo_file_id, 0 status_update_id;"
+                         "insert into contacts(_id) values('x'),(x'00'),(2.5),(4294967297);"
+                         "create table visible_contacts as select _id from contacts;"
+                         "create table localizer as select _id contact_id, 'n' display_name, "
+                         "'k' localizerkey, '' group_id, '' account_id, 0 hasMail, 0 hasAddress "
+                         "from contacts where _id is not null;"
+                         "insert into status_updates values(5,x'00'),(6,3.5)");
+    tag_ReadSet set;
+    EXPECT_EQ(0, ReadAll(set));
+    EXPECT_EQ((std::vector<int>{0, 0, 2, 1}), set.Ids());
+    EXPECT_EQ(0, m_clReader.ReadAllSmsOnlineStatus(&set, 0, nullptr));
+}
+
+TEST_F(CHostileTest, ContactsGoneSinceTheCountFailTheRead)
+{
+    m_clProvider.PutAll({{1, "a"}, {2, "b"}, {3, "c"}});
+    CLineHook hook(
+        [this](const std::string& strText)
+        {
+            if (StartsWith(strText, SQLSTAT_4))
+            {
+                m_clProvider.Remove(2);
+            }
+        });
+    tag_ReadSet set;
+    EXPECT_EQ(-1, ReadAll(set));
+    EXPECT_EQ((std::vector<int>{1, 3, 0}), set.Ids());
+    EXPECT_STREQ(L"c", set.pContacts[1].szName);
+    EXPECT_STREQ(L"", set.pContacts[2].szName);
+    EXPECT_EQ(1, hook.Count(LINE_MERGE_SHORT));
+}
+
+TEST_F(CHostileTest, ContactsNewSinceTheCountAreLeftOut)
+{
+    m_clProvider.PutAll({{1, "a"}, {3, "c"}});
+    CLineHook hook(
+        [this](const std::string& strText)
+        {
+            if (StartsWith(strText, SQLSTAT_4))
+            {
+                m_clProvider.Put({2, "b"});
+            }
+        });
+    tag_ReadSet set;
+    EXPECT_EQ(0, ReadAll(set));
+    EXPECT_EQ((std::vector<int>{1, 2}), set.Ids());
+    EXPECT_EQ(1, hook.Count(LINE_CONTACTS_STEP + std::string("100")));
+    EXPECT_EQ(1, hook.Count(LINE_LOCALIZER_STEP));
+}
+
+TEST_F(CHostileTest, ANegativeCountIsAnError)
+{
+    const CConnectionCatcher catcher;
+    ASSERT_EQ(0, m_clReader.open());
+    sqlite3_create_function(g_pReaderDB, "count", 0, SQLITE_UTF8, nullptr, nullptr, &CountRow,
+                            &NegativeCount);
+    CLogCapture log;
+    tag_ReadSet set;
+    EXPECT_EQ(-1, ReadAll(set));
+    EXPECT_EQ(std::vector<std::string>{COUNT_NEGATIVE + "-3"}, log.Texts(ERROR_LINE));
+    EXPECT_EQ(0, set.RecordNum);
+}
+
+// A fresh connection must read the tables' definitions first, and the prepare is busy; one that
+// knows them meets the lock in its first step.
+TEST_F(CHostileTest, ALockedDatabaseIsTriedForAWhile)
+{
+    m_clProvider.Put({1});
+    m_clProvider.LockExclusive();
+    tag_ReadSet set;
+    int iCount = 42;
+    {
+        CLogCapture log;
+        EXPECT_EQ(-1, ReadAll(set));
+        const std::string strBusy = "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: select "
+                                    "count";
+        EXPECT_EQ(
+            (std::vector<std::string>{strBusy, strBusy, strBusy, strBusy, COUNT_PREPARE + "5"}),
+            log.Texts(ERROR_LINE));
+        EXPECT_EQ(-1, m_clReader.GetContactsCount(&iCount));
+        EXPECT_EQ(4, log.Count(ERROR_LINE, "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: "
+                                           "GetContactsCount"));
+        EXPECT_TRUE(log.Has(ERROR_LINE, " QV_Contacts>>QV_ContactsLocalize_SO>> select contacts "
+                                        "count ERROR result=5"));
+        EXPECT_EQ("QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> GetContactsCount end",
+                  log.Lines().back().strText);
+        log.Clear();
+        EXPECT_EQ(-1, m_clReader.ReadAllSmsOnlineStatus(&set, 0, nullptr));
+        EXPECT_EQ(
+            (std::vector<tag_LogLine>(4, {DEBUG_LINE, DB_TAG, "!!! SQLITE_BUSY: select count"})),
+            log.Lines());
+    }
+    m_clProvider.Unlock();
+    EXPECT_EQ(0, m_clReader.GetContactsCount(&iCount));
+    EXPECT_EQ(1, iCount);
+    m_clProvider.LockExclusive();
+    CLogCapture log;
+    const std::string strTry = " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select "
+                               "contacts count sqlite3_step is busy try ";
+    EXPECT_EQ(-1, ReadAll(set));
+    EXPECT_EQ((std::vector<std::string>{strTry + "1 times", strTry + "2 times", strTry + "3 times",
+                                        COUNT_STEP + "5"}),
+              log.Texts(ERROR_LINE));
+    log.Clear();
+    EXPECT_EQ(-1, m_clReader.GetContactsCount(&iCount));
+    const std::string strCountTry = " QV_Contacts>>QV_ContactsLocalize_SO>> sqlite3_step error "
+                                    "result=5 first, and has try ";
+    EXPECT_EQ((std::vector<std::string>{
+                  strCountTry + "1 times.", strCountTry + "2 times.", strCountTry + "3 times.",
+                  " QV_Contacts>>QV_ContactsLocalize_SO>> sqlite3_step error result=5"}),
+              log.Texts(ERROR_LINE));
+    log.Clear();
+    EXPECT_EQ(-1, m_clReader.ReadAllSmsOnlineStatus(&set, 0, nullptr));
+    EXPECT_TRUE(log.Lines().empty());
+    m_clProvider.Unlock();
+}
+
+// The reader's connection forgets the tables' definitions before the query, so that its prepare
+// meets the lock, which goes away only after more attempts than any bounded wait makes.
+TEST_F(CHostileTest, TheRecordQueriesWaitAsLongAsItTakes)
+{
+    const std::pair<std::string, std::string> QUERIES[] = {
+        {SQLSTAT_4, "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: select from contacts"},
+        {SQLSTAT_5, "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: select from localizer"}};
+    m_clProvider.PutAll({{1, "a"}, {2, "b"}});
+    const CConnectionCatcher catcher;
+    for (const auto& query : QUERIES)
+    {
+        int iBusyLines = 0;
+        CLineHook hook(
+            [&](const std::string& strText)
+            {
+                if (StartsWith(strText, query.first))
+                {
+                    sqlite3_exec(g_pReaderDB, "pragma writable_schema=reset", nullptr, nullptr,
+                                 nullptr);
+                    m_clProvider.LockExclusive();
+                }
+                else if (strText == query.second && ++iBusyLines == 6)
+                {
+                    m_clProvider.Unlock();
+                }
+            });
+        tag_ReadSet set;
+        EXPECT_EQ(0, ReadAll(set));
+        EXPECT_EQ(6, hook.Count(query.second));
+        EXPECT_EQ((std::vector<int>{1, 2}), set.Ids());
+    }
+}
+
+TEST_F(CHostileTest, ABusyWaitEndsWithTheLock)
+{
+    m_clProvider.Put({1});
+    m_clProvider.LockExclusive();
+    CLineHook hook(
+        [this](const std::string& strText)
+        {
+            if (strText == "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: GetContactsCount")
+            {
+                m_clProvider.Unlock();
+            }
+        });
+    int iCount = 0;
+    EXPECT_EQ(0, m_clReader.GetContactsCount(&iCount));
+    EXPECT_EQ(1, iCount);
+}
+
+// A lock that comes between the queries ends the loop of the next one; the read fails because
+// its contacts are missing.
+TEST_F(CHostileTest, ALockBetweenTheQueriesFailsTheRead)
+{
+    m_clProvider.PutAll({{1}, {2}});
+    CLineHook hook(
+        [this](const std::string& strText)
+        {
+            if (StartsWith(strText, SQLSTAT_4))
+            {
+                m_clProvider.LockExclusive();
+            }
+            else if (StartsWith(strText, SQLSTAT_5))
+            {
+                m_clProvider.Unlock();
+            }
+        });
+    tag_ReadSet set;
+    EXPECT_EQ(-1, ReadAll(set));
+    EXPECT_EQ(1, hook.Count(LINE_CONTACTS_STEP + std::string("5")));
+    EXPECT_EQ((std::vector<int>{0, 0}), set.Ids());
+}
+
+// The file is replaced by another: an operation that kept its connection still reads the old one.
+TEST_F(CHostileTest, KeepsItsConnectionUntilAReadIsComplete)
+{
+    m_clProvider.Put({1});
+    const auto Count = [this]
+    {
+        int iCount = -1;
+        m_clReader.GetContactsCount(&iCount);
+        return iCount;
+    };
+    tag_ReadSet set;
+    EXPECT_EQ(1, Count());
+    EXPECT_EQ(0, m_clReader.ReadAllSmsOnlineStatus(&set, 0, nullptr));
+    fs::remove(CDataPaths::Database());
+    CProviderDatabase clOther;
+    clOther.PutAll({{1}, {2}});
+    EXPECT_EQ(1, Count());
+    EXPECT_EQ(0, ReadAll(set));
+    EXPECT_EQ(2, Count());
+    fs::remove(CDataPaths::Database());
+    CProviderDatabase clThird;
+    tag_ContactsStruct record{};
+    int iFound = 0;
+    EXPECT_EQ(0, m_clReader.ReadContactsByID(1, &record, iFound));
+    EXPECT_EQ(1, iFound);
+    EXPECT_EQ(0, Count());
+}

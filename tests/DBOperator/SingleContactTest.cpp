@@ -1,0 +1,146 @@
+#include "DBOperator/DBOperatorFactory.h"
+#include "tests/DBOperator/ReaderFixture.h"
+
+#include <cstring>
+#include <memory>
+
+namespace
+{
+
+using CSingleContactTest = CReaderTest;
+
+// The place of a virtual operation, as it stands in a pointer to it.
+template <typename T>
+size_t SlotOf(T pfnOperation)
+{
+    size_t uOffset = 0;
+    std::memcpy(&uOffset, &pfnOperation, sizeof(uOffset));
+    return uOffset / sizeof(void*);
+}
+
+} // namespace
+
+TEST(DBOperatorInterface, KeepsTheOrderOfItsSlots)
+{
+    EXPECT_EQ(2U, SlotOf(&CDBOperator::GetContactsCount));
+    EXPECT_EQ(3U, SlotOf(&CDBOperator::ReadAllLocalizer));
+    EXPECT_EQ(4U, SlotOf(&CDBOperator::ReadContactsByID));
+    EXPECT_EQ(5U, SlotOf(&CDBOperator::ReadAllSmsOnlineStatus));
+}
+
+TEST(DBOperatorFactory, MakesTheKnownKindOnly)
+{
+    const std::unique_ptr<CDBOperator> pOperator(
+        CDBOperatorFactory::CreateDBOperator(DB_OPERATOR_SQLITE));
+    EXPECT_NE(nullptr, dynamic_cast<CSQLiteOperator*>(pOperator.get()));
+    for (const int iKind : {-1, 1, 7})
+    {
+        EXPECT_EQ(nullptr,
+                  CDBOperatorFactory::CreateDBOperator(static_cast<DB_OPERATOR_TYPE>(iKind)));
+    }
+}
+
+TEST(ParseIDString, StoresWhatTheTextHolds)
+{
+    const struct
+    {
+        const char* szText;
+        int iMax;
+        std::vector<QVLong32> vStored; // -9 where nothing is written
+    } TEXTS[] = {{nullptr, 4, {-9, -9, -9, -9}},
+                 {"", 4, {-9, -9, -9, -9}},
+                 {"3.12.40", 4, {3, 12, 40, -9}},
+                 {"5..7", 4, {5, 0, 7, -9}},
+                 {".", 4, {0, 0, -9, -9}},
+                 {"7.", 4, {7, 0, -9, -9}},
+                 {"7.x.9", 4, {7, -9, -9, -9}},
+                 {"7.9x", 4, {7, -9, -9, -9}},
+                 {" 7", 4, {-9, -9, -9, -9}},
+                 {"-7", 4, {-9, -9, -9, -9}},
+                 {"1\xE5", 4, {-9, -9, -9, -9}},
+                 {"1.2.3", 2, {1, 2, -9, -9}},
+                 {"1.2", 2, {1, 2, -9, -9}},
+                 {"1.2.", 2, {1, 2, -9, -9}},
+                 {"1", 0, {-9, -9, -9, -9}},
+                 {"1.2", -1, {-9, -9, -9, -9}},
+                 {"2147483648.4294967303", 4, {-2147483647 - 1, 7, -9, -9}}};
+    CSQLiteOperator clReader;
+    for (const auto& text : TEXTS)
+    {
+        std::vector<QVLong32> vIds(4, -9);
+        clReader.ParseIDString(text.szText, vIds.data(), text.iMax);
+        EXPECT_EQ(text.vStored, vIds) << (text.szText == nullptr ? "null" : text.szText);
+    }
+    clReader.ParseIDString("1", nullptr, 4);
+}
+
+TEST_F(CSingleContactTest, FillsOneRecordVisibleOrNot)
+{
+    std::string strGroups = "1";
+    for (int i = 2; i <= 101; ++i)
+    {
+        strGroups += "." + std::to_string(i);
+    }
+    tag_ProviderContact contact{-4, "安", "k", strGroups, "6"};
+    contact.llLastTime = 1700000000123LL;
+    contact.iTimes = 2;
+    contact.iStatusId = 8;
+    contact.bSecret = contact.bStarred = contact.bPhone = contact.bMail = contact.bAddress = true;
+    contact.bVisible = false;
+    m_clProvider.Put(contact);
+
+    CLogCapture log;
+    tag_ContactsStruct record{};
+    record.iStatusUpdateID = 77;
+    int iFound = 5;
+    ASSERT_EQ(0, m_clReader.ReadContactsByID(-4, &record, iFound));
+    EXPECT_EQ(1, iFound);
+    EXPECT_EQ(-4, record.iContactID);
+    EXPECT_EQ(100, record.lGroupID[99]);
+    EXPECT_EQ(6, record.lAccountID[0]);
+    EXPECT_EQ(0x1FU, record.iFlags);
+    EXPECT_EQ(1700000000123LL, record.llLastTimeContacted);
+    EXPECT_EQ(2, record.iTimesContacted);
+    EXPECT_EQ(77, record.iStatusUpdateID);
+    EXPECT_STREQ(L"\u5B89", record.szName);
+    EXPECT_STREQ(L"k", record.szLocalizerKey);
+    const std::vector<tag_LogLine> EXPECTED = {
+        {DEBUG_LINE, DB_TAG,
+         "QV_Contacts>>QV_ContactsLocalize_SO>> CSQLiteOperator ReadContactsByID iContactID = "
+         "-4\n"}};
+    EXPECT_EQ(EXPECTED, log.Lines());
+}
+
+TEST_F(CSingleContactTest, FoundTellsOfTheNameRow)
+{
+    m_clProvider.PutAll({{1, "a"}, {2, "b"}});
+    m_clProvider.Execute("delete from contacts where _id=1; delete from localizer where "
+                         "contact_id=2");
+    const struct
+    {
+        int iId;
+        int iFound;
+        int iFilledId;
+    } CASES[] = {{1, 1, 0}, {2, 0, 2}, {3, 0, 0}};
+    for (const auto& one : CASES)
+    {
+        tag_ContactsStruct record{};
+        int iFound = -1;
+        EXPECT_EQ(0, m_clReader.ReadContactsByID(one.iId, &record, iFound));
+        EXPECT_EQ(one.iFound, iFound) << one.iId;
+        EXPECT_EQ(one.iFilledId, record.iContactID) << one.iId;
+        EXPECT_STREQ(L"", record.szName) << one.iId;
+    }
+}
+
+TEST_F(CSingleContactTest, FailsWithoutOneOfItsTables)
+{
+    m_clProvider.Put({1});
+    for (const char* szTable : {"localizer", "contacts"})
+    {
+        m_clProvider.Execute(std::string("drop table ") + szTable);
+        tag_ContactsStruct record{};
+        int iFound = 0;
+        EXPECT_EQ(-1, m_clReader.ReadContactsByID(1, &record, iFound)) << szTable;
+    }
+}

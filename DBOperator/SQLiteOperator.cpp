@@ -61,6 +61,15 @@ private:
     char m_szText[LIST_STATEMENT_SIZE];
 };
 
+// What a count writes when something is in its way; SQLite's result follows the error texts.
+struct tag_CountLines
+{
+    const char* szBusy;
+    void (*pfnLogTry)(int iTry);
+    const char* szPrepareError;
+    const char* szStepError;
+};
+
 void LogReadCountTry(int iTry)
 {
     QV_LOGE(DB_LOG_TAG,
@@ -75,6 +84,37 @@ void LogGetCountTry(int iTry)
             " QV_Contacts>>QV_ContactsLocalize_SO>> sqlite3_step error result=%d first, and has "
             "try %d times.",
             SQLITE_BUSY, iTry);
+}
+
+constexpr tag_CountLines READ_COUNT_LINES = {
+    "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: select count", &LogReadCountTry,
+    " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select contacts count "
+    "sqlite3_prepare ERROR result=",
+    " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select contacts count "
+    "sqlite3_step ERROR result="};
+constexpr tag_CountLines GET_COUNT_LINES = {
+    "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: GetContactsCount", &LogGetCountTry,
+    " QV_Contacts>>QV_ContactsLocalize_SO>> select contacts count ERROR result=",
+    " QV_Contacts>>QV_ContactsLocalize_SO>> sqlite3_step error result="};
+
+// The number that the query gives; iCount keeps its value on failure.
+int QueryCount(sqlite3* pDB, const char* szSql, const tag_CountLines& lines, int& iCount)
+{
+    CSqlStatement clRow(pDB);
+    int iRetCode = clRow.PrepareBounded(szSql, QV_LOG_ERROR, lines.szBusy);
+    if (iRetCode != SQLITE_OK)
+    {
+        QV_LOGE(DB_LOG_TAG, "%s%d", lines.szPrepareError, iRetCode);
+        return -1;
+    }
+    iRetCode = clRow.StepBounded(lines.pfnLogTry);
+    if (iRetCode != SQLITE_ROW)
+    {
+        QV_LOGE(DB_LOG_TAG, "%s%d", lines.szStepError, iRetCode);
+        return -1;
+    }
+    iCount = clRow.Int(0);
+    return 0;
 }
 
 int AllocateRecords(tag_ContactsInfo* pRecord)
@@ -205,7 +245,8 @@ int CSQLiteOperator::GetContactsCount(int* piCount)
 {
     QV_LOGD(DB_LOG_TAG,
             "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> GetContactsCount begin");
-    const int iResult = QueryContactsCount(piCount);
+    const bool bReady = piCount != nullptr && EnsureOpen() == 0;
+    const int iResult = bReady ? QueryCount(m_pDB, SELECT_COUNT, GET_COUNT_LINES, *piCount) : -1;
     QV_LOGD(DB_LOG_TAG,
             "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> GetContactsCount end");
     return iResult;
@@ -298,34 +339,6 @@ int CSQLiteOperator::EnsureOpen()
     return m_pDB != nullptr ? 0 : open();
 }
 
-int CSQLiteOperator::QueryContactsCount(int* piCount)
-{
-    if (piCount == nullptr || EnsureOpen() != 0)
-    {
-        return -1;
-    }
-    CSqlStatement clRow(m_pDB);
-    int iRetCode =
-        clRow.PrepareBounded(SELECT_COUNT, QV_LOG_ERROR,
-                             "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: GetContactsCount");
-    if (iRetCode != SQLITE_OK)
-    {
-        QV_LOGE(DB_LOG_TAG,
-                " QV_Contacts>>QV_ContactsLocalize_SO>> select contacts count ERROR result=%d",
-                iRetCode);
-        return -1;
-    }
-    iRetCode = clRow.StepBounded(LogGetCountTry);
-    if (iRetCode != SQLITE_ROW)
-    {
-        QV_LOGE(DB_LOG_TAG, " QV_Contacts>>QV_ContactsLocalize_SO>> sqlite3_step error result=%d",
-                iRetCode);
-        return -1;
-    }
-    *piCount = clRow.Int(0);
-    return 0;
-}
-
 // RecordNum becomes the number of contacts that the two record queries are expected to give.
 int CSQLiteOperator::CountContacts(const CIdList& clIds, tag_ContactsInfo* pRecord)
 {
@@ -334,28 +347,11 @@ int CSQLiteOperator::CountContacts(const CIdList& clIds, tag_ContactsInfo* pReco
             "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_3 = "
             "%s\n",
             clSql.Text());
-    CSqlStatement clRow(m_pDB);
-    int iRetCode =
-        clRow.PrepareBounded(clSql.Text(), QV_LOG_ERROR,
-                             "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: select count");
-    if (iRetCode != SQLITE_OK)
+    int iCount = 0;
+    if (QueryCount(m_pDB, clSql.Text(), READ_COUNT_LINES, iCount) != 0)
     {
-        QV_LOGE(DB_LOG_TAG,
-                " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select contacts count "
-                "sqlite3_prepare ERROR result=%d",
-                iRetCode);
         return -1;
     }
-    iRetCode = clRow.StepBounded(LogReadCountTry);
-    if (iRetCode != SQLITE_ROW)
-    {
-        QV_LOGE(DB_LOG_TAG,
-                " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select contacts count "
-                "sqlite3_step ERROR result=%d",
-                iRetCode);
-        return -1;
-    }
-    const int iCount = clRow.Int(0);
     if (iCount < 0)
     {
         QV_LOGE(DB_LOG_TAG,

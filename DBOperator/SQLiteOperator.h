@@ -46,7 +46,6 @@ public:
 
 private:
     int EnsureOpen();
-    int QueryContactsCount(int* piCount);
     int CountContacts(const CIdList& clIds, tag_ContactsInfo* pRecord);
     int ReadContacts(const CIdList& clIds, tag_ContactsInfo* pRecord);
     int ReadLocalizer(const CIdList& clIds, tag_ContactsInfo* pRecord);

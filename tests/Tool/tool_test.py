@@ -1,0 +1,316 @@
+"""Runs the built qvlocalize and checks its output, its files and its exit codes.
+
+tool_test.py TOOL PYFILE [TestClass...]
+"""
+import contextlib
+import fcntl
+import json
+import pathlib
+import re
+import shutil
+import sqlite3
+import subprocess
+import sys
+import tempfile
+import unittest
+
+TOOL, PYFILE = sys.argv[1:3]
+DONE, FAILED, USAGE, MISSING = 0, 1, 2, 3
+PY_RECORD_SIZE = 46
+HANZI_BASE = 0x1000
+
+
+def run(directory, command, *arguments):
+    """The finished process of one call of the tool on a data directory."""
+    call = [TOOL, command, "--data-dir", str(directory), *arguments]
+    return subprocess.run(call, capture_output=True, encoding="utf-8", check=False)
+
+
+def make_sample(directory):
+    for call in (["sample", "--pyfile", PYFILE], ["index"]):
+        process = run(directory, *call)
+        assert process.returncode == DONE, process.stderr
+
+
+class ToolTest(unittest.TestCase):
+    """A directory with the sample and its index, made once for a class."""
+
+    @classmethod
+    def setUpClass(cls):
+        cls.root = pathlib.Path(tempfile.mkdtemp(prefix="qvtool_"))
+        cls.addClassCleanup(shutil.rmtree, cls.root)
+        cls.data = cls.root / "data"
+        make_sample(cls.data)
+
+    def check(self, command, *arguments, code=DONE):
+        process = run(self.data, command, *arguments)
+        self.assertEqual(code, process.returncode, process.stderr)
+        return process
+
+    def search(self, text, *arguments):
+        """The JSON document of a search with all matches."""
+        process = self.check("search", text, "--json", "--limit", "0", *arguments)
+        self.assertEqual("", process.stderr)
+        return json.loads(process.stdout)
+
+    def last_step(self, text, *arguments):
+        return self.search(text, *arguments)["steps"][-1]
+
+    def sql(self, statement):
+        with contextlib.closing(sqlite3.connect(self.data / "databases/contacts2.db")) as database:
+            return database.execute(statement).fetchall()
+
+
+class SampleTest(ToolTest):
+    def test_holds_every_kind_of_contact(self):
+        self.assertGreaterEqual(self.sql("SELECT count(*) FROM contacts")[0][0], 500)
+        kinds = {
+            "simplified": "display_name = '张三'",
+            "traditional": "display_name = '張三豐'",
+            "two readings": "display_name = '单田芳'",
+            "Latin": "display_name = 'Tom'",
+            "mixed": "display_name = '王Li'",
+            "digits": "display_name = '10086'",
+            "no name": "display_name = ''",
+            "groups": "group_id LIKE '%.%'",
+            "accounts": "account_id LIKE '%.%'",
+            "secret": "single_is_secret = 1",
+            "starred": "starred = 1",
+            "online": "status = 'online'",
+            "invisible": "_id NOT IN (SELECT _id FROM visible_contacts)",
+        }
+        for kind, condition in kinds.items():
+            found = self.sql(f"""SELECT count(*) FROM contacts JOIN localizer ON contact_id = _id
+                LEFT JOIN status_updates ON status_update_data_id = status_update_id
+                WHERE {condition}""")
+            self.assertGreater(found[0][0], 0, kind)
+
+    def test_ids_are_primary_keys(self):
+        keys = {"contacts": "_id", "visible_contacts": "_id", "localizer": "contact_id",
+                "status_updates": "status_update_data_id"}
+        for table, column in keys.items():
+            columns = {row[1]: row for row in self.sql(f"PRAGMA table_info({table})")}
+            self.assertEqual(("INTEGER", 1), (columns[column][2], columns[column][5]), table)
+
+    def test_keys_are_the_codes_of_the_folded_names(self):
+        table = pathlib.Path(PYFILE).read_bytes()
+        words = [table[i:i + 3].decode() for i in range(0, len(table), PY_RECORD_SIZE)]
+        zhang, san, feng = (chr(HANZI_BASE + words.index(word)) for word in "张三丰")
+        expected = {"张三": zhang + san, "張三豐": zhang + san + feng, "": "",
+                    "Tom 2": "\u4f13\u4f0e\u4f0c\u5000\u5a02", "Zoë": "\u4f19\u4f0e\u5000"}
+        for name, key in expected.items():
+            found = self.sql(f"SELECT DISTINCT localizerkey FROM localizer"
+                             f" WHERE display_name = '{name}'")
+            self.assertEqual([(key,)], found, name)
+
+    def test_is_the_same_every_time_and_replaced_only_by_force(self):
+        before = self.sql("SELECT * FROM contacts JOIN localizer ON contact_id = _id")
+        process = self.check("sample", "--pyfile", PYFILE, code=USAGE)
+        self.assertIn("--force", process.stderr)
+        self.check("sample", "--pyfile", PYFILE, "--force")
+        self.assertEqual(before, self.sql("SELECT * FROM contacts JOIN localizer"
+                                          " ON contact_id = _id"))
+        files = {path.name for path in (self.data / "databases").iterdir()}
+        self.assertEqual({"contacts2.db"}, files)
+
+
+class IndexTest(ToolTest):
+    def test_shows_phases_and_files(self):
+        output = self.check("index").stdout
+        for phase in ("copy the pinyin table", "read the database", "spell and sort the names",
+                      "write the store"):
+            self.assertRegex(output, rf"{phase} +\d+ ms\n")
+        visible = self.sql("SELECT count(*) FROM visible_contacts")[0][0]
+        self.assertIn(f"{visible} contacts, room for {visible + 1000}\n", output)
+        for name in ("PyFileMappint.bin", "ContactsLocalizer.bin", "ContactsReg.bin",
+                     "memlock.ini"):
+            size = (self.data / "files" / name).stat().st_size
+            self.assertRegex(output, rf"{re.escape(name)} +{size} bytes\n")
+
+    def test_leaves_an_index_that_is_there_if_told_so(self):
+        records = self.data / "files/ContactsLocalizer.bin"
+        before = records.stat().st_mtime_ns
+        self.assertIn("there already", self.check("index", "--if-needed").stdout)
+        self.assertEqual(before, records.stat().st_mtime_ns)
+
+
+class SearchTest(ToolTest):
+    def marked(self, text, *arguments):
+        return [match["marked"] for match in self.last_step(text, *arguments)["matches"]]
+
+    def test_marks_what_matched(self):
+        cases = [
+            (["zs"], ["[张三]", "[張三]豐", "[章三]", "李[张三]"]),
+            (["zhangsan"], ["[张三]", "[張三]豐", "李[张三]", "[章三]"]),
+            (["张s"], ["[张三]", "[張三]豐", "李[张三]"]),
+            (["tom#2"], ["[Tom 2]"]),
+            (["wangli"], ["[王Li]"]),
+            (["926454", "--type", "num"], ["[王Li]"]),
+            (["chan"], ["[单]田芳", "[长]孙无忌"]),
+            (["shan"], ["[单]田芳", "[单]雄信"]),
+            (["10086", "--type", "num"], ["[10086]"]),
+        ]
+        for arguments, expected in cases:
+            found = self.marked(*arguments)
+            for name in expected:
+                self.assertIn(name, found, arguments)
+
+    def test_searches_key_by_key(self):
+        document = self.search("zhan")
+        self.assertEqual(["z", "zh", "zha", "zhan"], [step["typed"] for step in document["steps"]])
+        last = document["steps"][-1]
+        self.assertIn("张", last["candidates"])
+        self.assertIn("g", last["next_keys"])
+        self.assertNotIn("n", last["next_keys"])
+        self.assertEqual(last["total"], len(last["matches"]))
+        once = self.search("zhan", "--once")["steps"]
+        self.assertEqual(["zhan"], [step["typed"] for step in once])
+
+    def test_narrowing_finds_what_the_whole_index_holds(self):
+        for text, kind in (("zhangsan", "word"), ("lgs", "word"), ("94264726", "num")):
+            narrowed = self.search(text, "--type", kind)["steps"]
+            whole = self.search(text, "--type", kind, "--whole")["steps"]
+            self.assertEqual([step["matches"] for step in whole],
+                             [step["matches"] for step in narrowed], text)
+
+    def test_ten_keys_allow_no_further_one(self):
+        last = self.last_step("abcdefghij")
+        self.assertEqual((0, []), (last["mask"], last["next_keys"]))
+        self.assertEqual(["[ABCDEFGHIJ]KLMNOP", "[abcdefghij]"],
+                         sorted(match["marked"] for match in last["matches"]))
+
+    def test_filters_keep_what_the_database_says(self):
+        member = "'.' || group_id || '.' LIKE '%.2.%'"
+        cases = [
+            (["--starred"], "starred = 1"),
+            (["--phone"], "has_phone_number = 1"),
+            (["--mail"], "hasMail = 1"),
+            (["--postal"], "hasAddress = 1"),
+            (["--online"], "status = 'online'"),
+            (["--group", "2"], member),
+            (["--not-group", "2"], f"NOT ({member})"),
+            (["--group", "-1"], "single_is_secret = 1"),
+            (["--account", "3"], "'.' || account_id || '.' LIKE '%.3.%'"),
+            (["--not-account", "1", "--not-account", "2"],
+             "account_id NOT IN ('1', '2', '1.2', '2.1')"),
+            (["--not-contact", "1", "--not-contact", "2"], "_id NOT IN (1, 2)"),
+            (["--starred", "--phone", "--group", "2"],
+             f"starred = 1 AND has_phone_number = 1 AND {member}"),
+        ]
+        for arguments, condition in cases:
+            rows = self.sql(f"""SELECT _id FROM contacts JOIN localizer ON contact_id = _id
+                LEFT JOIN status_updates ON status_update_data_id = status_update_id
+                WHERE _id IN (SELECT _id FROM visible_contacts) AND {condition}""")
+            found = {match["contact_id"] for match in self.last_step("", *arguments)["matches"]}
+            self.assertEqual({row[0] for row in rows}, found, arguments)
+            self.assertTrue(found, arguments)
+
+    def test_an_empty_text_lists_everybody_by_sections(self):
+        step = self.last_step("")
+        places = [match["name_order"] for match in step["matches"]]
+        self.assertEqual(list(range(step["total"])), places)
+        sections = {}
+        for match in step["matches"]:
+            letter = match["index_character"]
+            sections[letter] = sections.get(letter, 0) + 1
+        self.assertEqual(step["sections"], sections)
+
+    def test_special_numbers_need_no_contacts_and_take_no_filters(self):
+        everything = self.last_step("", "--type", "special", "--starred")
+        self.assertEqual(list(range(7)), [match["contact_id"] for match in everything["matches"]])
+        self.assertEqual("火警", everything["matches"][3]["name"])
+        self.assertEqual(["[火警]"], self.marked("hj", "--type", "special")[:1])
+
+    def test_text_for_people(self):
+        output = self.check("search", "zs", "--limit", "1").stdout
+        total = self.last_step("zs")["total"]
+        self.assertIn(f"> zs_   {total} matches\n", output)
+        self.assertRegex(output, r" 1\.  contact \d+ +\S*\[\S+\]\S*\n")
+        self.assertIn(f"and {total - 1} more\n", output)
+        self.assertIn("keys that may follow:", output)
+        self.assertNotIn("\033", output)
+        self.assertIn("> qqq_   0 matches\n", self.check("search", "qqq").stdout)
+
+
+class ShowTest(ToolTest):
+    def test_shows_the_registration_record_and_the_records(self):
+        output = self.check("show", "--limit", "3").stdout
+        visible = self.sql("SELECT count(*) FROM visible_contacts")[0][0]
+        self.assertRegex(output, rf"iTotalNum +{visible} ")
+        self.assertRegex(output, r"iSortType +0 \(name order\)")
+        self.assertRegex(output, rf"iMemSize +{visible + 1000} ")
+        self.assertEqual(["0", "1", "2"], re.findall(r"(?m)^ +(\d+) +\d+  \S{6} ", output))
+
+    def test_time_order_begins_with_the_latest(self):
+        self.addCleanup(self.check, "index")
+        self.addCleanup(self.check, "show", "--set-sort-type", "name", "--limit", "1")
+        output = self.check("show", "--set-sort-type", "time", "--limit", "1").stdout
+        self.assertRegex(output, r"iSortType +1 .*\n +iMemSize +0 ")
+        self.check("index")
+        step = self.last_step("")
+        times = [match["last_time_contacted"] for match in step["matches"]]
+        self.assertEqual(sorted(times, reverse=True), times)
+        self.assertLessEqual(set(step["sections"]), set("12345-"))
+        by_name = self.check("show", "--sort-type", "name", "--limit", "2").stdout
+        self.assertEqual(["0", "1"], re.findall(r"(?m)^ +(\d+) +\d+  \S{6} ", by_name))
+
+
+class ErrorsTest(ToolTest):
+    def fails(self, directory, code, text, command, *arguments):
+        process = run(directory, command, *arguments)
+        self.assertEqual(code, process.returncode, (command, arguments, process.stderr))
+        self.assertIn(text, process.stderr)
+        self.assertEqual("", process.stdout)
+
+    def test_says_what_is_missing_and_what_makes_it(self):
+        empty = self.root / "it's empty"
+        advice = f"qvlocalize sample --data-dir '{self.root}/it'\\''s empty'"
+        self.fails(empty, MISSING, advice, "index")
+        self.fails(empty, MISSING, advice, "search", "a")
+        self.fails(empty, MISSING, "qvlocalize index --data-dir", "show")
+        unindexed = self.root / "unindexed"
+        shutil.copytree(self.data, unindexed)
+        (unindexed / "files/ContactsReg.bin").unlink()
+        self.fails(unindexed, MISSING, f"qvlocalize index --data-dir {unindexed}\n", "search", "a")
+        (unindexed / "files/pyfile.bin").unlink()
+        self.fails(unindexed, MISSING, "there is no pinyin table", "index")
+        self.fails(empty, MISSING, "--pyfile", "sample", "--pyfile", str(self.root / "none"))
+
+    def test_refuses_what_cannot_be_searched(self):
+        self.fails(self.data, USAGE, "11 characters; a search takes at most 10", "search",
+                   "abcdefghijk")
+        self.fails(self.data, USAGE, "beyond U+FFFF", "search", "\U0001F600")
+        self.fails(self.data, USAGE, "--type", "search", "a", "--type", "letters")
+        self.fails(self.data, USAGE, "text is required", "search")
+        self.fails(self.data, USAGE, "--limit", "search", "a", "--limit", "-1")
+        self.fails("", USAGE, "no name", "search", "a")
+        self.fails("x" * 4001, USAGE, "too long", "search", "a")
+        self.assertEqual(USAGE, subprocess.run([TOOL], capture_output=True, check=False).returncode)
+
+    def test_a_database_of_something_else(self):
+        other = self.root / "other"
+        shutil.copytree(self.data, other)
+        (other / "databases/contacts2.db").write_text("no database")
+        self.fails(other, FAILED, "ReadAllLocalizer select contacts count sqlite3_prepare ERROR",
+                   "index")
+        self.fails(other, FAILED, "not a contacts database", "search", "a")
+
+    def test_a_store_that_another_process_holds(self):
+        with open(self.data / "files/memlock.ini", "ab") as lock:
+            fcntl.flock(lock, fcntl.LOCK_EX)
+            self.fails(self.data, FAILED, "InitContactRecord write share memo lock", "index")
+            self.fails(self.data, FAILED, "the index could not be read", "search", "a", "--json")
+            process = run(self.data, "show")
+            self.assertEqual(FAILED, process.returncode)
+            self.assertIn("another process holds the store", process.stderr)
+        self.check("search", "a")
+
+    def test_help_ends_well(self):
+        for command in ("sample", "index", "search", "show"):
+            output = self.check(command, "--help").stdout
+            self.assertIn("--data-dir", output)
+            self.assertIn("Exit codes: 0 done", output)
+
+
+if __name__ == "__main__":
+    unittest.main(argv=[sys.argv[0], *sys.argv[3:]])

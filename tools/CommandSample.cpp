@@ -1,0 +1,123 @@
+#include "tools/Commands.h"
+
+#include "Common/DataPaths.h"
+#include "tools/DataDirectory.h"
+#include "tools/LocalizerKeys.h"
+#include "tools/SampleContacts.h"
+#include "tools/SampleDatabase.h"
+#include "tools/ToolError.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <filesystem>
+#include <iostream>
+#include <memory>
+#include <system_error>
+
+namespace fs = std::filesystem;
+
+namespace
+{
+
+constexpr int DEFAULT_CONTACTS = 600;
+constexpr int MAX_CONTACTS = 200000;
+constexpr int64_t DEFAULT_NOW_MS = 1735689600000; // the first day of 2025, UTC
+
+struct tag_SampleOptions
+{
+    CDataDirectory directory;
+    std::string strPinyinTable = QV_TOOL_PYFILE;
+    int iCount = DEFAULT_CONTACTS;
+    int64_t llNow = DEFAULT_NOW_MS;
+    bool bForce = false;
+};
+
+void RefuseToReplace()
+{
+    std::error_code error;
+    if (fs::exists(CDataPaths::Database(), error))
+    {
+        throw CToolError(TOOL_EXIT_USAGE,
+                         std::string("there is a database already: ") + CDataPaths::Database(),
+                         "Choose another directory with --data-dir, or replace it with --force.");
+    }
+}
+
+void InstallPinyinTable(const std::string& strSource)
+{
+    std::error_code error;
+    if (!fs::is_regular_file(strSource, error))
+    {
+        throw CToolError(TOOL_EXIT_MISSING, "there is no pinyin table " + strSource,
+                         "Build the target qv_pyfile, or name the file with --pyfile.");
+    }
+    const char* szTarget = CDataPaths::PinyinSource();
+    if (fs::equivalent(strSource, szTarget, error))
+    {
+        return;
+    }
+    fs::copy_file(strSource, szTarget, fs::copy_options::overwrite_existing, error);
+    if (error)
+    {
+        throw CToolError(TOOL_EXIT_FAILED, std::string("cannot copy ") + strSource + " to " +
+                                               szTarget + ": " + error.message());
+    }
+}
+
+template <typename Test>
+auto CountIf(const std::vector<tag_SampleContact>& vContacts, Test test)
+{
+    return std::count_if(vContacts.begin(), vContacts.end(), test);
+}
+
+void PrintSummary(const std::vector<tag_SampleContact>& vContacts)
+{
+    using Contact = const tag_SampleContact&;
+    std::cout << "Wrote " << vContacts.size() << " contacts to " << CDataPaths::Database() << ":\n"
+              << "  " << CountIf(vContacts, [](Contact c) { return c.bVisible; }) << " visible, "
+              << CountIf(vContacts, [](Contact c) { return c.bStarred; }) << " starred, "
+              << CountIf(vContacts, [](Contact c) { return c.bSecret; }) << " secret (group -1), "
+              << CountIf(vContacts, [](Contact c) { return c.strStatus == "online"; })
+              << " online, groups 1 to " << SAMPLE_GROUPS << ", accounts 1 to " << SAMPLE_ACCOUNTS
+              << "\n";
+}
+
+void RunSample(const tag_SampleOptions& options)
+{
+    options.directory.Use();
+    if (!options.bForce)
+    {
+        RefuseToReplace();
+    }
+    options.directory.Create();
+    InstallPinyinTable(options.strPinyinTable);
+    std::vector<tag_SampleContact> vContacts = MakeSampleContacts(options.iCount, options.llNow);
+    FillLocalizerKeys(vContacts);
+    WriteSampleDatabase(CDataPaths::Database(), vContacts);
+    PrintSummary(vContacts);
+    std::cout << "Next: " << options.directory.CommandLine("index") << "\n";
+}
+
+} // namespace
+
+void AddSampleCommand(CLI::App& app)
+{
+    auto pOptions = std::make_shared<tag_SampleOptions>();
+    CLI::App* pCommand =
+        app.add_subcommand("sample", "Make a provider database of sample contacts");
+    pOptions->directory.AddOption(*pCommand);
+    pCommand->add_option("--pyfile", pOptions->strPinyinTable, "Pinyin table to install")
+        ->type_name("FILE")
+        ->capture_default_str();
+    pCommand->add_option("--count", pOptions->iCount, "Number of contacts")
+        ->check(CLI::Range(1, MAX_CONTACTS))
+        ->capture_default_str();
+    pCommand
+        ->add_option("--now", pOptions->llNow,
+                     "Time in milliseconds since 1970 that the last contacts go back from")
+        ->type_name("MS")
+        ->capture_default_str();
+    pCommand->add_flag("--force", pOptions->bForce, "Replace a database that is there");
+    pCommand->callback([pOptions] { RunSample(*pOptions); });
+}

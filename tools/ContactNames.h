@@ -1,0 +1,20 @@
+#ifndef QV_TOOLS_CONTACTNAMES_H
+#define QV_TOOLS_CONTACTNAMES_H
+
+#include "Core/SearchRecords.h"
+
+#include <functional>
+#include <string>
+
+// The name, in UTF-8, to show for an entry of a result set, which carries only an id and codes.
+using ContactNameLookup = std::function<std::string(const tag_LocalizerDetail&)>;
+
+// Looks the contact up in the provider's database, since the store keeps spellings, not names.
+// The name is empty where the contact has none or is gone. Throws CToolError.
+ContactNameLookup LookUpInDatabase();
+
+// Reads the name back from the codes of the entry; fits the special numbers, whose codes are all
+// Chinese characters. Throws CToolError when the pinyin table cannot be opened.
+ContactNameLookup LookUpByCodes();
+
+#endif

@@ -1,0 +1,137 @@
+#include "tools/DataDirectory.h"
+
+#include "Common/DataPaths.h"
+#include "Core/LocalizerLogic.h"
+#include "tools/ToolError.h"
+
+#include <CLI/CLI.hpp>
+
+#include <algorithm>
+#include <cctype>
+#include <cstring>
+#include <filesystem>
+#include <system_error>
+
+namespace fs = std::filesystem;
+
+namespace
+{
+
+bool IsFile(const char* szPath)
+{
+    std::error_code error;
+    return fs::is_regular_file(szPath, error);
+}
+
+void CreateParent(const char* szPath)
+{
+    const fs::path directory = fs::path(szPath).parent_path();
+    std::error_code error;
+    fs::create_directories(directory, error);
+    if (error)
+    {
+        throw CToolError(TOOL_EXIT_FAILED,
+                         "cannot create " + directory.string() + ": " + error.message(),
+                         "Choose a directory that you may write with --data-dir.");
+    }
+}
+
+// As the library wants a root: absolute paths stay right wherever it looks from, and a slash at
+// the end would be doubled.
+std::string RootOf(const std::string& strDirectory)
+{
+    std::string strRoot = fs::absolute(strDirectory).lexically_normal().string();
+    while (strRoot.size() > 1 && strRoot.back() == '/')
+    {
+        strRoot.pop_back();
+    }
+    return strRoot == "/" ? "" : strRoot;
+}
+
+bool IsPlain(char c)
+{
+    return std::isalnum(static_cast<unsigned char>(c)) != 0 ||
+           std::strchr("/._-+@%:=,", c) != nullptr;
+}
+
+// A word that a shell reads as it stands.
+std::string Quoted(const std::string& strWord)
+{
+    if (std::all_of(strWord.begin(), strWord.end(), IsPlain))
+    {
+        return strWord;
+    }
+    std::string strQuoted = "'";
+    for (const char c : strWord)
+    {
+        strQuoted += c == '\'' ? std::string("'\\''") : std::string(1, c);
+    }
+    return strQuoted + "'";
+}
+
+} // namespace
+
+void CDataDirectory::AddOption(CLI::App& command)
+{
+    command
+        .add_option("--data-dir", m_strRoot,
+                    "Directory that holds databases/ and files/ "
+                    "(default: /data/data/com.android.providers.contacts)")
+        ->type_name("DIR")
+        ->check([](const std::string& strDirectory)
+                { return strDirectory.empty() ? "the directory has no name" : ""; });
+}
+
+void CDataDirectory::Use() const
+{
+    if (!m_strRoot.empty() && CDataPaths::SetRoot(RootOf(m_strRoot).c_str()) != 0)
+    {
+        throw CToolError(TOOL_EXIT_USAGE, "the path of the data directory is too long",
+                         "Choose a shorter one with --data-dir.");
+    }
+}
+
+void CDataDirectory::Create() const
+{
+    CreateParent(CDataPaths::Database());
+    CreateParent(CDataPaths::PinyinSource());
+}
+
+void CDataDirectory::RequireDatabase() const
+{
+    if (!IsFile(CDataPaths::Database()))
+    {
+        throw CToolError(TOOL_EXIT_MISSING,
+                         std::string("there is no contacts database ") + CDataPaths::Database(),
+                         "Name another directory with --data-dir, or make sample contacts: " +
+                             CommandLine("sample"));
+    }
+}
+
+void CDataDirectory::RequirePinyinSource() const
+{
+    if (!IsFile(CDataPaths::PinyinSource()))
+    {
+        throw CToolError(TOOL_EXIT_MISSING,
+                         std::string("there is no pinyin table ") + CDataPaths::PinyinSource(),
+                         "Copy pyfile.bin there, or make sample contacts, which installs it: " +
+                             CommandLine("sample"));
+    }
+}
+
+void CDataDirectory::RequireIndex() const
+{
+    if (IsNeedReload() != 0)
+    {
+        throw CToolError(TOOL_EXIT_MISSING,
+                         "the index is not built in " +
+                             fs::path(CDataPaths::ContactReg()).parent_path().string(),
+                         "Build it first: " + CommandLine("index"));
+    }
+}
+
+std::string CDataDirectory::CommandLine(const char* szCommand) const
+{
+    const std::string strLine = std::string("qvlocalize ") + szCommand;
+    return m_strRoot.empty() ? strLine : strLine + " --data-dir " + Quoted(m_strRoot);
+}

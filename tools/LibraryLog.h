@@ -1,0 +1,32 @@
+#ifndef QV_TOOLS_LIBRARYLOG_H
+#define QV_TOOLS_LIBRARYLOG_H
+
+#include <string>
+#include <vector>
+
+// Lets no line of the library's log reach the terminal: a subcommand reads the lines that it
+// wants and tells failures in its own words.
+void SilenceLibraryLog();
+
+// Collects the library's log for as long as the object lives; one object at a time.
+class CLibraryLog
+{
+public:
+    CLibraryLog();
+    ~CLibraryLog();
+    CLibraryLog(const CLibraryLog&) = delete;
+    CLibraryLog& operator=(const CLibraryLog&) = delete;
+
+    // The milliseconds of the last line "QV_Contacts: <szPhase> time = <n>", -1 without one.
+    int PhaseTime(const char* szPhase) const;
+    // The lines of error priority, each on an indented line of its own; empty without one.
+    std::string Errors() const;
+
+private:
+    static void Collect(void* pContext, int iPriority, const char* szTag, const char* szText);
+
+    std::vector<std::string> m_vPhases;
+    std::vector<std::string> m_vErrors;
+};
+
+#endif

@@ -1,0 +1,12 @@
+#ifndef QV_TOOLS_RECORDTEXT_H
+#define QV_TOOLS_RECORDTEXT_H
+
+#include "Core/ContactRecords.h"
+
+#include <iosfwd>
+
+// A stored record as one line of a table, and the table's heading.
+void PrintRecordHeading(std::ostream& stream);
+void PrintRecord(std::ostream& stream, const tag_ContactsStruct& record);
+
+#endif

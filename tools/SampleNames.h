@@ -1,0 +1,10 @@
+#ifndef QV_TOOLS_SAMPLENAMES_H
+#define QV_TOOLS_SAMPLENAMES_H
+
+#include <string>
+
+// Name number iIndex (from 0) of the sample contacts in UTF-8, always the same for an index.
+// The first ones are picked one by one to show a rule each; the others are put together.
+std::string SampleName(int iIndex);
+
+#endif

@@ -1,0 +1,58 @@
+#include "tools/SearchReport.h"
+
+#include "LocalizerImpl/QVLocalizerManager.h"
+#include "tools/Utf8Text.h"
+
+namespace
+{
+
+constexpr uint32_t MATCH_START_SHIFT = 16;
+constexpr uint32_t MATCH_END_MASK = 0xFFFF;
+
+} // namespace
+
+int FirstMatched(const tag_LocalizerDetail& detail)
+{
+    return static_cast<int>(static_cast<uint32_t>(detail.iMatchPos) >> MATCH_START_SHIFT);
+}
+
+int LastMatched(const tag_LocalizerDetail& detail)
+{
+    return static_cast<int>(static_cast<uint32_t>(detail.iMatchPos) & MATCH_END_MASK);
+}
+
+std::string MarkedName(const tag_FoundContact& contact, const tag_SearchStep& step,
+                       const char* szBegin, const char* szEnd)
+{
+    if (step.strTyped.empty())
+    {
+        return contact.strName;
+    }
+    std::string strMarked;
+    int iCharacter = 0; // a name has one code per character
+    for (const std::string& strCharacter : Characters(contact.strName))
+    {
+        const bool bFirst = iCharacter == FirstMatched(contact.detail);
+        const bool bLast = iCharacter == LastMatched(contact.detail);
+        strMarked += (bFirst ? szBegin : "") + strCharacter + (bLast ? szEnd : "");
+        ++iCharacter;
+    }
+    return strMarked;
+}
+
+std::vector<std::string> NextKeys(uint32_t uMask)
+{
+    std::vector<std::string> vKeys;
+    for (uint32_t i = 0; i < LOC_ALPHA_COUNT; ++i)
+    {
+        if ((uMask >> i & 1U) != 0)
+        {
+            vKeys.emplace_back(1, static_cast<char>('a' + i));
+        }
+    }
+    if ((uMask & MASK_OTHER) != 0)
+    {
+        vKeys.emplace_back("#");
+    }
+    return vKeys;
+}

@@ -1,0 +1,37 @@
+#ifndef QV_TOOLS_SEARCHREPORT_H
+#define QV_TOOLS_SEARCHREPORT_H
+
+#include "tools/FilterOptions.h"
+#include "tools/SearchSession.h"
+
+#include <iosfwd>
+#include <string>
+#include <vector>
+
+// What a whole search of the command line was and answered.
+struct tag_SearchReport
+{
+    std::string strType;  // "word", "num" or "special"
+    std::string strInput; // UTF-8
+    bool bNarrow = false;
+    std::vector<tag_ChosenFilter> vFilters;
+    std::vector<tag_SearchStep> vSteps;
+};
+
+// For people. bBold also prints the matched characters in bold.
+void PrintSearchText(std::ostream& stream, const tag_SearchReport& report, bool bBold);
+
+// One JSON document for programs; `qvlocalize search --help` describes it.
+void PrintSearchJson(std::ostream& stream, const tag_SearchReport& report);
+
+// Parts of both forms. The matched characters of a name between szBegin and szEnd; an empty text
+// (nothing typed) marks none.
+std::string MarkedName(const tag_FoundContact& contact, const tag_SearchStep& step,
+                       const char* szBegin = "[", const char* szEnd = "]");
+// Index of the first and the last matched character.
+int FirstMatched(const tag_LocalizerDetail& detail);
+int LastMatched(const tag_LocalizerDetail& detail);
+// The keys of a mask: letters, and "#" for digits and other characters.
+std::vector<std::string> NextKeys(uint32_t uMask);
+
+#endif

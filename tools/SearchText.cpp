@@ -1,0 +1,116 @@
+#include "tools/SearchReport.h"
+
+#include <iomanip>
+#include <ostream>
+
+namespace
+{
+
+constexpr const char* BOLD_BEGIN = "[\033[1m";
+constexpr const char* BOLD_END = "\033[0m]";
+constexpr int NUMBER_WIDTH = 5;
+constexpr int ID_WIDTH = 6;
+
+void PrintFilters(std::ostream& stream, const tag_SearchReport& report)
+{
+    const char* szBefore = "; filters: ";
+    for (const tag_ChosenFilter& filter : report.vFilters)
+    {
+        stream << szBefore << filter.strName;
+        if (filter.bHasID)
+        {
+            stream << ' ' << filter.iID;
+        }
+        szBefore = ", ";
+    }
+}
+
+void PrintHeading(std::ostream& stream, const tag_SearchReport& report)
+{
+    stream << "Search \"" << report.strInput << "\" (" << report.strType << ", "
+           << (report.bNarrow ? "each key narrows the matches before it"
+                              : "each key searches the whole index");
+    PrintFilters(stream, report);
+    stream << ")\n";
+}
+
+void PrintContact(std::ostream& stream, const tag_SearchStep& step, const tag_FoundContact& contact,
+                  int iRank, bool bBold)
+{
+    stream << std::setw(NUMBER_WIDTH) << iRank << ".  contact " << std::left << std::setw(ID_WIDTH)
+           << contact.detail.iContactID << std::right << ' ';
+    if (contact.detail.iFirstWord != 0)
+    {
+        stream << static_cast<char>(contact.detail.iFirstWord) << "  ";
+    }
+    if (contact.strName.empty())
+    {
+        stream << "(no name)\n";
+        return;
+    }
+    stream << (bBold ? MarkedName(contact, step, BOLD_BEGIN, BOLD_END) : MarkedName(contact, step))
+           << '\n';
+}
+
+void PrintContacts(std::ostream& stream, const tag_SearchStep& step, bool bBold)
+{
+    int iRank = 0;
+    for (const tag_FoundContact& contact : step.vBest)
+    {
+        PrintContact(stream, step, contact, ++iRank, bBold);
+    }
+    if (step.iTotal > iRank)
+    {
+        stream << std::setw(NUMBER_WIDTH) << "..."
+               << "   and " << step.iTotal - iRank << " more\n";
+    }
+}
+
+void PrintSections(std::ostream& stream, const tag_SearchStep& step)
+{
+    if (step.vSections.empty())
+    {
+        return;
+    }
+    const char* szBefore = "   sections: ";
+    for (const tag_Section& section : step.vSections)
+    {
+        stream << szBefore << section.strLabel << ' ' << section.iContacts;
+        szBefore = ", ";
+    }
+    stream << '\n';
+}
+
+void PrintWords(std::ostream& stream, const char* szLabel, const std::vector<std::string>& vWords)
+{
+    stream << szLabel;
+    for (const std::string& strWord : vWords)
+    {
+        stream << ' ' << strWord;
+    }
+    stream << (vWords.empty() ? " none\n" : "\n");
+}
+
+void PrintStep(std::ostream& stream, const tag_SearchStep& step, bool bBold)
+{
+    stream << "\n> " << step.strTyped << "_   " << step.iTotal
+           << (step.iTotal == 1 ? " match\n" : " matches\n");
+    PrintContacts(stream, step, bBold);
+    PrintSections(stream, step);
+    PrintWords(stream, "   keys that may follow:", NextKeys(step.uMask));
+    if (!step.vCandidates.empty())
+    {
+        PrintWords(stream, "   characters to pick: ", step.vCandidates);
+    }
+}
+
+} // namespace
+
+void PrintSearchText(std::ostream& stream, const tag_SearchReport& report, bool bBold)
+{
+    PrintHeading(stream, report);
+    for (const tag_SearchStep& step : report.vSteps)
+    {
+        PrintStep(stream, step, bBold);
+    }
+}

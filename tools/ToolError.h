@@ -1,0 +1,33 @@
+#ifndef QV_TOOLS_TOOLERROR_H
+#define QV_TOOLS_TOOLERROR_H
+
+#include <stdexcept>
+#include <string>
+
+// What the tool tells the program that called it.
+enum TOOL_EXIT : int
+{
+    TOOL_EXIT_DONE = 0,    // also for a search without matches
+    TOOL_EXIT_FAILED = 1,  // the library, SQLite or the system could not do it
+    TOOL_EXIT_USAGE = 2,   // the command line asks for something that cannot be done
+    TOOL_EXIT_MISSING = 3, // a file that another subcommand makes is not there
+};
+
+// Ends a subcommand: what is wrong, and what to do about it (may be empty).
+class CToolError : public std::runtime_error
+{
+public:
+    CToolError(TOOL_EXIT eExit, const std::string& strWhat, const std::string& strAdvice = "")
+        : std::runtime_error(strWhat), m_eExit(eExit), m_strAdvice(strAdvice)
+    {
+    }
+
+    TOOL_EXIT Exit() const { return m_eExit; }
+    const std::string& Advice() const { return m_strAdvice; }
+
+private:
+    TOOL_EXIT m_eExit;
+    std::string m_strAdvice;
+};
+
+#endif

@@ -1,0 +1,77 @@
+#include "tools/Commands.h"
+#include "tools/LibraryLog.h"
+#include "tools/ToolError.h"
+
+#include <CLI/CLI.hpp>
+
+#include <exception>
+#include <iostream>
+
+namespace
+{
+
+constexpr const char* EXIT_CODES = "Exit codes: 0 done (also a search without matches), "
+                                   "1 the library or the system failed,\n"
+                                   "2 wrong use of the command line, 3 no database, pinyin table "
+                                   "or index there.";
+
+void AddCommands(CLI::App& app)
+{
+    app.require_subcommand(1);
+    app.footer(EXIT_CODES); // subcommands added later inherit it
+    AddSampleCommand(app);
+    AddIndexCommand(app);
+    AddSearchCommand(app);
+    AddShowCommand(app);
+}
+
+int Report(const CToolError& error)
+{
+    std::cerr << "qvlocalize: " << error.what() << '\n';
+    if (!error.Advice().empty())
+    {
+        std::cerr << error.Advice() << '\n';
+    }
+    return error.Exit();
+}
+
+int RunCommandLine(CLI::App& app, int argc, char** argv)
+{
+    try
+    {
+        app.parse(argc, argv);
+    }
+    catch (const CLI::ParseError& error)
+    {
+        return app.exit(error) == 0 ? TOOL_EXIT_DONE : TOOL_EXIT_USAGE;
+    }
+    std::cout.flush();
+    if (!std::cout)
+    {
+        throw CToolError(TOOL_EXIT_FAILED, "the output could not be written");
+    }
+    return TOOL_EXIT_DONE;
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    try
+    {
+        SilenceLibraryLog();
+        CLI::App app("Builds, shows and searches the contact index of a provider's data "
+                     "directory.",
+                     "qvlocalize");
+        AddCommands(app);
+        return RunCommandLine(app, argc, argv);
+    }
+    catch (const CToolError& error)
+    {
+        return Report(error);
+    }
+    catch (const std::exception& error)
+    {
+        return Report(CToolError(TOOL_EXIT_FAILED, error.what()));
+    }
+}

@@ -53,6 +53,10 @@ USE_WEIGHTS: Dict[str, int] = {
 }
 TRADITIONAL_OF_STANDARD_WEIGHT = 10
 
+# Rare characters that names do use stand mostly under these radicals: woman, sun, water, fire, jade and grass.
+NAME_RADICALS = {"38", "72", "85", "86", "96", "140"}
+NAME_RADICAL_WEIGHT = 2
+
 Fields = Dict[str, Dict[str, str]]
 Readings = List[str]
 
@@ -214,7 +218,7 @@ class CharacterChoice:
         spare = room - len(required)
         if not 0 <= spare <= len(fillers):
             raise ValueError(f"{room} records for {len(required)} required and {len(fillers)} other characters")
-        ranked = sorted(fillers, key=lambda char: (-self._use(char), char))
+        ranked = sorted(fillers, key=lambda char: (-self._use(char), self._strokes(char), char))
         return sorted(required | set(ranked[:spare]))
 
     def _use(self, char: str) -> int:
@@ -222,7 +226,12 @@ class CharacterChoice:
         simplified = listed_characters(self._fields["kSimplifiedVariant"].get(char, ""))
         if any(form in self._fields["kTGH"] for form in simplified):
             use += TRADITIONAL_OF_STANDARD_WEIGHT
+        if self._fields["kRSUnicode"][char].split(".")[0] in NAME_RADICALS:
+            use += NAME_RADICAL_WEIGHT
         return use
+
+    def _strokes(self, char: str) -> int:
+        return int(self._fields["kTotalStrokes"][char].split()[0])
 
 
 def between(chars: Set[str], chosen: Sequence[str], last: str) -> Set[str]:

@@ -74,9 +74,10 @@ public:
         CFirstFound firstFound;
         for (int i = 0; i < m_table.RowCount(); ++i)
         {
-            if (m_table.RowAt(i).uFirstFound != CPieceTable::NOT_FOUND)
+            tag_PieceRow& row = m_table.RowAt(i);
+            if (row.uFirstFound != CPieceTable::NOT_FOUND && IsHanZiCode(CodeBits(row.code)))
             {
-                firstFound.Offer(m_table.RowAt(i));
+                firstFound.Offer(row);
             }
         }
         for (int i = 0; i < firstFound.Count(); ++i)

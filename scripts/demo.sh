@@ -1,11 +1,14 @@
 #!/usr/bin/env bash
 # The library's main job from end to end: installs what is missing, builds, makes a provider
 # database of sample contacts, indexes it and types some searches key by key:
-#   scripts/demo.sh [DIR]     works in DIR, build/demo-data by default, which is made anew
+#   scripts/demo.sh           works in build/demo-data, which it makes anew
+#   scripts/demo.sh DIR       works in DIR, which must not hold a database yet
 set -euo pipefail
+export LC_ALL=C.UTF-8 # Chinese characters are shown, whatever the machine's language
+given=${1:+$(realpath -m "$1")}
 cd "$(dirname "$0")/.."
 
-data=${1:-build/demo-data}
+data=${given:-build/demo-data}
 tool=build/release/tools/qvlocalize
 
 build_tool() {
@@ -14,13 +17,12 @@ build_tool() {
     cmake --build --preset release --target qvlocalize
 }
 
-# Shows a call of the tool and makes it.
+# Shows a call of the tool, without its data directory, and makes it.
 run() {
-    local command=$1
+    local command=$1 shown
     shift
-    printf '\n\033[1m$ qvlocalize %s' "$command"
-    printf ' %q' "$@"
-    printf '\033[0m\n'
+    shown="qvlocalize $command$([ $# -eq 0 ] || printf ' %q' "$@")"
+    printf '\n$ %s\n' "$shown"
     "$tool" "$command" --data-dir "$data" "$@"
 }
 
@@ -29,14 +31,18 @@ heading() {
 }
 
 build_tool
+if [ -z "$given" ]; then
+    rm -rf "$data"
+fi
+printf '\nEvery call below also has --data-dir %s\n' "$data"
 
 heading "Sample contacts and the index"
-run sample --force
+run sample
 run index
 run show --limit 5
 
 heading "Keypad digits: z h a n g s a n is 9 4 2 6 4 7 2 6"
-run search 9426472 --type num --limit 3
+run search 94264726 --type num --limit 3
 
 heading "Letters: whole readings, beginnings and initials; a surname with two readings"
 run search zhangs --limit 3
@@ -64,4 +70,4 @@ heading "Nothing typed: everybody, by sections"
 run search "" --limit 3
 
 heading "For programs"
-run search lgs --limit 1 --json --once
+run search zgl --limit 1 --json --once

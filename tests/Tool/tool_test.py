@@ -167,7 +167,7 @@ class SearchTest(ToolTest):
         self.assertEqual(["zhan"], [step["typed"] for step in once])
 
     def test_narrowing_finds_what_the_whole_index_holds(self):
-        for text, kind in (("zhangsan", "word"), ("lgs", "word"), ("94264726", "num")):
+        for text, kind in (("zhangsan", "word"), ("zgl", "word"), ("94264726", "num")):
             narrowed = self.search(text, "--type", kind)["steps"]
             whole = self.search(text, "--type", kind, "--whole")["steps"]
             self.assertEqual([step["matches"] for step in whole],

@@ -169,12 +169,18 @@ int Common_Qsort::SearchHalves(char* base, int count, char* key, bool* pbFound)
     return hi + 1;
 }
 
+// Whether there are records to look at; where there are none, *piResult is the answer. An empty
+// array, null or not, has one place for a key: its beginning.
+bool Common_Qsort::BeginSearch(const char* base, int count, const char* key, Common_Sort_enum type,
+                               int bInsertPos, int* piResult)
+{
+    InitInterData(type);
+    *piResult = IsReady() && count <= 0 && bInsertPos != 0 ? 0 : -1;
+    return IsReady() && count > 0 && base != nullptr && key != nullptr;
+}
+
 int Common_Qsort::SearchExact(char* base, int count, char* key)
 {
-    if (count <= 0)
-    {
-        return -1;
-    }
     char* pLast = RecordAt(base, count - 1);
     if (count > 1 && (QSORT_LT(key, base) == 1 || QSORT_GT(key, pLast) == 1))
     {
@@ -196,18 +202,14 @@ int Common_Qsort::SearchExact(char* base, int count, char* key)
 int Common_Qsort::Search_Bin(char* base, int count, char* key, Common_Sort_enum type,
                              int bInsertPos)
 {
-    InitInterData(type);
-    if (base == nullptr || key == nullptr || !IsReady())
+    int iNoRecords = -1;
+    if (!BeginSearch(base, count, key, type, bInsertPos, &iNoRecords))
     {
-        return -1;
+        return iNoRecords;
     }
     if (bInsertPos == 0)
     {
         return SearchExact(base, count, key);
-    }
-    if (count <= 0)
-    {
-        return 0;
     }
     if (count == 1)
     {
@@ -228,10 +230,10 @@ int Common_Qsort::Search_Bin(char* base, int count, char* key, Common_Sort_enum 
 int Common_Qsort::Search_BinEx(char* base, int count, char* key, Common_Sort_enum type,
                                int bInsertPos, int* pbFound)
 {
-    InitInterData(type);
-    if (base == nullptr || key == nullptr || !IsReady())
+    int iNoRecords = -1;
+    if (!BeginSearch(base, count, key, type, bInsertPos, &iNoRecords))
     {
-        return -1;
+        return iNoRecords;
     }
     if (bInsertPos == 0)
     {
@@ -249,10 +251,6 @@ int Common_Qsort::Search_BinEx(char* base, int count, char* key, Common_Sort_enu
 // The insertion place that prefers an equal first or last record to the place behind it.
 int Common_Qsort::SearchInsertion(char* base, int count, char* key, bool* pbFound)
 {
-    if (count <= 0)
-    {
-        return 0;
-    }
     if (count == 1)
     {
         if (QSORT_LT(key, base) == 1)

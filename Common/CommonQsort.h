@@ -41,7 +41,7 @@ public:
     // leading zero-terminated string matters).
     // bInsertPos 0: the index of an equal record, or -1. bInsertPos not 0: the index 0..count at
     // which the key keeps the order; that of an equal record where one is met.
-    // -1 as well for a null array or key.
+    // A count of 0 or less: -1 or 0, whatever base and key are; else -1 for a null base or key.
     int Search_Bin(char* base, int count, char* key, Common_Sort_enum type, int bInsertPos);
 
     // The same search; with bInsertPos it sets *pbFound to 1 when an equal record was met, and
@@ -59,6 +59,8 @@ private:
     bool IsReady() const { return m_pKeyBuf != nullptr && m_pSwapBuf != nullptr; }
     void FreeBuffers();
     char* RecordAt(char* base, int iIndex) const;
+    bool BeginSearch(const char* base, int count, const char* key, Common_Sort_enum type,
+                     int bInsertPos, int* piResult);
     int SearchExact(char* base, int count, char* key);
     int SearchInsertion(char* base, int count, char* key, bool* pbFound);
     int SearchHalves(char* base, int count, char* key, bool* pbFound);

@@ -4,7 +4,7 @@
 //   group    three bits: nameless, first code other, first code a digit
 //   script   whether the first code is a Chinese character or a letter
 //   prefix   the first 12 units of the name, 16 bits each, cut at the first unit that needs more
-//   iRecord  the record, asked when the prefixes are equal
+//   iRecord  the record, asked when the prefixes are equal or cannot tell
 
 #include "LocalizerImpl/ContactSort.h"
 
@@ -24,6 +24,7 @@ constexpr int PREFIX_WORDS = 3;
 constexpr int UNITS_PER_WORD = 4;
 constexpr int PREFIX_UNIT_BITS = 16;
 constexpr uint32_t PREFIX_UNIT_MAX = 0xFFFF;
+constexpr uint32_t WRAPPING_UNIT_MIN = 0x80000000;
 
 struct tag_NameKey
 {
@@ -32,6 +33,7 @@ struct tag_NameKey
     uint8_t uGroup;
     bool bHanZi;
     bool bAlpha;
+    bool bWraps; // the prefix met a unit whose differences to others wrap
     int32_t iRecord;
 };
 
@@ -52,8 +54,8 @@ uint8_t GroupOf(const tag_ContactsStruct& record)
 }
 
 // A unit too large for its field takes the largest value and ends the prefix: two prefixes that
-// differ then differ in the order of the names.
-void FillPrefix(const wchar_t* szName, uint64_t (&auPrefix)[PREFIX_WORDS])
+// differ then differ in the order of the names, unless one of them wraps.
+void FillPrefix(const wchar_t* szName, tag_NameKey& key)
 {
     bool bEnded = false;
     for (int i = 0; i < PREFIX_WORDS * UNITS_PER_WORD; ++i)
@@ -61,7 +63,8 @@ void FillPrefix(const wchar_t* szName, uint64_t (&auPrefix)[PREFIX_WORDS])
         const uint32_t uUnit = bEnded ? 0 : static_cast<uint32_t>(szName[i]);
         const bool bLarge = uUnit >= PREFIX_UNIT_MAX;
         bEnded = bEnded || uUnit == 0 || bLarge;
-        uint64_t& uWord = auPrefix[i / UNITS_PER_WORD];
+        key.bWraps = key.bWraps || uUnit >= WRAPPING_UNIT_MIN;
+        uint64_t& uWord = key.auPrefix[i / UNITS_PER_WORD];
         uWord = (uWord << PREFIX_UNIT_BITS) | (bLarge ? PREFIX_UNIT_MAX : uUnit);
     }
 }
@@ -70,7 +73,7 @@ tag_NameKey NameKeyOf(const tag_ContactsStruct& record, int iRecord)
 {
     const uint16_t uCode = CodeBits(record.szLocalizerKey[0]);
     tag_NameKey key = {};
-    FillPrefix(record.szName, key.auPrefix);
+    FillPrefix(record.szName, key);
     key.firstUnit = record.szName[0];
     key.uGroup = GroupOf(record);
     key.bHanZi = IsHanZiCode(uCode);
@@ -99,7 +102,7 @@ public:
         {
             return a.uGroup > b.uGroup;
         }
-        for (int i = 0; i < PREFIX_WORDS; ++i)
+        for (int i = 0; i < PREFIX_WORDS && !a.bWraps && !b.bWraps; ++i)
         {
             if (a.auPrefix[i] != b.auPrefix[i])
             {

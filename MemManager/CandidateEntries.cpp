@@ -6,6 +6,7 @@
 #include "Filter/FilterProcessFactory.h"
 #include "Filter/RecordTest.h"
 
+#include <algorithm>
 #include <memory>
 #include <new>
 
@@ -37,6 +38,18 @@ void FillEntry(const tag_ContactsStruct& record, tag_LocalizerDetail* pEntry)
     pEntry->llLastTimeContacted = record.llLastTimeContacted;
 }
 
+// Of each record a few fields are read, too far apart for the processor to see a pattern: it is
+// told ahead where they are.
+constexpr int PREFETCH_AHEAD = 12;
+
+void Prefetch(const tag_ContactsStruct& record)
+{
+    __builtin_prefetch(&record);
+    __builtin_prefetch(&record.iFlags);
+    __builtin_prefetch(&record.szLocalizerKey);
+    __builtin_prefetch(&record.szReserved[5]);
+}
+
 } // namespace
 
 int CCandidateEntries::Select(const tag_ContactsStruct* pRecords, int iCount,
@@ -47,6 +60,7 @@ int CCandidateEntries::Select(const tag_ContactsStruct* pRecords, int iCount,
     int iKept = 0;
     for (int i = 0; i < iCount; ++i)
     {
+        Prefetch(pRecords[std::min(i + PREFETCH_AHEAD, iCount - 1)]);
         if (bAll || test.Keeps(pRecords[i]))
         {
             FillEntry(pRecords[i], &pEntries[iKept++]);

@@ -19,11 +19,11 @@
 //  - iMemSize 0 and the old iTotalNum over old and new records: an index that may miss a contact
 //    or show it twice;
 //  - iMemSize 0 and the new iTotalNum, sort type old or new: the new index, whole.
-// In the last two the next notification of changed contacts or status rebuilds the store, as it
-// does whenever iTotalNum exceeds iMemSize. Readers under the lock meet these states only after a
-// writer died; GetMemSize and GetSortType take no lock and may also see iMemSize 0 while a change
-// is under way.
-// A damaged record (see StoreCheck.h) acts like a file that cannot be mapped, with an error line.
+// In the last two the next notification of changed contacts or status rebuilds the store, because
+// iTotalNum, or the database's count where iTotalNum is 0, exceeds iMemSize. Readers under the lock
+// meet these states only after a writer died; GetMemSize and GetSortType take no lock and may also
+// see iMemSize 0 while a change is under way. A damaged record (see StoreCheck.h) acts like a file
+// that cannot be mapped, with an error line.
 //
 // Result sets. A set made here is one object from scalar new and, when it has entries, one array
 // from array new; no two sets share an array. The receiver releases a set with FreeSearchResult.

@@ -82,7 +82,7 @@ int ReadFileEnd(int iFd, off_t iSize, tag_FileEnd* pEnd)
     {
         return errno;
     }
-    pEnd->iLength = info.st_size;
+    pEnd->iLength = static_cast<off_t>(info.st_size);
     pEnd->cLast = 0;
     errno = EIO; // in case that nothing is read without an error
     if (pEnd->iLength >= iSize && pread(iFd, &pEnd->cLast, 1, iSize - 1) != 1)

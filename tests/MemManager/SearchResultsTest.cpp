@@ -110,6 +110,7 @@ TEST_F(SearchResults, KeepsWhatPassesTheChain)
         const auto pChain = Chain(entry.vKinds, entry.vIds);
         const Set set = CopyContacts(*pChain);
         std::vector<int> vKept;
+        vKept.reserve(9);
         for (int i = 0; i < set->iResultNum; ++i)
         {
             vKept.push_back(set->pDetail[i].iContactID);
@@ -261,7 +262,7 @@ TEST_F(SearchResults, CopiesTheSpecialNumbers)
         EXPECT_EQ(set->pDetail[i].iSortIndex, i);
         EXPECT_EQ(std::wcslen(set->pDetail[i].szLocalizerKey), lengths[i]);
     }
-    EXPECT_EQ(set->pDetail[6].szLocalizerKey[7], 0x3D2B);
+    EXPECT_EQ(set->pDetail[6].szLocalizerKey[7], wchar_t{0x3D2B});
     EXPECT_TRUE(m_log.Lines().empty());
     {
         const CMemoryFailure failure(1);

@@ -51,30 +51,30 @@ TEST_F(StoreCheck, TellsDamagedRecords)
 {
     const struct
     {
-        tag_ContactReg reg;
         int64_t llFileSize;
+        tag_ContactReg reg;
         bool bDamaged;
     } cases[] = {
-        {{0, 0, 0}, 0, false},
-        {{0, 0, 1000}, 0, false},
-        {{0, 0, 1001}, 0, true},
-        {{1, 0, 0}, 0, true},
-        {{1, 0, 0}, 703, true},
-        {{1, 0, 0}, 704, false},
-        {{1, 1, 1000}, 704, false},
-        {{1, 1, 1001}, 704, true},
-        {{5, 0, 1005}, 1005 * 704, false},
-        {{5, 0, 1005}, 1005 * 704 - 1, true},
-        {{1005, 0, 0}, 1005 * 704, false},
-        {{1005, -9, 3}, 1005 * 704, false},
-        {{-1, 0, 0}, 1005 * 704, true},
-        {{0, 0, -1}, 1005 * 704, true},
-        {{INT32_MIN, 0, 0}, INT64_MAX, true},
-        {{3050402, 0, 3050402}, INT64_MAX, false},
-        {{3050403, 0, 0}, INT64_MAX, true},
-        {{0, 0, 3050403}, INT64_MAX, true},
-        {{6100806, 0, 0}, INT64_MAX, true},
-        {{INT32_MAX, 0, INT32_MAX}, INT64_MAX, true},
+        {0, {0, 0, 0}, false},
+        {0, {0, 0, 1000}, false},
+        {0, {0, 0, 1001}, true},
+        {0, {1, 0, 0}, true},
+        {703, {1, 0, 0}, true},
+        {704, {1, 0, 0}, false},
+        {704, {1, 1, 1000}, false},
+        {704, {1, 1, 1001}, true},
+        {1005 * 704, {5, 0, 1005}, false},
+        {1005 * 704 - 1, {5, 0, 1005}, true},
+        {1005 * 704, {1005, 0, 0}, false},
+        {1005 * 704, {1005, -9, 3}, false},
+        {1005 * 704, {-1, 0, 0}, true},
+        {1005 * 704, {0, 0, -1}, true},
+        {INT64_MAX, {INT32_MIN, 0, 0}, true},
+        {INT64_MAX, {3050402, 0, 3050402}, false},
+        {INT64_MAX, {3050403, 0, 0}, true},
+        {INT64_MAX, {0, 0, 3050403}, true},
+        {INT64_MAX, {6100806, 0, 0}, true},
+        {INT64_MAX, {INT32_MAX, 0, INT32_MAX}, true},
     };
     for (const auto& entry : cases)
     {
@@ -160,8 +160,8 @@ TEST_F(StoreCheck, RandomFilesHarmNobody)
         ASSERT_NE(pResult, nullptr);
         for (int i = 0; i < pResult->iResultNum; ++i)
         {
-            EXPECT_EQ(pResult->pDetail[i].szLocalizerKey[10], 0);
-            EXPECT_EQ(pResult->pDetail[i].szReserved[4], 0);
+            EXPECT_EQ(pResult->pDetail[i].szLocalizerKey[10], L'\0');
+            EXPECT_EQ(pResult->pDetail[i].szReserved[4], L'\0');
         }
         m_store.FreeSearchResult(pResult);
         tag_ContactsStruct* pContacts = nullptr;

@@ -2,7 +2,7 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
-#include "Common/SystemTime.h"
+#include "Core/Stopwatch.h"
 #include "DBOperator/DBOperator.h"
 #include "DBOperator/DBOperatorFactory.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
@@ -31,20 +31,6 @@ int FileSize(const char* szPath)
     }
     return static_cast<int>(info.st_size);
 }
-
-// Milliseconds since it was made.
-class CStopwatch
-{
-public:
-    int Elapsed() const
-    {
-        return static_cast<int>(static_cast<uint32_t>(GetTickCount()) -
-                                static_cast<uint32_t>(m_iStart));
-    }
-
-private:
-    int32_t m_iStart = GetTickCount();
-};
 
 // The matcher for a kind of input, null for an unknown kind or without memory.
 std::unique_ptr<CQVLocalizerManager> CreateMatcher(IME_SEARCH_TYPE eSearchType)

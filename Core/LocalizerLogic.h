@@ -8,6 +8,7 @@
 class CDBOperator;
 class CFilterChain;
 class CMemManger;
+class CStopwatch;
 
 extern "C"
 {
@@ -78,6 +79,37 @@ public:
     void SetSortType(int iSortType);
     int GetSortType();
 
+    // Change notifications of the provider, after its change is in the database. They wait for
+    // the store lock without limit (one error line per refused attempt), except for a rebuild,
+    // which gives up like MemInit. The changes of the database, their notifications, SetSortType
+    // and MemInit are the business of one process at a time; any process may search meanwhile.
+    //
+    // A change that fails leaves the store marked (capacity 0), and the next notification of
+    // contacts or status then rebuilds it. So it does with a store that a killed process left
+    // unfinished and with a damaged one; the notifications of times and stars repair nothing.
+
+    // Rebuilds the store from the database in the stored order. The pinyin table stays as it is.
+    void OnContactsTableChanged();
+    // The iRecordNum contacts of pIds appeared, changed or went. Contacts that appear or go
+    // together are named in one call: the stored count becomes the database's. The array is used
+    // up: ids found in the store are taken out, the last one moving into each gap. The store is
+    // rebuilt instead of patched when its capacity or its mark asks for it, the database cannot
+    // be counted, or the reader cannot list the ids whole (more than 200, more text than it
+    // takes, ids beyond 32 bits). Online bits of patched contacts wait for the next notification
+    // of status. Null pIds or a count of 0 or less: nothing.
+    void OnContactsTableChanged(int iRecordNum, long long* pIds);
+    // Who is online changed: sets and clears the bits of all contacts in place. The arguments are
+    // not used. When who is online cannot be read, the bits stay.
+    void OnStatusUpdatesTableChanged(int iRecordNum, long long* pIds);
+    // The contact was contacted at llTime, in milliseconds since 1970: stores the time, counts
+    // one more contact and, in a store in time order, makes it the first. Contacts that are not
+    // stored change nothing.
+    void OnContactTimeChanged(long iContactID, long long llTime);
+    // The contact became a favourite (1) or ceased to be one (any other value).
+    void OnContactStarChanged(long iContactID, long lStarred);
+    // The stored sort type, read from the file; 0 when there is no store or it is damaged.
+    int OnGetSortType();
+
 private:
     int BuildIndex(tag_ContactsInfo& record);
     int ReadContacts(tag_ContactsInfo& record);
@@ -85,6 +117,11 @@ private:
     static int SortByStoredOrder(tag_ContactsInfo& record, int iSortType);
     void CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain,
                     tag_LocalizerResult** ppSource);
+    int RebuildStore(tag_ContactsInfo& record);
+    bool HasRoomForAll(int& iDatabaseCount);
+    bool PatchStore(int iDatabaseCount, int iRecordNum, long long* pIds, const CStopwatch& watch);
+    bool HasUnbuiltContacts(int iTotalNum);
+    bool RefreshOnlineStatus();
 
     CMemManger* m_pclMemManger;
     CDBOperator* m_pDBOperator;

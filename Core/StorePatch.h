@@ -1,0 +1,96 @@
+#ifndef QV_CORE_STOREPATCH_H
+#define QV_CORE_STOREPATCH_H
+
+// Changes to stored records where they lie, under the store lock that the caller holds.
+
+#include "Common/CommonQsort.h"
+#include "Core/ContactRecords.h"
+
+// Keeps the registration record from looking complete while stored records change: its capacity
+// is 0 from construction on, which makes the next notification rebuild the store. Only Finish
+// puts it back, so a writer that fails, or dies, leaves the store marked.
+class CStoreMark
+{
+public:
+    explicit CStoreMark(tag_ContactReg& reg);
+    CStoreMark(const CStoreMark&) = delete;
+    CStoreMark& operator=(const CStoreMark&) = delete;
+
+    int Capacity() const { return m_iCapacity; }
+    int SortType() const { return m_iSortType; }
+    // The change is complete. A sort type that was set meanwhile keeps the mark: the records are
+    // not in its order.
+    void Finish();
+
+private:
+    tag_ContactReg& m_reg;
+    int m_iCapacity;
+    int m_iSortType;
+};
+
+// The ids of a notification that have not been found yet. The array stays the caller's and is
+// changed: an id that is taken out is replaced by the last one.
+class CChangedIds
+{
+public:
+    CChangedIds(long long* pIds, int iNum) : m_pIds(pIds), m_iNum(iNum) {}
+
+    bool IsEmpty() const { return m_iNum == 0; }
+    // Takes out the first id that equals the contact's; false when there is none.
+    bool Take(int iContactID);
+
+private:
+    long long* m_pIds;
+    int m_iNum;
+};
+
+enum PATCH_RESULT
+{
+    PATCH_DONE,
+    PATCH_FAILED, // the store holds what was changed so far
+    PATCH_FULL    // as PATCH_FAILED, for want of capacity
+};
+
+// The stored records while contacts are renewed, removed and inserted among them. Their number is
+// kept here; the registration record is the caller's business.
+class CStorePatch
+{
+public:
+    // iCount records of iCapacity slots in the order of iSortType. pRecords is null only without
+    // capacity.
+    CStorePatch(tag_ContactsStruct* pRecords, int iCount, int iCapacity, int iSortType);
+
+    int Count() const { return m_iCount; }
+
+    // Looks for the contacts of ids from slot 0 on, as long as there are ids left. A contact that
+    // has a record of the same converted name in changed is renewed by it in its slot and keeps
+    // its iSortIndex; the record leaves changed, whose last one takes its place. Slots of all
+    // other contacts found are listed in piRemoved, as long as the list of ids, in increasing
+    // order; their number is returned.
+    int Match(CChangedIds& ids, tag_ContactsInfo& changed, int* piRemoved);
+    // Closes the gaps of iNum slots, listed in increasing order.
+    void Remove(const int* piSlots, int iNum);
+    // Puts every record of inserted, whose names are converted, where it belongs, its iSortIndex
+    // being its slot.
+    PATCH_RESULT Insert(tag_ContactsInfo& inserted);
+    // Numbers the records of a store in name order by their slots; does nothing in time order.
+    void Renumber();
+    // Clears the slots behind the records up to iTotalNum, at most the capacity.
+    void ClearUpTo(int iTotalNum);
+
+private:
+    bool Renew(int iSlot, tag_ContactsInfo& changed);
+    PATCH_RESULT InsertOne(tag_ContactsStruct& record);
+    bool IsTimeOrder() const { return m_iSortType == STORE_ORDER_TIME; }
+
+    tag_ContactsStruct* m_pRecords;
+    int m_iCount;
+    int m_iCapacity;
+    int m_iSortType;
+    Common_Qsort m_sorter;
+};
+
+// Moves the record of iSlot to slot 0 and the records before it one slot up.
+void MoveToFront(tag_ContactsStruct* pRecords, int iSlot);
+
+#endif

@@ -8,7 +8,10 @@
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "LocalizerImpl/QVNumLocalizerManager.h"
 #include "LocalizerImpl/QVWordLocalizerManager.h"
+#include "LocalizerImpl/SearchRun.h"
+#include "MemManager/ContactSelection.h"
 #include "MemManager/MemManger.h"
+#include "MemManager/ResultSet.h"
 
 #include <sys/stat.h>
 #include <unistd.h>
@@ -32,7 +35,7 @@ int FileSize(const char* szPath)
     return static_cast<int>(info.st_size);
 }
 
-// The matcher for a kind of input, null for an unknown kind or without memory.
+// The matcher for a kind of input, null without memory.
 std::unique_ptr<CQVLocalizerManager> CreateMatcher(IME_SEARCH_TYPE eSearchType)
 {
     using Owner = std::unique_ptr<CQVLocalizerManager>;
@@ -45,6 +48,18 @@ bool IsKnownType(IME_SEARCH_TYPE eSearchType)
 {
     return eSearchType == IME_SEARCH_WORD || eSearchType == IME_SEARCH_NUM ||
            eSearchType == IME_SEARCH_SPECIAL;
+}
+
+// The caller's result with room for iNum entries; null for want of memory.
+tag_LocalizerResult* NewResult(int iNum)
+{
+    bool bNoEntries = false;
+    tag_LocalizerResult* pResult = NewSet(iNum, &bNoEntries);
+    if (bNoEntries)
+    {
+        QV_LOGE(QV_LOG_TAG, "QV_Contacts: CopySearchResult malloc mem error");
+    }
+    return pResult;
 }
 
 // A result set of the store manager, released with the scope.
@@ -207,36 +222,45 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
         return -1;
     }
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search Start\n");
-    CResultOwner copy(*m_pclMemManger);
-    tag_LocalizerResult* pSource = pLastResult;
-    int bTimeOrder = 0;
-    if (pLastResult == nullptr)
-    {
-        CopySource(eSearchType, *pFilterChain, copy.Receive());
-        pSource = copy.Get();
-        bTimeOrder = m_pclMemManger->GetSortType() == STORE_ORDER_TIME ? 1 : 0;
-    }
-    CResultOwner work(*m_pclMemManger);
-    int iRet = m_pclMemManger->NewSearchResult(pSource, work.Receive());
-    if (iRet != 0 || !IsKnownType(eSearchType))
-    {
-        return iRet;
-    }
-    const CStopwatch watch;
     const std::unique_ptr<CQVLocalizerManager> matcher = CreateMatcher(eSearchType);
     if (matcher == nullptr)
     {
         return -1;
     }
-    iRet =
-        matcher->DoSearch(pSource, szInput, eSearchType, bTimeOrder, work.Get(), pMask, szWordOut);
+    // The text is looked at before the store, so that only what can match is copied out of it.
+    CSearchRun run(*matcher);
+    const bool bKnown = IsKnownType(eSearchType);
+    const bool bComplete = szInput != nullptr && pMask != nullptr && szWordOut != nullptr;
+    const int iBegun = bKnown && bComplete ? run.Begin(szInput) : LOC_ERR_PARAM;
+    CResultOwner copy(*m_pclMemManger);
+    tag_LocalizerResult* pSource = pLastResult;
+    int bTimeOrder = 0;
+    if (pLastResult == nullptr)
+    {
+        CopySource(eSearchType, *pFilterChain, run, copy.Receive());
+        pSource = copy.Get();
+        bTimeOrder = m_pclMemManger->GetSortType() == STORE_ORDER_TIME ? 1 : 0;
+    }
+    if (pSource == nullptr)
+    {
+        return -1;
+    }
+    if (!bKnown || iBegun != 0)
+    {
+        return bKnown ? iBegun : 0;
+    }
+    const CStopwatch watch;
+    tag_LocalizerResult* pResult = NewResult(run.Find(*pSource, bTimeOrder));
+    run.Finish(*pSource, pResult, pMask, szWordOut);
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search IFL_Search time = %d\n", watch.Elapsed());
-    return iRet == 0 ? m_pclMemManger->CopySearchResult(work.Get(), ppResult) : iRet;
+    *ppResult = pResult;
+    return pResult != nullptr ? 0 : -1;
 }
 
-// The set to search when the caller gives none; a failure leaves it empty or null.
+// The set to search when the caller gives none, less what the search rules out; a failure leaves
+// it empty or null.
 void CLocalizerLogic::CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain,
-                                 tag_LocalizerResult** ppSource)
+                                 CCandidateTest& test, tag_LocalizerResult** ppSource)
 {
     const CStopwatch watch;
     if (eSearchType == IME_SEARCH_SPECIAL)
@@ -245,7 +269,7 @@ void CLocalizerLogic::CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chai
     }
     else
     {
-        m_pclMemManger->CopyContactsResult(chain, ppSource);
+        CContactSelection::Copy(chain, &test, ppSource);
     }
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search CopyContactsResult time = %d\n", watch.Elapsed());
 }

@@ -5,6 +5,7 @@
 #include "Core/ContactRecords.h"
 #include "Core/SearchRecords.h"
 
+class CCandidateTest;
 class CDBOperator;
 class CFilterChain;
 class CMemManger;
@@ -115,7 +116,7 @@ private:
     int ReadContacts(tag_ContactsInfo& record);
     void ReadOnlineStatus(tag_ContactsInfo& record);
     static int SortByStoredOrder(tag_ContactsInfo& record, int iSortType);
-    void CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain,
+    void CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain, CCandidateTest& test,
                     tag_LocalizerResult** ppSource);
     int RebuildStore(tag_ContactsInfo& record);
     bool HasRoomForAll(int& iDatabaseCount);

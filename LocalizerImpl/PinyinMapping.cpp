@@ -130,8 +130,8 @@ int CQVLocalizerManager::ReleasePinYinFileMapping(long hMap)
 
 int CQVLocalizerManager::FindRecord(Common_Qsort& sorter, PYOFWORDS* pMap, const char* szKey)
 {
-    return sorter.Search_Bin(reinterpret_cast<char*>(pMap), PY_WORD_COUNT,
-                             const_cast<char*>(szKey), SORT_PYWORD, 0);
+    return sorter.Search_Bin(reinterpret_cast<char*>(pMap), PY_WORD_COUNT, const_cast<char*>(szKey),
+                             SORT_PYWORD, 0);
 }
 
 bool CQVLocalizerManager::IsEnglishWord(wchar_t unit)

@@ -1,136 +1,23 @@
-// One search: the typed text against every candidate, the ranked result, the next keys and the
-// candidate characters.
-//
-// Every way to cut the text into pieces is tried on every name, but not one by one: PieceTable
-// knows which pieces fit which characters, RunFinder follows them through a name. What a
-// successful comparison of a last piece adds to the mask and to the candidate characters is the
-// same for every name with that character, so it is collected per character and added at the end,
-// in the order in which trying split by split and contact by contact would have met it.
+// The object of one search: its state, and the comparisons it is made of, one by one. How they are
+// put together for a whole search is told in SearchRun.cpp.
 
 #include "LocalizerImpl/QVLocalizerManager.h"
 
 #include "Common/CommonQsort.h"
-#include "Common/Log.h"
 #include "Common/WideString.h"
 #include "LocalizerImpl/NameFolding.h"
-#include "LocalizerImpl/PieceTable.h"
 #include "LocalizerImpl/PinyinTable.h"
-#include "LocalizerImpl/RankingOrder.h"
 #include "LocalizerImpl/RunFinder.h"
+#include "LocalizerImpl/SearchRun.h"
 
 #include <algorithm>
-#include <cstring>
-#include <ctime>
 #include <iterator>
 
 namespace
 {
 
-constexpr int SPLIT_SHIFT = 32; // a discovery key: split above, candidate below
-constexpr int64_t MS_PER_SECOND = 1000;
 constexpr int POSITION_BITS = 16; // of iMatchPos: start above, end below
 constexpr uint32_t POSITION_MASK = 0xFFFF;
-
-// Characters that the search found first, in order of discovery.
-class CFirstFound
-{
-public:
-    void Offer(tag_PieceRow& row)
-    {
-        tag_PieceRow** ppEnd = m_apRows + m_iCount;
-        tag_PieceRow** ppPlace = std::find_if(m_apRows, ppEnd,
-                                              [&row](const tag_PieceRow* pRow)
-                                              { return row.uFirstFound < pRow->uFirstFound; });
-        if (ppPlace - m_apRows == CN_WORD_MAX)
-        {
-            return;
-        }
-        std::move_backward(ppPlace, m_apRows + std::min(m_iCount, CN_WORD_MAX - 1),
-                           m_apRows + std::min(m_iCount + 1, CN_WORD_MAX));
-        *ppPlace = &row;
-        m_iCount = std::min(m_iCount + 1, CN_WORD_MAX);
-    }
-
-    int Count() const { return m_iCount; }
-    tag_PieceRow& At(int i) const { return *m_apRows[i]; }
-
-private:
-    tag_PieceRow* m_apRows[CN_WORD_MAX] = {};
-    int m_iCount = 0;
-};
-
-// Feeds the mask and the candidate characters of a manager from what a search marked.
-class CFindingsWriter
-{
-public:
-    CFindingsWriter(CQVLocalizerManager& manager, PYOFWORDS* pMap, _mask_type& mask,
-                    CPieceTable& table)
-        : m_manager(manager), m_pMap(pMap), m_mask(mask), m_table(table)
-    {
-    }
-
-    void Write()
-    {
-        CFirstFound firstFound;
-        for (int i = 0; i < m_table.RowCount(); ++i)
-        {
-            tag_PieceRow& row = m_table.RowAt(i);
-            if (row.uFirstFound != CPieceTable::NOT_FOUND && IsHanZiCode(CodeBits(row.code)))
-            {
-                firstFound.Offer(row);
-            }
-        }
-        for (int i = 0; i < firstFound.Count(); ++i)
-        {
-            TakeFirstPiece(firstFound.At(i));
-        }
-        for (int i = 0; i < m_table.RowCount(); ++i)
-        {
-            TakeOtherPieces(m_table.RowAt(i));
-            TakeNextKeys(m_table.RowAt(i));
-        }
-    }
-
-private:
-    void TakeFirstPiece(tag_PieceRow& row)
-    {
-        const unsigned uSplit = static_cast<unsigned>(row.uFirstFound >> SPLIT_SHIFT);
-        TakeLastPiece(row, m_table.InputLength() - 1 - __builtin_ctz(uSplit));
-    }
-
-    // The character is listed by now or the list is full: these add to the mask alone.
-    void TakeOtherPieces(tag_PieceRow& row)
-    {
-        for (unsigned uOffsets = row.uLastOffsets; uOffsets != 0; uOffsets &= uOffsets - 1)
-        {
-            TakeLastPiece(row, __builtin_ctz(uOffsets));
-        }
-    }
-
-    void TakeLastPiece(tag_PieceRow& row, int iOffset)
-    {
-        if (IsHanZiCode(CodeBits(row.code)))
-        {
-            int iFull = 0;
-            m_manager.CmpChineseWord(m_pMap, row.code, m_pMap[HanZiRecord(row.code)],
-                                     m_table.Piece(iOffset, m_table.InputLength()), &m_mask, 1,
-                                     iFull);
-        }
-    }
-
-    void TakeNextKeys(const tag_PieceRow& row)
-    {
-        if (row.bBehindRun)
-        {
-            m_manager.CreateMaskWord(m_pMap, row.code);
-        }
-    }
-
-    CQVLocalizerManager& m_manager;
-    PYOFWORDS* m_pMap;
-    _mask_type& m_mask;
-    CPieceTable& m_table;
-};
 
 } // namespace
 
@@ -160,116 +47,14 @@ int CQVLocalizerManager::DoSearch(tag_LocalizerResult* pCandidates, wchar_t* szI
     {
         return LOC_ERR_PARAM;
     }
-    _wcslwr(szInput);
-    ClearSearch();
-    const size_t uInputLen = _wcslen(szInput);
-    m_iInputLen = static_cast<int>(std::min<size_t>(uInputLen, LOC_MAX_INPUT + 1));
-    if (m_iInputLen > LOC_MAX_INPUT)
+    CSearchRun run(*this);
+    const int iRet = run.Begin(szInput);
+    if (iRet == 0)
     {
-        return LOC_ERR_PARAM;
+        run.Find(*pCandidates, bTimeOrder);
+        run.Finish(*pCandidates, pResult, pMask, szWordOut);
     }
-    const CPinyinTable table;
-    if (!table.IsOpen())
-    {
-        return LOC_ERR_MAP;
-    }
-    if (m_iInputLen > 0)
-    {
-        ProcessInputCNWord(table.Records(), szInput);
-        FindMatches(*pCandidates, table.Records(), szInput);
-    }
-    else
-    {
-        ListAll(*pCandidates, table.Records(), bTimeOrder);
-    }
-    WriteResult(*pCandidates, *pResult);
-    *pMask = static_cast<long>(m_stMask.lMask);
-    QV_LOGD(QV_LOG_TAG, "QV_Contacts:DoSearch QVLocalizerManger pMask = %x\n", m_stMask.lMask);
-    WriteCandidateWords(szWordOut);
-    m_vLocateArray.clear();
-    return 0;
-}
-
-void CQVLocalizerManager::ListAll(const tag_LocalizerResult& candidates, PYOFWORDS* pMap,
-                                  int bTimeOrder)
-{
-    if (bTimeOrder != 0)
-    {
-        m_llNowMs = static_cast<int64_t>(std::time(nullptr)) * MS_PER_SECOND;
-    }
-    CPieceTable table(*this, pMap, L"", 0);
-    for (int32_t i = 0; candidates.pDetail != nullptr && i < candidates.iResultNum; ++i)
-    {
-        const tag_LocalizerDetail& detail = candidates.pDetail[i];
-        wchar_t szFirstWord[2] = {};
-        if (bTimeOrder != 0)
-        {
-            GetFirstWord(static_cast<long long>(detail.llLastTimeContacted), szFirstWord);
-        }
-        else
-        {
-            GetFirstWord(pMap, detail.szLocalizerKey[0], szFirstWord);
-        }
-        m_vLocateArray.push({i, MATCH_LIST, 0, static_cast<int32_t>(szFirstWord[0])});
-        const int iOffered =
-            m_bMatchAnywhere != 0 ? NameLength(detail) : std::min(NameLength(detail), 1);
-        for (int iCode = 0; iCode < iOffered; ++iCode)
-        {
-            table.RowOf(detail.szLocalizerKey[iCode]).bBehindRun = true;
-        }
-    }
-    CFindingsWriter(*this, pMap, m_stMask, table).Write();
-}
-
-void CQVLocalizerManager::FindMatches(tag_LocalizerResult& candidates, PYOFWORDS* pMap,
-                                      wchar_t* szInput)
-{
-    CPieceTable table(*this, pMap, szInput, m_iInputLen);
-    CRunFinder finder(table, m_bMatchAnywhere != 0);
-    android::Vector<uint16_t> vFirstSplits; // when each match was first found
-    for (int32_t i = 0; candidates.pDetail != nullptr && i < candidates.iResultNum; ++i)
-    {
-        tag_NameMatch match;
-        if (finder.Find(candidates.pDetail[i], i, match) &&
-            vFirstSplits.add(match.uFirstSplit) >= 0)
-        {
-            m_vLocateArray.push({i, match.iMatchType, match.iMatchPos, 0});
-        }
-    }
-    CFindingsWriter(*this, pMap, m_stMask, table).Write();
-    const int iMatches = static_cast<int>(m_vLocateArray.size());
-    if (iMatches > 1 && RankMatches(m_vLocateArray, vFirstSplits.array(), candidates.pDetail) != 0)
-    {
-        LocalResultQuickSort(m_vLocateArray, 0, iMatches - 1, candidates.pDetail);
-    }
-}
-
-void CQVLocalizerManager::WriteResult(const tag_LocalizerResult& candidates,
-                                      tag_LocalizerResult& result)
-{
-    const int iMatches = static_cast<int>(m_vLocateArray.size());
-    QV_LOGD(QV_LOG_TAG, "QV_Contacts:DoSearch m_vLocateArray nCount = %d\n", iMatches);
-    result.iResultNum = result.pDetail == nullptr ? 0 : iMatches;
-    for (int i = 0; i < result.iResultNum; ++i)
-    {
-        const _MatchResult& match = m_vLocateArray[static_cast<size_t>(i)];
-        tag_LocalizerDetail& entry = result.pDetail[i];
-        entry = candidates.pDetail[match.iIndex];
-        entry.iMatchPos = match.iMatchPos;
-        entry.iFirstWord = match.iFirstWord;
-    }
-}
-
-void CQVLocalizerManager::WriteCandidateWords(wchar_t* szWordOut) const
-{
-    for (const CNWORDOUTPUT& word : m_stCNWords)
-    {
-        if (word.wszWord[0] == 0)
-        {
-            return;
-        }
-        *szWordOut++ = word.wszWord[0];
-    }
+    return iRet;
 }
 
 int CQVLocalizerManager::DoCompare(PYOFWORDS* pMap, tag_LocalizerDetail* pDetail,
@@ -279,7 +64,7 @@ int CQVLocalizerManager::DoCompare(PYOFWORDS* pMap, tag_LocalizerDetail* pDetail
     {
         return 0;
     }
-    const int iLength = NameLength(*pDetail);
+    const int iLength = NameLength(pDetail->szLocalizerKey);
     const int iPieces = static_cast<int>(vPieces.size());
     for (int iStart = 0; iStart + iPieces <= iLength; ++iStart)
     {

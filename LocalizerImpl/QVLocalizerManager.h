@@ -197,11 +197,9 @@ protected:
     explicit CQVLocalizerManager(int bMatchAnywhere);
 
 private:
+    friend class CSearchRun;
+
     void ClearSearch();
-    void ListAll(const tag_LocalizerResult& candidates, PYOFWORDS* pMap, int bTimeOrder);
-    void FindMatches(tag_LocalizerResult& candidates, PYOFWORDS* pMap, wchar_t* szInput);
-    void WriteResult(const tag_LocalizerResult& candidates, tag_LocalizerResult& result);
-    void WriteCandidateWords(wchar_t* szWordOut) const;
     bool CompareRun(PYOFWORDS* pMap, const wchar_t* pCodes,
                     const android::Vector<wchar_t*>& vPieces, int& bRunFull);
     bool ComparePiece(PYOFWORDS* pMap, wchar_t code, wchar_t* szPiece, bool bLast, int& bRunFull);

@@ -16,16 +16,34 @@ int LowestBit(unsigned uBits)
 
 } // namespace
 
-bool CRunFinder::Find(const tag_LocalizerDetail& candidate, int32_t iCandidate,
-                      tag_NameMatch& match)
+// Finds the rows of a name's characters; returns the number of characters where a run may begin.
+int CRunFinder::LookUp(const wchar_t* pCodes)
 {
-    m_iLength = NameLength(candidate);
+    m_iLength = NameLength(pCodes);
     for (int i = 0; i < m_iLength; ++i)
     {
-        m_apRows[i] = &m_table.RowOf(candidate.szLocalizerKey[i]);
+        m_apRows[i] = &m_table.RowOf(pCodes[i]);
     }
+    return m_bAnywhere ? m_iLength : std::min(m_iLength, 1);
+}
+
+bool CRunFinder::CanMatch(const wchar_t* pCodes)
+{
+    const int iStarts = LookUp(pCodes);
+    for (int iStart = 0; iStart < iStarts; ++iStart)
+    {
+        if (LeadsToEnd(iStart))
+        {
+            return true;
+        }
+    }
+    return false;
+}
+
+bool CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& match)
+{
+    const int iStarts = LookUp(pCodes);
     bool bFound = false;
-    const int iStarts = m_bAnywhere ? m_iLength : std::min(m_iLength, 1);
     for (int iStart = 0; iStart < iStarts; ++iStart)
     {
         if (!LeadsToEnd(iStart))

@@ -26,13 +26,18 @@ public:
     // bAnywhere false: runs begin at a name's first character only.
     CRunFinder(CPieceTable& table, bool bAnywhere) : m_table(table), m_bAnywhere(bAnywhere) {}
 
-    // Whether the text spells a run of the candidate's name; then match tells how, and the rows
-    // of the characters that took a last piece or stood behind a run are marked.
-    bool Find(const tag_LocalizerDetail& candidate, int32_t iCandidate, tag_NameMatch& match);
+    // Whether the text spells a run of the name with these codes (at most CONTACT_MAX_KEY, ending
+    // at the first 0).
+    bool CanMatch(const wchar_t* pCodes);
+
+    // The same; then match tells how, and the rows of the characters that took a last piece or
+    // stood behind a run are marked as found by candidate iCandidate.
+    bool Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& match);
 
 private:
     static constexpr int SPLIT_WORDS = (1 << (LOC_MAX_INPUT - 1)) / 64;
 
+    int LookUp(const wchar_t* pCodes);
     bool LeadsToEnd(int iStart);
     void Extend(int iPiece, int iOffset, uint32_t uSplit, bool bAllFull);
     void Record(int iPieces, int iLastOffset, uint32_t uSplit, bool bAllFull);
@@ -50,10 +55,10 @@ private:
 };
 
 // Number of codes of a name, at most CONTACT_MAX_KEY.
-inline int NameLength(const tag_LocalizerDetail& detail)
+inline int NameLength(const wchar_t* pCodes)
 {
     int iLength = 0;
-    while (iLength < CONTACT_MAX_KEY && detail.szLocalizerKey[iLength] != 0)
+    while (iLength < CONTACT_MAX_KEY && pCodes[iLength] != 0)
     {
         ++iLength;
     }

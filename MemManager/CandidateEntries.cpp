@@ -52,21 +52,28 @@ void Prefetch(const tag_ContactsStruct& record)
 
 } // namespace
 
-int CCandidateEntries::Select(const tag_ContactsStruct* pRecords, int iCount,
-                              const CFilterChain& chain, tag_LocalizerDetail* pEntries)
+CCandidateEntries::Counts CCandidateEntries::Select(const tag_ContactsStruct* pRecords, int iCount,
+                                                    const CFilterChain& chain,
+                                                    CCandidateTest* pTest,
+                                                    tag_LocalizerDetail* pEntries)
 {
     const CRecordTest test(chain);
     const bool bAll = chain.GetFilterNum() == 0;
-    int iKept = 0;
+    Counts counts = {0, 0};
     for (int i = 0; i < iCount; ++i)
     {
         Prefetch(pRecords[std::min(i + PREFETCH_AHEAD, iCount - 1)]);
-        if (bAll || test.Keeps(pRecords[i]))
+        if (!bAll && !test.Keeps(pRecords[i]))
         {
-            FillEntry(pRecords[i], &pEntries[iKept++]);
+            continue;
+        }
+        ++counts.iKept;
+        if (pTest == nullptr || pTest->MayMatch(pRecords[i].szLocalizerKey))
+        {
+            FillEntry(pRecords[i], &pEntries[counts.iWritten++]);
         }
     }
-    return iKept;
+    return counts;
 }
 
 void CCandidateEntries::NarrowCopy(tag_ContactsInfo* pCopy, CFilterChain& chain,

@@ -6,17 +6,24 @@
 
 #include "Core/ContactRecords.h"
 #include "Core/SearchRecords.h"
+#include "MemManager/CandidateTest.h"
 
 class CFilterChain;
 
 class CCandidateEntries
 {
 public:
+    struct Counts
+    {
+        int iKept;    // records that pass the filters
+        int iWritten; // those of them that the test does not rule out
+    };
+
     // Writes an entry for each of the iCount records that passes the chain, which has to be one
-    // that CRecordTest::CanTest accepts, and returns their number. The records are only read, so
-    // they may lie in a mapping; pEntries has room for iCount entries.
-    static int Select(const tag_ContactsStruct* pRecords, int iCount, const CFilterChain& chain,
-                      tag_LocalizerDetail* pEntries);
+    // that CRecordTest::CanTest accepts, and that pTest (may be null) does not rule out. The
+    // records are only read, so they may lie in a mapping; pEntries has room for iCount entries.
+    static Counts Select(const tag_ContactsStruct* pRecords, int iCount, const CFilterChain& chain,
+                         CCandidateTest* pTest, tag_LocalizerDetail* pEntries);
 
     // Narrows the caller's copy of the records by the pipeline of filter processes and makes the
     // entries of what is left, in a new array of pResult, which comes in empty. It stays empty

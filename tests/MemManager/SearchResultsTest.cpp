@@ -232,8 +232,9 @@ TEST_F(SearchResults, BothWaysToTheEntriesAgree)
         }
         const int iNum = static_cast<int>(vRecords.size());
         std::vector<tag_LocalizerDetail> vEntries(vRecords.size());
-        const int iKept =
-            CCandidateEntries::Select(vRecords.data(), iNum, *pChain, vEntries.data());
+        const CCandidateEntries::Counts counts =
+            CCandidateEntries::Select(vRecords.data(), iNum, *pChain, nullptr, vEntries.data());
+        const int iKept = counts.iKept;
         tag_ContactsInfo copy = {iNum, vRecords.data()};
         const Set set = Own(new tag_LocalizerResult());
         CCandidateEntries::NarrowCopy(&copy, *pChain, set.get());

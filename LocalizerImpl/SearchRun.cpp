@@ -1,0 +1,270 @@
+// One search: the typed text against every candidate, the ranked result, the next keys and the
+// candidate characters.
+//
+// Every way to cut the text into pieces is tried on every name, but not one by one: PieceTable
+// knows which pieces fit which characters, RunFinder follows them through a name. What a
+// successful comparison of a last piece adds to the mask and to the candidate characters is the
+// same for every name with that character, so it is collected per character and added at the end,
+// in the order in which trying split by split and contact by contact would have met it.
+
+#include "LocalizerImpl/SearchRun.h"
+
+#include "Common/Log.h"
+#include "Common/WideString.h"
+#include "LocalizerImpl/RankingOrder.h"
+
+#include <algorithm>
+#include <ctime>
+
+namespace
+{
+
+constexpr int SPLIT_SHIFT = 32; // a discovery key: split above, candidate below
+constexpr int64_t MS_PER_SECOND = 1000;
+
+// Characters that the search found first, in order of discovery.
+class CFirstFound
+{
+public:
+    void Offer(tag_PieceRow& row)
+    {
+        tag_PieceRow** ppEnd = m_apRows + m_iCount;
+        tag_PieceRow** ppPlace = std::find_if(m_apRows, ppEnd,
+                                              [&row](const tag_PieceRow* pRow)
+                                              { return row.uFirstFound < pRow->uFirstFound; });
+        if (ppPlace - m_apRows == CN_WORD_MAX)
+        {
+            return;
+        }
+        std::move_backward(ppPlace, m_apRows + std::min(m_iCount, CN_WORD_MAX - 1),
+                           m_apRows + std::min(m_iCount + 1, CN_WORD_MAX));
+        *ppPlace = &row;
+        m_iCount = std::min(m_iCount + 1, CN_WORD_MAX);
+    }
+
+    int Count() const { return m_iCount; }
+    tag_PieceRow& At(int i) const { return *m_apRows[i]; }
+
+private:
+    tag_PieceRow* m_apRows[CN_WORD_MAX] = {};
+    int m_iCount = 0;
+};
+
+// Feeds the mask and the candidate characters of a manager from what a search marked.
+class CFindingsWriter
+{
+public:
+    CFindingsWriter(CQVLocalizerManager& manager, PYOFWORDS* pMap, _mask_type& mask,
+                    CPieceTable& table)
+        : m_manager(manager), m_pMap(pMap), m_mask(mask), m_table(table)
+    {
+    }
+
+    void Write()
+    {
+        CFirstFound firstFound;
+        for (int i = 0; i < m_table.RowCount(); ++i)
+        {
+            tag_PieceRow& row = m_table.RowAt(i);
+            if (row.uFirstFound != CPieceTable::NOT_FOUND && IsHanZiCode(CodeBits(row.code)))
+            {
+                firstFound.Offer(row);
+            }
+        }
+        for (int i = 0; i < firstFound.Count(); ++i)
+        {
+            TakeFirstPiece(firstFound.At(i));
+        }
+        for (int i = 0; i < m_table.RowCount(); ++i)
+        {
+            TakeOtherPieces(m_table.RowAt(i));
+            TakeNextKeys(m_table.RowAt(i));
+        }
+    }
+
+private:
+    void TakeFirstPiece(tag_PieceRow& row)
+    {
+        const unsigned uSplit = static_cast<unsigned>(row.uFirstFound >> SPLIT_SHIFT);
+        TakeLastPiece(row, m_table.InputLength() - 1 - __builtin_ctz(uSplit));
+    }
+
+    // The character is listed by now or the list is full: these add to the mask alone.
+    void TakeOtherPieces(tag_PieceRow& row)
+    {
+        for (unsigned uOffsets = row.uLastOffsets; uOffsets != 0; uOffsets &= uOffsets - 1)
+        {
+            TakeLastPiece(row, __builtin_ctz(uOffsets));
+        }
+    }
+
+    void TakeLastPiece(tag_PieceRow& row, int iOffset)
+    {
+        if (IsHanZiCode(CodeBits(row.code)))
+        {
+            int iFull = 0;
+            m_manager.CmpChineseWord(m_pMap, row.code, m_pMap[HanZiRecord(row.code)],
+                                     m_table.Piece(iOffset, m_table.InputLength()), &m_mask, 1,
+                                     iFull);
+        }
+    }
+
+    void TakeNextKeys(const tag_PieceRow& row)
+    {
+        if (row.bBehindRun)
+        {
+            m_manager.CreateMaskWord(m_pMap, row.code);
+        }
+    }
+
+    CQVLocalizerManager& m_manager;
+    PYOFWORDS* m_pMap;
+    _mask_type& m_mask;
+    CPieceTable& m_table;
+};
+
+} // namespace
+
+int CSearchRun::Begin(wchar_t* szInput)
+{
+    if (szInput == nullptr)
+    {
+        return LOC_ERR_PARAM;
+    }
+    _wcslwr(szInput);
+    m_manager.ClearSearch();
+    const size_t uLength = _wcslen(szInput);
+    m_manager.m_iInputLen = static_cast<int>(std::min<size_t>(uLength, LOC_MAX_INPUT + 1));
+    if (m_manager.m_iInputLen > LOC_MAX_INPUT)
+    {
+        return LOC_ERR_PARAM;
+    }
+    m_table.emplace();
+    if (!m_table->IsOpen())
+    {
+        return LOC_ERR_MAP;
+    }
+    m_manager.ProcessInputCNWord(m_table->Records(), szInput);
+    m_pieces.emplace(m_manager, m_table->Records(), szInput, m_manager.m_iInputLen);
+    m_finder.emplace(*m_pieces, m_manager.m_bMatchAnywhere != 0);
+    return 0;
+}
+
+bool CSearchRun::MayMatch(const wchar_t* pCodes)
+{
+    return m_finder && (m_manager.m_iInputLen == 0 || m_finder->CanMatch(pCodes));
+}
+
+int CSearchRun::Find(const tag_LocalizerResult& candidates, int bTimeOrder)
+{
+    if (m_manager.m_iInputLen == 0)
+    {
+        ListAll(candidates, bTimeOrder);
+    }
+    else
+    {
+        FindMatches(candidates);
+    }
+    CFindingsWriter(m_manager, m_table->Records(), m_manager.m_stMask, *m_pieces).Write();
+    return static_cast<int>(m_manager.m_vLocateArray.size());
+}
+
+void CSearchRun::ListAll(const tag_LocalizerResult& candidates, int bTimeOrder)
+{
+    if (bTimeOrder != 0)
+    {
+        m_manager.m_llNowMs = static_cast<int64_t>(std::time(nullptr)) * MS_PER_SECOND;
+    }
+    const int iOffered = m_manager.m_bMatchAnywhere != 0 ? CONTACT_MAX_KEY : 1;
+    const int iCount = candidates.pDetail == nullptr ? 0 : candidates.iResultNum;
+    m_manager.m_vLocateArray.setCapacity(static_cast<size_t>(std::max(iCount, 0)));
+    for (int32_t i = 0; i < iCount; ++i)
+    {
+        const tag_LocalizerDetail& detail = candidates.pDetail[i];
+        const wchar_t firstWord = IndexCharacter(detail, bTimeOrder);
+        m_manager.m_vLocateArray.push({i, MATCH_LIST, 0, static_cast<int32_t>(firstWord)});
+        const int iCodes = std::min(NameLength(detail.szLocalizerKey), iOffered);
+        for (int iCode = 0; iCode < iCodes; ++iCode)
+        {
+            m_pieces->RowOf(detail.szLocalizerKey[iCode]).bBehindRun = true;
+        }
+    }
+}
+
+wchar_t CSearchRun::IndexCharacter(const tag_LocalizerDetail& detail, int bTimeOrder)
+{
+    wchar_t szFirstWord[2] = {};
+    if (bTimeOrder != 0)
+    {
+        m_manager.GetFirstWord(static_cast<long long>(detail.llLastTimeContacted), szFirstWord);
+    }
+    else
+    {
+        CQVLocalizerManager::GetFirstWord(m_table->Records(), detail.szLocalizerKey[0],
+                                          szFirstWord);
+    }
+    return szFirstWord[0];
+}
+
+void CSearchRun::FindMatches(const tag_LocalizerResult& candidates)
+{
+    android::Vector<_MatchResult>& vMatches = m_manager.m_vLocateArray;
+    android::Vector<uint16_t> vFirstSplits; // when each match was first found
+    for (int32_t i = 0; candidates.pDetail != nullptr && i < candidates.iResultNum; ++i)
+    {
+        tag_NameMatch match;
+        if (m_finder->Find(candidates.pDetail[i].szLocalizerKey, i, match) &&
+            vFirstSplits.add(match.uFirstSplit) >= 0)
+        {
+            vMatches.push({i, match.iMatchType, match.iMatchPos, 0});
+        }
+    }
+    const int iMatches = static_cast<int>(vMatches.size());
+    if (iMatches > 1 && RankMatches(vMatches, vFirstSplits.array(), candidates.pDetail) != 0)
+    {
+        CQVLocalizerManager::LocalResultQuickSort(vMatches, 0, iMatches - 1, candidates.pDetail);
+    }
+}
+
+void CSearchRun::Finish(const tag_LocalizerResult& candidates, tag_LocalizerResult* pResult,
+                        long* pMask, wchar_t* szWordOut)
+{
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts:DoSearch m_vLocateArray nCount = %d\n",
+            static_cast<int>(m_manager.m_vLocateArray.size()));
+    if (pResult != nullptr)
+    {
+        WriteEntries(candidates, *pResult);
+    }
+    *pMask = static_cast<long>(m_manager.m_stMask.lMask);
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts:DoSearch QVLocalizerManger pMask = %x\n",
+            m_manager.m_stMask.lMask);
+    WriteCandidateWords(szWordOut);
+    m_manager.m_vLocateArray.clear();
+}
+
+void CSearchRun::WriteEntries(const tag_LocalizerResult& candidates,
+                              tag_LocalizerResult& result) const
+{
+    const android::Vector<_MatchResult>& vMatches = m_manager.m_vLocateArray;
+    result.iResultNum = result.pDetail == nullptr ? 0 : static_cast<int32_t>(vMatches.size());
+    for (int i = 0; i < result.iResultNum; ++i)
+    {
+        const _MatchResult& match = vMatches[static_cast<size_t>(i)];
+        tag_LocalizerDetail& entry = result.pDetail[i];
+        entry = candidates.pDetail[match.iIndex];
+        entry.iMatchPos = match.iMatchPos;
+        entry.iFirstWord = match.iFirstWord;
+    }
+}
+
+void CSearchRun::WriteCandidateWords(wchar_t* szWordOut) const
+{
+    for (const CNWORDOUTPUT& word : m_manager.m_stCNWords)
+    {
+        if (word.wszWord[0] == 0)
+        {
+            return;
+        }
+        *szWordOut++ = word.wszWord[0];
+    }
+}

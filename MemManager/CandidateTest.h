@@ -1,0 +1,16 @@
+#ifndef QV_MEMMANAGER_CANDIDATETEST_H
+#define QV_MEMMANAGER_CANDIDATETEST_H
+
+// What a search tells the store manager before it reads the store, so that contacts it cannot
+// find need no entry.
+class CCandidateTest
+{
+public:
+    virtual ~CCandidateTest() = default;
+
+    // False when no contact with these codes (at most CONTACT_MAX_KEY, ending at the first 0) can
+    // be in the search's result.
+    virtual bool MayMatch(const wchar_t* pCodes) = 0;
+};
+
+#endif

@@ -1,0 +1,140 @@
+#include "MemManager/ContactSelection.h"
+
+#include "Common/DataPaths.h"
+#include "Common/Log.h"
+#include "Filter/RecordTest.h"
+#include "MemManager/CandidateEntries.h"
+#include "MemManager/LockAttempts.h"
+#include "MemManager/StoreCheck.h"
+
+#include <cstring>
+#include <memory>
+#include <new>
+
+namespace
+{
+
+bool TakeLockForSearch(CStoreLock* pLock)
+{
+    const bool bTaken = TryStoreLock(
+        pLock,
+        [](int iAttempt)
+        {
+            QV_LOGE(QV_LOG_TAG, "QV_Contacts: CopyContactsResult write share memo lock false %d",
+                    iAttempt);
+        });
+    if (!bTaken)
+    {
+        QV_LOGE(QV_LOG_TAG, "QV_Contacts:CopyContactsResult write share memo lock false return");
+    }
+    return bTaken;
+}
+
+// Maps all stored records and returns their number; 0 when there are none to be read.
+int OpenStoredRecords(CReadMapping* pRecords)
+{
+    tag_ContactReg reg = {};
+    if (CStoreCheck::MapReg(&reg) != 0 || reg.iTotalNum <= 0)
+    {
+        return 0;
+    }
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts:CopyContactsResult iContactCount = %d\n", reg.iTotalNum);
+    return pRecords->Open(CDataPaths::ContactRecords(), StoreBytes(reg.iTotalNum)) ? reg.iTotalNum
+                                                                                   : 0;
+}
+
+template <typename T>
+std::unique_ptr<T[]> NewUnderLock(int iCount)
+{
+    std::unique_ptr<T[]> pArray(new (std::nothrow) T[static_cast<size_t>(iCount)]);
+    if (pArray == nullptr)
+    {
+        QV_LOGE(QV_LOG_TAG, "QV_Contacts: CopyContactsResult NEW mem error");
+    }
+    return pArray;
+}
+
+// The store as a search holds it while it reads: the lock, the mapping, the number of records.
+struct tag_OpenStore
+{
+    CStoreLock lock;
+    CReadMapping records;
+    int iCount = 0;
+
+    void Close()
+    {
+        records.Close();
+        lock.Release();
+    }
+};
+
+// Makes the entries from the records where they lie. That holds the lock no longer than copying
+// the records would: of each one or two cache lines are read, and entries are an eighth of them.
+// Room for all is taken, but only what is written costs memory.
+void SelectFromStore(tag_OpenStore* pStore, const CFilterChain& chain, CCandidateTest* pTest,
+                     tag_LocalizerResult* pResult)
+{
+    auto pEntries = NewUnderLock<tag_LocalizerDetail>(pStore->iCount);
+    if (pEntries == nullptr)
+    {
+        return;
+    }
+    const CCandidateEntries::Counts counts = CCandidateEntries::Select(
+        pStore->records.As<tag_ContactsStruct>(), pStore->iCount, chain, pTest, pEntries.get());
+    pStore->Close();
+    CCandidateEntries::LogFilterResult(counts.iKept);
+    if (counts.iWritten > 0)
+    {
+        pResult->iResultNum = counts.iWritten;
+        pResult->pDetail = pEntries.release();
+    }
+}
+
+// Copies the records out, gives the store back and filters the copy.
+void CopyFromStore(tag_OpenStore* pStore, CFilterChain& chain, tag_LocalizerResult* pResult)
+{
+    const auto pCopy = NewUnderLock<tag_ContactsStruct>(pStore->iCount);
+    if (pCopy == nullptr)
+    {
+        return;
+    }
+    std::memcpy(pCopy.get(), pStore->records.As<void>(), StoreBytes(pStore->iCount));
+    pStore->Close();
+    tag_ContactsInfo copy = {pStore->iCount, pCopy.get()};
+    CCandidateEntries::NarrowCopy(&copy, chain, pResult);
+}
+
+} // namespace
+
+void CContactSelection::Copy(CFilterChain& chain, CCandidateTest* pTest,
+                             tag_LocalizerResult** ppResult)
+{
+    if (ppResult == nullptr)
+    {
+        return;
+    }
+    *ppResult = new (std::nothrow) tag_LocalizerResult();
+    if (*ppResult == nullptr)
+    {
+        QV_LOGE(QV_LOG_TAG, "QV_Contacts:CopyContactsResult new LocalizerResult error");
+        return;
+    }
+    tag_OpenStore store;
+    if (!TakeLockForSearch(&store.lock))
+    {
+        return;
+    }
+    store.iCount = OpenStoredRecords(&store.records);
+    if (store.iCount == 0)
+    {
+        return;
+    }
+    if (CRecordTest::CanTest(chain))
+    {
+        SelectFromStore(&store, chain, pTest, *ppResult);
+    }
+    else
+    {
+        CopyFromStore(&store, chain, *ppResult);
+    }
+}

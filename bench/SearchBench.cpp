@@ -1,0 +1,277 @@
+// How long a keystroke, a build and a change take, beside what no implementation can beat.
+//
+// Every benchmark is one pass over its whole workload; the counters tell the result. Times in
+// counters are microseconds; a "share" is a time divided by what it is allowed, so that 1 is the
+// limit whatever machine runs it. bench/report.py turns the output into bench/README.md.
+
+#include "Core/LocalizerLogic.h"
+#include "Filter/FilterChain.h"
+#include "bench/Floors.h"
+#include "bench/PeakMemory.h"
+#include "bench/Queries.h"
+#include "bench/Workload.h"
+
+#include <benchmark/benchmark.h>
+
+#include <algorithm>
+#include <map>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace
+{
+
+constexpr int SIZES[] = {1000, 10000, 100000};
+constexpr int LARGEST = 100000;
+constexpr double MICROSECONDS = 1e6;
+constexpr double MIB = 1024.0 * 1024.0;
+constexpr int WORD_BUFFER = 64;
+constexpr int INPUT_BUFFER = 16;
+
+// The workloads are large: one stands at a time.
+CWorkload& WorkloadOf(int iContacts)
+{
+    static std::unique_ptr<CWorkload> pWorkload;
+    if (pWorkload == nullptr || pWorkload->Contacts() != iContacts)
+    {
+        pWorkload.reset();
+        pWorkload = std::make_unique<CWorkload>(iContacts);
+    }
+    return *pWorkload;
+}
+
+struct tag_Keystroke
+{
+    const tag_Query* pQuery;
+    size_t uTyped;
+    int iBefore; // entries searched in
+    int iAfter;  // entries found
+    double dSeconds;
+    size_t uPeakBytes;
+    double dAllowed;
+};
+
+double Percentile(std::vector<double> vValues, int iPercent)
+{
+    std::sort(vValues.begin(), vValues.end());
+    const size_t uIndex = (vValues.size() * static_cast<size_t>(iPercent) + 99) / 100;
+    return vValues[std::max<size_t>(uIndex, 1) - 1];
+}
+
+// Types all queries key by key and measures every keystroke.
+class CTypist
+{
+public:
+    explicit CTypist(bool bNarrow) : m_bNarrow(bNarrow) {}
+
+    std::vector<tag_Keystroke> TypeAll()
+    {
+        std::vector<tag_Keystroke> vKeystrokes;
+        for (const tag_Query& query : QUERIES)
+        {
+            Type(query, vKeystrokes);
+        }
+        return vKeystrokes;
+    }
+
+private:
+    void Type(const tag_Query& query, std::vector<tag_Keystroke>& vKeystrokes)
+    {
+        const std::wstring strText = query.szText;
+        tag_LocalizerResult* pPrevious = nullptr;
+        if (m_bNarrow)
+        {
+            pPrevious = Search(query.eType, L"", nullptr);
+        }
+        for (size_t uTyped = m_bNarrow ? 1 : 0; uTyped <= strText.size(); ++uTyped)
+        {
+            const std::wstring strTyped = strText.substr(0, uTyped);
+            vKeystrokes.push_back(Measure(query, strTyped, pPrevious));
+            if (m_bNarrow)
+            {
+                tag_LocalizerResult* pNext = Search(query.eType, strTyped, pPrevious);
+                m_logic.FreeSearchResult(pPrevious);
+                pPrevious = pNext;
+            }
+        }
+        m_logic.FreeSearchResult(pPrevious);
+    }
+
+    tag_Keystroke Measure(const tag_Query& query, const std::wstring& strTyped,
+                          tag_LocalizerResult* pPrevious)
+    {
+        tag_LocalizerResult* pResult = nullptr;
+        int iFound = 0;
+        CPeakMemory::Restart();
+        const double dSeconds = MedianSeconds(
+            MEASURE_RUNS, [&] { pResult = Search(query.eType, strTyped, pPrevious); },
+            [&]
+            {
+                iFound = pResult->iResultNum;
+                m_logic.FreeSearchResult(pResult);
+            });
+        const int iBefore = pPrevious == nullptr ? 0 : pPrevious->iResultNum;
+        return {&query, strTyped.size(), iBefore, iFound, dSeconds, CPeakMemory::PeakBytes(), 0};
+    }
+
+    tag_LocalizerResult* Search(IME_SEARCH_TYPE eType, const std::wstring& strText,
+                                tag_LocalizerResult* pPrevious)
+    {
+        wchar_t szInput[INPUT_BUFFER] = {};
+        std::copy(strText.begin(), strText.end(), szInput);
+        wchar_t szWords[WORD_BUFFER] = {};
+        long lMask = 0;
+        tag_LocalizerResult* pResult = nullptr;
+        m_logic.Search(pPrevious, szInput, eType, &m_chain, 0, &pResult, &lMask, szWords);
+        return pResult;
+    }
+
+    bool m_bNarrow;
+    CLocalizerLogic m_logic;
+    CFilterChain m_chain;
+};
+
+double EntriesOf(int iEntries)
+{
+    static std::map<int, double> floors;
+    const auto found = floors.find(iEntries);
+    return found != floors.end() ? found->second
+                                 : floors.emplace(iEntries, EntriesFloor(iEntries)).first->second;
+}
+
+void CountKeystrokes(benchmark::State& state, const std::vector<tag_Keystroke>& vKeystrokes,
+                     int iContacts)
+{
+    std::vector<double> vTimes;
+    std::vector<double> vShares;
+    for (const tag_Keystroke& key : vKeystrokes)
+    {
+        vTimes.push_back(key.dSeconds * MICROSECONDS);
+        vShares.push_back(key.dSeconds / key.dAllowed);
+    }
+    const auto worst =
+        std::max_element(vKeystrokes.begin(), vKeystrokes.end(),
+                         [](const tag_Keystroke& a, const tag_Keystroke& b)
+                         { return a.dSeconds / a.dAllowed < b.dSeconds / b.dAllowed; });
+    std::string strWorst;
+    for (size_t i = 0; i < worst->uTyped; ++i)
+    {
+        strWorst += static_cast<char>(worst->pQuery->szText[i]);
+    }
+    state.SetLabel("worst share: " + strWorst + ", " + std::to_string(worst->iAfter) + " found");
+    state.counters["keystrokes"] = static_cast<double>(vKeystrokes.size());
+    state.counters["p50_us"] = Percentile(vTimes, 50);
+    state.counters["p95_us"] = Percentile(vTimes, 95);
+    state.counters["max_us"] = Percentile(vTimes, 100);
+    state.counters["p50_ns_per_contact"] = Percentile(vTimes, 50) * 1000 / iContacts;
+    state.counters["p50_share"] = Percentile(vShares, 50);
+    state.counters["p95_share"] = Percentile(vShares, 95);
+    state.counters["max_share"] = Percentile(vShares, 100);
+}
+
+// Allowed: 1.5 copies of the store and two of the entries; small stores 2 copies and 100 us.
+void WholeStore(benchmark::State& state)
+{
+    const int iContacts = static_cast<int>(state.range(0));
+    WorkloadOf(iContacts);
+    for (auto _ : state)
+    {
+        const double dCopy = CopyFloor(iContacts);
+        const double dBase = iContacts == LARGEST ? 1.5 * dCopy : 2 * dCopy + 100e-6;
+        std::vector<tag_Keystroke> vKeystrokes = CTypist(false).TypeAll();
+        double dMemory = 0;
+        for (tag_Keystroke& key : vKeystrokes)
+        {
+            key.dAllowed = dBase + 2 * EntriesOf(key.iAfter);
+            const double dAllowedBytes = iContacts * 176.0 + key.iAfter * 136.0 + MIB;
+            dMemory = std::max(dMemory, static_cast<double>(key.uPeakBytes) / dAllowedBytes);
+        }
+        CountKeystrokes(state, vKeystrokes, iContacts);
+        std::vector<double> vNet;
+        for (const tag_Keystroke& key : vKeystrokes)
+        {
+            vNet.push_back(key.dSeconds - EntriesOf(key.iAfter));
+        }
+        state.counters["worst_to_median"] = Percentile(vNet, 100) / Percentile(vNet, 50);
+        state.counters["memory_share"] = dMemory;
+        state.counters["copy_us"] = dCopy * MICROSECONDS;
+    }
+}
+
+// Allowed: 6 scans of the previous result, two copies of the new entries and 50 us.
+void Narrowed(benchmark::State& state)
+{
+    const int iContacts = static_cast<int>(state.range(0));
+    WorkloadOf(iContacts);
+    for (auto _ : state)
+    {
+        const double dScanPerEntry = ScanFloor(iContacts) / iContacts;
+        std::vector<tag_Keystroke> vKeystrokes = CTypist(true).TypeAll();
+        for (tag_Keystroke& key : vKeystrokes)
+        {
+            key.dAllowed = 6 * dScanPerEntry * key.iBefore + 2 * EntriesOf(key.iAfter) + 50e-6;
+        }
+        CountKeystrokes(state, vKeystrokes, iContacts);
+        state.counters["copy_us"] = CopyFloor(iContacts) * MICROSECONDS;
+    }
+}
+
+// Allowed: 1.8 times reading the database, copying to fresh memory and rewriting the file.
+void Build(benchmark::State& state)
+{
+    const int iContacts = static_cast<int>(state.range(0));
+    WorkloadOf(iContacts);
+    for (auto _ : state)
+    {
+        CLocalizerLogic logic;
+        const double dFloor = SqlFloor() + CopyFreshFloor(iContacts) + RewriteFloor(iContacts);
+        const double dSeconds = MedianSeconds(3, [&] { logic.MemInit(true); });
+        state.counters["build_us"] = dSeconds * MICROSECONDS;
+        state.counters["floor_us"] = dFloor * MICROSECONDS;
+        state.counters["build_share"] = dSeconds / (1.8 * dFloor);
+    }
+}
+
+void Floors(benchmark::State& state)
+{
+    const int iContacts = static_cast<int>(state.range(0));
+    WorkloadOf(iContacts);
+    for (auto _ : state)
+    {
+        state.counters["copy_us"] = CopyFloor(iContacts) * MICROSECONDS;
+        state.counters["copy_fresh_us"] = CopyFreshFloor(iContacts) * MICROSECONDS;
+        state.counters["scan_us"] = ScanFloor(iContacts) * MICROSECONDS;
+        state.counters["entries_us"] = EntriesFloor(iContacts) * MICROSECONDS;
+        state.counters["sql_us"] = SqlFloor() * MICROSECONDS;
+        state.counters["rewrite_us"] = RewriteFloor(iContacts) * MICROSECONDS;
+    }
+}
+
+void RegisterAll()
+{
+    for (const int iSize : SIZES)
+    {
+        const auto add = [iSize](const char* szName, void (*pfnBench)(benchmark::State&))
+        {
+            benchmark::RegisterBenchmark(szName, pfnBench)
+                ->Arg(iSize)
+                ->Iterations(1)
+                ->Unit(benchmark::kMillisecond);
+        };
+        add("floors", Floors);
+        add("whole_store", WholeStore);
+        add("narrowed", Narrowed);
+        add("build", Build);
+    }
+}
+
+} // namespace
+
+int main(int argc, char** argv)
+{
+    benchmark::Initialize(&argc, argv);
+    RegisterAll();
+    benchmark::RunSpecifiedBenchmarks();
+    return 0;
+}

@@ -2,6 +2,7 @@
 # Installs what building and testing need and this machine lacks, from Debian's packages:
 #   scripts/setup.sh          compiler, build tools and libraries
 #   scripts/setup.sh --lint   also the formatter and the static checker
+#   scripts/setup.sh --armhf  also the cross compiler and the emulator for 32-bit ARM
 # Touches neither apt nor the network when nothing is missing.
 set -euo pipefail
 
@@ -12,6 +13,9 @@ packages=(
 )
 if [ "${1:-}" = --lint ]; then
     packages+=(clang-format-14 clang-tidy-14)
+fi
+if [ "${1:-}" = --armhf ]; then
+    packages+=(g++-arm-linux-gnueabihf qemu-user googletest)
 fi
 
 is_installed() {

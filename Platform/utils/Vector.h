@@ -4,6 +4,7 @@
 #include <sys/types.h>
 
 #include <cstddef>
+#include <cstdint>
 #include <cstdlib>
 #include <cstring>
 #include <type_traits>
@@ -62,6 +63,10 @@ public:
     // Makes room for uCapacity items; the room, or -1 when memory ran out. Never shrinks.
     ssize_t setCapacity(size_t uCapacity)
     {
+        if (uCapacity > MAX_CAPACITY)
+        {
+            return -1;
+        }
         if (uCapacity > m_uCapacity)
         {
             void* pItems = std::realloc(static_cast<void*>(m_pItems), uCapacity * sizeof(T));
@@ -85,6 +90,8 @@ public:
 
 private:
     static constexpr size_t FIRST_CAPACITY = 4;
+    // No block of memory is larger than what pointers into it can measure.
+    static constexpr size_t MAX_CAPACITY = PTRDIFF_MAX / sizeof(T);
 
     T* m_pItems = nullptr;
     size_t m_uCount = 0;

@@ -105,6 +105,16 @@ tag_PieceRow& CPieceTable::AddRow(wchar_t code, int iKey)
     return row;
 }
 
+uint16_t CPieceTable::AskFirstEnds(wchar_t code, int iKey)
+{
+    const uint16_t uEnds = Ends(RowOf(code), 0);
+    if (m_pFirstEnds != nullptr)
+    {
+        m_pFirstEnds[static_cast<size_t>(iKey)] = uEnds;
+    }
+    return uEnds;
+}
+
 void CPieceTable::Fill(tag_PieceRow& row, int iOffset)
 {
     unsigned uEnds = 0;

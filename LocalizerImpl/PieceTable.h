@@ -50,6 +50,15 @@ public:
         return uRow != NO_ROW ? RowAt(uRow - 1) : AddRow(code, iKey);
     }
 
+    // Where the text's first pieces that fit the code end. Most names are told apart by this
+    // alone, so it has a table of its own that stays in the nearest cache.
+    uint16_t FirstEnds(wchar_t code)
+    {
+        const int iKey = KeyOf(code);
+        const uint16_t uEnds = m_pFirstEnds == nullptr ? NOT_ASKED : m_pFirstEnds[iKey];
+        return uEnds != NOT_ASKED ? uEnds : AskFirstEnds(code, iKey);
+    }
+
     // Where pieces from the offset on that fit the row's character end.
     uint16_t Ends(tag_PieceRow& row, int iOffset)
     {
@@ -80,6 +89,7 @@ private:
     static constexpr int CHUNK_ROWS = 256;
     static constexpr int CHUNK_COUNT = (KEY_COUNT + CHUNK_ROWS - 1) / CHUNK_ROWS;
     static constexpr uint16_t NO_ROW = 0;
+    static constexpr uint16_t NOT_ASKED = UINT16_MAX;
 
     int KeyOf(wchar_t code) const
     {
@@ -89,6 +99,7 @@ private:
     static int KeyOfBits(uint16_t uCode);
     int KeyOfWide(wchar_t code) const;
     tag_PieceRow& AddRow(wchar_t code, int iKey);
+    uint16_t AskFirstEnds(wchar_t code, int iKey);
     void Fill(tag_PieceRow& row, int iOffset);
     bool Fits(const tag_PieceRow& row, wchar_t* szPiece, bool& bFull);
     bool IsLastPieceValid(int iOffset);
@@ -100,6 +111,7 @@ private:
     uint16_t m_uValidLast; // offsets whose last piece the matcher finds worth trying
     int m_iRows = 0;
     std::unique_ptr<uint16_t[]> m_pRowOfKey; // row + 1, or NO_ROW
+    std::unique_ptr<uint16_t[]> m_pFirstEnds;
     std::unique_ptr<tag_PieceRow[]> m_apChunks[CHUNK_COUNT];
     tag_PieceRow m_noRow;
     wchar_t m_szPiece[LOC_PIECE_BUFFER] = {};

@@ -29,10 +29,10 @@ int CRunFinder::LookUp(const wchar_t* pCodes)
 
 bool CRunFinder::CanMatch(const wchar_t* pCodes)
 {
-    const int iStarts = LookUp(pCodes);
-    for (int iStart = 0; iStart < iStarts; ++iStart)
+    const int iStarts = m_bAnywhere ? CONTACT_MAX_KEY : 1;
+    for (int iStart = 0; iStart < iStarts && pCodes[iStart] != 0; ++iStart)
     {
-        if (LeadsToEnd(iStart))
+        if (LeadsToEnd(pCodes + iStart, CONTACT_MAX_KEY - iStart))
         {
             return true;
         }
@@ -42,11 +42,15 @@ bool CRunFinder::CanMatch(const wchar_t* pCodes)
 
 bool CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& match)
 {
+    if (!CanMatch(pCodes))
+    {
+        return false;
+    }
     const int iStarts = LookUp(pCodes);
     bool bFound = false;
     for (int iStart = 0; iStart < iStarts; ++iStart)
     {
-        if (!LeadsToEnd(iStart))
+        if (!LeadsToEnd(pCodes + iStart, m_iLength - iStart))
         {
             continue;
         }
@@ -65,25 +69,27 @@ bool CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& 
     return bFound;
 }
 
-// All splits at once: the offsets that can be reached, character by character.
-bool CRunFinder::LeadsToEnd(int iStart)
+// All splits at once: the offsets of the text that can be reached, character by character. At most
+// iLength codes, fewer when a 0 ends them; the first one is not 0.
+bool CRunFinder::LeadsToEnd(const wchar_t* pCodes, int iLength)
 {
     const unsigned uEnd = 1U << m_table.InputLength();
-    unsigned uReached = 1;
-    for (int i = iStart; i < m_iLength && uReached != 0; ++i)
+    unsigned uReached = m_table.FirstEnds(pCodes[0]);
+    for (int i = 1; (uReached & uEnd) == 0; ++i)
     {
+        if (uReached == 0 || i >= iLength || pCodes[i] == 0)
+        {
+            return false;
+        }
+        tag_PieceRow& row = m_table.RowOf(pCodes[i]);
         unsigned uNext = 0;
         for (unsigned uOffsets = uReached; uOffsets != 0; uOffsets &= uOffsets - 1)
         {
-            uNext |= m_table.Ends(*m_apRows[i], LowestBit(uOffsets));
-        }
-        if ((uNext & uEnd) != 0)
-        {
-            return true;
+            uNext |= m_table.Ends(row, LowestBit(uOffsets));
         }
         uReached = uNext;
     }
-    return false;
+    return true;
 }
 
 // Lays one more piece, from iOffset on, on the run's character number iPiece.

@@ -9,10 +9,9 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
-#include <cstring>
-#include <numeric>
 #include <random>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace
@@ -74,22 +73,6 @@ bool NameBehind(const Contact& a, const Contact& b)
     return NameUnits(a) > NameUnits(b);
 }
 
-bool TimeBehind(const Contact& a, const Contact& b)
-{
-    return a.llLastTimeContacted < b.llLastTimeContacted;
-}
-
-std::vector<unsigned char> Word(const PYOFWORDS& record)
-{
-    const auto* p = reinterpret_cast<const unsigned char*>(&record);
-    return {p, std::find(p, p + sizeof(record), 0)};
-}
-
-bool WordBehind(const PYOFWORDS& a, const PYOFWORDS& b)
-{
-    return Word(a) > Word(b);
-}
-
 // --- Records -----------------------------------------------------------------------------------
 
 Contact NameRecord(const std::wstring& strName, wchar_t code)
@@ -100,6 +83,7 @@ Contact NameRecord(const std::wstring& strName, wchar_t code)
     return record;
 }
 
+// Each kind makes records with few different keys and a rest that tells equal ones apart.
 struct tag_NameKind
 {
     static constexpr Common_Sort_enum TYPE = SORT_NAME;
@@ -114,9 +98,10 @@ struct tag_NameKind
         static const wchar_t CODES[] = {0x1000, 0x4C3D, 0x4F19, 0x5000, 0x15000, 0x5A09, 0, 0x4C3E};
         std::wstring strName(rng() % 8 == 0 ? 31 : rng() % 4, L'a');
         std::generate(strName.begin(), strName.end(), [&] { return UNITS[rng() % 7]; });
-        return NameRecord(rng() % 6 == 0 ? L"\x7FFFFFFF" : strName, CODES[rng() % 8]);
+        Contact record = NameRecord(rng() % 6 == 0 ? L"\x7FFFFFFF" : strName, CODES[rng() % 8]);
+        record.iContactID = static_cast<int>(rng());
+        return record;
     }
-    static void Number(Contact& record, int iNumber) { record.iContactID = iNumber; }
 };
 
 struct tag_TimeKind
@@ -124,16 +109,19 @@ struct tag_TimeKind
     static constexpr Common_Sort_enum TYPE = SORT_TIME;
     using Record = Contact;
 
-    static bool Behind(const Contact& a, const Contact& b) { return TimeBehind(a, b); }
+    static bool Behind(const Contact& a, const Contact& b)
+    {
+        return a.llLastTimeContacted < b.llLastTimeContacted;
+    }
     static bool Equal(const Contact& a, const Contact& b) { return !Behind(a, b) && !Behind(b, a); }
     static Contact Make(std::mt19937& rng)
     {
         static const int64_t TIMES[] = {INT64_MIN, -1, 0, 1, 1LL << 31, 1LL << 32, INT64_MAX};
         Contact record = {};
         record.llLastTimeContacted = TIMES[rng() % 7];
+        record.iContactID = static_cast<int>(rng());
         return record;
     }
-    static void Number(Contact& record, int iNumber) { record.iContactID = iNumber; }
 };
 
 struct tag_WordKind
@@ -141,24 +129,25 @@ struct tag_WordKind
     static constexpr Common_Sort_enum TYPE = SORT_PYWORD;
     using Record = PYOFWORDS;
 
-    static bool Behind(const PYOFWORDS& a, const PYOFWORDS& b) { return WordBehind(a, b); }
+    static std::vector<unsigned char> Word(const PYOFWORDS& record)
+    {
+        const auto* p = reinterpret_cast<const unsigned char*>(&record);
+        return {p, std::find(p, p + sizeof(record), 0)};
+    }
+    static bool Behind(const PYOFWORDS& a, const PYOFWORDS& b) { return Word(a) > Word(b); }
     static bool Equal(const PYOFWORDS& a, const PYOFWORDS& b) { return Word(a) == Word(b); }
     // Some words run into the next field, some records hold no 0 at all.
     static PYOFWORDS Make(std::mt19937& rng)
     {
         static const unsigned char BYTES[] = {'a', 0x7F, 0x80, 0xE4, 0xFF};
         PYOFWORDS record = {};
-        const size_t uLength = rng() % 8 == 0 ? sizeof(record) : rng() % 6;
-        std::generate_n(Bytes(&record), uLength,
-                        [&] { return static_cast<char>(BYTES[rng() % (uLength > 6 ? 2 : 5)]); });
-        return record;
-    }
-    static void Number(PYOFWORDS& record, int iNumber)
-    {
-        if (std::memchr(&record, 0, sizeof(record) - 1) != nullptr)
+        std::generate_n(Bytes(&record), sizeof(record),
+                        [&] { return static_cast<char>(BYTES[rng() % 5]); });
+        if (rng() % 8 != 0)
         {
-            Bytes(&record)[sizeof(record) - 1] = static_cast<char>(iNumber);
+            Bytes(&record)[rng() % 6] = 0;
         }
+        return record;
     }
 };
 
@@ -172,11 +161,7 @@ template <class TKind>
 std::vector<typename TKind::Record> MakeRecords(std::mt19937& rng, size_t uCount)
 {
     std::vector<typename TKind::Record> vRecords(uCount);
-    for (size_t i = 0; i < uCount; ++i)
-    {
-        vRecords[i] = TKind::Make(rng);
-        TKind::Number(vRecords[i], static_cast<int>(i));
-    }
+    std::generate(vRecords.begin(), vRecords.end(), [&] { return TKind::Make(rng); });
     return vRecords;
 }
 
@@ -236,26 +221,13 @@ void PlainInsertionSort(std::vector<typename TKind::Record>& a, size_t lo, size_
     }
 }
 
-// What a search of either form answers.
-struct tag_Place
-{
-    int iIndex;
-    bool bFound;
-    bool operator==(const tag_Place& other) const
-    {
-        return iIndex == other.iIndex && bFound == other.bFound;
-    }
-};
-
-std::ostream& operator<<(std::ostream& stream, const tag_Place& place)
-{
-    return stream << place.iIndex << (place.bFound ? " found" : "");
-}
+// What a search of either form answers: an index, and whether it met an equal record.
+using Place = std::pair<int, bool>;
 
 // The search; bMarks is the form that tells whether it met an equal record.
 template <class TKind>
-tag_Place PlainSearch(const std::vector<typename TKind::Record>& a,
-                      const typename TKind::Record& key, bool bInsert, bool bMarks)
+Place PlainSearch(const std::vector<typename TKind::Record>& a, const typename TKind::Record& key,
+                  bool bInsert, bool bMarks)
 {
     const auto eq = [&](int i) { return TKind::Equal(key, a[static_cast<size_t>(i)]); };
     const auto gt = [&](int i) { return TKind::Behind(key, a[static_cast<size_t>(i)]); };
@@ -281,7 +253,7 @@ tag_Place PlainSearch(const std::vector<typename TKind::Record>& a,
     }
     if (bInsert && !lt(hi))
     {
-        return bMarks && eq(hi) ? tag_Place{hi, true} : tag_Place{iCount, false};
+        return bMarks && eq(hi) ? Place{hi, true} : Place{iCount, false};
     }
     if (!bInsert && (lt(0) || gt(hi) || eq(0) || eq(hi)))
     {
@@ -376,11 +348,10 @@ TYPED_TEST(SorterOf, SearchesAtEveryLength)
                 sorter.Search_Bin(Bytes(a.data()), iCount, Bytes(&key), TypeParam::TYPE, bInsert);
             const int iMarked = sorter.Search_BinEx(Bytes(a.data()), iCount, Bytes(&key),
                                                     TypeParam::TYPE, bInsert, &bFound);
-            ASSERT_EQ((tag_Place{iPlain, false}),
-                      PlainSearch<TypeParam>(a, key, bInsert == 1, false))
+            ASSERT_EQ((Place{iPlain, false}), PlainSearch<TypeParam>(a, key, bInsert == 1, false))
                 << iCount;
             ASSERT_TRUE(bFound == -7 || bFound == 1);
-            ASSERT_EQ((tag_Place{iMarked, bFound == 1}),
+            ASSERT_EQ((Place{iMarked, bFound == 1}),
                       PlainSearch<TypeParam>(a, key, bInsert == 1, true))
                 << iCount;
         }
@@ -396,8 +367,6 @@ TEST(CommonQsort, SortsBuiltRecordsIntoNameOrder)
         NameRecord(L"anna", 0x4F00),    NameRecord(L"an \u5b89", 0x2000),
         NameRecord(L"7eleven", 0x5A07), NameRecord(L"# office", 0x5000),
         NameRecord(L"\x7FFFFFFF", 0),   NameRecord(L"zoe", 0x4F19)};
-    std::vector<int> vOrder(vPool.size());
-    std::iota(vOrder.begin(), vOrder.end(), 0);
     std::vector<Contact> vExpected = vPool;
     std::stable_sort(vExpected.begin(), vExpected.end(),
                      [](const Contact& a, const Contact& b) { return NameBehind(b, a); });

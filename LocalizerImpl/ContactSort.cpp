@@ -3,8 +3,9 @@
 //
 //   group    three bits: nameless, first code other, first code a digit
 //   script   whether the first code is a Chinese character or a letter
-//   prefix   the first 12 units of the name, 16 bits each, cut at the first unit that needs more
-//   iRecord  the record, asked when the prefixes are equal or cannot tell
+//   prefix   the first 24 units of the name, 16 bits each, cut at the first unit that needs more
+//   iRecord  the record, asked when prefixes are equal and do not hold the whole name or cannot
+//   tell
 
 #include "LocalizerImpl/ContactSort.h"
 
@@ -20,7 +21,7 @@
 namespace
 {
 
-constexpr int PREFIX_WORDS = 3;
+constexpr int PREFIX_WORDS = 6;
 constexpr int UNITS_PER_WORD = 4;
 constexpr int PREFIX_UNIT_BITS = 16;
 constexpr uint32_t PREFIX_UNIT_MAX = 0xFFFF;
@@ -33,6 +34,7 @@ struct tag_NameKey
     uint8_t uGroup;
     bool bHanZi;
     bool bAlpha;
+    bool bWhole; // the prefix is the whole name
     bool bWraps; // the prefix met a unit whose differences to others wrap
     int32_t iRecord;
 };
@@ -57,13 +59,15 @@ uint8_t GroupOf(const tag_ContactsStruct& record)
 // differ then differ in the order of the names, unless one of them wraps.
 void FillPrefix(const wchar_t* szName, tag_NameKey& key)
 {
-    bool bEnded = false;
+    bool bCut = false;
     for (int i = 0; i < PREFIX_WORDS * UNITS_PER_WORD; ++i)
     {
+        const bool bEnded = key.bWhole || bCut;
         const uint32_t uUnit = bEnded ? 0 : static_cast<uint32_t>(szName[i]);
         const bool bLarge = uUnit >= PREFIX_UNIT_MAX;
-        bEnded = bEnded || uUnit == 0 || bLarge;
+        key.bWhole = key.bWhole || (uUnit == 0 && !bCut);
         key.bWraps = key.bWraps || uUnit >= WRAPPING_UNIT_MIN;
+        bCut = bCut || bLarge;
         uint64_t& uWord = key.auPrefix[i / UNITS_PER_WORD];
         uWord = (uWord << PREFIX_UNIT_BITS) | (bLarge ? PREFIX_UNIT_MAX : uUnit);
     }
@@ -109,7 +113,8 @@ public:
                 return a.auPrefix[i] > b.auPrefix[i];
             }
         }
-        return CompareNameText(m_pRecords[a.iRecord], m_pRecords[b.iRecord]) > 0;
+        const bool bEqual = a.bWhole && b.bWhole; // no prefix that wraps is a whole name
+        return !bEqual && CompareNameText(m_pRecords[a.iRecord], m_pRecords[b.iRecord]) > 0;
     }
 
 private:

@@ -13,7 +13,6 @@
 // Text that comes from wide characters holds whole characters of one to three bytes, so that
 // every character is one item.
 
-#include "Common/CommonQsort.h"
 #include "Common/Log.h"
 #include "Common/Utf8.h"
 #include "Common/WideString.h"
@@ -132,7 +131,7 @@ wchar_t DigitCode(int iDigit)
     return code;
 }
 
-wchar_t CodeOfItem(Common_Qsort& sorter, PYOFWORDS* pMap, const tag_NameItem& item)
+wchar_t CodeOfItem(PYOFWORDS* pMap, const tag_NameItem& item)
 {
     if (item.eClass == ITEM_LETTER)
     {
@@ -142,9 +141,8 @@ wchar_t CodeOfItem(Common_Qsort& sorter, PYOFWORDS* pMap, const tag_NameItem& it
     {
         return DigitCode(item.szBytes[0] - '0');
     }
-    const int iRecord = item.eClass == ITEM_CHINESE
-                            ? CQVLocalizerManager::FindRecord(sorter, pMap, item.szBytes)
-                            : -1;
+    const int iRecord =
+        item.eClass == ITEM_CHINESE ? CQVLocalizerManager::FindRecord(pMap, item.szBytes) : -1;
     return iRecord < 0 ? LOC_OTHER : LOC_HANZI_BASE + static_cast<wchar_t>(iRecord);
 }
 
@@ -170,11 +168,11 @@ int AppendReading(const PYOFWORDS& record, const tag_NameItem& item, wchar_t* sz
     return iCount;
 }
 
-int AppendSpelling(Common_Qsort& sorter, PYOFWORDS* pMap, const tag_NameItem& item, wchar_t* szOut)
+int AppendSpelling(PYOFWORDS* pMap, const tag_NameItem& item, wchar_t* szOut)
 {
     if (item.eClass == ITEM_CHINESE)
     {
-        const int iRecord = CQVLocalizerManager::FindRecord(sorter, pMap, item.szBytes);
+        const int iRecord = CQVLocalizerManager::FindRecord(pMap, item.szBytes);
         return iRecord < 0 ? AppendBytes(item.szBytes, item.iBytes, szOut)
                            : AppendReading(pMap[iRecord], item, szOut);
     }
@@ -266,21 +264,20 @@ int CQVLocalizerManager::TranslateNameToLocal(PYOFWORDS* pMap, wchar_t* szDispla
     std::fill_n(szOut, CONTACT_MAX_KEY, L'\0');
     char szUtf8[NAME_UTF8_BUFFER];
     EncodeName(szDisplayName, szUtf8);
-    Common_Qsort sorter;
     int iCodes = 0;
     for (const char* p = szUtf8; *p != 0 && iCodes < CONTACT_MAX_KEY; ++iCodes)
     {
         const tag_NameItem item = NextItem(p);
-        szOut[iCodes] = CodeOfItem(sorter, pMap, item);
+        szOut[iCodes] = CodeOfItem(pMap, item);
         p += item.iBytes;
     }
     return 1;
 }
 
-int CQVLocalizerManager::TranslateChineseToPinyin(Common_Qsort* pSorter, PYOFWORDS* pMap,
+int CQVLocalizerManager::TranslateChineseToPinyin(Common_Qsort* /*pSorter*/, PYOFWORDS* pMap,
                                                   wchar_t* szDisplayName, wchar_t* szOut)
 {
-    if (pSorter == nullptr || pMap == nullptr || szDisplayName == nullptr || szOut == nullptr)
+    if (pMap == nullptr || szDisplayName == nullptr || szOut == nullptr)
     {
         return 1;
     }
@@ -291,7 +288,7 @@ int CQVLocalizerManager::TranslateChineseToPinyin(Common_Qsort* pSorter, PYOFWOR
     for (const char* p = szUtf8; *p != 0 && iCount < CONTACT_MAX_NAME;)
     {
         const tag_NameItem item = NextItem(p);
-        iCount += AppendSpelling(*pSorter, pMap, item, szOut + iCount);
+        iCount += AppendSpelling(pMap, item, szOut + iCount);
         p += item.iBytes;
     }
     return 1;
@@ -360,7 +357,6 @@ int CQVLocalizerManager::TransNameToPY(tag_ContactsStruct* pRecords, int iCount)
     {
         return LOC_ERR_MAP;
     }
-    Common_Qsort sorter;
     for (int i = 0; i < iCount; ++i)
     {
         if (pRecords[i].szName[0] == 0)
@@ -369,21 +365,20 @@ int CQVLocalizerManager::TransNameToPY(tag_ContactsStruct* pRecords, int iCount)
         }
         else
         {
-            SpellName(sorter, table.Records(), pRecords[i]);
+            SpellName(table.Records(), pRecords[i]);
         }
     }
     return 0;
 }
 
 // Replaces the record's name by its pinyin key, zero-padded to 30 characters.
-void CQVLocalizerManager::SpellName(Common_Qsort& sorter, PYOFWORDS* pMap,
-                                    tag_ContactsStruct& record)
+void CQVLocalizerManager::SpellName(PYOFWORDS* pMap, tag_ContactsStruct& record)
 {
     wchar_t szName[LOC_NAME_BUFFER];
     CopyName(record.szName, szName);
     Ft2Jt(szName);
     wchar_t szSpelling[LOC_SPELLING_BUFFER] = {};
-    TranslateChineseToPinyin(&sorter, pMap, szName, szSpelling);
+    TranslateChineseToPinyin(nullptr, pMap, szName, szSpelling);
     _wcsncpy(record.szName, szSpelling, CONTACT_MAX_NAME);
 }
 
@@ -408,8 +403,7 @@ int CQVLocalizerManager::GetLocalizerString(wchar_t* szInput, int iPos, wchar_t*
         _wcsupr(szOut);
         return 0;
     }
-    Common_Qsort sorter;
-    const int iRecord = FindRecord(sorter, table.Records(), word.szUtf8);
+    const int iRecord = FindRecord(table.Records(), word.szUtf8);
     if (iRecord < 0)
     {
         return LOC_ERR_MAP;

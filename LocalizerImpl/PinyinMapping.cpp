@@ -1,10 +1,10 @@
 // The pinyin table: its shared file, its mapping, and what is asked of it.
 
-#include "Common/CommonQsort.h"
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
 #include "Common/Utf8.h"
 #include "Common/WideString.h"
+#include "LocalizerImpl/LowMapping.h"
 #include "LocalizerImpl/PinyinTable.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "LocalizerImpl/Syllables.h"
@@ -22,6 +22,17 @@
 
 namespace
 {
+
+// A zero-padded word as a number in the order of its bytes.
+uint32_t WordNumber(const char (&szWord)[sizeof(PYOFWORDS::szWord)])
+{
+    uint32_t uNumber = 0;
+    for (const char cByte : szWord)
+    {
+        uNumber = (uNumber << 8) | static_cast<unsigned char>(cByte);
+    }
+    return uNumber;
+}
 
 struct CFileCloser
 {
@@ -105,7 +116,13 @@ int CQVLocalizerManager::MemRelease(void* pMap)
 long CQVLocalizerManager::CreatePinYinFileMapping()
 {
     void* pMap = nullptr;
-    const int iRet = MemInit(&pMap);
+    int iRet = MemInit(&pMap);
+    if (iRet == 0 && !CLowMapping::IsHandle(pMap))
+    {
+        MemRelease(pMap);
+        pMap = CLowMapping::Map(CDataPaths::PinyinMapping(), PY_FILE_SIZE);
+        iRet = pMap == MAP_FAILED ? LOC_ERR_MAP : 0;
+    }
     if (iRet != 0)
     {
         QV_LOGE(QV_LOG_TAG, "CQVLocalizerManager::CreatePinYinFileMapping memInit error code = %d",
@@ -128,10 +145,23 @@ int CQVLocalizerManager::ReleasePinYinFileMapping(long hMap)
     return LOC_ERR_PARAM;
 }
 
-int CQVLocalizerManager::FindRecord(Common_Qsort& sorter, PYOFWORDS* pMap, const char* szKey)
+// A conversion asks this for every character, so the few bytes of a key are compared as one number.
+int CQVLocalizerManager::FindRecord(const PYOFWORDS* pMap, const char* szKey)
 {
-    return sorter.Search_Bin(reinterpret_cast<char*>(pMap), PY_WORD_COUNT, const_cast<char*>(szKey),
-                             SORT_PYWORD, 0);
+    char szWord[sizeof(PYOFWORDS::szWord)] = {};
+    const size_t uLength = strnlen(szKey, sizeof(szWord));
+    if (pMap == nullptr || uLength == sizeof(szWord))
+    {
+        return -1;
+    }
+    std::memcpy(szWord, szKey, uLength);
+    const uint32_t uWanted = WordNumber(szWord);
+    const PYOFWORDS* pEnd = pMap + PY_WORD_COUNT;
+    const PYOFWORDS* pFound = std::lower_bound(pMap, pEnd, uWanted,
+                                               [](const PYOFWORDS& record, uint32_t uKey)
+                                               { return WordNumber(record.szWord) < uKey; });
+    const bool bFound = pFound != pEnd && WordNumber(pFound->szWord) == uWanted;
+    return bFound ? static_cast<int>(pFound - pMap) : -1;
 }
 
 bool CQVLocalizerManager::IsEnglishWord(wchar_t unit)

@@ -256,7 +256,7 @@ int CQVLocalizerManager::LocalizerSearchPos(tag_ContactsStruct* pRecords, int iC
         {
             return -1;
         }
-        SpellName(sorter, table.Records(), *pRecord);
+        SpellName(table.Records(), *pRecord);
     }
     return sorter.Search_Bin(reinterpret_cast<char*>(pRecords), iCount,
                              reinterpret_cast<char*>(pRecord), bByTime ? SORT_TIME : SORT_NAME, 1);

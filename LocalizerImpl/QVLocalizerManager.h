@@ -77,14 +77,15 @@ public:
     // Releases a mapping of MemInit; 0. Null and MAP_FAILED are left alone.
     static int MemRelease(void* pMap);
 
-    // A mapping for callers that convert many names: its address, or -1 with an error line. It
-    // lives until ReleasePinYinFileMapping, which returns 0, or LOC_ERR_PARAM with two error
-    // lines for a handle that is not positive.
+    // A mapping for callers that convert many names: its address, which is positive as a long
+    // also where addresses have 32 bits, or -1 with an error line. It lives until
+    // ReleasePinYinFileMapping, which returns 0, or LOC_ERR_PARAM with two error lines for a
+    // handle that is not positive.
     static long CreatePinYinFileMapping();
     static int ReleasePinYinFileMapping(long hMap);
 
     // Record of a character (zero-terminated UTF-8) in the table, -1 when it has none.
-    static int FindRecord(Common_Qsort& sorter, PYOFWORDS* pMap, const char* szKey);
+    static int FindRecord(const PYOFWORDS* pMap, const char* szKey);
 
     // Classes of codes (cut to 16 bits) and of characters.
     static bool IsHanZi(unsigned short code) { return IsHanZiCode(code); }
@@ -102,7 +103,8 @@ public:
     // the first 30 characters are looked at. Always 1.
     static int TranslateNameToLocal(PYOFWORDS* pMap, wchar_t* szDisplayName, wchar_t* szOut);
     // Pinyin key of a name into szOut, LOC_SPELLING_BUFFER wide characters, zeroed by the caller;
-    // ends with the item that passes 30 characters. Lowercases szDisplayName in place. Always 1.
+    // ends with the item that passes 30 characters. Lowercases szDisplayName in place. pSorter may
+    // be null: characters are found without one. Always 1.
     static int TranslateChineseToPinyin(Common_Qsort* pSorter, PYOFWORDS* pMap,
                                         wchar_t* szDisplayName, wchar_t* szOut);
 
@@ -203,7 +205,7 @@ private:
     bool CompareRun(PYOFWORDS* pMap, const wchar_t* pCodes,
                     const android::Vector<wchar_t*>& vPieces, int& bRunFull);
     bool ComparePiece(PYOFWORDS* pMap, wchar_t code, wchar_t* szPiece, bool bLast, int& bRunFull);
-    static void SpellName(Common_Qsort& sorter, PYOFWORDS* pMap, tag_ContactsStruct& record);
+    static void SpellName(PYOFWORDS* pMap, tag_ContactsStruct& record);
 
     android::Vector<_MatchResult> m_vLocateArray; // at most one per candidate
     CNWORDOUTPUT m_stCNWords[CN_WORD_MAX];        // in order of discovery

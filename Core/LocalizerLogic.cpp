@@ -245,14 +245,22 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
     {
         return -1;
     }
-    if (!bKnown || iBegun != 0)
+    if (!bKnown)
     {
-        return bKnown ? iBegun : 0;
+        return 0;
     }
     const CStopwatch watch;
-    tag_LocalizerResult* pResult = NewResult(run.Find(*pSource, bTimeOrder));
-    run.Finish(*pSource, pResult, pMask, szWordOut);
+    tag_LocalizerResult* pResult = nullptr;
+    if (iBegun == 0)
+    {
+        pResult = NewResult(run.Find(*pSource, bTimeOrder));
+        run.Finish(*pSource, pResult, pMask, szWordOut);
+    }
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search IFL_Search time = %d\n", watch.Elapsed());
+    if (iBegun != 0)
+    {
+        return iBegun;
+    }
     *ppResult = pResult;
     return pResult != nullptr ? 0 : -1;
 }

@@ -10,6 +10,7 @@
 #include "bench/PeakMemory.h"
 #include "bench/Queries.h"
 #include "bench/Workload.h"
+#include "tests/Support/ProviderDatabase.h"
 
 #include <benchmark/benchmark.h>
 
@@ -49,7 +50,8 @@ struct tag_Keystroke
     int iAfter;  // entries found
     double dSeconds;
     size_t uPeakBytes;
-    double dAllowed;
+    double dAllowed;    // 95 of 100 keystrokes
+    double dAllowedMax; // all of them
 };
 
 double Percentile(std::vector<double> vValues, int iPercent)
@@ -112,7 +114,7 @@ private:
                 m_logic.FreeSearchResult(pResult);
             });
         const int iBefore = pPrevious == nullptr ? 0 : pPrevious->iResultNum;
-        return {&query, strTyped.size(), iBefore, iFound, dSeconds, CPeakMemory::PeakBytes(), 0};
+        return {&query, strTyped.size(), iBefore, iFound, dSeconds, CPeakMemory::PeakBytes(), 0, 0};
     }
 
     tag_LocalizerResult* Search(IME_SEARCH_TYPE eType, const std::wstring& strText,
@@ -145,10 +147,12 @@ void CountKeystrokes(benchmark::State& state, const std::vector<tag_Keystroke>& 
 {
     std::vector<double> vTimes;
     std::vector<double> vShares;
+    double dMaxShare = 0;
     for (const tag_Keystroke& key : vKeystrokes)
     {
         vTimes.push_back(key.dSeconds * MICROSECONDS);
         vShares.push_back(key.dSeconds / key.dAllowed);
+        dMaxShare = std::max(dMaxShare, key.dSeconds / key.dAllowedMax);
     }
     const auto worst =
         std::max_element(vKeystrokes.begin(), vKeystrokes.end(),
@@ -167,10 +171,11 @@ void CountKeystrokes(benchmark::State& state, const std::vector<tag_Keystroke>& 
     state.counters["p50_ns_per_contact"] = Percentile(vTimes, 50) * 1000 / iContacts;
     state.counters["p50_share"] = Percentile(vShares, 50);
     state.counters["p95_share"] = Percentile(vShares, 95);
-    state.counters["max_share"] = Percentile(vShares, 100);
+    state.counters["max_share"] = dMaxShare;
 }
 
-// Allowed: 1.5 copies of the store and two of the entries; small stores 2 copies and 100 us.
+// Allowed: 1.5 copies of the store and two of the entries, 2.5 copies for the slowest; small stores
+// 2 copies and 100 us.
 void WholeStore(benchmark::State& state)
 {
     const int iContacts = static_cast<int>(state.range(0));
@@ -184,6 +189,7 @@ void WholeStore(benchmark::State& state)
         for (tag_Keystroke& key : vKeystrokes)
         {
             key.dAllowed = dBase + 2 * EntriesOf(key.iAfter);
+            key.dAllowedMax = std::max(dBase, 2.5 * dCopy) + 2 * EntriesOf(key.iAfter);
             const double dAllowedBytes = iContacts * 176.0 + key.iAfter * 136.0 + MIB;
             dMemory = std::max(dMemory, static_cast<double>(key.uPeakBytes) / dAllowedBytes);
         }
@@ -211,9 +217,12 @@ void Narrowed(benchmark::State& state)
         for (tag_Keystroke& key : vKeystrokes)
         {
             key.dAllowed = 6 * dScanPerEntry * key.iBefore + 2 * EntriesOf(key.iAfter) + 50e-6;
+            key.dAllowedMax = key.dAllowed;
         }
         CountKeystrokes(state, vKeystrokes, iContacts);
-        state.counters["copy_us"] = CopyFloor(iContacts) * MICROSECONDS;
+        const double dCopy = CopyFloor(iContacts) * MICROSECONDS;
+        state.counters["copy_us"] = dCopy;
+        state.counters["median_share"] = state.counters["p50_us"] / (dCopy / 20);
     }
 }
 
@@ -230,6 +239,49 @@ void Build(benchmark::State& state)
         state.counters["build_us"] = dSeconds * MICROSECONDS;
         state.counters["floor_us"] = dFloor * MICROSECONDS;
         state.counters["build_share"] = dSeconds / (1.8 * dFloor);
+    }
+}
+
+// One contact changed in the database and then in the store. Allowed: the count query and 1.5
+// copies when it is renewed in place, 6 copies when records move.
+void Changes(benchmark::State& state)
+{
+    constexpr int CHANGED_ID = 4711;
+    const int iContacts = static_cast<int>(state.range(0));
+    WorkloadOf(iContacts);
+    for (auto _ : state)
+    {
+        CLocalizerLogic logic;
+        CProviderDatabase database;
+        const int iId = CHANGED_ID % iContacts + 1;
+        const auto notify = [&]
+        {
+            long long llId = iId;
+            logic.OnContactsTableChanged(1, &llId);
+        };
+        const auto share = [&](const char* szCounter, double dSeconds, double dCopies)
+        {
+            const double dAllowed = CountQueryFloor() + dCopies * CopyFloor(iContacts);
+            state.counters[std::string(szCounter) + "_us"] = dSeconds * MICROSECONDS;
+            state.counters[std::string(szCounter) + "_share"] = dSeconds / dAllowed;
+        };
+        int iRound = 0;
+        share("renewed", MedianSeconds(MEASURE_RUNS, notify), 1.5);
+        share("renamed",
+              MedianSeconds(MEASURE_RUNS, notify,
+                            [&] { database.SetName(iId, iRound++ % 2 == 0 ? "aa" : "zz", ""); }),
+              6);
+        std::vector<double> vRemoved;
+        std::vector<double> vInserted;
+        for (int i = 0; i < MEASURE_RUNS; ++i)
+        {
+            database.SetVisible(iId, false);
+            vRemoved.push_back(MedianSeconds(1, notify));
+            database.SetVisible(iId, true);
+            vInserted.push_back(MedianSeconds(1, notify));
+        }
+        share("removed", Percentile(vRemoved, 50), 6);
+        share("inserted", Percentile(vInserted, 50), 6);
     }
 }
 
@@ -263,6 +315,7 @@ void RegisterAll()
         add("whole_store", WholeStore);
         add("narrowed", Narrowed);
         add("build", Build);
+        add("changes", Changes);
     }
 }
 

@@ -54,7 +54,7 @@ PYOFWORDS RecordOf(std::initializer_list<const char*> readings)
 const PYOFWORDS ZHANG = RecordOf({"zhang"});
 const PYOFWORDS ZHANG_ZHONG = RecordOf({"zhang", "zhong"});
 const PYOFWORDS CHANG_ZHANG = RecordOf({"chang", "", "zhang"}); // an empty slot is no end
-const PYOFWORDS XI_XIAN = RecordOf({"xian", "xi"});
+const PYOFWORDS XI_XIAN = RecordOf({"xian", "xi", "xiang"});
 const PYOFWORDS NO_READING = RecordOf({});
 
 enum FIT

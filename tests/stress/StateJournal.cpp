@@ -1,0 +1,86 @@
+#include "tests/stress/StateJournal.h"
+
+#include "Common/DataPaths.h"
+#include "Common/NameOrder.h"
+#include "tests/Support/DataDirectory.h"
+
+#include <cstring>
+#include <set>
+
+namespace
+{
+
+std::string RecordBytes(const tag_StoreImage& image)
+{
+    return {reinterpret_cast<const char*>(image.vRecords.data()),
+            image.vRecords.size() * sizeof(tag_ContactsStruct)};
+}
+
+std::string RegBytes(const tag_ContactReg& reg)
+{
+    return {reinterpret_cast<const char*>(&reg), sizeof(reg)};
+}
+
+bool IsBuiltRecord(const tag_ContactsStruct& record)
+{
+    static const tag_ContactsStruct empty = {};
+    return record.iContactID > 0 && record.iPadding == 0 && record.szName[0] != 0 &&
+           record.szName[CONTACT_MAX_NAME] == 0 && record.szLocalizerKey[CONTACT_MAX_KEY] == 0 &&
+           std::memcmp(record.szReserved, empty.szReserved, sizeof(empty.szReserved)) == 0;
+}
+
+bool IsInOrder(const tag_ContactsStruct& first, const tag_ContactsStruct& second, int iSortType)
+{
+    return iSortType == STORE_ORDER_TIME ? first.llLastTimeContacted >= second.llLastTimeContacted
+                                         : !NameSortsBehind(first, second);
+}
+
+} // namespace
+
+void CStateJournal::Write(int iState, const tag_StoreImage& image) const
+{
+    CDataDirectory::WriteBytes(m_strBase + std::to_string(iState),
+                               RegBytes(image.reg) + RecordBytes(image));
+}
+
+tag_StoreImage CStateJournal::Read(int iState) const
+{
+    const std::string strBytes = CDataDirectory::ReadBytes(m_strBase + std::to_string(iState));
+    tag_StoreImage image;
+    std::memcpy(&image.reg, strBytes.data(), sizeof(image.reg));
+    image.vRecords.resize(static_cast<size_t>(image.reg.iTotalNum));
+    std::memcpy(static_cast<void*>(image.vRecords.data()), strBytes.data() + sizeof(image.reg),
+                image.vRecords.size() * sizeof(tag_ContactsStruct));
+    return image;
+}
+
+std::string FaultOf(const tag_StoreImage& image)
+{
+    std::set<int32_t> setIds;
+    for (size_t i = 0; i < image.vRecords.size(); ++i)
+    {
+        const tag_ContactsStruct& record = image.vRecords[i];
+        const std::string strSlot = " in slot " + std::to_string(i);
+        if (!IsBuiltRecord(record))
+        {
+            return "a torn record" + strSlot;
+        }
+        if (!setIds.insert(record.iContactID).second)
+        {
+            return "contact " + std::to_string(record.iContactID) + " again" + strSlot;
+        }
+        if (i > 0 && !IsMarked(image.reg) &&
+            !IsInOrder(image.vRecords[i - 1], record, image.reg.iSortType))
+        {
+            return "a wrong order" + strSlot;
+        }
+    }
+    return {};
+}
+
+void InstallStore(const tag_StoreImage& image, int iSortType)
+{
+    const tag_ContactReg reg = {image.reg.iTotalNum, iSortType, 0};
+    CDataDirectory::WriteBytes(CDataPaths::ContactRecords(), RecordBytes(image));
+    CDataDirectory::WriteBytes(CDataPaths::ContactReg(), RegBytes(reg));
+}

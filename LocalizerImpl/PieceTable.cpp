@@ -23,8 +23,13 @@ tag_PieceRow EmptyRow(wchar_t code)
 CPieceTable::CPieceTable(CQVLocalizerManager& matcher, PYOFWORDS* pMap, const wchar_t* szInput,
                          int iInputLen)
     : m_matcher(matcher), m_pMap(pMap), m_szInput(szInput), m_iInputLen(iInputLen), m_uValidLast(0),
-      m_pRowOfKey(new (std::nothrow) uint16_t[KEY_COUNT]()), m_noRow(EmptyRow(0))
+      m_pRowOfKey(new (std::nothrow) uint16_t[KEY_COUNT]()),
+      m_pFirstEnds(new (std::nothrow) uint16_t[KEY_COUNT]), m_noRow(EmptyRow(0))
 {
+    if (m_pFirstEnds != nullptr)
+    {
+        std::fill_n(m_pFirstEnds.get(), KEY_COUNT, NOT_ASKED);
+    }
     m_noRow.uFilled = ALL_OFFSETS;
     for (int iOffset = 0; iOffset < iInputLen; ++iOffset)
     {
@@ -49,12 +54,8 @@ bool CPieceTable::IsLastPieceValid(int iOffset)
     return m_matcher.IsValid(vPieces) != 0;
 }
 
-int CPieceTable::KeyOfBits(uint16_t uCode)
+int CPieceTable::KeyOfOther(uint16_t uCode)
 {
-    if (IsHanZiCode(uCode))
-    {
-        return uCode - LOC_HANZI_BASE;
-    }
     if (IsAlphaCode(uCode))
     {
         return KEY_ALPHA + (uCode - LOC_ALPHA_BASE);

@@ -96,7 +96,11 @@ private:
         const uint32_t uCode = static_cast<uint32_t>(code);
         return uCode <= UINT16_MAX ? KeyOfBits(static_cast<uint16_t>(uCode)) : KeyOfWide(code);
     }
-    static int KeyOfBits(uint16_t uCode);
+    static int KeyOfBits(uint16_t uCode)
+    {
+        return IsHanZiCode(uCode) ? uCode - LOC_HANZI_BASE : KeyOfOther(uCode);
+    }
+    static int KeyOfOther(uint16_t uCode);
     int KeyOfWide(wchar_t code) const;
     tag_PieceRow& AddRow(wchar_t code, int iKey);
     uint16_t AskFirstEnds(wchar_t code, int iKey);

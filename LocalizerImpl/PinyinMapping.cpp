@@ -157,6 +157,10 @@ int CQVLocalizerManager::FindRecord(const PYOFWORDS* pMap, const char* szKey)
     std::memcpy(szWord, szKey, uLength);
     const uint32_t uWanted = WordNumber(szWord);
     const PYOFWORDS* pEnd = pMap + PY_WORD_COUNT;
+    if (WordNumber(pEnd[-1].szWord) < uWanted)
+    {
+        return -1; // also any character of a table whose tail is missing: it is not in order
+    }
     const PYOFWORDS* pFound = std::lower_bound(pMap, pEnd, uWanted,
                                                [](const PYOFWORDS& record, uint32_t uKey)
                                                { return WordNumber(record.szWord) < uKey; });

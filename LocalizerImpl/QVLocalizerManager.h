@@ -124,7 +124,7 @@ public:
     // The typed text after the user picked the character szWord for the letters before iPos:
     // szOut (as long as szInput, szWord and a terminator together) gets szInput with szWord in
     // place of the letters from the last one before iPos that begins a reading of szWord, in
-    // capitals. A szWord that is no Chinese character is appended. szInput is lowercased in
+    // capitals. A szWord in ASCII is appended. szInput is lowercased in
     // place. Where no letter fits, szOut is the lowercased text and the result 0. LOC_ERR_MAP
     // also when the table has no such character. iPos is cut to the length of szInput.
     static int GetLocalizerString(wchar_t* szInput, int iPos, wchar_t* szWord, wchar_t* szOut);

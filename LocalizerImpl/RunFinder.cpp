@@ -32,7 +32,9 @@ bool CRunFinder::CanMatch(const wchar_t* pCodes)
     const int iStarts = m_bAnywhere ? CONTACT_MAX_KEY : 1;
     for (int iStart = 0; iStart < iStarts && pCodes[iStart] != 0; ++iStart)
     {
-        if (LeadsToEnd(pCodes + iStart, CONTACT_MAX_KEY - iStart))
+        const unsigned uFirstEnds = m_table.FirstEnds(pCodes[iStart]);
+        if (uFirstEnds != 0 &&
+            LeadsToEnd(uFirstEnds, pCodes + iStart + 1, CONTACT_MAX_KEY - iStart - 1))
         {
             return true;
         }
@@ -47,35 +49,24 @@ bool CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& 
         return false;
     }
     const int iStarts = LookUp(pCodes);
-    bool bFound = false;
-    for (int iStart = 0; iStart < iStarts; ++iStart)
+    m_iCandidate = iCandidate;
+    m_uLastSplit = 0;
+    std::fill(std::begin(m_auSeen), std::end(m_auSeen), 0);
+    m_match = {MATCH_LIST, 0, UINT16_MAX};
+    for (m_iStart = 0; m_iStart < iStarts; ++m_iStart)
     {
-        if (!LeadsToEnd(pCodes + iStart, m_iLength - iStart))
-        {
-            continue;
-        }
-        if (!bFound)
-        {
-            bFound = true;
-            m_iCandidate = iCandidate;
-            m_uLastSplit = 0;
-            std::fill(std::begin(m_auSeen), std::end(m_auSeen), 0);
-            m_match = {MATCH_LIST, 0, UINT16_MAX};
-        }
-        m_iStart = iStart;
         Extend(0, 0, 0, true);
     }
     match = m_match;
-    return bFound;
+    return true;
 }
 
-// All splits at once: the offsets of the text that can be reached, character by character. At most
-// iLength codes, fewer when a 0 ends them; the first one is not 0.
-bool CRunFinder::LeadsToEnd(const wchar_t* pCodes, int iLength)
+// All splits at once: from the offsets that the pieces before reach, character by character. At
+// most iLength codes, fewer when a 0 ends them.
+bool CRunFinder::LeadsToEnd(unsigned uReached, const wchar_t* pCodes, int iLength)
 {
     const unsigned uEnd = 1U << m_table.InputLength();
-    unsigned uReached = m_table.FirstEnds(pCodes[0]);
-    for (int i = 1; (uReached & uEnd) == 0; ++i)
+    for (int i = 0; (uReached & uEnd) == 0; ++i)
     {
         if (uReached == 0 || i >= iLength || pCodes[i] == 0)
         {

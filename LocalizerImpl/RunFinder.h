@@ -38,7 +38,7 @@ private:
     static constexpr int SPLIT_WORDS = (1 << (LOC_MAX_INPUT - 1)) / 64;
 
     int LookUp(const wchar_t* pCodes);
-    bool LeadsToEnd(const wchar_t* pCodes, int iLength);
+    bool LeadsToEnd(unsigned uReached, const wchar_t* pCodes, int iLength);
     void Extend(int iPiece, int iOffset, uint32_t uSplit, bool bAllFull);
     void Record(int iPieces, int iLastOffset, uint32_t uSplit, bool bAllFull);
     bool MarkSeen(uint32_t uSplit);

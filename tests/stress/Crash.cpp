@@ -203,7 +203,7 @@ public:
                 std::filesystem::remove(CDataPaths::ContactReg());
                 std::filesystem::remove(CDataPaths::ContactRecords());
             }
-        } while (!StartVictim(eKind, 1 + Pick(static_cast<int>(m_mapTime[eKind] * 5 / 4))));
+        } while (!StartVictim(eKind, AnyDelay(eKind)));
         Require(IsLockFree(), "the lock is still held");
         CProcess reader({"reader", m_directory.Root(), std::to_string(m_random()), "0", "0"});
         RequireSuccess("a reader", reader.Wait());
@@ -231,6 +231,13 @@ public:
 
 private:
     int Pick(int iNum) { return static_cast<int>(m_random() % static_cast<unsigned int>(iNum)); }
+
+    // A point of the whole work, or as often of its second half, where the files are written.
+    int AnyDelay(ACTION_KIND eKind)
+    {
+        const int iTime = static_cast<int>(m_mapTime[eKind]) + 1;
+        return Pick(2) == 0 ? 1 + Pick(iTime) : iTime / 2 + Pick(iTime / 2 + 1) + 1;
+    }
 
     // False when the process was done before its time.
     bool StartVictim(ACTION_KIND eKind, int iDelay)

@@ -24,10 +24,20 @@ constexpr int DEFAULT_CONTACTS = 600;
 constexpr int MAX_CONTACTS = 200000;
 constexpr int64_t DEFAULT_NOW_MS = 1735689600000; // the first day of 2025, UTC
 
+// The table that was installed with the program, else the one of its build.
+std::string DefaultPinyinTable()
+{
+    std::error_code error;
+    const fs::path program = fs::read_symlink("/proc/self/exe", error);
+    const fs::path installed =
+        (program.parent_path() / QV_TOOL_INSTALLED_PYFILE).lexically_normal();
+    return fs::is_regular_file(installed, error) ? installed.string() : QV_TOOL_PYFILE;
+}
+
 struct tag_SampleOptions
 {
     CDataDirectory directory;
-    std::string strPinyinTable = QV_TOOL_PYFILE;
+    std::string strPinyinTable = DefaultPinyinTable();
     int iCount = DEFAULT_CONTACTS;
     int64_t llNow = DEFAULT_NOW_MS;
     bool bForce = false;

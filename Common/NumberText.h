@@ -5,6 +5,7 @@
 
 // Numbers to text and back. Reentrant, independent of the locale.
 
+// The bases that numbers are written in.
 constexpr int NUMBER_MIN_RADIX = 2;
 constexpr int NUMBER_MAX_RADIX = 36;
 

@@ -9,14 +9,14 @@
 // A calendar time in the device's time zone.
 struct tag_SystemTime
 {
-    uint16_t year;      // in full, not counted from 1900
-    uint16_t month;     // 1..12
-    uint16_t dayOfWeek; // 0 = Sunday .. 6 = Saturday
-    uint16_t day;       // 1..31
-    uint16_t hour;      // 0..23
-    uint16_t minute;    // 0..59
-    uint16_t second;    // 0..60
-    uint16_t milliseconds;
+    uint16_t year;         // in full, not counted from 1900
+    uint16_t month;        // 1..12
+    uint16_t dayOfWeek;    // 0 = Sunday .. 6 = Saturday
+    uint16_t day;          // 1..31
+    uint16_t hour;         // 0..23
+    uint16_t minute;       // 0..59
+    uint16_t second;       // 0..60
+    uint16_t milliseconds; // 0..999
 };
 static_assert(sizeof(tag_SystemTime) == 16, "part of the interface");
 static_assert(offsetof(tag_SystemTime, dayOfWeek) == 4, "part of the interface");
@@ -40,6 +40,7 @@ extern "C"
     // Pauses the calling thread; a signal may end the pause early.
     QV_EXPORT void Sleep(unsigned int uMilliseconds);
 
+    // The wall clock as a calendar time.
     QV_EXPORT void GetLocalTime(tag_SystemTime* pTime);
 
     // Between calendar and point in time; always 1. A calendar time is taken as standard time,

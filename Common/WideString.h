@@ -10,6 +10,7 @@
 // strupr depends on the locale. Pointers are not null except where a call says what null does.
 extern "C"
 {
+    // The number of units before the terminator.
     QV_EXPORT size_t _wcslen(const wchar_t* szText);
 
     // Copy szSource with its terminator to szTarget, which must have room; return szTarget. Null

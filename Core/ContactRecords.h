@@ -15,6 +15,7 @@ static_assert(sizeof(wchar_t) == 4, "text is kept in 32-bit units");
 using QVLong32 = std::conditional<sizeof(long) == sizeof(int32_t), long, int32_t>::type;
 static_assert(sizeof(QVLong32) == 4, "ids are 32-bit fields of the record");
 
+// What a record has room for.
 constexpr int CONTACT_MAX_GROUPS = 100;
 constexpr int CONTACT_MAX_ACCOUNTS = 20;
 constexpr int CONTACT_MAX_NAME = 30; // characters of szName before its terminator
@@ -44,15 +45,15 @@ constexpr int STORE_ORDER_TIME = 1; // last contacted first
 // One contact. Whoever creates a record zero-fills it; the reader ORs flag bits into it.
 struct tag_ContactsStruct
 {
-    int32_t iContactID;
-    QVLong32 lGroupID[CONTACT_MAX_GROUPS];     // ends at the first 0
-    QVLong32 lAccountID[CONTACT_MAX_ACCOUNTS]; // ends at the first 0
-    uint32_t iFlags;                           // CONTACT_FLAG_*
-    int32_t iSortIndex;                        // place in name order, from 0
-    int32_t iPadding;                          // always 0; brings the time to 8 bytes
-    int64_t llLastTimeContacted;               // milliseconds since 1970, UTC
-    int32_t iTimesContacted;
-    int32_t iStatusUpdateID;
+    int32_t iContactID;                          // the provider's _id
+    QVLong32 lGroupID[CONTACT_MAX_GROUPS];       // ends at the first 0
+    QVLong32 lAccountID[CONTACT_MAX_ACCOUNTS];   // ends at the first 0
+    uint32_t iFlags;                             // CONTACT_FLAG_*
+    int32_t iSortIndex;                          // place in name order, from 0
+    int32_t iPadding;                            // always 0; brings the time to 8 bytes
+    int64_t llLastTimeContacted;                 // milliseconds since 1970, UTC
+    int32_t iTimesContacted;                     // how often
+    int32_t iStatusUpdateID;                     // its latest status update, 0 for none
     wchar_t szName[CONTACT_MAX_NAME + 1];        // display name, then its pinyin key
     wchar_t szLocalizerKey[CONTACT_MAX_KEY + 1]; // localizer codes, one per name character
     wchar_t szReserved[6];                       // never written, always 0
@@ -74,8 +75,8 @@ static_assert(std::is_trivially_copyable<tag_ContactsStruct>::value, "copied who
 // null when nothing was read. Filters lower RecordNum and leave the allocation as it is.
 struct tag_ContactsInfo
 {
-    int32_t RecordNum;
-    tag_ContactsStruct* pContacts;
+    int32_t RecordNum;             // records that count
+    tag_ContactsStruct* pContacts; // the array, as long as it was allocated
 };
 static_assert(sizeof(void*) != 4 || sizeof(tag_ContactsInfo) == 8, "part of the interface");
 

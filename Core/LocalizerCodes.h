@@ -19,22 +19,23 @@ constexpr wchar_t LOC_DIGIT_BASE = 0x5A00; // + value of the digit
 constexpr int LOC_ALPHA_COUNT = 26;
 constexpr int LOC_DIGIT_COUNT = 10;
 
-constexpr int PY_WORD_COUNT = 15422;
-constexpr int PY_READINGS = 3;    // readings of one character, at most
-constexpr int PY_MAX_LETTERS = 6; // letters of one reading, at most
+constexpr int PY_WORD_COUNT = 15422; // characters of the pinyin table
+constexpr int PY_READINGS = 3;       // readings of one character, at most
+constexpr int PY_MAX_LETTERS = 6;    // letters of one reading, at most
 
 // One character of the pinyin table: UTF-8 and ASCII text, every string zero-terminated inside
 // its slot and the rest of the slot zero. Unused readings are empty.
 struct PYOFWORDS
 {
-    char szWord[4];
-    char szPinyin[PY_READINGS][PY_MAX_LETTERS + 1];
-    char szPinyinNum[PY_READINGS][PY_MAX_LETTERS + 1];
+    char szWord[4];                                    // the character
+    char szPinyin[PY_READINGS][PY_MAX_LETTERS + 1];    // its readings, without tone, v for u-umlaut
+    char szPinyinNum[PY_READINGS][PY_MAX_LETTERS + 1]; // the same as keypad digits
 };
 static_assert(sizeof(PYOFWORDS) == 46, "the record is the file");
 static_assert(offsetof(PYOFWORDS, szPinyin) == 4, "file layout");
 static_assert(offsetof(PYOFWORDS, szPinyinNum) == 25, "file layout");
 
+// Bytes of a record and of the table's file.
 constexpr int PY_RECORD_SIZE = static_cast<int>(sizeof(PYOFWORDS));
 constexpr int PY_FILE_SIZE = PY_WORD_COUNT * PY_RECORD_SIZE;
 static_assert(PY_FILE_SIZE == 709412, "the table is the file");

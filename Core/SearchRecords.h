@@ -16,7 +16,7 @@ enum IME_SEARCH_TYPE
 // One contact as a search sees it. Callers read these bytes directly.
 struct tag_LocalizerDetail
 {
-    int32_t iContactID;
+    int32_t iContactID;                          // the provider's _id
     int32_t iSortIndex;                          // place in name order, the last ranking key
     wchar_t szLocalizerKey[CONTACT_MAX_KEY + 1]; // what is matched; zero-terminated
     wchar_t szReserved[5];                       // copied from the record, never read
@@ -35,8 +35,8 @@ static_assert(std::is_trivially_copyable<tag_LocalizerDetail>::value, "copied wh
 // A result set. pDetail is null when iResultNum is 0 and no array was made.
 struct tag_LocalizerResult
 {
-    int32_t iResultNum;
-    tag_LocalizerDetail* pDetail;
+    int32_t iResultNum;           // entries
+    tag_LocalizerDetail* pDetail; // the entries, best first
 };
 static_assert(sizeof(void*) != 4 || sizeof(tag_LocalizerResult) == 8, "part of the interface");
 

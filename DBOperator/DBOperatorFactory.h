@@ -9,6 +9,7 @@ enum DB_OPERATOR_TYPE : int
     DB_OPERATOR_SQLITE = 0
 };
 
+// Makes database operators.
 class QV_EXPORT CDBOperatorFactory
 {
 public:

@@ -9,8 +9,8 @@
 class QV_EXPORT AccountExpandFilterProcess : public FilterProcess
 {
 public:
+    // The kind of filter served, and its rule.
     static constexpr int KIND = FILTER_ACCOUNT_EXPAND;
-
     static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
                       const CFilterChain& chain);
 

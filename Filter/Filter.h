@@ -30,35 +30,38 @@ public:
     int32_t m_iType; // FILTER_*
 
 protected:
-    explicit CFilter(int iType);
+    explicit CFilter(int iType); // of the given kind
 };
 static_assert(sizeof(void*) != 4 || sizeof(CFilter) == 8, "part of the interface");
 
+// Keeps the members of a group; SECRET_GROUP_ID of Core/ContactRecords.h: secret contacts.
 class QV_EXPORT CGroupFilter : public CFilter
 {
 public:
+    // The group that the filter is about, by its id.
     explicit CGroupFilter(int iGroupID);
     int GetGroupID() const { return m_iID; }
-
     int32_t m_iID;
 };
 static_assert(sizeof(void*) != 4 || sizeof(CGroupFilter) == 12, "part of the interface");
 
+// Keeps the contacts outside a group.
 class QV_EXPORT CGroupExpandFilter : public CFilter
 {
 public:
+    // The group that the filter is about, by its id.
     explicit CGroupExpandFilter(int iGroupID);
     int GetGroupID() const { return m_iID; }
-
     int32_t m_iID;
 };
 
+// Keeps the contacts with data in an account.
 class QV_EXPORT CAccountFilter : public CFilter
 {
 public:
+    // The account that the filter is about, by its id.
     explicit CAccountFilter(int iAccountID);
     int GetAccountID() const { return m_iID; }
-
     int32_t m_iID;
 };
 
@@ -66,49 +69,55 @@ public:
 class QV_EXPORT CAccountExpandFilter : public CFilter
 {
 public:
+    // The account that the filter is about, by its id.
     explicit CAccountExpandFilter(int iAccountID);
     int GetAccountID() const { return m_iID; }
-
     int32_t m_iID;
 };
 
+// Keeps all contacts but one.
 class QV_EXPORT CContactIdExpandFilter : public CFilter
 {
 public:
+    // The contact that the filter is about, by its id.
     explicit CContactIdExpandFilter(int iContactID);
     int GetContactID() const { return m_iID; }
-
     int32_t m_iID;
 };
 
+// Keeps the contacts with a phone number.
 class QV_EXPORT CPhoneFilter : public CFilter
 {
 public:
-    CPhoneFilter();
+    CPhoneFilter(); // of that kind
 };
 
+// Keeps the contacts with a mail address.
 class QV_EXPORT CMailFilter : public CFilter
 {
 public:
-    CMailFilter();
+    CMailFilter(); // of that kind
 };
 
+// Keeps the starred contacts.
 class QV_EXPORT CFavouritesFilter : public CFilter
 {
 public:
-    CFavouritesFilter();
+    CFavouritesFilter(); // of that kind
 };
 
+// Keeps the contacts with a postal address.
 class QV_EXPORT CPostalFilter : public CFilter
 {
 public:
-    CPostalFilter();
+    CPostalFilter(); // of that kind
 };
 
+// Keeps the contacts that are online.
 class QV_EXPORT OnlineFilter : public CFilter
 {
 public:
-    OnlineFilter();
+    OnlineFilter(); // of that kind
 };
 
 #endif

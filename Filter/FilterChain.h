@@ -20,6 +20,7 @@ public:
     // deleted and GetFilterNum stays as it was. A null filter takes a place and is ignored.
     void SetFilter(CFilter* pFilter);
 
+    // The number of places, null filters included.
     int GetFilterNum() const;
 
     // The filter at iNo, from 0 in the order of appending, still owned by the chain; null when

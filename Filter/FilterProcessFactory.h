@@ -5,6 +5,7 @@
 
 class FilterProcess;
 
+// Makes the pipeline that narrows records by a chain of filters.
 class QV_EXPORT FilterProcessFactory
 {
 public:

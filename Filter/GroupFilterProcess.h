@@ -8,8 +8,8 @@
 class QV_EXPORT GroupFilterProcess : public FilterProcess
 {
 public:
+    // The kind of filter served, and its rule.
     static constexpr int KIND = FILTER_GROUP;
-
     static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
                       const CFilterChain& chain);
 

@@ -3,7 +3,7 @@
 
 #include "Common/Export.h"
 
-constexpr int FOLDING_ROWS = 3755;
+constexpr int FOLDING_ROWS = 3755; // of the folding table
 
 // Row r folds g_szTraditional[r] to g_szSimplified[r]; a character that stands in several rows
 // folds by the first. Both arrays end with 0. Made from data/folding.tsv by the build.

@@ -15,7 +15,7 @@ class Common_Qsort;
 constexpr int LOC_MAX_INPUT = 10;    // characters of a typed text
 constexpr int LOC_PIECE_BUFFER = 20; // wide characters of a piece's buffer
 constexpr int CN_WORD_MAX = 20;      // candidate characters that one search reports
-constexpr int LOC_NAME_BUFFER = CONTACT_MAX_NAME + 1;
+constexpr int LOC_NAME_BUFFER = CONTACT_MAX_NAME + 1; // wide characters of a name
 constexpr int LOC_SPELLING_BUFFER = 240; // wide characters of a pinyin key while it is made
 
 // Bit of the key mask for digits and other characters; bits 0..25 are the letters.
@@ -24,7 +24,7 @@ constexpr uint32_t MASK_OTHER = 0x4000000;
 // The keys that can usefully be typed next.
 struct _mask_type
 {
-    uint32_t lMask;
+    uint32_t lMask;     // bits 0..25: letters; MASK_OTHER
     uint32_t lReserved; // cleared with lMask, never set
 };
 static_assert(sizeof(_mask_type) == 8, "two 32-bit words");

@@ -9,6 +9,7 @@
 class QV_EXPORT CQVNumLocalizerManager : public CQVLocalizerManager
 {
 public:
+    // bMatchAnywhere 0: a match begins only at a name's first character.
     explicit CQVNumLocalizerManager(int bMatchAnywhere);
 
     int CmpChineseWord(PYOFWORDS* pMap, wchar_t code, PYOFWORDS& record, wchar_t* szPiece,

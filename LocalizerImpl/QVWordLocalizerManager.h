@@ -9,6 +9,7 @@
 class QV_EXPORT CQVWordLocalizerManager : public CQVLocalizerManager
 {
 public:
+    // bMatchAnywhere 0: a match begins only at a name's first character.
     explicit CQVWordLocalizerManager(int bMatchAnywhere);
 
     // A piece of one character that is neither a letter nor the character itself fits no reading.

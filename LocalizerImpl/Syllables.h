@@ -4,7 +4,7 @@
 #include "Common/Export.h"
 #include "Core/LocalizerCodes.h"
 
-constexpr int PY_SYLLABLE_COUNT = 416;
+constexpr int PY_SYLLABLE_COUNT = 416; // entries of g_pyWords
 
 // The syllables that letters can spell, lowercase, ascending, zero-padded. tools/data/syllables.py
 // holds the same list for the checks of the data.

@@ -34,6 +34,7 @@
 
 class CFilterChain;
 
+// The store manager; this file begins with what it promises.
 class QV_EXPORT CMemManger
 {
 public:

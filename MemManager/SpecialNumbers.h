@@ -4,7 +4,7 @@
 #include "Common/Export.h"
 #include "Core/SearchRecords.h"
 
-constexpr int SPECIAL_NUMBER_COUNT = 7;
+constexpr int SPECIAL_NUMBER_COUNT = 7; // entries of g_specialNumberRecords
 
 // The fixed entries that a search for special numbers looks through in place of the store: the
 // keys of seven Chinese names, told apart by iContactID 0 to 6.

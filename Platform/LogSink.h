@@ -6,6 +6,7 @@
 // One line: its priority (3 debug, 6 error), tag and formatted text, valid during the call.
 using LogSinkFn = void (*)(void* pContext, int iPriority, const char* szTag, const char* szText);
 
+// The one sink of the process.
 class __attribute__((visibility("default"))) CLogSink
 {
 public:

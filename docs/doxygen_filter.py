@@ -14,6 +14,7 @@ import sys
 ESCAPED = re.compile(r"[\\@<>#%&$]")
 TRAILING = re.compile(r"^(.*\S)\s*//\s?(.*)$")
 # Lines that open or close a scope or switch access, and those that are no declarations.
+TYPE = re.compile(r"\s*(class|struct|enum)\b")
 NEUTRAL = re.compile(r"^\s*(#|[{}]|public:|protected:|private:|extern \"C\"$|template\b|namespace\b"
                      r"|class \w+;|struct \w+;|friend\b)")
 
@@ -43,7 +44,7 @@ def statements(lines):
                 continue
         pending.append(line)
         depth += code.count("(") - code.count(")")
-        opens_type = re.match(r"\s*(class|struct|enum)\b", pending[0])
+        opens_type = TYPE.match(pending[0])
         in_body = "{" in "".join(pending) and not opens_type
         if in_body:
             braces = "".join(l.split("//")[0] for l in pending)
@@ -89,12 +90,18 @@ def filtered(lines):
             comment = []
             out += block
         elif kind == "neutral":
+            if block[0].startswith("#define") and comment:
+                block = documented(block, comment)
+            if not block[0].startswith("#"):
+                comment = []  # another scope, or another access
             out += block
         elif "= delete" in block[-1] or block[0].lstrip().startswith("static_assert"):
             continue
         else:
             at_top = False
             out += documented(block, comment)
+            if TYPE.match(block[0]):
+                comment = []
     return out
 
 

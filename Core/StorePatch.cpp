@@ -150,7 +150,11 @@ void CStorePatch::Renumber()
     }
     for (int i = 0; i < m_iCount; ++i)
     {
-        m_pRecords[i].iSortIndex = i;
+        // Records before the first change have their number: their pages stay clean.
+        if (m_pRecords[i].iSortIndex != i)
+        {
+            m_pRecords[i].iSortIndex = i;
+        }
     }
 }
 

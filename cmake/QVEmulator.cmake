@@ -13,10 +13,14 @@ function(qv_get_program target result)
     set(${result} $<TARGET_FILE:${target}> PARENT_SCOPE)
     return()
   endif()
-  list(JOIN CMAKE_CROSSCOMPILING_EMULATOR " " emulator)
   set(launcher ${CMAKE_BINARY_DIR}/launchers/${target})
-  file(GENERATE OUTPUT ${launcher}
-       CONTENT "#!/bin/sh\nexec ${emulator} $<TARGET_FILE:${target}> \"$@\"\n"
-       FILE_PERMISSIONS OWNER_READ OWNER_WRITE OWNER_EXECUTE)
   set(${result} ${launcher} PARENT_SCOPE)
+  get_target_property(has_launcher ${target} QV_HAS_LAUNCHER)
+  if(NOT has_launcher)
+    list(JOIN CMAKE_CROSSCOMPILING_EMULATOR " " emulator)
+    file(GENERATE OUTPUT ${launcher}
+         CONTENT "#!/bin/sh\nexec ${emulator} $<TARGET_FILE:${target}> \"$@\"\n"
+         FILE_PERMISSIONS OWNER_READ OWNER_WRITE OWNER_EXECUTE)
+    set_target_properties(${target} PROPERTIES QV_HAS_LAUNCHER ON)
+  endif()
 endfunction()

@@ -82,6 +82,9 @@ if [ ! -d "$root" ]; then
     make_root
 fi
 
+# The files of both builds are compared.
+cmake --preset release
+cmake --build --preset release --target qvlocalize
 cmake --preset armhf
 cmake --build --preset armhf
 ctest --preset armhf --parallel "$(nproc)" "$@"

@@ -99,6 +99,9 @@ TEST_F(CSearchTest, FindsRanksAndTellsWhatMayFollow)
         {{"张三"}, "zhan", WORD, {{1, At(0, 0)}}, "gs", "张"},
         {{"张三"}, "zx", WORD, {}, "", ""},
         {{"张张三"}, "zs", WORD, {{1, At(1, 2)}}, "a", "三"},
+        // Of all ways to cut the text that fit, the last one decides.
+        {{"先安"}, "xian", WORD, {{1, At(0, 1)}}, "a", "先安"},
+        {{"先安", "先"}, "xian", WORD, {{2, At(0, 0)}, {1, At(0, 1)}}, "a", "先安"},
         {{"张三", "张三四"}, "94264726", NUM, {{1, At(0, 1)}, {2, At(0, 1)}}, "s", ""},
         // Every reading of a character counts.
         {{"长江"}, "c", WORD, {{1, At(0, 0)}}, "hj", "长"},

@@ -7,7 +7,7 @@
 namespace
 {
 
-constexpr const char* LOG_TAG = "Filter/AccountExpandFilterProcess";
+constexpr const char* TRACE_TAG = "Filter/AccountExpandFilterProcess";
 
 // The chain itself is searched: it is as short as a list of its ids, and needs no memory.
 bool IsExcluded(QVLong32 lAccountID, const CFilterChain& chain)
@@ -46,7 +46,7 @@ int AccountExpandFilterProcess::IsSameAccountEx(int iID, const QVLong32* plList,
     {
         return plList[0] == iID ? 1 : 0;
     }
-    QV_LOGD(LOG_TAG, "QV_Contacts: IsSameAccountEx ACCOUNT SUM= %d\n", iCount);
+    QV_LOGD(TRACE_TAG, "QV_Contacts: IsSameAccountEx ACCOUNT SUM= %d\n", iCount);
     return AreAllExcluded(plList, iCount, chain) ? 1 : 0;
 }
 

@@ -5,7 +5,7 @@
 namespace
 {
 
-constexpr const char* LOG_TAG = "Filter/OnlineFilterProcess";
+constexpr const char* TRACE_TAG = "Filter/OnlineFilterProcess";
 
 } // namespace
 
@@ -15,7 +15,7 @@ bool OnlineFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter&
     const bool bOnline = (record.iFlags & CONTACT_FLAG_ONLINE) != 0;
     if (bOnline)
     {
-        QV_LOGD(LOG_TAG, "OnlineFilterProcess: find one contact is  sms online\n");
+        QV_LOGD(TRACE_TAG, "OnlineFilterProcess: find one contact is  sms online\n");
     }
     return bOnline;
 }

@@ -8,7 +8,7 @@
 namespace
 {
 
-constexpr const char* LOG_TAG = "LocalizerImpl/QVNumLocalizerManager";
+constexpr const char* TRACE_TAG = "LocalizerImpl/QVNumLocalizerManager";
 
 constexpr wchar_t KEYS[LOC_ALPHA_COUNT + 1] = L"22233344455566677778889999";
 
@@ -63,7 +63,7 @@ int CQVNumLocalizerManager::CmpDigitalWord(unsigned short code, wchar_t* szPiece
         return 0;
     }
     const int iFits = IsUnit(szPiece, L'0' + static_cast<wchar_t>(code - LOC_DIGIT_BASE)) ? 1 : 0;
-    QV_LOGD(LOG_TAG, "QV_Contacts:CQVNumLocalizerManager::CmpDigitalWord r == %d", iFits);
+    QV_LOGD(TRACE_TAG, "QV_Contacts:CQVNumLocalizerManager::CmpDigitalWord r == %d", iFits);
     return iFits;
 }
 

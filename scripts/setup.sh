@@ -1,7 +1,7 @@
 #!/usr/bin/env bash
 # Installs what building and testing need and this machine lacks, from Debian's packages:
 #   scripts/setup.sh          compiler, build tools and libraries
-#   scripts/setup.sh --lint   also the formatter and the static checker
+#   scripts/setup.sh --lint   also the formatter, the static checker and Doxygen
 #   scripts/setup.sh --armhf  also the cross compiler and the emulator for 32-bit ARM
 # Touches neither apt nor the network when nothing is missing.
 set -euo pipefail
@@ -9,10 +9,10 @@ set -euo pipefail
 packages=(
     g++ cmake ninja-build python3
     libsqlite3-dev libcli11-dev nlohmann-json3-dev
-    libgtest-dev libbenchmark-dev unicode-data
+    libgtest-dev libbenchmark-dev unicode-data pkg-config
 )
 if [ "${1:-}" = --lint ]; then
-    packages+=(clang-format-14 clang-tidy-14)
+    packages+=(clang-format-14 clang-tidy-14 doxygen)
 fi
 if [ "${1:-}" = --armhf ]; then
     packages+=(g++-arm-linux-gnueabihf qemu-user googletest)

@@ -2,6 +2,7 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
+#include "Core/ResultOwner.h"
 #include "Core/Stopwatch.h"
 #include "DBOperator/DBOperator.h"
 #include "DBOperator/DBOperatorFactory.h"
@@ -62,28 +63,21 @@ tag_LocalizerResult* NewResult(int iNum)
     return pResult;
 }
 
-// A result set of the store manager, released with the scope.
-class CResultOwner
+// Finishes a search into the caller's result: the facade's own copy of the source where all of it
+// was found and its array has no room to spare, else a new set. Null for want of memory.
+tag_LocalizerResult* HandOut(CSearchRun& run, CResultOwner& copy, const tag_LocalizerResult& source,
+                             int iFound, long* pMask, wchar_t* szWordOut)
 {
-public:
-    explicit CResultOwner(CMemManger& manager) : m_manager(manager) {}
-    ~CResultOwner()
+    if (copy.IsExact() && iFound == source.iResultNum)
     {
-        if (m_pResult != nullptr)
-        {
-            m_manager.FreeSearchResult(m_pResult);
-        }
+        tag_LocalizerResult* pResult = copy.Detach();
+        run.FinishInPlace(*pResult, pMask, szWordOut);
+        return pResult;
     }
-    CResultOwner(const CResultOwner&) = delete;
-    CResultOwner& operator=(const CResultOwner&) = delete;
-
-    tag_LocalizerResult* Get() const { return m_pResult; }
-    tag_LocalizerResult** Receive() { return &m_pResult; }
-
-private:
-    CMemManger& m_manager;
-    tag_LocalizerResult* m_pResult = nullptr;
-};
+    tag_LocalizerResult* pResult = NewResult(iFound);
+    run.Finish(source, pResult, pMask, szWordOut);
+    return pResult;
+}
 
 } // namespace
 
@@ -237,47 +231,42 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
     int bTimeOrder = 0;
     if (pLastResult == nullptr)
     {
-        CopySource(eSearchType, *pFilterChain, run, copy.Receive());
+        CopySource(eSearchType, *pFilterChain, run, copy);
         pSource = copy.Get();
         bTimeOrder = m_pclMemManger->GetSortType() == STORE_ORDER_TIME ? 1 : 0;
     }
-    if (pSource == nullptr)
+    if (pSource == nullptr || !bKnown)
     {
-        return -1;
-    }
-    if (!bKnown)
-    {
-        return 0;
+        return pSource == nullptr ? -1 : 0;
     }
     const CStopwatch watch;
-    tag_LocalizerResult* pResult = nullptr;
+    int iRet = iBegun;
     if (iBegun == 0)
     {
-        pResult = NewResult(run.Find(*pSource, bTimeOrder));
-        run.Finish(*pSource, pResult, pMask, szWordOut);
+        const int iFound = run.Find(*pSource, bTimeOrder);
+        *ppResult = HandOut(run, copy, *pSource, iFound, pMask, szWordOut);
+        iRet = *ppResult != nullptr ? 0 : -1;
     }
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search IFL_Search time = %d\n", watch.Elapsed());
-    if (iBegun != 0)
-    {
-        return iBegun;
-    }
-    *ppResult = pResult;
-    return pResult != nullptr ? 0 : -1;
+    return iRet;
 }
 
 // The set to search when the caller gives none, less what the search rules out; a failure leaves
 // it empty or null.
 void CLocalizerLogic::CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain,
-                                 CCandidateTest& test, tag_LocalizerResult** ppSource)
+                                 CCandidateTest& test, CResultOwner& copy)
 {
     const CStopwatch watch;
     if (eSearchType == IME_SEARCH_SPECIAL)
     {
-        m_pclMemManger->CopySpecialNumberRecord(ppSource);
+        m_pclMemManger->CopySpecialNumberRecord(copy.Receive());
+        copy.SetExact(true);
     }
     else
     {
-        CContactSelection::Copy(chain, &test, ppSource);
+        bool bExact = false;
+        CContactSelection::Copy(chain, &test, copy.Receive(), &bExact);
+        copy.SetExact(bExact);
     }
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search CopyContactsResult time = %d\n", watch.Elapsed());
 }

@@ -9,6 +9,7 @@ class CCandidateTest;
 class CDBOperator;
 class CFilterChain;
 class CMemManger;
+class CResultOwner;
 class CStopwatch;
 
 extern "C"
@@ -117,7 +118,7 @@ private:
     void ReadOnlineStatus(tag_ContactsInfo& record);
     static int SortByStoredOrder(tag_ContactsInfo& record, int iSortType);
     void CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain, CCandidateTest& test,
-                    tag_LocalizerResult** ppSource);
+                    CResultOwner& copy);
     int RebuildStore(tag_ContactsInfo& record);
     bool HasRoomForAll(int& iDatabaseCount);
     bool PatchStore(int iDatabaseCount, int iRecordNum, long long* pIds, const CStopwatch& watch);

@@ -123,6 +123,12 @@ private:
     CPieceTable& m_table;
 };
 
+void LogMatches(size_t uMatches)
+{
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts:DoSearch m_vLocateArray nCount = %d\n",
+            static_cast<int>(uMatches));
+}
+
 } // namespace
 
 int CSearchRun::Begin(wchar_t* szInput)
@@ -229,12 +235,49 @@ void CSearchRun::FindMatches(const tag_LocalizerResult& candidates)
 void CSearchRun::Finish(const tag_LocalizerResult& candidates, tag_LocalizerResult* pResult,
                         long* pMask, wchar_t* szWordOut)
 {
-    QV_LOGD(QV_LOG_TAG, "QV_Contacts:DoSearch m_vLocateArray nCount = %d\n",
-            static_cast<int>(m_manager.m_vLocateArray.size()));
+    LogMatches(m_manager.m_vLocateArray.size());
     if (pResult != nullptr)
     {
         WriteEntries(candidates, *pResult);
     }
+    WriteKeys(pMask, szWordOut);
+}
+
+void CSearchRun::FinishInPlace(tag_LocalizerResult& candidates, long* pMask, wchar_t* szWordOut)
+{
+    LogMatches(m_manager.m_vLocateArray.size());
+    RankInPlace(candidates.pDetail);
+    WriteKeys(pMask, szWordOut);
+}
+
+// Brings entries into the order of their matches along the cycles of the permutation; place k gets
+// the entry that match k points to.
+void CSearchRun::RankInPlace(tag_LocalizerDetail* pDetail)
+{
+    android::Vector<_MatchResult>& vMatches = m_manager.m_vLocateArray;
+    const int32_t iCount = static_cast<int32_t>(vMatches.size());
+    for (int32_t iStart = 0; iStart < iCount; ++iStart)
+    {
+        const tag_LocalizerDetail first = pDetail[iStart];
+        int32_t iPlace = iStart;
+        while (vMatches[static_cast<size_t>(iPlace)].iIndex != iPlace)
+        {
+            _MatchResult& match = vMatches.editItemAt(static_cast<size_t>(iPlace));
+            const int32_t iFrom = match.iIndex;
+            pDetail[iPlace] = iFrom == iStart ? first : pDetail[iFrom];
+            match.iIndex = iPlace;
+            iPlace = iFrom;
+        }
+    }
+    for (int32_t i = 0; i < iCount; ++i)
+    {
+        pDetail[i].iMatchPos = vMatches[static_cast<size_t>(i)].iMatchPos;
+        pDetail[i].iFirstWord = vMatches[static_cast<size_t>(i)].iFirstWord;
+    }
+}
+
+void CSearchRun::WriteKeys(long* pMask, wchar_t* szWordOut)
+{
     *pMask = static_cast<long>(m_manager.m_stMask.lMask);
     QV_LOGD(QV_LOG_TAG, "QV_Contacts:DoSearch QVLocalizerManger pMask = %x\n",
             m_manager.m_stMask.lMask);

@@ -40,7 +40,13 @@ public:
     void Finish(const tag_LocalizerResult& candidates, tag_LocalizerResult* pResult, long* pMask,
                 wchar_t* szWordOut);
 
+    // The same for a caller whose candidates are its own and all of them matches: they become the
+    // result where they are.
+    void FinishInPlace(tag_LocalizerResult& candidates, long* pMask, wchar_t* szWordOut);
+
 private:
+    void WriteKeys(long* pMask, wchar_t* szWordOut);
+    void RankInPlace(tag_LocalizerDetail* pDetail);
     void ListAll(const tag_LocalizerResult& candidates, int bTimeOrder);
     void FindMatches(const tag_LocalizerResult& candidates);
     wchar_t IndexCharacter(const tag_LocalizerDetail& detail, int bTimeOrder);

@@ -71,13 +71,14 @@ struct tag_OpenStore
 // Makes the entries from the records where they lie. That holds the lock no longer than copying
 // the records would: of each one or two cache lines are read, and entries are an eighth of them.
 // Room for all is taken, but only what is written costs memory.
-void SelectFromStore(tag_OpenStore* pStore, const CFilterChain& chain, CCandidateTest* pTest,
+// Returns whether the array is exactly full.
+bool SelectFromStore(tag_OpenStore* pStore, const CFilterChain& chain, CCandidateTest* pTest,
                      tag_LocalizerResult* pResult)
 {
     auto pEntries = NewUnderLock<tag_LocalizerDetail>(pStore->iCount);
     if (pEntries == nullptr)
     {
-        return;
+        return true;
     }
     const CCandidateEntries::Counts counts = CCandidateEntries::Select(
         pStore->records.As<tag_ContactsStruct>(), pStore->iCount, chain, pTest, pEntries.get());
@@ -88,6 +89,7 @@ void SelectFromStore(tag_OpenStore* pStore, const CFilterChain& chain, CCandidat
         pResult->iResultNum = counts.iWritten;
         pResult->pDetail = pEntries.release();
     }
+    return counts.iWritten == 0 || counts.iWritten == pStore->iCount;
 }
 
 // Copies the records out, gives the store back and filters the copy.
@@ -107,8 +109,9 @@ void CopyFromStore(tag_OpenStore* pStore, CFilterChain& chain, tag_LocalizerResu
 } // namespace
 
 void CContactSelection::Copy(CFilterChain& chain, CCandidateTest* pTest,
-                             tag_LocalizerResult** ppResult)
+                             tag_LocalizerResult** ppResult, bool* pbExact)
 {
+    *pbExact = true;
     if (ppResult == nullptr)
     {
         return;
@@ -131,7 +134,7 @@ void CContactSelection::Copy(CFilterChain& chain, CCandidateTest* pTest,
     }
     if (CRecordTest::CanTest(chain))
     {
-        SelectFromStore(&store, chain, pTest, *ppResult);
+        *pbExact = SelectFromStore(&store, chain, pTest, *ppResult);
     }
     else
     {

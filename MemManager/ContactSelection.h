@@ -12,8 +12,10 @@ class CContactSelection
 public:
     // As CMemManger::CopyContactsResult, less the contacts that pTest (may be null) rules out.
     // With a chain whose processes write log lines all survivors of the filters stay in the set.
-    // The set's array may have room for more entries than it holds.
-    static void Copy(CFilterChain& chain, CCandidateTest* pTest, tag_LocalizerResult** ppResult);
+    // *pbExact tells whether the set's array has room for exactly the entries it holds; otherwise
+    // it may have room for every stored contact.
+    static void Copy(CFilterChain& chain, CCandidateTest* pTest, tag_LocalizerResult** ppResult,
+                     bool* pbExact);
 };
 
 #endif

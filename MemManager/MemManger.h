@@ -91,7 +91,10 @@ public:
     int UpdateContactRecord(tag_ContactsInfo* pInfo);
 
     // The stored contacts that pass every filter of the chain, as a set of entries in the
-    // store's order. Five attempts at the lock, 200 ms apart, with an error line each. The set
+    // store's order. Five attempts at the lock, 200 ms apart, with an error line each. The lock is
+    // held while the records are read, once and in order: entries are made where the records lie,
+    // which takes no longer than copying them out. Only for chains whose filters write log lines
+    // (kinds 9 and 11) the records are copied, and filtered after the lock is released. The set
     // is empty when there is no store, it is damaged, the lock was refused or memory ran out,
     // and null when the set could not be allocated. Null ppResult: nothing is done.
     void CopyContactsResult(CFilterChain& chain, tag_LocalizerResult** ppResult);

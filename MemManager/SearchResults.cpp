@@ -38,7 +38,8 @@ void CountSections(const tag_LocalizerResult& set, int iFirst, int iSections, in
 
 void CMemManger::CopyContactsResult(CFilterChain& chain, tag_LocalizerResult** ppResult)
 {
-    CContactSelection::Copy(chain, nullptr, ppResult);
+    bool bExact = false;
+    CContactSelection::Copy(chain, nullptr, ppResult, &bExact);
 }
 
 void CMemManger::CopySpecialNumberRecord(tag_LocalizerResult** ppResult)

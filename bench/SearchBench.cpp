@@ -6,6 +6,11 @@
 
 #include "Core/LocalizerLogic.h"
 #include "Filter/FilterChain.h"
+#include "LocalizerImpl/QVNumLocalizerManager.h"
+#include "LocalizerImpl/QVWordLocalizerManager.h"
+#include "LocalizerImpl/SearchRun.h"
+#include "MemManager/ContactSelection.h"
+#include "MemManager/MemManger.h"
 #include "bench/Floors.h"
 #include "bench/PeakMemory.h"
 #include "bench/Queries.h"
@@ -134,6 +139,29 @@ private:
     CFilterChain m_chain;
 };
 
+// Time of the selection alone for the first character of a text.
+double SelectionSeconds(const tag_Query& query)
+{
+    CMemManger manager;
+    CFilterChain chain;
+    tag_LocalizerResult* pResult = nullptr;
+    return MedianSeconds(
+        MEASURE_RUNS,
+        [&]
+        {
+            CQVWordLocalizerManager words(1);
+            CQVNumLocalizerManager digits(1);
+            CQVLocalizerManager& matcher =
+                query.eType == IME_SEARCH_NUM ? static_cast<CQVLocalizerManager&>(digits) : words;
+            CSearchRun run(matcher);
+            wchar_t szInput[] = {query.szText[0], 0};
+            run.Begin(szInput);
+            bool bExact = false;
+            CContactSelection::Copy(chain, &run, &pResult, &bExact);
+        },
+        [&] { manager.FreeSearchResult(pResult); });
+}
+
 double EntriesOf(int iEntries)
 {
     static std::map<int, double> floors;
@@ -202,6 +230,28 @@ void WholeStore(benchmark::State& state)
         state.counters["worst_to_median"] = Percentile(vNet, 100) / Percentile(vNet, 50);
         state.counters["memory_share"] = dMemory;
         state.counters["copy_us"] = dCopy * MICROSECONDS;
+    }
+}
+
+// The selection of a whole-store keystroke, which is nearly all done under the store lock. Allowed:
+// what the lock would be held for to copy the records out, into memory of their own.
+void LockHeld(benchmark::State& state)
+{
+    const int iContacts = static_cast<int>(state.range(0));
+    WorkloadOf(iContacts);
+    for (auto _ : state)
+    {
+        const double dCopy = CopyFreshFloor(iContacts);
+        std::vector<double> vTimes;
+        for (const tag_Query& query : QUERIES)
+        {
+            vTimes.push_back(SelectionSeconds(query) * MICROSECONDS);
+        }
+        state.counters["held_p50_us"] = Percentile(vTimes, 50);
+        state.counters["held_max_us"] = Percentile(vTimes, 100);
+        state.counters["copy_us"] = CopyFloor(iContacts) * MICROSECONDS;
+        state.counters["copy_fresh_us"] = dCopy * MICROSECONDS;
+        state.counters["lock_share"] = Percentile(vTimes, 100) / (dCopy * MICROSECONDS);
     }
 }
 
@@ -313,6 +363,7 @@ void RegisterAll()
         };
         add("floors", Floors);
         add("whole_store", WholeStore);
+        add("lock_held", LockHeld);
         add("narrowed", Narrowed);
         add("build", Build);
         add("changes", Changes);

@@ -89,6 +89,11 @@ def main() -> int:
         rows["whole_store"], times, {"p95_share": "p95 share", "max_share": "max share",
                                      "worst_to_median": "worst/median",
                                      "memory_share": "memory share"})
+    text += ("\n## How long a keystroke may hold the store lock\n\nThe whole selection, text and "
+             "opening of files included, beside copying the records out, which is what the lock "
+             "would be held for otherwise.\n\n") + by_size(
+        rows["lock_held"], {"held_p50_us": "p50 us", "held_max_us": "max us", "copy_us": "copy",
+                            "copy_fresh_us": "copy-fresh"}, {"lock_share": "max / copy-fresh"})
     text += ("\n## A keystroke that narrows the previous result\n\nAllowed: p95 6 scans of the "
              "previous result + 2 entries of the new one + 50 us; the median keystroke of 100,000 "
              "contacts copy / 20.\n\n") + by_size(

@@ -57,13 +57,13 @@ public:
 
 private:
     bool IsReady() const { return m_pKeyBuf != nullptr && m_pSwapBuf != nullptr; }
-    void FreeBuffers();
-    char* RecordAt(char* base, int iIndex) const;
-    bool BeginSearch(const char* base, int count, const char* key, Common_Sort_enum type,
-                     int bInsertPos, int* piResult);
-    int SearchExact(char* base, int count, char* key);
-    int SearchInsertion(char* base, int count, char* key, bool* pbFound);
-    int SearchHalves(char* base, int count, char* key, bool* pbFound);
+    QV_INTERNAL void FreeBuffers();
+    QV_INTERNAL char* RecordAt(char* base, int iIndex) const;
+    QV_INTERNAL bool BeginSearch(const char* base, int count, const char* key,
+                                 Common_Sort_enum type, int bInsertPos, int* piResult);
+    QV_INTERNAL int SearchExact(char* base, int count, char* key);
+    QV_INTERNAL int SearchInsertion(char* base, int count, char* key, bool* pbFound);
+    QV_INTERNAL int SearchHalves(char* base, int count, char* key, bool* pbFound);
 
     Common_Sort_enum m_eSortType = SORT_NAME;
     int m_iRecSize = 0;

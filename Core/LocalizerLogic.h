@@ -113,17 +113,18 @@ public:
     int OnGetSortType();
 
 private:
-    int BuildIndex(tag_ContactsInfo& record);
-    int ReadContacts(tag_ContactsInfo& record);
-    void ReadOnlineStatus(tag_ContactsInfo& record);
-    static int SortByStoredOrder(tag_ContactsInfo& record, int iSortType);
-    void CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain, CCandidateTest& test,
-                    CResultOwner& copy);
-    int RebuildStore(tag_ContactsInfo& record);
-    bool HasRoomForAll(int& iDatabaseCount);
-    bool PatchStore(int iDatabaseCount, int iRecordNum, long long* pIds, const CStopwatch& watch);
-    bool HasUnbuiltContacts(int iTotalNum);
-    bool RefreshOnlineStatus();
+    QV_INTERNAL int BuildIndex(tag_ContactsInfo& record);
+    QV_INTERNAL int ReadContacts(tag_ContactsInfo& record);
+    QV_INTERNAL void ReadOnlineStatus(tag_ContactsInfo& record);
+    QV_INTERNAL static int SortByStoredOrder(tag_ContactsInfo& record, int iSortType);
+    QV_INTERNAL void CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain,
+                                CCandidateTest& test, CResultOwner& copy);
+    QV_INTERNAL int RebuildStore(tag_ContactsInfo& record);
+    QV_INTERNAL bool HasRoomForAll(int& iDatabaseCount);
+    QV_INTERNAL bool PatchStore(int iDatabaseCount, int iRecordNum, long long* pIds,
+                                const CStopwatch& watch);
+    QV_INTERNAL bool HasUnbuiltContacts(int iTotalNum);
+    QV_INTERNAL bool RefreshOnlineStatus();
 
     CMemManger* m_pclMemManger;
     CDBOperator* m_pDBOperator;

@@ -45,12 +45,12 @@ public:
     void ParseIDString(const char* szText, QVLong32* pIds, int iMax);
 
 private:
-    int EnsureOpen();
-    int CountContacts(const CIdList& clIds, tag_ContactsInfo* pRecord);
-    int ReadContacts(const CIdList& clIds, tag_ContactsInfo* pRecord);
-    int ReadLocalizer(const CIdList& clIds, tag_ContactsInfo* pRecord);
-    int ReadContactRow(int iContactID, tag_ContactsStruct* pContact, int& iFound);
-    int ReadLocalizerRow(int iContactID, tag_ContactsStruct* pContact, int& iFound);
+    QV_INTERNAL int EnsureOpen();
+    QV_INTERNAL int CountContacts(const CIdList& clIds, tag_ContactsInfo* pRecord);
+    QV_INTERNAL int ReadContacts(const CIdList& clIds, tag_ContactsInfo* pRecord);
+    QV_INTERNAL int ReadLocalizer(const CIdList& clIds, tag_ContactsInfo* pRecord);
+    QV_INTERNAL int ReadContactRow(int iContactID, tag_ContactsStruct* pContact, int& iFound);
+    QV_INTERNAL int ReadLocalizerRow(int iContactID, tag_ContactsStruct* pContact, int& iFound);
 
     sqlite3* m_pDB; // null while closed
 };

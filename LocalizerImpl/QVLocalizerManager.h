@@ -201,11 +201,12 @@ protected:
 private:
     friend class CSearchRun;
 
-    void ClearSearch();
-    bool CompareRun(PYOFWORDS* pMap, const wchar_t* pCodes,
-                    const android::Vector<wchar_t*>& vPieces, int& bRunFull);
-    bool ComparePiece(PYOFWORDS* pMap, wchar_t code, wchar_t* szPiece, bool bLast, int& bRunFull);
-    static void SpellName(PYOFWORDS* pMap, tag_ContactsStruct& record);
+    QV_INTERNAL void ClearSearch();
+    QV_INTERNAL bool CompareRun(PYOFWORDS* pMap, const wchar_t* pCodes,
+                                const android::Vector<wchar_t*>& vPieces, int& bRunFull);
+    QV_INTERNAL bool ComparePiece(PYOFWORDS* pMap, wchar_t code, wchar_t* szPiece, bool bLast,
+                                  int& bRunFull);
+    QV_INTERNAL static void SpellName(PYOFWORDS* pMap, tag_ContactsStruct& record);
 
     android::Vector<_MatchResult> m_vLocateArray; // at most one per candidate
     CNWORDOUTPUT m_stCNWords[CN_WORD_MAX];        // in order of discovery

@@ -25,8 +25,8 @@ public:
     int IsValid(android::Vector<wchar_t*>& vPieces) override;
 
 private:
-    void OfferReading(PYOFWORDS* pMap, const PYOFWORDS& record, const char* szReading, int iLength,
-                      int iTyped);
+    QV_INTERNAL void OfferReading(PYOFWORDS* pMap, const PYOFWORDS& record, const char* szReading,
+                                  int iLength, int iTyped);
 };
 
 #endif

@@ -21,7 +21,7 @@ CProcess::CProcess(const std::vector<std::string>& vArguments) : m_iPid(fork())
             vArgv.push_back(const_cast<char*>(strArgument.c_str()));
         }
         vArgv.push_back(nullptr);
-        execv("/proc/self/exe", vArgv.data());
+        execv(QV_STRESS_PROGRAM, vArgv.data());
         _exit(127);
     }
 }

@@ -13,5 +13,6 @@ void AddSampleCommand(CLI::App& app);
 void AddIndexCommand(CLI::App& app);
 void AddSearchCommand(CLI::App& app);
 void AddShowCommand(CLI::App& app);
+void AddNotifyCommand(CLI::App& app);
 
 #endif

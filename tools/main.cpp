@@ -23,6 +23,7 @@ void AddCommands(CLI::App& app)
     AddIndexCommand(app);
     AddSearchCommand(app);
     AddShowCommand(app);
+    AddNotifyCommand(app);
 }
 
 int Report(const CToolError& error)

@@ -13,6 +13,7 @@
 #include <fcntl.h>
 #include <filesystem>
 #include <functional>
+#include <numeric>
 #include <random>
 #include <sys/file.h>
 #include <unistd.h>
@@ -162,23 +163,23 @@ TEST_F(CContactChangesTest, RenewsAContactInItsSlot)
     EXPECT_EQ(after.lGroupID[1], 9);
     EXPECT_EQ(after.iSortIndex, before.iSortIndex);
     EXPECT_EQ(after.llLastTimeContacted, contact.llLastTime);
-    EXPECT_EQ(
-        HandlerLines(DEBUG_LINE),
-        (Lines{"QV_Contacts: OnContactsTableChanged1 iRecordNum = 1\n",
-               "QV_Contacts: OnContactsTableChanged1 m_pclMemManger->GetMemSize; memSize = 1008 "
-               "memContactsNum = 8",
-               "QV_Contacts: OnContactsTableChanged1 GetContactsCount = 8\n",
-               "QV_Contacts: OnContactsTableChanged1 contactCount less than memSize, right!",
-               "QV_Contacts: OnContactsTableChanged1 old contact count = 8\n",
-               "QV_Contacts: OnContactsTableChanged1 stRecord.RecordNum: 1",
-               "QV_Contacts: OnContactsTableChanged1 found same item, renew it k=0, "
-               "stRecord.RecordNum=0",
-               "QV_Contacts: OnContactsTablePartChanged1 find matchedNum=0, stRecord.RecordNum=0",
-               HandlerLines(DEBUG_LINE).back()}));
-    EXPECT_EQ(HandlerLines(DEBUG_LINE)
-                  .back()
-                  .rfind("QV_Contacts: OnContactsTablePartChanged1 EXIT takes ", 0),
-              0U);
+    const std::string strPatch = "QV_Contacts: OnContactsTableChanged1 ";
+    const std::string strPart = "QV_Contacts: OnContactsTablePartChanged1 ";
+    const Lines vExpected = {
+        strPatch + "iRecordNum = 1\n",
+        strPatch + "m_pclMemManger->GetMemSize; memSize = 1008 memContactsNum = 8",
+        strPatch + "GetContactsCount = 8\n",
+        strPatch + "contactCount less than memSize, right!",
+        strPatch + "old contact count = 8\n",
+        strPatch + "stRecord.RecordNum: 1",
+        strPatch + "found same item, renew it k=0, stRecord.RecordNum=0",
+        strPart + "find matchedNum=0, stRecord.RecordNum=0",
+        strPart + "EXIT takes ",
+    };
+    Lines vLines = HandlerLines(DEBUG_LINE);
+    ASSERT_FALSE(vLines.empty());
+    vLines.back().resize(vExpected.back().size()); // without the milliseconds
+    EXPECT_EQ(vLines, vExpected);
     EXPECT_TRUE(m_log.Texts(ERROR_LINE).empty());
 }
 
@@ -277,7 +278,7 @@ TEST_P(CPatch, EndsLikeAFreshBuildAfterAnyChanges)
     const std::vector<std::string> vNames = {"张三", "张山", "zhang", "Tom", "tom",  "",
                                              "9",    "李",   "重庆",  "#",   "李Lee"};
     BuildStore(GetParam());
-    for (int iRound = 0; iRound < 30; ++iRound)
+    for (int iRound = 0; iRound < 15; ++iRound)
     {
         std::vector<long long> vIds;
         for (int i = Pick(12); i >= 0; --i)
@@ -366,11 +367,8 @@ TEST_F(CContactChangesTest, RebuildsWhereAPatchCannotDo)
 {
     const auto Many = [](int iNum, long long llFirst)
     {
-        std::vector<long long> vIds;
-        for (int i = 0; i < iNum; ++i)
-        {
-            vIds.push_back(llFirst + i);
-        }
+        std::vector<long long> vIds(static_cast<size_t>(iNum));
+        std::iota(vIds.begin(), vIds.end(), llFirst);
         return vIds;
     };
     const struct

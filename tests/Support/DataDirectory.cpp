@@ -5,7 +5,6 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
-#include <iterator>
 #include <stdexcept>
 
 namespace fs = std::filesystem;
@@ -42,8 +41,13 @@ bool CDataDirectory::Exists(const std::string& strPath)
 
 std::string CDataDirectory::ReadBytes(const std::string& strPath)
 {
+    std::error_code error;
+    const uintmax_t uSize = fs::file_size(strPath, error);
+    std::string strBytes(error ? 0 : static_cast<size_t>(uSize), '\0');
     std::ifstream stream(strPath, std::ios::binary);
-    return {std::istreambuf_iterator<char>(stream), std::istreambuf_iterator<char>()};
+    stream.read(strBytes.data(), static_cast<std::streamsize>(strBytes.size()));
+    strBytes.resize(static_cast<size_t>(stream.gcount()));
+    return strBytes;
 }
 
 void CDataDirectory::WriteBytes(const std::string& strPath, const std::string& strBytes)

@@ -255,6 +255,77 @@ class ShowTest(ToolTest):
         self.assertEqual(["0", "1"], re.findall(r"(?m)^ +(\d+) +\d+  \S{6} ", by_name))
 
 
+class NotifyTest(ToolTest):
+    """A sample for every test: each changes it."""
+
+    def setUp(self):
+        super().setUp()
+        self.data = pathlib.Path(tempfile.mkdtemp(dir=self.root))
+        make_sample(self.data)
+
+    def change(self, statement):
+        with contextlib.closing(sqlite3.connect(self.data / "databases/contacts2.db")) as database:
+            database.execute(statement)
+            database.commit()
+
+    def notify(self, *arguments):
+        return self.check("notify", *arguments).stdout
+
+    def found(self, text, *arguments):
+        return {match["contact_id"]
+                for match in self.last_step(text, "--once", *arguments)["matches"]}
+
+    def test_the_next_search_shows_the_change(self):
+        self.change("UPDATE localizer SET (display_name, localizerkey) = (SELECT display_name, "
+                    "localizerkey FROM localizer WHERE contact_id = 1) WHERE contact_id = 54")
+        self.assertNotIn(54, self.found("zhangsan"))
+        self.assertEqual("The index holds 565 contacts, with room for 1565\n",
+                         self.notify("contacts", "54"))
+        self.assertIn(54, self.found("zhangsan"))
+        self.assertNotIn(54, self.found("tom"))
+
+        self.assertNotIn(6, self.found("zs", "--starred"))
+        self.notify("star", "6")
+        self.assertIn(6, self.found("zs", "--starred"))
+        self.notify("star", "6", "--off")
+        self.assertNotIn(6, self.found("zs", "--starred"))
+
+        self.change("UPDATE status_updates SET status = 'online' "
+                    "WHERE status_update_data_id = 1005")
+        self.notify("status")
+        self.assertIn(6, self.found("zs", "--online"))
+
+    def test_contacts_come_and_go(self):
+        everybody = self.found("")
+        self.change("DELETE FROM visible_contacts WHERE _id IN (1, 6)")
+        self.assertIn("holds 563 contacts, with room for 1565", self.notify("contacts", "1", "6"))
+        self.assertEqual(everybody - {1, 6}, self.found(""))
+        self.change("INSERT INTO visible_contacts(_id) VALUES(1), (6)")
+        self.assertIn("holds 565 contacts, with room for 1565", self.notify("contacts"))
+        self.assertEqual(everybody, self.found(""))
+
+    def test_the_last_contacted_comes_first(self):
+        self.check("show", "--set-sort-type", "time")
+        self.notify("contacts")
+        self.notify("time", "54", "1900000000000")
+        self.assertEqual(54, self.last_step("", "--once")["matches"][0]["contact_id"])
+
+    def test_tells_when_the_index_does_not_follow(self):
+        self.change("DELETE FROM localizer WHERE contact_id = 54")
+        process = self.check("notify", "contacts", "54", code=FAILED)
+        self.assertIn("ReadAllLocalizer", process.stderr)
+        self.assertIn("builds it anew", process.stderr)
+
+    def test_wrong_use(self):
+        for arguments in ([], ["nothing"], ["star"], ["star", "0"], ["time", "5"],
+                          ["contacts", "x"], ["status", "5"]):
+            self.check("notify", *arguments, code=USAGE)
+        (self.data / "files/ContactsReg.bin").unlink()
+        self.check("notify", "status", code=MISSING)
+        (self.data / "databases/contacts2.db").unlink()
+        self.check("notify", "status", code=MISSING)
+
+
 class ErrorsTest(ToolTest):
     def fails(self, directory, code, text, command, *arguments):
         process = run(directory, command, *arguments)
@@ -306,7 +377,7 @@ class ErrorsTest(ToolTest):
         self.check("search", "a")
 
     def test_help_ends_well(self):
-        for command in ("sample", "index", "search", "show"):
+        for command in ("sample", "index", "search", "show", "notify"):
             output = self.check(command, "--help").stdout
             self.assertIn("--data-dir", output)
             self.assertIn("Exit codes: 0 done", output)

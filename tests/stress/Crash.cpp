@@ -40,7 +40,7 @@ namespace
 
 using Clock = std::chrono::steady_clock;
 
-constexpr int CONTACTS = 2000;
+constexpr int CONTACTS = 1000;
 constexpr int READER_PLANS = 10;
 constexpr unsigned int READER_SECONDS = 60; // a reader that takes longer hangs
 constexpr int NEVER = 0;                    // microseconds until the kill

@@ -1,7 +1,7 @@
 // Many processes on one store: a provider that changes its database and tells the library, some
 // that search meanwhile, one that takes the store lock away from all of them.
 //
-//   qv_stress [ROUNDS [SEED [CHANGES]]]    2 rounds of 40 changes, seed 1 by default
+//   qv_stress [ROUNDS [SEED [CHANGES]]]    2 rounds of 25 changes, seed 1 by default
 //
 // Each round ends with the store compared to a fresh build and every search result compared to
 // what the same search gives in the states that the store had while it ran.
@@ -410,7 +410,7 @@ int main(int argc, char** argv)
         }
         const auto Number = [&vArguments](size_t uPlace, int iDefault)
         { return vArguments.size() > uPlace ? std::stoi(vArguments[uPlace]) : iDefault; };
-        return RunRounds(Number(0, 2), static_cast<unsigned int>(Number(1, 1)), Number(2, 40));
+        return RunRounds(Number(0, 2), static_cast<unsigned int>(Number(1, 1)), Number(2, 25));
     }
     catch (const std::exception& error)
     {

@@ -1,0 +1,117 @@
+#include "tools/Commands.h"
+
+#include "Core/LocalizerLogic.h"
+#include "MemManager/MemManger.h"
+#include "tools/DataDirectory.h"
+#include "tools/LibraryLog.h"
+#include "tools/ToolError.h"
+
+#include <CLI/CLI.hpp>
+
+#include <functional>
+#include <iostream>
+#include <limits>
+#include <memory>
+#include <string>
+#include <vector>
+
+namespace
+{
+
+struct tag_NotifyOptions
+{
+    CDataDirectory directory;
+    std::vector<long long> vIds;
+    long lId = 0;
+    long long llTime = 0;
+    bool bStarred = true;
+};
+
+using OptionsPtr = std::shared_ptr<tag_NotifyOptions>;
+using Handler = std::function<void(CLocalizerLogic&, tag_NotifyOptions&)>;
+
+void TellContacts(CLocalizerLogic& logic, tag_NotifyOptions& options)
+{
+    if (options.vIds.empty())
+    {
+        logic.OnContactsTableChanged();
+    }
+    else
+    {
+        logic.OnContactsTableChanged(static_cast<int>(options.vIds.size()), options.vIds.data());
+    }
+}
+
+// The handlers report nothing; what they could not do shows in the registration record.
+void RequireComplete(const CLibraryLog& log)
+{
+    int iTotal = 0;
+    const int iCapacity = CMemManger().GetMemSize(&iTotal);
+    if (iTotal > iCapacity || iCapacity == 0)
+    {
+        throw CToolError(TOOL_EXIT_FAILED,
+                         "the index does not hold what the database holds" + log.Errors(),
+                         "The next notification of contacts or status builds it anew.");
+    }
+    std::cout << "The index holds " << iTotal << " contacts, with room for " << iCapacity << '\n';
+}
+
+void RunNotify(tag_NotifyOptions& options, const Handler& fnHandler)
+{
+    options.directory.Use();
+    options.directory.RequireDatabase();
+    options.directory.RequireIndex();
+    const CLibraryLog log;
+    CLocalizerLogic logic;
+    fnHandler(logic, options);
+    RequireComplete(log);
+}
+
+CLI::App* AddEvent(CLI::App& notify, const OptionsPtr& pOptions, const char* szName,
+                   const char* szMeaning, const Handler& fnHandler)
+{
+    CLI::App* pEvent = notify.add_subcommand(szName, szMeaning);
+    pEvent->fallthrough(); // --data-dir may follow the event
+    pEvent->callback([pOptions, fnHandler] { RunNotify(*pOptions, fnHandler); });
+    return pEvent;
+}
+
+void AddContactId(CLI::App& event, tag_NotifyOptions& options)
+{
+    event.add_option("id", options.lId, "The contact")
+        ->required()
+        ->check(CLI::Range(1, std::numeric_limits<int>::max()));
+}
+
+void AddEvents(CLI::App& notify, const OptionsPtr& pOptions)
+{
+    AddEvent(notify, pOptions, "contacts", "Contacts appeared, changed or went", TellContacts)
+        ->add_option("ids", pOptions->vIds,
+                     "The contacts; all of them without one. More than 200 rebuild the index");
+    AddEvent(notify, pOptions, "status", "Contacts went online or offline",
+             [](CLocalizerLogic& logic, tag_NotifyOptions& /*options*/)
+             { logic.OnStatusUpdatesTableChanged(0, nullptr); });
+    CLI::App* pTime = AddEvent(notify, pOptions, "time", "A contact was contacted",
+                               [](CLocalizerLogic& logic, tag_NotifyOptions& options)
+                               { logic.OnContactTimeChanged(options.lId, options.llTime); });
+    AddContactId(*pTime, *pOptions);
+    pTime->add_option("ms", pOptions->llTime, "When, in milliseconds since 1970")->required();
+    CLI::App* pStar =
+        AddEvent(notify, pOptions, "star", "A contact became a favourite",
+                 [](CLocalizerLogic& logic, tag_NotifyOptions& options)
+                 { logic.OnContactStarChanged(options.lId, options.bStarred ? 1 : 0); });
+    AddContactId(*pStar, *pOptions);
+    pStar->add_flag("!--off", pOptions->bStarred, "It ceased to be one");
+}
+
+} // namespace
+
+void AddNotifyCommand(CLI::App& app)
+{
+    auto pOptions = std::make_shared<tag_NotifyOptions>();
+    CLI::App* pCommand = app.add_subcommand(
+        "notify", "Tell the library what changed in the database, as the provider does");
+    pOptions->directory.AddOption(*pCommand);
+    pCommand->require_subcommand(1);
+    AddEvents(*pCommand, pOptions);
+}

@@ -26,19 +26,6 @@ TEST(IdList, WritesTheLow32BitsOfEachIdSigned)
     EXPECT_EQ(" in(1,-2147483648,-1,5)", ListText({1, 0x80000000LL, -1, 0x100000005LL}));
 }
 
-TEST(IdList, IsEmptyOutsideOneTo200Ids)
-{
-    const std::vector<long long> vIds(201, 1);
-    for (const long lCount : {-1L, 0L, 201L})
-    {
-        EXPECT_TRUE(CIdList(lCount, vIds.data()).IsEmpty()) << lCount;
-        EXPECT_FALSE(CIdList::CanListAll(lCount, vIds.data())) << lCount;
-    }
-    EXPECT_TRUE(CIdList::CanListAll(200, vIds.data()));
-    EXPECT_TRUE(CIdList(1, nullptr).IsEmpty());
-    EXPECT_FALSE(CIdList::CanListAll(1, nullptr));
-}
-
 // " in(" and 163 ids of ten digits are 1,796 characters: one more id begins, whatever its length,
 // and the list ends.
 TEST(IdList, StopsBehindTheIdThatReachesTheLimit)
@@ -53,18 +40,4 @@ TEST(IdList, StopsBehindTheIdThatReachesTheLimit)
     vIds.push_back(1);
     EXPECT_FALSE(CanListAll(vIds));
     EXPECT_EQ(strFull, ListText(vIds));
-}
-
-TEST(IdList, HoldsTheLongestText)
-{
-    // 1,797 characters before the last id, the longest of all.
-    std::vector<long long> vIds(162, 1234567890);
-    vIds.push_back(-1234567890);
-    vIds.push_back(-2147483648LL);
-    EXPECT_EQ(CIdList::TEXT_SIZE, ListText(vIds).size() + 1);
-    EXPECT_TRUE(CanListAll(vIds));
-    // A text of exactly the limit takes no further id.
-    vIds[0] = -1234567890;
-    EXPECT_EQ(CIdList::TEXT_LIMIT + 1, ListText(vIds).size());
-    EXPECT_FALSE(CanListAll(vIds));
 }

@@ -95,27 +95,6 @@ TEST_F(COnlineTest, FindsTheSameRecordsWithoutItsTable)
     EXPECT_EQ(2, iSuccesses); // without the table, and with everything
 }
 
-TEST_F(COnlineTest, NoOnlineRowClearsEveryBit)
-{
-    MakeRecords({1, 2, 0});
-    EXPECT_EQ(0, ReadOnline());
-    EXPECT_TRUE(OnlinePlaces().empty());
-    MakeRecords({});
-    m_clProvider.SetOnline(0, true);
-    EXPECT_EQ(0, ReadOnline());
-}
-
-TEST_F(COnlineTest, AFailureChangesNoRecord)
-{
-    MakeRecords({1});
-    m_clProvider.Execute("drop table status_updates");
-    CLogCapture log;
-    EXPECT_EQ(-1, ReadOnline());
-    EXPECT_EQ(std::vector<int>{0}, OnlinePlaces());
-    EXPECT_EQ(std::vector<std::string>{" select contacts count ERROR result=1"},
-              log.Texts(ERROR_LINE));
-}
-
 TEST_F(COnlineTest, ARecordArrayThatCannotBeHadFailsTheRead)
 {
     m_clProvider.PutAll({{1}, {2}});

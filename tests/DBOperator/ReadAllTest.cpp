@@ -1,6 +1,5 @@
 #include "tests/DBOperator/ReaderFixture.h"
 
-#include <climits>
 #include <cstring>
 
 namespace
@@ -63,32 +62,6 @@ TEST_F(CReadAllTest, FillsEveryFieldOfTheVisibleContacts)
     EXPECT_EQ(0, std::memcmp(expected, set.pContacts, sizeof(expected)));
 }
 
-TEST_F(CReadAllTest, FlagColumnsSetTheirOwnBit)
-{
-    const struct
-    {
-        bool tag_ProviderContact::*pFlag;
-        uint32_t uBit;
-    } FLAGS[] = {{&tag_ProviderContact::bSecret, CONTACT_FLAG_SECRET},
-                 {&tag_ProviderContact::bMail, CONTACT_FLAG_MAIL},
-                 {&tag_ProviderContact::bPhone, CONTACT_FLAG_PHONE},
-                 {&tag_ProviderContact::bStarred, CONTACT_FLAG_STARRED},
-                 {&tag_ProviderContact::bAddress, CONTACT_FLAG_ADDRESS}};
-    int iId = 0;
-    for (const auto& flag : FLAGS)
-    {
-        tag_ProviderContact contact{++iId};
-        contact.*flag.pFlag = true;
-        m_clProvider.Put(contact);
-    }
-    tag_ReadSet set;
-    ASSERT_EQ(0, ReadAll(set));
-    for (int i = 0; i < set.RecordNum; ++i)
-    {
-        EXPECT_EQ(FLAGS[i].uBit, set.pContacts[i].iFlags) << i;
-    }
-}
-
 TEST_F(CReadAllTest, CutsNamesAndKeysToTheirFields)
 {
     const std::string strZhang = "张"; // three bytes
@@ -100,7 +73,6 @@ TEST_F(CReadAllTest, CutsNamesAndKeysToTheirFields)
     } TEXTS[] = {
         {"", L"", L""},
         {std::string(40, 'x'), std::wstring(30, L'x'), std::wstring(10, L'x')},
-        {Repeat(strZhang, 10), std::wstring(10, L'\u5F20'), std::wstring(10, L'\u5F20')},
         {Repeat(strZhang, 14), std::wstring(10, L'\u5F20'), std::wstring(10, L'\u5F20')},
         // The last character would end behind the limit.
         {"x" + Repeat(strZhang, 10), L"x" + std::wstring(9, L'\u5F20'),
@@ -108,7 +80,6 @@ TEST_F(CReadAllTest, CutsNamesAndKeysToTheirFields)
         // Not UTF-8 from some byte on.
         {"ab\xFFzz", L"ab", L"ab"},
         {"ab\xF0\x9F\x98\x80zz", L"ab", L"ab"},
-        {"ab\xE5\xBC", L"ab", L"ab"},
         {"\x80z", L"", L""},
         {std::string("ab\0cd", 5), L"ab", L"ab"},
     };
@@ -176,21 +147,6 @@ TEST_F(CReadAllTest, ReadsTheListedVisibleContactsOnly)
     }
 }
 
-TEST_F(CReadAllTest, ReadsTheLongestList)
-{
-    std::vector<long long> vIds(200);
-    std::vector<tag_ProviderContact> vContacts(vIds.size());
-    for (size_t i = 0; i < vIds.size(); ++i)
-    {
-        vContacts[i].iId = INT_MIN + static_cast<int>(i);
-        vIds[i] = vContacts[i].iId;
-    }
-    m_clProvider.PutAll(vContacts);
-    tag_ReadSet set;
-    ASSERT_EQ(0, m_clReader.ReadAllLocalizer(&set, 200, vIds.data()));
-    EXPECT_EQ(150, set.RecordNum); // (1798 - 4) / 12 rounded up
-}
-
 TEST_F(CReadAllTest, LogsTheStatements)
 {
     m_clProvider.PutAll({{1}, {2}});
@@ -218,15 +174,6 @@ TEST_F(CReadAllTest, LogsTheStatements)
     EXPECT_EQ(EXPECTED, log.Lines());
 }
 
-TEST_F(CReadAllTest, NoVisibleContactIsASuccessWithoutArray)
-{
-    tag_ContactsStruct untouched{};
-    tag_ContactsInfo set{5, &untouched};
-    EXPECT_EQ(0, ReadAll(set));
-    EXPECT_EQ(0, set.RecordNum);
-    EXPECT_EQ(&untouched, set.pContacts);
-}
-
 TEST_F(CReadAllTest, RefusesMissingArguments)
 {
     tag_ReadSet set;
@@ -240,60 +187,4 @@ TEST_F(CReadAllTest, RefusesMissingArguments)
     EXPECT_EQ(-1, m_clReader.ReadAllSmsOnlineStatus(nullptr, 0, nullptr));
     int iFound = 0;
     EXPECT_EQ(-1, m_clReader.ReadContactsByID(1, nullptr, iFound));
-}
-
-TEST_F(CReadAllTest, SkipsNameRowsOfInvisibleContacts)
-{
-    m_clProvider.PutAll({{1}, {2, "b"}, {3}});
-    m_clProvider.SetVisible(1, false);
-    m_clProvider.SetVisible(3, false);
-    CLogCapture log;
-    tag_ReadSet set;
-    EXPECT_EQ(0, ReadAll(set));
-    EXPECT_EQ(std::vector<int>{2}, set.Ids());
-    EXPECT_STREQ(L"b", set.pContacts[0].szName);
-    // The row of contact 3 comes when every record is complete.
-    EXPECT_EQ(std::vector<std::string>{LINE_LOCALIZER_STEP}, log.Texts(ERROR_LINE));
-}
-
-TEST_F(CReadAllTest, FailsForAVisibleContactWithoutNameRow)
-{
-    m_clProvider.PutAll({{1, "a"}, {2, "b"}, {3, "c"}});
-    m_clProvider.Execute("delete from localizer where contact_id=2");
-    CLogCapture log;
-    tag_ReadSet set;
-    EXPECT_EQ(-1, ReadAll(set));
-    EXPECT_EQ((std::vector<int>{1, 2, 3}), set.Ids());
-    EXPECT_STREQ(L"a", set.pContacts[0].szName);
-    EXPECT_STREQ(L"", set.pContacts[2].szName);
-    EXPECT_EQ(std::vector<std::string>{LINE_MERGE_SHORT}, log.Texts(ERROR_LINE));
-}
-
-TEST_F(CReadAllTest, FailsWhenNameRowsComeInAnotherOrder)
-{
-    m_clProvider.PutAll({{1}, {2}, {3}});
-    m_clProvider.Execute("create table t as select * from localizer order by contact_id desc;"
-                         "drop table localizer; alter table t rename to localizer");
-    CLogCapture log;
-    tag_ReadSet set;
-    EXPECT_EQ(-1, ReadAll(set));
-    EXPECT_EQ(std::vector<std::string>{LINE_MERGE_SHORT}, log.Texts(ERROR_LINE));
-}
-
-TEST_F(CReadAllTest, Reads100000Contacts)
-{
-    std::vector<tag_ProviderContact> vContacts;
-    vContacts.reserve(100000);
-    for (int i = 1; i <= 100000; ++i)
-    {
-        vContacts.push_back({i, "name " + std::to_string(i), "k", "1.2", "3"});
-    }
-    m_clProvider.PutAll(vContacts);
-    tag_ReadSet set;
-    ASSERT_EQ(0, ReadAll(set));
-    ASSERT_EQ(100000, set.RecordNum);
-    EXPECT_STREQ(L"name 100000", set.pContacts[99999].szName);
-    int iCount = 0;
-    EXPECT_EQ(0, m_clReader.GetContactsCount(&iCount));
-    EXPECT_EQ(100000, iCount);
 }

@@ -6,7 +6,7 @@ import io
 import pathlib
 import sys
 import tempfile
-from typing import Callable, List, NamedTuple
+from typing import Callable, List, Tuple
 
 ROOT = pathlib.Path(__file__).resolve().parents[2]
 sys.path.insert(0, str(ROOT / "tools" / "data"))
@@ -16,30 +16,17 @@ import make_tables  # noqa: E402
 FIRST = 0x4E00
 
 
-class Fault(NamedTuple):
-    """One way to spoil a table that is right, and a part of the message that must tell it."""
-
-    kind: str
-    spoil: Callable[[str], str]
-    message: str
-
-
-FAULTS = [
-    Fault("pyfile", lambda text: text.replace("丁\ta\n", ""), "expected 15422 characters, found 15421"),
-    Fault("pyfile", lambda text: text.replace("丁\ta\n", "丁\ta\n丁\ta\n"), "丁 does not follow 丁"),
-    Fault("pyfile", lambda text: text.replace("丁", "丂", 1), "丂 does not follow 丂"),
-    Fault("pyfile", lambda text: text.replace("丁\ta\n", "丁\tv\n"), ":2: 'v' is no syllable"),
-    Fault("pyfile", lambda text: text.replace("丁\ta\n", "丁\t\n"), "'' is no syllable"),
-    Fault("pyfile", lambda text: text.replace("丁\ta\n", "丁\ta  ai\n"), "'' is no syllable"),
-    Fault("pyfile", lambda text: text.replace("丁\ta\n", "丁\ta a\n"), "a reading stands twice"),
-    Fault("pyfile", lambda text: text.replace("丁\ta\n", "丁\ta ai an ang\n"), "found 4"),
-    Fault("pyfile", lambda text: text.replace("丁\ta\n", "丁 a\n"), "expected two columns, found 1"),
-    Fault("pyfile", lambda text: text.replace("丁\ta\n", "\n"), "expected two columns, found 1"),
-    Fault("pyfile", lambda text: text.replace("丁\ta\n", "é\ta\n"), "is not one character of U+4E00"),
-    Fault("pyfile", lambda text: text[:-1], "the last line has no line end"),
-    Fault("folding", lambda text: text.replace("丁\t丁\n", ""), "expected 3755 rows, found 3754"),
-    Fault("folding", lambda text: text.replace("丁\t丁\n", "丁丁\t丁\n"), ":2: '丁丁' is not one character"),
-    Fault("folding", lambda text: text.replace("丁\t丁\n", "丁\t丁\t丁\n"), "expected two columns, found 3"),
+# A kind of table, a way to spoil one that is right, and a part of the message that must tell it.
+FAULTS: List[Tuple[str, Callable[[str], str], str]] = [
+    ("pyfile", lambda text: text.replace("丁\ta\n", ""), "expected 15422 characters, found 15421"),
+    ("pyfile", lambda text: text.replace("丁", "丂", 1), "丂 does not follow 丂"),
+    ("pyfile", lambda text: text.replace("丁\ta\n", "丁\tv\n"), ":2: 'v' is no syllable"),
+    ("pyfile", lambda text: text.replace("丁\ta\n", "丁\ta a\n"), "a reading stands twice"),
+    ("pyfile", lambda text: text.replace("丁\ta\n", "\n"), "expected two columns, found 1"),
+    ("pyfile", lambda text: text.replace("丁\ta\n", "é\ta\n"), "is not one character of U+4E00"),
+    ("pyfile", lambda text: text[:-1], "the last line has no line end"),
+    ("folding", lambda text: text.replace("丁\t丁\n", ""), "expected 3755 rows, found 3754"),
+    ("folding", lambda text: text.replace("丁\t丁\n", "丁丁\t丁\n"), ":2: '丁丁' is not one character"),
 ]
 
 
@@ -67,10 +54,10 @@ def main() -> int:
         for kind in ("pyfile", "folding"):
             if run(kind, right_table(kind), directory) != "":
                 failures.append(f"{kind}: a right table is refused")
-        for fault in FAULTS:
-            errors = run(fault.kind, fault.spoil(right_table(fault.kind)), directory)
-            if fault.message not in errors:
-                failures.append(f"{fault.kind}: expected {fault.message!r}, told {errors!r}")
+        for kind, spoil, message in FAULTS:
+            errors = run(kind, spoil(right_table(kind)), directory)
+            if message not in errors:
+                failures.append(f"{kind}: expected {message!r}, told {errors!r}")
     for failure in failures:
         print(failure)
     return 1 if failures else 0

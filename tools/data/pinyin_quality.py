@@ -10,8 +10,6 @@ import pathlib
 import re
 from typing import Dict, Iterator, List, Tuple
 
-import derivation
-
 import derive_pinyin
 import unihan
 
@@ -126,7 +124,6 @@ def general_standard(fields: derive_pinyin.Fields, first_level: bool, table: Tab
 
 
 def main() -> None:
-    derivation.skip_without_recorded_version()
     fields = unihan.load("Readings", "OtherMappings")
     sources = derive_pinyin.ReadingSources(fields, derive_pinyin.SYLLABLES)
     table = read_table()

@@ -145,8 +145,8 @@ TEST_F(CHostileTest, AMissingTableOrColumnNamesItsQuery)
     }
 }
 
-// NULL, text, a blob, a real and a number of more than 32 bits in each column that can hold them.
-TEST_F(CHostileTest, TakesAnyTypeInAnyColumn)
+// NULL, text, a blob, a real and a number of more than 32 bits in a column of each kind.
+TEST_F(CHostileTest, TakesAnyTypeInAColumn)
 {
     const char* const VALUES[] = {"null", "'text'", "x'E5BCA000FF'", "-1.5e300",
                                   "-4611686018427387904"};
@@ -169,10 +169,6 @@ TEST_F(CHostileTest, TakesAnyTypeInAnyColumn)
             EXPECT_EQ(0, m_clReader.ReadContactsByID(1, &record, iFound));
         }
     }
-    m_clProvider.Execute("update localizer set display_name=x'E5BCA000FF', localizerkey=null");
-    tag_ReadSet set;
-    EXPECT_EQ(0, ReadAll(set));
-    EXPECT_STREQ(L"\u5F20", set.pContacts[1].szName);
 }
 
 TEST_F(CHostileTest, ContactsGoneSinceTheCountFailTheReadAndNewOnesAreLeftOut)

@@ -3,6 +3,7 @@
 
 #include <cstring>
 #include <memory>
+#include <numeric>
 
 namespace
 {
@@ -81,21 +82,24 @@ TEST_F(CSingleContactTest, FillsOneRecordVisibleOrNot)
     contact.bVisible = false;
     m_clProvider.Put(contact);
 
+    tag_ContactsStruct expected{};
+    expected.iContactID = -4;
+    std::iota(std::begin(expected.lGroupID), std::end(expected.lGroupID), 1);
+    expected.lAccountID[0] = 6;
+    expected.iFlags = 0x1F;
+    expected.llLastTimeContacted = contact.llLastTime;
+    expected.iTimesContacted = 2;
+    expected.iStatusUpdateID = 77;
+    expected.szName[0] = L'\u5B89';
+    expected.szLocalizerKey[0] = L'k';
+
     CLogCapture log;
     tag_ContactsStruct record{};
     record.iStatusUpdateID = 77;
     int iFound = 5;
     ASSERT_EQ(0, m_clReader.ReadContactsByID(-4, &record, iFound));
     EXPECT_EQ(1, iFound);
-    EXPECT_EQ(-4, record.iContactID);
-    EXPECT_EQ(100, record.lGroupID[99]);
-    EXPECT_EQ(6, record.lAccountID[0]);
-    EXPECT_EQ(0x1FU, record.iFlags);
-    EXPECT_EQ(1700000000123LL, record.llLastTimeContacted);
-    EXPECT_EQ(2, record.iTimesContacted);
-    EXPECT_EQ(77, record.iStatusUpdateID);
-    EXPECT_STREQ(L"\u5B89", record.szName);
-    EXPECT_STREQ(L"k", record.szLocalizerKey);
+    EXPECT_EQ(0, std::memcmp(&expected, &record, sizeof(record)));
     const std::vector<tag_LogLine> EXPECTED = {
         {DEBUG_LINE, DB_TAG,
          "QV_Contacts>>QV_ContactsLocalize_SO>> CSQLiteOperator ReadContactsByID iContactID = "

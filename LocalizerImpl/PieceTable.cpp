@@ -3,34 +3,32 @@
 #include <algorithm>
 #include <new>
 
-static_assert(sizeof(tag_PieceRow) == 64, "a row fills one cache line");
-
 namespace
 {
 
-constexpr uint16_t ALL_OFFSETS = 0xFFFF;
+constexpr wchar_t NO_CODE = 0;
+constexpr wchar_t UPPER_BIT = 0x10000;
 
-tag_PieceRow EmptyRow(wchar_t code)
+bool IsChineseUnit(wchar_t unit)
 {
-    tag_PieceRow row = {};
-    row.code = code;
-    row.uFirstFound = CPieceTable::NOT_FOUND;
-    return row;
+    return IsHanZiCode(CodeBits(unit));
 }
 
 } // namespace
 
-CPieceTable::CPieceTable(CQVLocalizerManager& matcher, PYOFWORDS* pMap, const wchar_t* szInput,
-                         int iInputLen)
-    : m_matcher(matcher), m_pMap(pMap), m_szInput(szInput), m_iInputLen(iInputLen), m_uValidLast(0),
-      m_pRowOfKey(new (std::nothrow) uint16_t[KEY_COUNT]()),
-      m_pFirstEnds(new (std::nothrow) uint16_t[KEY_COUNT]), m_noRow(EmptyRow(0))
+CPieceTable::CPieceTable(CQVLocalizerManager& matcher, const CReadingSets& sets,
+                         const wchar_t* szInput, int iInputLen)
+    : m_matcher(matcher), m_sets(sets), m_szInput(szInput), m_iInputLen(iInputLen),
+      m_iFirstOther(sets.Count()), m_iFirstTyped(sets.Count() + PLACE_COUNT),
+      m_bChineseTyped(std::any_of(szInput, szInput + iInputLen, IsChineseUnit)),
+      m_pRows(new (std::nothrow) tag_PieceRow[static_cast<size_t>(KeyCount())]()),
+      m_pFirstEnds(new (std::nothrow) uint16_t[static_cast<size_t>(KeyCount())])
 {
-    if (m_pFirstEnds != nullptr)
+    if (!IsReady())
     {
-        std::fill_n(m_pFirstEnds.get(), KEY_COUNT, NOT_ASKED);
+        return;
     }
-    m_noRow.uFilled = ALL_OFFSETS;
+    std::fill_n(m_pFirstEnds.get(), KeyCount(), NOT_ASKED);
     for (int iOffset = 0; iOffset < iInputLen; ++iOffset)
     {
         if (IsLastPieceValid(iOffset))
@@ -54,76 +52,76 @@ bool CPieceTable::IsLastPieceValid(int iOffset)
     return m_matcher.IsValid(vPieces) != 0;
 }
 
-int CPieceTable::KeyOfOther(uint16_t uCode)
+// A typed Chinese character fits its own code alone, all 32 bits of it, and no other code of the
+// set.
+int CPieceTable::KeyOfTyped(wchar_t code) const
 {
-    if (IsAlphaCode(uCode))
-    {
-        return KEY_ALPHA + (uCode - LOC_ALPHA_BASE);
-    }
+    const wchar_t* pEnd = m_szInput + m_iInputLen;
+    const wchar_t* pTyped = std::find(m_szInput, pEnd, code);
+    return pTyped != pEnd ? m_iFirstTyped + static_cast<int>(pTyped - m_szInput)
+                          : m_sets.SetOf(code);
+}
+
+// LOC_OTHER with upper bits, which only a damaged record holds, is not LOC_OTHER for the mask.
+int CPieceTable::PlaceOfRare(uint16_t uCode, wchar_t code)
+{
     if (IsDigitCode(uCode))
     {
-        return KEY_DIGIT + (uCode - LOC_DIGIT_BASE);
+        return PLACE_DIGIT + (uCode - LOC_DIGIT_BASE);
     }
-    return uCode == LOC_OTHER ? KEY_OTHER : KEY_UNKNOWN;
-}
-
-// Only a damaged record holds such a code. It acts by its low 16 bits, but a typed character is
-// not equal to it, and it is not LOC_OTHER for the mask.
-int CPieceTable::KeyOfWide(wchar_t code) const
-{
-    const uint16_t uCode = CodeBits(code);
     if (uCode == LOC_OTHER)
     {
-        return KEY_WIDE_OTHER;
+        return code == LOC_OTHER ? PLACE_OTHER : PLACE_WIDE_OTHER;
     }
-    if (IsHanZiCode(uCode))
-    {
-        const wchar_t* pEnd = m_szInput + m_iInputLen;
-        const wchar_t* pTyped = std::find(m_szInput, pEnd, static_cast<wchar_t>(uCode));
-        if (pTyped != pEnd)
-        {
-            return KEY_WIDE_TYPED + static_cast<int>(pTyped - m_szInput);
-        }
-    }
-    return KeyOfBits(uCode);
+    return PLACE_UNKNOWN;
 }
 
-tag_PieceRow& CPieceTable::AddRow(wchar_t code, int iKey)
+wchar_t CPieceTable::CompactCodeOf(int iKey) const
 {
-    std::unique_ptr<tag_PieceRow[]>& chunk = m_apChunks[m_iRows / CHUNK_ROWS];
-    if (chunk == nullptr)
+    if (iKey < m_iFirstOther)
     {
-        chunk.reset(new (std::nothrow) tag_PieceRow[CHUNK_ROWS]);
+        return LOC_HANZI_BASE + iKey;
     }
-    if (chunk == nullptr || m_pRowOfKey == nullptr)
+    if (iKey >= m_iFirstTyped)
     {
-        return m_noRow;
+        return m_sets.CompactCode(TypedUnit(iKey));
     }
-    const bool bWhole = iKey == KEY_WIDE_OTHER || iKey >= KEY_WIDE_TYPED;
-    tag_PieceRow& row = chunk[static_cast<size_t>(m_iRows % CHUNK_ROWS)];
-    row = EmptyRow(bWhole ? code : static_cast<wchar_t>(CodeBits(code)));
-    m_pRowOfKey[static_cast<size_t>(iKey)] = static_cast<uint16_t>(++m_iRows);
-    return row;
+    const int iPlace = iKey - m_iFirstOther;
+    if (iPlace < PLACE_DIGIT)
+    {
+        return LOC_ALPHA_BASE + iPlace;
+    }
+    if (iPlace < PLACE_OTHER)
+    {
+        return LOC_DIGIT_BASE + (iPlace - PLACE_DIGIT);
+    }
+    if (iPlace == PLACE_UNKNOWN)
+    {
+        return NO_CODE;
+    }
+    return iPlace == PLACE_OTHER ? LOC_OTHER : LOC_OTHER | UPPER_BIT;
 }
 
-uint16_t CPieceTable::AskFirstEnds(wchar_t code, int iKey)
+wchar_t CPieceTable::TypedUnit(int iKey) const
 {
-    const uint16_t uEnds = Ends(RowOf(code), 0);
-    if (m_pFirstEnds != nullptr)
-    {
-        m_pFirstEnds[static_cast<size_t>(iKey)] = uEnds;
-    }
+    return iKey < m_iFirstTyped ? NO_CODE : m_szInput[iKey - m_iFirstTyped];
+}
+
+unsigned CPieceTable::AskFirstEnds(int iKey)
+{
+    const unsigned uEnds = Ends(iKey, 0);
+    m_pFirstEnds[static_cast<size_t>(iKey)] = static_cast<uint16_t>(uEnds);
     return uEnds;
 }
 
-void CPieceTable::Fill(tag_PieceRow& row, int iOffset)
+void CPieceTable::Fill(int iKey, int iOffset)
 {
     unsigned uEnds = 0;
     unsigned uFull = 0;
     for (int iEnd = iOffset + 1; iEnd <= m_iInputLen; ++iEnd)
     {
         bool bFull = false;
-        if (!Fits(row, Piece(iOffset, iEnd), bFull))
+        if (!Fits(iKey, Piece(iOffset, iEnd), bFull))
         {
             break; // no longer piece fits either
         }
@@ -131,31 +129,36 @@ void CPieceTable::Fill(tag_PieceRow& row, int iOffset)
         uEnds |= static_cast<unsigned>(bTried) << iEnd;
         uFull |= static_cast<unsigned>(bTried && bFull) << iEnd;
     }
+    tag_PieceRow& row = m_pRows[static_cast<size_t>(iKey)];
     row.auEnds[iOffset] = static_cast<uint16_t>(uEnds);
     row.auFull[iOffset] = static_cast<uint16_t>(uFull);
     row.uFilled = static_cast<uint16_t>(row.uFilled | (1U << iOffset));
 }
 
-bool CPieceTable::Fits(const tag_PieceRow& row, wchar_t* szPiece, bool& bFull)
+bool CPieceTable::Fits(int iKey, wchar_t* szPiece, bool& bFull)
 {
-    const uint16_t uCode = CodeBits(row.code);
+    const uint16_t uCode = CodeBits(CompactCodeOf(iKey));
+    if (IsHanZiCode(uCode))
+    {
+        return FitsChinese(iKey, szPiece, bFull);
+    }
     bFull = true; // only Chinese characters can take less than all of themselves
     if (IsAlphaCode(uCode))
     {
         return m_matcher.CmpEnglishWords(uCode, szPiece) != 0;
     }
-    if (IsHanZiCode(uCode))
-    {
-        _mask_type unused = {};
-        int iFull = 0;
-        const int iFits = m_matcher.CmpChineseWord(m_pMap, row.code, m_pMap[HanZiRecord(row.code)],
-                                                   szPiece, &unused, 0, iFull);
-        bFull = iFull != 0;
-        return iFits != 0;
-    }
-    if (IsDigitCode(uCode))
-    {
-        return m_matcher.CmpDigitalWord(uCode, szPiece) != 0;
-    }
-    return m_matcher.CmpOtherWords(uCode, szPiece) != 0;
+    return (IsDigitCode(uCode) ? m_matcher.CmpDigitalWord(uCode, szPiece)
+                               : m_matcher.CmpOtherWords(uCode, szPiece)) != 0;
+}
+
+bool CPieceTable::FitsChinese(int iKey, wchar_t* szPiece, bool& bFull)
+{
+    PYOFWORDS* pRecords = m_sets.Records();
+    _mask_type unused = {};
+    int iFull = 0;
+    const int iFits = m_matcher.CmpChineseWord(pRecords, TypedUnit(iKey),
+                                               pRecords[HanZiRecord(CompactCodeOf(iKey))], szPiece,
+                                               &unused, 0, iFull);
+    bFull = iFull != 0;
+    return iFits != 0;
 }

@@ -12,6 +12,7 @@
 #include "MemManager/ShareMemory.h"
 
 #include <sys/mman.h>
+#include <sys/time.h>
 
 #include <algorithm>
 #include <cstdio>
@@ -91,6 +92,9 @@ int CQVLocalizerManager::InitMapFile()
         return LOC_ERR_MAP;
     }
     std::memcpy(mapping.As<char>(), buffer.get(), PY_FILE_SIZE);
+    // Writing through a mapping shows in the file's times at the first byte of a page only;
+    // searches that keep what they read go by these times.
+    static_cast<void>(utimes(CDataPaths::PinyinMapping(), nullptr));
     return 0;
 }
 

@@ -41,10 +41,10 @@ struct CNWORDOUTPUT
 // CQVNumLocalizerManager for digits), used by one thread and thrown away.
 //
 // Results: 0, LOC_ERR_PARAM for a null argument, LOC_ERR_MAP when the pinyin table cannot be
-// mapped, unless an operation says otherwise. Operations that need the table and are not handed
-// one map it for the call and release it on every path. No store lock is taken here. The
-// table's bytes are trusted as to meaning, not as to bounds: a damaged one gives wrong readings
-// and nothing worse.
+// mapped or a search finds no memory for its own tables, unless an operation says otherwise.
+// Operations that need the table and are not handed one map it for the call and release it on every
+// path. No store lock is taken here. The table's bytes are trusted as to meaning, not as to bounds:
+// a damaged one gives wrong readings and nothing worse.
 class QV_EXPORT CQVLocalizerManager
 {
 public:

@@ -6,9 +6,6 @@
 namespace
 {
 
-constexpr int WORD_BITS = 64;
-constexpr int CANDIDATE_BITS = 32;
-
 int LowestBit(unsigned uBits)
 {
     return __builtin_ctz(uBits);
@@ -16,28 +13,34 @@ int LowestBit(unsigned uBits)
 
 } // namespace
 
-// Finds the rows of a name's characters; returns the number of characters where a run may begin.
-int CRunFinder::LookUp(const wchar_t* pCodes)
+CRunFinder::CRunFinder(CPieceTable& table, bool bAnywhere)
+    : m_table(table), m_bAnywhere(bAnywhere),
+      m_iSplitWords(((1 << std::max(table.InputLength() - 1, 0)) + WORD_BITS - 1) / WORD_BITS)
 {
-    m_iLength = NameLength(pCodes);
-    for (int i = 0; i < m_iLength; ++i)
-    {
-        m_apRows[i] = &m_table.RowOf(pCodes[i]);
-    }
-    return m_bAnywhere ? m_iLength : std::min(m_iLength, 1);
 }
 
+// All starts and splits at once: which offsets are reached behind each character.
 bool CRunFinder::CanMatch(const wchar_t* pCodes)
 {
-    const int iStarts = m_bAnywhere ? CONTACT_MAX_KEY : 1;
-    for (int iStart = 0; iStart < iStarts && pCodes[iStart] != 0; ++iStart)
+    const unsigned uEnd = 1U << m_table.InputLength();
+    unsigned uReached = 0;
+    for (int i = 0; i < CONTACT_MAX_KEY && pCodes[i] != 0; ++i)
     {
-        const unsigned uFirstEnds = m_table.FirstEnds(pCodes[iStart]);
-        if (uFirstEnds != 0 &&
-            LeadsToEnd(uFirstEnds, pCodes + iStart + 1, CONTACT_MAX_KEY - iStart - 1))
+        const int iKey = m_table.KeyOf(pCodes[i]);
+        unsigned uNext = m_bAnywhere || i == 0 ? m_table.FirstEnds(iKey) : 0;
+        for (unsigned uOffsets = uReached; uOffsets != 0; uOffsets &= uOffsets - 1)
+        {
+            uNext |= m_table.Ends(iKey, LowestBit(uOffsets));
+        }
+        if ((uNext & uEnd) != 0)
         {
             return true;
         }
+        if (uNext == 0 && !m_bAnywhere)
+        {
+            return false;
+        }
+        uReached = uNext;
     }
     return false;
 }
@@ -48,51 +51,38 @@ bool CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& 
     {
         return false;
     }
-    const int iStarts = LookUp(pCodes);
+    m_pCodes = pCodes;
     m_iCandidate = iCandidate;
     m_uLastSplit = 0;
-    std::fill(std::begin(m_auSeen), std::end(m_auSeen), 0);
+    std::fill_n(m_auSeen, m_iSplitWords, 0);
     m_match = {MATCH_LIST, 0, UINT16_MAX};
+    m_iLength = NameLength(pCodes);
+    for (int i = 0; i < m_iLength; ++i)
+    {
+        m_aiKeys[i] = m_table.KeyOf(pCodes[i]);
+    }
+    const int iStarts = m_bAnywhere ? m_iLength : 1;
     for (m_iStart = 0; m_iStart < iStarts; ++m_iStart)
     {
-        Extend(0, 0, 0, true);
+        if (m_table.FirstEnds(m_aiKeys[m_iStart]) != 0)
+        {
+            Extend(0, 0, 0, true);
+        }
     }
     match = m_match;
-    return true;
-}
-
-// All splits at once: from the offsets that the pieces before reach, character by character. At
-// most iLength codes, fewer when a 0 ends them.
-bool CRunFinder::LeadsToEnd(unsigned uReached, const wchar_t* pCodes, int iLength)
-{
-    const unsigned uEnd = 1U << m_table.InputLength();
-    for (int i = 0; (uReached & uEnd) == 0; ++i)
-    {
-        if (uReached == 0 || i >= iLength || pCodes[i] == 0)
-        {
-            return false;
-        }
-        tag_PieceRow& row = m_table.RowOf(pCodes[i]);
-        unsigned uNext = 0;
-        for (unsigned uOffsets = uReached; uOffsets != 0; uOffsets &= uOffsets - 1)
-        {
-            uNext |= m_table.Ends(row, LowestBit(uOffsets));
-        }
-        uReached = uNext;
-    }
     return true;
 }
 
 // Lays one more piece, from iOffset on, on the run's character number iPiece.
 void CRunFinder::Extend(int iPiece, int iOffset, uint32_t uSplit, bool bAllFull)
 {
-    tag_PieceRow& row = *m_apRows[m_iStart + iPiece];
+    const int iKey = m_aiKeys[m_iStart + iPiece];
     const int iInputLen = m_table.InputLength();
     const uint32_t uExtended = uSplit | (1U << (iInputLen - 1 - iOffset));
-    for (unsigned uEnds = m_table.Ends(row, iOffset); uEnds != 0; uEnds &= uEnds - 1)
+    for (unsigned uEnds = m_table.Ends(iKey, iOffset); uEnds != 0; uEnds &= uEnds - 1)
     {
         const int iEnd = LowestBit(uEnds);
-        const bool bFull = bAllFull && ((row.auFull[iOffset] >> iEnd) & 1U) != 0;
+        const bool bFull = bAllFull && ((m_table.RowOf(iKey).auFull[iOffset] >> iEnd) & 1U) != 0;
         if (iEnd == iInputLen)
         {
             Record(iPiece + 1, iOffset, uExtended, bFull);
@@ -110,15 +100,7 @@ void CRunFinder::Record(int iPieces, int iLastOffset, uint32_t uSplit, bool bAll
     {
         return; // it fitted further left already
     }
-    tag_PieceRow& lastRow = *m_apRows[m_iStart + iPieces - 1];
-    lastRow.uLastOffsets = static_cast<uint16_t>(lastRow.uLastOffsets | (1U << iLastOffset));
-    const uint64_t uFound =
-        (static_cast<uint64_t>(uSplit) << CANDIDATE_BITS) | static_cast<uint32_t>(m_iCandidate);
-    lastRow.uFirstFound = std::min(lastRow.uFirstFound, uFound);
-    if (m_iStart + iPieces < m_iLength)
-    {
-        m_apRows[m_iStart + iPieces]->bBehindRun = true;
-    }
+    MarkFound(iPieces, iLastOffset, uSplit);
     m_match.uFirstSplit = std::min(m_match.uFirstSplit, static_cast<uint16_t>(uSplit));
     if (uSplit > m_uLastSplit)
     {
@@ -129,6 +111,22 @@ void CRunFinder::Record(int iPieces, int iLastOffset, uint32_t uSplit, bool bAll
         {
             m_match.iMatchType = MATCH_INITIALS;
         }
+    }
+}
+
+void CRunFinder::MarkFound(int iPieces, int iLastOffset, uint32_t uSplit)
+{
+    const int iLast = m_iStart + iPieces - 1;
+    tag_PieceRow& lastRow = m_table.RowOf(m_aiKeys[iLast]);
+    lastRow.uLastOffsets = static_cast<uint16_t>(lastRow.uLastOffsets | (1U << iLastOffset));
+    const uint16_t uLastCode = CodeBits(m_pCodes[iLast]);
+    if (m_firstFound.IsEarly(uSplit, m_iCandidate) && IsHanZiCode(uLastCode))
+    {
+        m_firstFound.Add(uSplit, m_iCandidate, uLastCode);
+    }
+    if (iLast + 1 < m_iLength)
+    {
+        m_table.RowOf(m_aiKeys[iLast + 1]).bBehindRun = true;
     }
 }
 

@@ -1,6 +1,7 @@
 #ifndef QV_LOCALIZERIMPL_RUNFINDER_H
 #define QV_LOCALIZERIMPL_RUNFINDER_H
 
+#include "LocalizerImpl/FirstFound.h"
 #include "LocalizerImpl/PieceTable.h"
 
 #include <cstdint>
@@ -24,28 +25,33 @@ class CRunFinder
 {
 public:
     // bAnywhere false: runs begin at a name's first character only.
-    CRunFinder(CPieceTable& table, bool bAnywhere) : m_table(table), m_bAnywhere(bAnywhere) {}
+    CRunFinder(CPieceTable& table, bool bAnywhere);
 
     // Whether the text spells a run of the name with these codes (at most CONTACT_MAX_KEY, ending
     // at the first 0).
     bool CanMatch(const wchar_t* pCodes);
 
     // The same; then match tells how, and the rows of the characters that took a last piece or
-    // stood behind a run are marked as found by candidate iCandidate.
+    // stood behind a run are marked, and the former noted as found by candidate iCandidate.
     bool Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& match);
 
-private:
-    static constexpr int SPLIT_WORDS = (1 << (LOC_MAX_INPUT - 1)) / 64;
+    const CFirstFound& FirstFound() const { return m_firstFound; }
 
-    int LookUp(const wchar_t* pCodes);
-    bool LeadsToEnd(unsigned uReached, const wchar_t* pCodes, int iLength);
+private:
+    static constexpr int WORD_BITS = 64;
+    static constexpr int SPLIT_WORDS = (1 << (LOC_MAX_INPUT - 1)) / WORD_BITS;
+
     void Extend(int iPiece, int iOffset, uint32_t uSplit, bool bAllFull);
     void Record(int iPieces, int iLastOffset, uint32_t uSplit, bool bAllFull);
+    void MarkFound(int iPieces, int iLastOffset, uint32_t uSplit);
     bool MarkSeen(uint32_t uSplit);
 
     CPieceTable& m_table;
+    CFirstFound m_firstFound;
     bool m_bAnywhere;
-    tag_PieceRow* m_apRows[CONTACT_MAX_KEY] = {};
+    int m_iSplitWords; // of m_auSeen that the text's splits need
+    const wchar_t* m_pCodes = nullptr;
+    int m_aiKeys[CONTACT_MAX_KEY] = {};
     int m_iLength = 0;
     int m_iStart = 0;
     int32_t m_iCandidate = 0;

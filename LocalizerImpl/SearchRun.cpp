@@ -9,6 +9,7 @@
 
 #include "LocalizerImpl/SearchRun.h"
 
+#include "Common/DataPaths.h"
 #include "Common/Log.h"
 #include "Common/WideString.h"
 #include "LocalizerImpl/RankingOrder.h"
@@ -19,106 +20,66 @@
 namespace
 {
 
-constexpr int SPLIT_SHIFT = 32; // a discovery key: split above, candidate below
+constexpr wchar_t NO_CODE = 0;
 constexpr int64_t MS_PER_SECOND = 1000;
-
-// Characters that the search found first, in order of discovery.
-class CFirstFound
-{
-public:
-    void Offer(tag_PieceRow& row)
-    {
-        tag_PieceRow** ppEnd = m_apRows + m_iCount;
-        tag_PieceRow** ppPlace = std::find_if(m_apRows, ppEnd,
-                                              [&row](const tag_PieceRow* pRow)
-                                              { return row.uFirstFound < pRow->uFirstFound; });
-        if (ppPlace - m_apRows == CN_WORD_MAX)
-        {
-            return;
-        }
-        std::move_backward(ppPlace, m_apRows + std::min(m_iCount, CN_WORD_MAX - 1),
-                           m_apRows + std::min(m_iCount + 1, CN_WORD_MAX));
-        *ppPlace = &row;
-        m_iCount = std::min(m_iCount + 1, CN_WORD_MAX);
-    }
-
-    int Count() const { return m_iCount; }
-    tag_PieceRow& At(int i) const { return *m_apRows[i]; }
-
-private:
-    tag_PieceRow* m_apRows[CN_WORD_MAX] = {};
-    int m_iCount = 0;
-};
 
 // Feeds the mask and the candidate characters of a manager from what a search marked.
 class CFindingsWriter
 {
 public:
-    CFindingsWriter(CQVLocalizerManager& manager, PYOFWORDS* pMap, _mask_type& mask,
+    CFindingsWriter(CQVLocalizerManager& manager, const CReadingSets& sets, _mask_type& mask,
                     CPieceTable& table)
-        : m_manager(manager), m_pMap(pMap), m_mask(mask), m_table(table)
+        : m_manager(manager), m_sets(sets), m_mask(mask), m_table(table)
     {
     }
 
-    void Write()
+    void Write(const CFirstFound& firstFound)
     {
-        CFirstFound firstFound;
-        for (int i = 0; i < m_table.RowCount(); ++i)
-        {
-            tag_PieceRow& row = m_table.RowAt(i);
-            if (row.uFirstFound != CPieceTable::NOT_FOUND && IsHanZiCode(CodeBits(row.code)))
-            {
-                firstFound.Offer(row);
-            }
-        }
         for (int i = 0; i < firstFound.Count(); ++i)
         {
             TakeFirstPiece(firstFound.At(i));
         }
-        for (int i = 0; i < m_table.RowCount(); ++i)
+        for (int iKey = 0; iKey < m_table.KeyCount(); ++iKey)
         {
-            TakeOtherPieces(m_table.RowAt(i));
-            TakeNextKeys(m_table.RowAt(i));
+            const tag_PieceRow& row = m_table.RowOf(iKey);
+            const wchar_t code = m_table.CompactCodeOf(iKey);
+            if (row.uLastOffsets != 0 && IsHanZiCode(CodeBits(code)))
+            {
+                TakeLastPieces(m_sets.Records()[HanZiRecord(code)], row.uLastOffsets);
+            }
+            if (row.bBehindRun)
+            {
+                m_manager.CreateMaskWord(m_sets.Records(), code);
+            }
         }
     }
 
 private:
-    void TakeFirstPiece(tag_PieceRow& row)
+    void TakeFirstPiece(const CFirstFound::tag_Find& find)
     {
-        const unsigned uSplit = static_cast<unsigned>(row.uFirstFound >> SPLIT_SHIFT);
-        TakeLastPiece(row, m_table.InputLength() - 1 - __builtin_ctz(uSplit));
+        PYOFWORDS record = m_sets.RecordOf(find.code);
+        TakeLastPiece(record, m_table.InputLength() - 1 - __builtin_ctz(find.Split()));
     }
 
-    // The character is listed by now or the list is full: these add to the mask alone.
-    void TakeOtherPieces(tag_PieceRow& row)
+    // The records of the sets have no character, so these add to the mask alone.
+    void TakeLastPieces(PYOFWORDS& record, unsigned uOffsets)
     {
-        for (unsigned uOffsets = row.uLastOffsets; uOffsets != 0; uOffsets &= uOffsets - 1)
+        for (; uOffsets != 0; uOffsets &= uOffsets - 1)
         {
-            TakeLastPiece(row, __builtin_ctz(uOffsets));
+            TakeLastPiece(record, __builtin_ctz(uOffsets));
         }
     }
 
-    void TakeLastPiece(tag_PieceRow& row, int iOffset)
+    // Without a code: a typed character adds nothing as a last piece.
+    void TakeLastPiece(PYOFWORDS& record, int iOffset)
     {
-        if (IsHanZiCode(CodeBits(row.code)))
-        {
-            int iFull = 0;
-            m_manager.CmpChineseWord(m_pMap, row.code, m_pMap[HanZiRecord(row.code)],
-                                     m_table.Piece(iOffset, m_table.InputLength()), &m_mask, 1,
-                                     iFull);
-        }
-    }
-
-    void TakeNextKeys(const tag_PieceRow& row)
-    {
-        if (row.bBehindRun)
-        {
-            m_manager.CreateMaskWord(m_pMap, row.code);
-        }
+        int iFull = 0;
+        m_manager.CmpChineseWord(m_sets.Records(), NO_CODE, record,
+                                 m_table.Piece(iOffset, m_table.InputLength()), &m_mask, 1, iFull);
     }
 
     CQVLocalizerManager& m_manager;
-    PYOFWORDS* m_pMap;
+    const CReadingSets& m_sets;
     _mask_type& m_mask;
     CPieceTable& m_table;
 };
@@ -145,13 +106,23 @@ int CSearchRun::Begin(wchar_t* szInput)
     {
         return LOC_ERR_PARAM;
     }
+    const tag_FileStamp stamp = ReadFileStamp(CDataPaths::PinyinMapping());
     m_table.emplace();
     if (!m_table->IsOpen())
     {
         return LOC_ERR_MAP;
     }
     m_manager.ProcessInputCNWord(m_table->Records(), szInput);
-    m_pieces.emplace(m_manager, m_table->Records(), szInput, m_manager.m_iInputLen);
+    m_sets = CReadingSets::Of(m_table->Records(), stamp);
+    if (m_sets == nullptr)
+    {
+        return LOC_ERR_MAP;
+    }
+    m_pieces.emplace(m_manager, *m_sets, szInput, m_manager.m_iInputLen);
+    if (!m_pieces->IsReady())
+    {
+        return LOC_ERR_MAP;
+    }
     m_finder.emplace(*m_pieces, m_manager.m_bMatchAnywhere != 0);
     return 0;
 }
@@ -171,7 +142,8 @@ int CSearchRun::Find(const tag_LocalizerResult& candidates, int bTimeOrder)
     {
         FindMatches(candidates);
     }
-    CFindingsWriter(m_manager, m_table->Records(), m_manager.m_stMask, *m_pieces).Write();
+    CFindingsWriter(m_manager, *m_sets, m_manager.m_stMask, *m_pieces)
+        .Write(m_finder->FirstFound());
     return static_cast<int>(m_manager.m_vLocateArray.size());
 }
 
@@ -192,7 +164,7 @@ void CSearchRun::ListAll(const tag_LocalizerResult& candidates, int bTimeOrder)
         const int iCodes = std::min(NameLength(detail.szLocalizerKey), iOffered);
         for (int iCode = 0; iCode < iCodes; ++iCode)
         {
-            m_pieces->RowOf(detail.szLocalizerKey[iCode]).bBehindRun = true;
+            m_pieces->RowOf(m_pieces->KeyOf(detail.szLocalizerKey[iCode])).bBehindRun = true;
         }
     }
 }
@@ -206,8 +178,8 @@ wchar_t CSearchRun::IndexCharacter(const tag_LocalizerDetail& detail, int bTimeO
     }
     else
     {
-        CQVLocalizerManager::GetFirstWord(m_table->Records(), detail.szLocalizerKey[0],
-                                          szFirstWord);
+        CQVLocalizerManager::GetFirstWord(
+            m_sets->Records(), m_sets->CompactCode(detail.szLocalizerKey[0]), szFirstWord);
     }
     return szFirstWord[0];
 }

@@ -4,6 +4,7 @@
 #include "LocalizerImpl/PieceTable.h"
 #include "LocalizerImpl/PinyinTable.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
+#include "LocalizerImpl/ReadingSets.h"
 #include "LocalizerImpl/RunFinder.h"
 #include "MemManager/CandidateTest.h"
 
@@ -26,7 +27,8 @@ public:
     CSearchRun& operator=(const CSearchRun&) = delete;
 
     // Lowercases szInput and puts codes in place of its Chinese characters. 0; LOC_ERR_PARAM for
-    // null or more than 10 characters; LOC_ERR_MAP. After a failure nothing may match.
+    // null or more than 10 characters; LOC_ERR_MAP, also for want of memory. After a failure
+    // nothing may match.
     int Begin(wchar_t* szInput);
 
     bool MayMatch(const wchar_t* pCodes) override;
@@ -55,8 +57,9 @@ private:
 
     CQVLocalizerManager& m_manager;
     std::optional<CPinyinTable> m_table; // from Begin on
-    std::optional<CPieceTable> m_pieces; // from a successful Begin on
-    std::optional<CRunFinder> m_finder;
+    CReadingSets::Ptr m_sets;
+    std::optional<CPieceTable> m_pieces;
+    std::optional<CRunFinder> m_finder; // from a successful Begin on
 };
 
 #endif

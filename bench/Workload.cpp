@@ -8,9 +8,11 @@
 #include "bench/NameSource.h"
 #include "tests/Support/ProviderDatabase.h"
 
+#include <chrono>
 #include <cstdlib>
 #include <filesystem>
 #include <stdexcept>
+#include <thread>
 
 namespace fs = std::filesystem;
 
@@ -24,6 +26,7 @@ constexpr int TIME_STEPS = 8191;
 constexpr int ONLINE_EVERY = 11;
 constexpr int GROUPS = 12;
 constexpr int ACCOUNTS = 3;
+constexpr std::chrono::seconds SETTLING_TIME(3);
 
 std::string ToUtf8(const std::wstring& strText)
 {
@@ -85,6 +88,8 @@ CWorkload::CWorkload(int iContacts) : m_iContacts(iContacts)
     FillDatabase();
     CLocalizerLogic logic;
     Require(logic.MemInit(true) == 0, "the index cannot be built");
+    // Searches keep nothing of a table that was written just now; people search an older one.
+    std::this_thread::sleep_for(SETTLING_TIME);
 }
 
 CWorkload::~CWorkload()

@@ -1,0 +1,182 @@
+#include "LocalizerImpl/ReadingSets.h"
+
+#include <cstring>
+#include <mutex>
+#include <new>
+
+namespace
+{
+
+constexpr size_t READINGS_OFFSET = offsetof(PYOFWORDS, szPinyin);
+constexpr size_t READINGS_SIZE = sizeof(PYOFWORDS) - READINGS_OFFSET;
+
+constexpr int SLOT_BITS = 15;
+constexpr uint32_t SLOT_COUNT = 1U << SLOT_BITS;
+static_assert(SLOT_COUNT > 2 * PY_WORD_COUNT, "slots stay half empty");
+constexpr uint64_t HASH_FACTOR = 0x9E3779B97F4A7C15ULL; // 2^64 divided by the golden ratio
+constexpr int HASH_FOLD = 32;
+constexpr int HASH_SHIFT = 64 - SLOT_BITS;
+
+const char* ReadingsOf(const PYOFWORDS& record)
+{
+    return reinterpret_cast<const char*>(&record) + READINGS_OFFSET;
+}
+
+uint32_t SlotOf(const char* pReadings)
+{
+    uint64_t uHash = 0;
+    for (size_t i = 0; i < READINGS_SIZE; i += sizeof(uint64_t))
+    {
+        uint64_t uBytes = 0;
+        std::memcpy(&uBytes, pReadings + i,
+                    i + sizeof(uBytes) <= READINGS_SIZE ? sizeof(uBytes) : READINGS_SIZE - i);
+        uHash = (uHash ^ uBytes) * HASH_FACTOR;
+        uHash ^= uHash >> HASH_FOLD;
+    }
+    return static_cast<uint32_t>((uHash * HASH_FACTOR) >> HASH_SHIFT);
+}
+
+// Numbers the different readings in the order in which they are met.
+class CReadingIndex
+{
+public:
+    explicit CReadingIndex(const PYOFWORDS* pMap)
+        : m_pMap(pMap), m_pSlots(new (std::nothrow) uint16_t[SLOT_COUNT]()),
+          m_pFirstOf(new (std::nothrow) uint16_t[PY_WORD_COUNT])
+    {
+    }
+
+    bool IsReady() const { return m_pSlots != nullptr && m_pFirstOf != nullptr; }
+    int Count() const { return m_iCount; }
+    // The record that a set was first met in.
+    const PYOFWORDS& FirstOf(int iSet) const { return m_pMap[m_pFirstOf[iSet]]; }
+
+    int Number(int iRecord)
+    {
+        const char* pReadings = ReadingsOf(m_pMap[iRecord]);
+        uint32_t uSlot = SlotOf(pReadings);
+        while (m_pSlots[uSlot] != EMPTY)
+        {
+            const int iSet = m_pSlots[uSlot] - 1;
+            if (std::memcmp(ReadingsOf(FirstOf(iSet)), pReadings, READINGS_SIZE) == 0)
+            {
+                return iSet;
+            }
+            uSlot = (uSlot + 1) % SLOT_COUNT;
+        }
+        m_pFirstOf[m_iCount] = static_cast<uint16_t>(iRecord);
+        m_pSlots[uSlot] = static_cast<uint16_t>(m_iCount + 1);
+        return m_iCount++;
+    }
+
+private:
+    static constexpr uint16_t EMPTY = 0;
+
+    const PYOFWORDS* m_pMap;
+    std::unique_ptr<uint16_t[]> m_pSlots; // set + 1, or EMPTY
+    std::unique_ptr<uint16_t[]> m_pFirstOf;
+    int m_iCount = 0;
+};
+
+} // namespace
+
+// The sets that the process keeps from one search to the next.
+class CKeptSets
+{
+public:
+    CReadingSets::Ptr Lend(const tag_FileStamp& stamp)
+    {
+        const std::lock_guard<std::mutex> lock(m_mutex);
+        return m_pSets != nullptr && IsSameStamp(stamp, m_stamp) ? m_pSets->Share() : nullptr;
+    }
+
+    void Keep(const CReadingSets& sets, const tag_FileStamp& stamp)
+    {
+        CReadingSets::Ptr pSets = sets.Share();
+        const std::lock_guard<std::mutex> lock(m_mutex);
+        m_pSets.swap(pSets);
+        m_stamp = stamp;
+    }
+
+private:
+    std::mutex m_mutex;
+    CReadingSets::Ptr m_pSets;
+    tag_FileStamp m_stamp = {};
+};
+
+namespace
+{
+
+CKeptSets& KeptSets()
+{
+    static CKeptSets kept;
+    return kept;
+}
+
+} // namespace
+
+CReadingSets::Ptr CReadingSets::Of(const PYOFWORDS* pMap, const tag_FileStamp& stamp)
+{
+    Ptr pSets = KeptSets().Lend(stamp);
+    if (pSets == nullptr)
+    {
+        pSets = Make(pMap);
+        if (pSets != nullptr && IsSettled(stamp))
+        {
+            KeptSets().Keep(*pSets, stamp);
+        }
+    }
+    return pSets;
+}
+
+void CReadingSets::tag_Release::operator()(const CReadingSets* pSets) const
+{
+    if (--pSets->m_iUsers == 0)
+    {
+        delete pSets;
+    }
+}
+
+CReadingSets::Ptr CReadingSets::Share() const
+{
+    ++m_iUsers;
+    return Ptr(this);
+}
+
+CReadingSets::Ptr CReadingSets::Make(const PYOFWORDS* pMap)
+{
+    CReadingSets* pSets = new (std::nothrow) CReadingSets;
+    Ptr pOwner(pSets);
+    return pSets != nullptr && pSets->Fill(pMap) ? std::move(pOwner) : nullptr;
+}
+
+bool CReadingSets::Fill(const PYOFWORDS* pMap)
+{
+    CReadingIndex index(pMap);
+    m_pSetOf.reset(new (std::nothrow) uint16_t[PY_WORD_COUNT]);
+    m_pWords.reset(new (std::nothrow) tag_Word[PY_WORD_COUNT]);
+    if (!index.IsReady() || m_pSetOf == nullptr || m_pWords == nullptr)
+    {
+        return false;
+    }
+    for (int i = 0; i < PY_WORD_COUNT; ++i)
+    {
+        m_pSetOf[i] = static_cast<uint16_t>(index.Number(i));
+        std::memcpy(m_pWords[i].szWord, pMap[i].szWord, sizeof(tag_Word));
+    }
+    m_iCount = index.Count();
+    m_pRecords.reset(new (std::nothrow) PYOFWORDS[static_cast<size_t>(m_iCount)]);
+    for (int i = 0; m_pRecords != nullptr && i < m_iCount; ++i)
+    {
+        m_pRecords[i] = index.FirstOf(i);
+        std::memset(m_pRecords[i].szWord, 0, sizeof(tag_Word));
+    }
+    return m_pRecords != nullptr;
+}
+
+PYOFWORDS CReadingSets::RecordOf(wchar_t code) const
+{
+    PYOFWORDS record = m_pRecords[SetOf(code)];
+    std::memcpy(record.szWord, m_pWords[HanZiRecord(code)].szWord, sizeof(tag_Word));
+    return record;
+}

@@ -8,6 +8,7 @@
 #include <iterator>
 #include <memory>
 #include <new>
+#include <utility>
 
 namespace
 {
@@ -16,6 +17,13 @@ constexpr int POSITION_BITS = 16;
 constexpr uint32_t POSITION_MASK = 0xFFFF;
 constexpr int SPLIT_SHIFT = 32; // a discovery key: split above, place in the vector below
 constexpr int RANGE_STACK_DEPTH = 32;
+
+// Places in name order are sorted digit by digit.
+constexpr int DIGIT_BITS = 8;
+constexpr int DIGITS = 4;
+constexpr size_t DIGIT_VALUES = 1U << DIGIT_BITS;
+constexpr uint32_t DIGIT_MASK = DIGIT_VALUES - 1;
+constexpr uint32_t SIGN_BIT = 0x80000000;
 
 // Kind, start and span of a match from one search: starts are 0..9, spans 1..10.
 constexpr int BUCKET_POSITION_BITS = 4;
@@ -106,43 +114,109 @@ int BucketOf(const _MatchResult& match)
                             uSpan);
 }
 
-// Distributes the matches over kind, start and span; inside a bucket they keep their order.
-void Distribute(const android::Vector<_MatchResult>& vMatches, _MatchResult* pSorted,
-                size_t (&aBucketEnds)[BUCKET_COUNT])
+// A match by its entry's place in name order.
+struct tag_NamePlace
 {
-    std::fill(std::begin(aBucketEnds), std::end(aBucketEnds), 0);
-    for (size_t i = 0; i < vMatches.size(); ++i)
+    uint32_t uPlace; // with its sign turned, so that unsigned order is the order of the places
+    uint32_t uMatch;
+
+    uint32_t Digit(int iDigit) const { return (uPlace >> (iDigit * DIGIT_BITS)) & DIGIT_MASK; }
+};
+
+using NamePlaces = std::unique_ptr<tag_NamePlace[]>;
+
+// Moves the places into the order of one of their digits; equal ones keep their order.
+void SortByDigit(const tag_NamePlace* pFrom, tag_NamePlace* pTo, size_t uCount, int iDigit)
+{
+    size_t aEnds[DIGIT_VALUES] = {};
+    for (size_t i = 0; i < uCount; ++i)
     {
-        ++aBucketEnds[BucketOf(vMatches[i])];
+        ++aEnds[pFrom[i].Digit(iDigit)];
     }
     size_t uStart = 0;
-    for (size_t& uEnd : aBucketEnds)
+    for (size_t& uEnd : aEnds)
     {
-        const size_t uCount = uEnd;
-        uEnd = uStart;
-        uStart += uCount;
+        uStart += std::exchange(uEnd, uStart);
     }
-    for (size_t i = 0; i < vMatches.size(); ++i)
+    for (size_t i = 0; i < uCount; ++i)
     {
-        pSorted[aBucketEnds[BucketOf(vMatches[i])]++] = vMatches[i];
+        pTo[aEnds[pFrom[i].Digit(iDigit)]++] = pFrom[i];
     }
 }
 
-// Sorts each bucket by place in name order, which is how most candidate sets come already.
-void SortBuckets(_MatchResult* pSorted, const size_t (&aBucketEnds)[BUCKET_COUNT],
-                 const tag_LocalizerDetail* pDetail)
+// The candidates of a search in the whole store come in name order; those of a narrowed one are
+// ranked, and those of a store ordered by last contact in any order. False without memory.
+bool SortByName(NamePlaces& places, size_t uCount)
 {
-    const auto before = [pDetail](const _MatchResult& a, const _MatchResult& b)
-    { return pDetail[a.iIndex].iSortIndex < pDetail[b.iIndex].iSortIndex; };
-    size_t uStart = 0;
-    for (const size_t uEnd : aBucketEnds)
+    const auto before = [](const tag_NamePlace& a, const tag_NamePlace& b)
+    { return a.uPlace < b.uPlace; };
+    if (std::is_sorted(places.get(), places.get() + uCount, before))
     {
-        if (!std::is_sorted(pSorted + uStart, pSorted + uEnd, before))
-        {
-            std::sort(pSorted + uStart, pSorted + uEnd, before);
-        }
-        uStart = uEnd;
+        return true;
     }
+    NamePlaces spare(new (std::nothrow) tag_NamePlace[uCount]);
+    if (spare == nullptr)
+    {
+        return false;
+    }
+    const uint32_t uLargest = std::max_element(places.get(), places.get() + uCount, before)->uPlace;
+    const uint32_t uSmallest =
+        std::min_element(places.get(), places.get() + uCount, before)->uPlace;
+    for (int i = 0; i < DIGITS && (uLargest ^ uSmallest) >> (i * DIGIT_BITS) != 0; ++i)
+    {
+        SortByDigit(places.get(), spare.get(), uCount, i);
+        places.swap(spare);
+    }
+    return true;
+}
+
+NamePlaces PlacesOf(const android::Vector<_MatchResult>& vMatches,
+                    const tag_LocalizerDetail* pDetail)
+{
+    const size_t uCount = vMatches.size();
+    NamePlaces places(new (std::nothrow) tag_NamePlace[uCount]);
+    for (size_t i = 0; places != nullptr && i < uCount; ++i)
+    {
+        const int32_t iPlace = pDetail[vMatches[i].iIndex].iSortIndex;
+        places[i] = {static_cast<uint32_t>(iPlace) ^ SIGN_BIT, static_cast<uint32_t>(i)};
+    }
+    return places != nullptr && SortByName(places, uCount) ? std::move(places) : nullptr;
+}
+
+// Distributes the matches, taken in name order, over kind, start and span.
+void Distribute(const android::Vector<_MatchResult>& vMatches, const tag_NamePlace* pPlaces,
+                _MatchResult* pSorted)
+{
+    size_t aEnds[BUCKET_COUNT] = {};
+    for (size_t i = 0; i < vMatches.size(); ++i)
+    {
+        ++aEnds[BucketOf(vMatches[i])];
+    }
+    size_t uStart = 0;
+    for (size_t& uEnd : aEnds)
+    {
+        uStart += std::exchange(uEnd, uStart);
+    }
+    for (size_t i = 0; i < vMatches.size(); ++i)
+    {
+        const _MatchResult& match = vMatches[pPlaces[i].uMatch];
+        pSorted[aEnds[BucketOf(match)]++] = match;
+    }
+}
+
+// Whether two matches are equal in all four keys.
+bool HasTies(const tag_NamePlace* pPlaces, const _MatchResult* pSorted, size_t uCount,
+             const tag_LocalizerDetail* pDetail)
+{
+    const auto same = [](const tag_NamePlace& a, const tag_NamePlace& b)
+    { return a.uPlace == b.uPlace; };
+    if (std::adjacent_find(pPlaces, pPlaces + uCount, same) == pPlaces + uCount)
+    {
+        return false;
+    }
+    const auto tied = [pDetail](const _MatchResult& a, const _MatchResult& b)
+    { return CompareMatches(a, b, pDetail) == 0; };
+    return std::adjacent_find(pSorted, pSorted + uCount, tied) != pSorted + uCount;
 }
 
 // The order in which the matches were first found: split by split, candidate by candidate.
@@ -174,18 +248,15 @@ int RankMatches(android::Vector<_MatchResult>& vMatches, const uint16_t* pFirstS
                 tag_LocalizerDetail* pDetail)
 {
     const size_t uCount = vMatches.size();
+    const NamePlaces places = PlacesOf(vMatches, pDetail);
     const std::unique_ptr<_MatchResult[]> sorted(new (std::nothrow) _MatchResult[uCount]);
-    if (sorted == nullptr)
+    if (places == nullptr || sorted == nullptr)
     {
         return -1;
     }
     // Kept aside, since ties are ordered from the order of discovery, not from the sorted one.
-    size_t aBucketEnds[BUCKET_COUNT];
-    Distribute(vMatches, sorted.get(), aBucketEnds);
-    SortBuckets(sorted.get(), aBucketEnds, pDetail);
-    const auto tied = [pDetail](const _MatchResult& a, const _MatchResult& b)
-    { return CompareMatches(a, b, pDetail) == 0; };
-    if (std::adjacent_find(sorted.get(), sorted.get() + uCount, tied) == sorted.get() + uCount)
+    Distribute(vMatches, places.get(), sorted.get());
+    if (!HasTies(places.get(), sorted.get(), uCount, pDetail))
     {
         std::copy_n(sorted.get(), uCount, vMatches.editArray());
         return 0;

@@ -22,13 +22,13 @@ CPieceTable::CPieceTable(CQVLocalizerManager& matcher, const CReadingSets& sets,
       m_iFirstOther(sets.Count()), m_iFirstTyped(sets.Count() + PLACE_COUNT),
       m_bChineseTyped(std::any_of(szInput, szInput + iInputLen, IsChineseUnit)),
       m_pRows(new (std::nothrow) tag_PieceRow[static_cast<size_t>(KeyCount())]()),
-      m_pFirstEnds(new (std::nothrow) uint16_t[static_cast<size_t>(KeyCount())])
+      m_pEnds(new (std::nothrow) uint16_t[static_cast<size_t>(iInputLen * KeyCount())])
 {
     if (!IsReady())
     {
         return;
     }
-    std::fill_n(m_pFirstEnds.get(), KeyCount(), NOT_ASKED);
+    std::fill_n(m_pEnds.get(), iInputLen * KeyCount(), NOT_ASKED);
     for (int iOffset = 0; iOffset < iInputLen; ++iOffset)
     {
         if (IsLastPieceValid(iOffset))
@@ -107,14 +107,7 @@ wchar_t CPieceTable::TypedUnit(int iKey) const
     return iKey < m_iFirstTyped ? NO_CODE : m_szInput[iKey - m_iFirstTyped];
 }
 
-unsigned CPieceTable::AskFirstEnds(int iKey)
-{
-    const unsigned uEnds = Ends(iKey, 0);
-    m_pFirstEnds[static_cast<size_t>(iKey)] = static_cast<uint16_t>(uEnds);
-    return uEnds;
-}
-
-void CPieceTable::Fill(int iKey, int iOffset)
+unsigned CPieceTable::Ask(int iKey, int iOffset)
 {
     unsigned uEnds = 0;
     unsigned uFull = 0;
@@ -129,10 +122,9 @@ void CPieceTable::Fill(int iKey, int iOffset)
         uEnds |= static_cast<unsigned>(bTried) << iEnd;
         uFull |= static_cast<unsigned>(bTried && bFull) << iEnd;
     }
-    tag_PieceRow& row = m_pRows[static_cast<size_t>(iKey)];
-    row.auEnds[iOffset] = static_cast<uint16_t>(uEnds);
-    row.auFull[iOffset] = static_cast<uint16_t>(uFull);
-    row.uFilled = static_cast<uint16_t>(row.uFilled | (1U << iOffset));
+    m_pRows[static_cast<size_t>(iKey)].auFull[iOffset] = static_cast<uint16_t>(uFull);
+    m_pEnds[static_cast<size_t>(iOffset * KeyCount() + iKey)] = static_cast<uint16_t>(uEnds);
+    return uEnds;
 }
 
 bool CPieceTable::Fits(int iKey, wchar_t* szPiece, bool& bFull)

@@ -5,14 +5,15 @@
 //
 // Whether a piece fits a character depends on the piece and the character's readings alone, not
 // on the contact. So characters that act alike share a key, and the matcher is asked once per key,
-// offset in the text and length. The answers of a key stand in one row:
+// offset in the text and length. Its answers are sets of ends: bit e stands for a piece that ends
+// before character e of the text.
 //
-//   text    z h a n g s          offset 0, row of the reading zhang:
+//   text    z h a n g s          offset 0, key of the reading zhang:
 //   offset  0 1 2 3 4 5          ends  1 2 3 4 5   (z, zh, zha, zhan, zhang)
 //                                full          5   (zhang)
 //
-// A name then matches when its characters lead from offset 0 to the end of the text.
-// Rows are filled when a name first asks for them.
+// A name then matches when its characters lead from offset 0 to the end of the text. The matcher
+// is asked when a name first needs the answer.
 
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "LocalizerImpl/ReadingSets.h"
@@ -20,12 +21,10 @@
 #include <cstdint>
 #include <memory>
 
-// One row. Bit e of a set of ends stands for a piece that ends before character e of the text.
+// What is known of a key besides its ends.
 struct tag_PieceRow
 {
-    uint16_t auEnds[LOC_MAX_INPUT]; // by offset: where pieces that fit end
-    uint16_t auFull[LOC_MAX_INPUT]; // by offset: those of them that leave a run of whole readings
-    uint16_t uFilled;               // offsets whose two words above are known
+    uint16_t auFull[LOC_MAX_INPUT]; // by offset: ends that leave a run of whole readings
     uint16_t uLastOffsets;          // offsets from which a character took the last piece
     bool bBehindRun;                // a character stood behind a matched run
 };
@@ -41,7 +40,7 @@ public:
     CPieceTable& operator=(const CPieceTable&) = delete;
 
     // False for want of memory; then nothing else may be called.
-    bool IsReady() const { return m_pRows != nullptr && m_pFirstEnds != nullptr; }
+    bool IsReady() const { return m_pRows != nullptr && m_pEnds != nullptr; }
 
     // Keys are 0..KeyCount() - 1, first one for each set of readings. Whatever a damaged record
     // holds has a key too.
@@ -58,23 +57,12 @@ public:
     // A code that stands for the key in the table of the sets.
     wchar_t CompactCodeOf(int iKey) const;
 
-    // Where the text's first pieces that fit the key end. Most names are told apart by this
-    // alone, so it has a table of its own that stays in the nearest cache.
-    unsigned FirstEnds(int iKey)
-    {
-        const uint16_t uEnds = m_pFirstEnds[iKey];
-        return uEnds != NOT_ASKED ? uEnds : AskFirstEnds(iKey);
-    }
-
-    // Where pieces from the offset on that fit the key end.
+    // Where pieces from the offset on that fit the key end. Each offset has a table of its own:
+    // the first one, which tells most names apart, stays in the nearest cache.
     unsigned Ends(int iKey, int iOffset)
     {
-        tag_PieceRow& row = m_pRows[iKey];
-        if (((row.uFilled >> iOffset) & 1U) == 0)
-        {
-            Fill(iKey, iOffset);
-        }
-        return row.auEnds[iOffset];
+        const uint16_t uEnds = m_pEnds[iOffset * KeyCount() + iKey];
+        return uEnds != NOT_ASKED ? uEnds : Ask(iKey, iOffset);
     }
 
     tag_PieceRow& RowOf(int iKey) { return m_pRows[iKey]; }
@@ -102,8 +90,7 @@ private:
     static int PlaceOfRare(uint16_t uCode, wchar_t code);
     int KeyOfTyped(wchar_t code) const;
     wchar_t TypedUnit(int iKey) const;
-    unsigned AskFirstEnds(int iKey);
-    void Fill(int iKey, int iOffset);
+    unsigned Ask(int iKey, int iOffset);
     bool Fits(int iKey, wchar_t* szPiece, bool& bFull);
     bool FitsChinese(int iKey, wchar_t* szPiece, bool& bFull);
     bool IsLastPieceValid(int iOffset);
@@ -117,7 +104,7 @@ private:
     bool m_bChineseTyped = false; // the text holds units that are Chinese codes
     uint16_t m_uValidLast = 0;    // offsets whose last piece the matcher finds worth trying
     std::unique_ptr<tag_PieceRow[]> m_pRows;
-    std::unique_ptr<uint16_t[]> m_pFirstEnds;
+    std::unique_ptr<uint16_t[]> m_pEnds; // by offset, then by key
     wchar_t m_szPiece[LOC_PIECE_BUFFER] = {};
 };
 

@@ -8,7 +8,7 @@
 #include <cstdint>
 
 // Brings the matches of one search, which stand in the order of their candidates, into ranking
-// order, in time proportional to their number when the candidates come in name order.
+// order, in time proportional to their number unless some are equal in every key.
 // Matches equal in every key keep the order that LocalResultQuickSort leaves when it starts from
 // the order in which they were first found; pFirstSplits, one per match, is the split that first
 // found each. 0, or -1 with the vector unsorted when memory ran out.

@@ -27,13 +27,15 @@ bool CRunFinder::CanMatch(const wchar_t* pCodes)
     for (int i = 0; i < CONTACT_MAX_KEY && pCodes[i] != 0; ++i)
     {
         const int iKey = m_table.KeyOf(pCodes[i]);
-        unsigned uNext = m_bAnywhere || i == 0 ? m_table.FirstEnds(iKey) : 0;
+        m_aiKeys[i] = iKey;
+        unsigned uNext = m_bAnywhere || i == 0 ? m_table.Ends(iKey, 0) : 0;
         for (unsigned uOffsets = uReached; uOffsets != 0; uOffsets &= uOffsets - 1)
         {
             uNext |= m_table.Ends(iKey, LowestBit(uOffsets));
         }
         if ((uNext & uEnd) != 0)
         {
+            m_iLength = i + 1;
             return true;
         }
         if (uNext == 0 && !m_bAnywhere)
@@ -56,15 +58,14 @@ bool CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& 
     m_uLastSplit = 0;
     std::fill_n(m_auSeen, m_iSplitWords, 0);
     m_match = {MATCH_LIST, 0, UINT16_MAX};
-    m_iLength = NameLength(pCodes);
-    for (int i = 0; i < m_iLength; ++i)
+    for (; m_iLength < CONTACT_MAX_KEY && pCodes[m_iLength] != 0; ++m_iLength)
     {
-        m_aiKeys[i] = m_table.KeyOf(pCodes[i]);
+        m_aiKeys[m_iLength] = m_table.KeyOf(pCodes[m_iLength]);
     }
     const int iStarts = m_bAnywhere ? m_iLength : 1;
     for (m_iStart = 0; m_iStart < iStarts; ++m_iStart)
     {
-        if (m_table.FirstEnds(m_aiKeys[m_iStart]) != 0)
+        if (m_table.Ends(m_aiKeys[m_iStart], 0) != 0)
         {
             Extend(0, 0, 0, true);
         }

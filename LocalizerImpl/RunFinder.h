@@ -51,7 +51,7 @@ private:
     bool m_bAnywhere;
     int m_iSplitWords; // of m_auSeen that the text's splits need
     const wchar_t* m_pCodes = nullptr;
-    int m_aiKeys[CONTACT_MAX_KEY] = {};
+    int m_aiKeys[CONTACT_MAX_KEY] = {}; // of the first m_iLength codes
     int m_iLength = 0;
     int m_iStart = 0;
     int32_t m_iCandidate = 0;

@@ -64,11 +64,11 @@ tag_LocalizerResult* NewResult(int iNum)
 }
 
 // Finishes a search into the caller's result: the facade's own copy of the source where all of it
-// was found and its array has no room to spare, else a new set. Null for want of memory.
+// was found and its array is dense, else a new set. Null for want of memory.
 tag_LocalizerResult* HandOut(CSearchRun& run, CResultOwner& copy, const tag_LocalizerResult& source,
                              int iFound, long* pMask, wchar_t* szWordOut)
 {
-    if (copy.IsExact() && iFound == source.iResultNum)
+    if (copy.IsDense() && iFound == source.iResultNum)
     {
         tag_LocalizerResult* pResult = copy.Detach();
         run.FinishInPlace(*pResult, pMask, szWordOut);
@@ -260,13 +260,13 @@ void CLocalizerLogic::CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chai
     if (eSearchType == IME_SEARCH_SPECIAL)
     {
         m_pclMemManger->CopySpecialNumberRecord(copy.Receive());
-        copy.SetExact(true);
+        copy.SetDense(true);
     }
     else
     {
-        bool bExact = false;
-        CContactSelection::Copy(chain, &test, copy.Receive(), &bExact);
-        copy.SetExact(bExact);
+        bool bDense = false;
+        CContactSelection::Copy(chain, &test, copy.Receive(), &bDense);
+        copy.SetDense(bDense);
     }
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search CopyContactsResult time = %d\n", watch.Elapsed());
 }

@@ -28,14 +28,14 @@ public:
         return pResult;
     }
 
-    // Whether a set is there whose array has room for exactly the entries it holds.
-    bool IsExact() const { return m_pResult != nullptr && m_bExact; }
-    void SetExact(bool bExact) { m_bExact = bExact; }
+    // Whether a set is there whose array is worth handing on, little of it being spare.
+    bool IsDense() const { return m_pResult != nullptr && m_bDense; }
+    void SetDense(bool bDense) { m_bDense = bDense; }
 
 private:
     CMemManger& m_manager;
     tag_LocalizerResult* m_pResult = nullptr;
-    bool m_bExact = false;
+    bool m_bDense = false;
 };
 
 #endif

@@ -71,7 +71,7 @@ struct tag_OpenStore
 // Makes the entries from the records where they lie. That holds the lock no longer than copying
 // the records would: of each one or two cache lines are read, and entries are an eighth of them.
 // Room for all is taken, but only what is written costs memory.
-// Returns whether the array is exactly full.
+// Returns whether the array is dense: what is spare is no more than what is used.
 bool SelectFromStore(tag_OpenStore* pStore, const CFilterChain& chain, CCandidateTest* pTest,
                      tag_LocalizerResult* pResult)
 {
@@ -89,7 +89,7 @@ bool SelectFromStore(tag_OpenStore* pStore, const CFilterChain& chain, CCandidat
         pResult->iResultNum = counts.iWritten;
         pResult->pDetail = pEntries.release();
     }
-    return counts.iWritten == 0 || counts.iWritten == pStore->iCount;
+    return counts.iWritten == 0 || counts.iWritten >= pStore->iCount - counts.iWritten;
 }
 
 // Copies the records out, gives the store back and filters the copy.
@@ -109,9 +109,9 @@ void CopyFromStore(tag_OpenStore* pStore, CFilterChain& chain, tag_LocalizerResu
 } // namespace
 
 void CContactSelection::Copy(CFilterChain& chain, CCandidateTest* pTest,
-                             tag_LocalizerResult** ppResult, bool* pbExact)
+                             tag_LocalizerResult** ppResult, bool* pbDense)
 {
-    *pbExact = true;
+    *pbDense = true;
     if (ppResult == nullptr)
     {
         return;
@@ -134,7 +134,7 @@ void CContactSelection::Copy(CFilterChain& chain, CCandidateTest* pTest,
     }
     if (CRecordTest::CanTest(chain))
     {
-        *pbExact = SelectFromStore(&store, chain, pTest, *ppResult);
+        *pbDense = SelectFromStore(&store, chain, pTest, *ppResult);
     }
     else
     {

@@ -12,10 +12,10 @@ class CContactSelection
 public:
     // As CMemManger::CopyContactsResult, less the contacts that pTest (may be null) rules out.
     // With a chain whose processes write log lines all survivors of the filters stay in the set.
-    // *pbExact tells whether the set's array has room for exactly the entries it holds; otherwise
-    // it may have room for every stored contact.
+    // The set's array may have room for every stored contact; *pbDense tells whether at least
+    // half of it is used, so that it may be handed on as it is.
     static void Copy(CFilterChain& chain, CCandidateTest* pTest, tag_LocalizerResult** ppResult,
-                     bool* pbExact);
+                     bool* pbDense);
 };
 
 #endif

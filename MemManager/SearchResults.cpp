@@ -38,8 +38,8 @@ void CountSections(const tag_LocalizerResult& set, int iFirst, int iSections, in
 
 void CMemManger::CopyContactsResult(CFilterChain& chain, tag_LocalizerResult** ppResult)
 {
-    bool bExact = false;
-    CContactSelection::Copy(chain, nullptr, ppResult, &bExact);
+    bool bDense = false;
+    CContactSelection::Copy(chain, nullptr, ppResult, &bDense);
 }
 
 void CMemManger::CopySpecialNumberRecord(tag_LocalizerResult** ppResult)

@@ -156,8 +156,8 @@ double SelectionSeconds(const tag_Query& query)
             CSearchRun run(matcher);
             wchar_t szInput[] = {query.szText[0], 0};
             run.Begin(szInput);
-            bool bExact = false;
-            CContactSelection::Copy(chain, &run, &pResult, &bExact);
+            bool bDense = false;
+            CContactSelection::Copy(chain, &run, &pResult, &bDense);
         },
         [&] { manager.FreeSearchResult(pResult); });
 }

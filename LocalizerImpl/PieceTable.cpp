@@ -122,8 +122,8 @@ unsigned CPieceTable::Ask(int iKey, int iOffset)
         uEnds |= static_cast<unsigned>(bTried) << iEnd;
         uFull |= static_cast<unsigned>(bTried && bFull) << iEnd;
     }
-    m_pRows[static_cast<size_t>(iKey)].auFull[iOffset] = static_cast<uint16_t>(uFull);
-    m_pEnds[static_cast<size_t>(iOffset * KeyCount() + iKey)] = static_cast<uint16_t>(uEnds);
+    m_pRows[iKey].auFull[iOffset] = static_cast<uint16_t>(uFull);
+    m_pEnds[PlaceOf(iKey, iOffset)] = static_cast<uint16_t>(uEnds);
     return uEnds;
 }
 

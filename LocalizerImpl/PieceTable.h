@@ -61,7 +61,7 @@ public:
     // the first one, which tells most names apart, stays in the nearest cache.
     unsigned Ends(int iKey, int iOffset)
     {
-        const uint16_t uEnds = m_pEnds[iOffset * KeyCount() + iKey];
+        const uint16_t uEnds = m_pEnds[PlaceOf(iKey, iOffset)];
         return uEnds != NOT_ASKED ? uEnds : Ask(iKey, iOffset);
     }
 
@@ -88,6 +88,7 @@ private:
                                   : PlaceOfRare(uCode, code);
     }
     static int PlaceOfRare(uint16_t uCode, wchar_t code);
+    int PlaceOf(int iKey, int iOffset) const { return iOffset * KeyCount() + iKey; }
     int KeyOfTyped(wchar_t code) const;
     wchar_t TypedUnit(int iKey) const;
     unsigned Ask(int iKey, int iOffset);

@@ -12,6 +12,7 @@
 #include <chrono>
 #include <cstdint>
 #include <cstring>
+#include <random>
 #include <stdexcept>
 #include <string>
 #include <vector>
@@ -167,6 +168,29 @@ double EntriesFloor(int iEntries)
                              const CFreshMemory target(EntryBytes(iEntries));
                              std::memcpy(target.Get(), vEntries.data(), vEntries.size());
                          });
+}
+
+double SortFloor(int iMatches)
+{
+    std::vector<_MatchResult> vMatches(static_cast<size_t>(iMatches));
+    std::mt19937 rng(1);
+    const auto shuffle = [&]
+    {
+        for (_MatchResult& match : vMatches)
+        {
+            match.iIndex = static_cast<int32_t>(rng());
+        }
+    };
+    shuffle();
+    return MedianSeconds(
+        MEASURE_RUNS,
+        [&]
+        {
+            std::sort(vMatches.begin(), vMatches.end(),
+                      [](const _MatchResult& a, const _MatchResult& b)
+                      { return a.iIndex < b.iIndex; });
+        },
+        shuffle);
 }
 
 double SqlFloor()

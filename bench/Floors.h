@@ -19,6 +19,8 @@ double CopyFreshFloor(int iContacts);
 double ScanFloor(int iEntries);
 // Copy iEntries result entries into fresh memory.
 double EntriesFloor(int iEntries);
+// Sort iMatches matches, in no order, by one number each.
+double SortFloor(int iMatches);
 // Step through the statements of a full read and its online status, every column fetched.
 double SqlFloor();
 // Step through the statement that counts the visible contacts.

@@ -80,9 +80,9 @@ wchar_t CNameSource::Surname()
     return Pick(RARE_SURNAMES, std::size(RARE_SURNAMES) - 1);
 }
 
-std::wstring CNameSource::PersonalName()
+std::wstring CNameSource::NextOf(wchar_t surname)
 {
-    std::wstring strName(1, Surname());
+    std::wstring strName(1, surname);
     strName += Pick(GIVEN, std::size(GIVEN) - 1);
     if (Below(5) != 0)
     {
@@ -112,7 +112,7 @@ std::wstring CNameSource::Next()
     const uint32_t uKind = Below(100);
     if (uKind < PERSONAL_PERCENT)
     {
-        return PersonalName();
+        return NextOf(Surname());
     }
     if (uKind < LATIN_PERCENT)
     {

@@ -13,12 +13,13 @@ public:
     explicit CNameSource(uint64_t uSeed) : m_uState(uSeed) {}
 
     std::wstring Next();
+    // A personal name with this surname.
+    std::wstring NextOf(wchar_t surname);
 
 private:
     uint32_t Below(uint32_t uLimit);
     wchar_t Surname();
     wchar_t Pick(const wchar_t* szCharacters, uint32_t uCount);
-    std::wstring PersonalName();
     std::wstring LatinName();
     std::wstring CompanyName();
 

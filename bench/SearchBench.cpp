@@ -22,6 +22,7 @@
 #include <algorithm>
 #include <map>
 #include <memory>
+#include <random>
 #include <string>
 #include <vector>
 
@@ -36,13 +37,14 @@ constexpr int WORD_BUFFER = 64;
 constexpr int INPUT_BUFFER = 16;
 
 // The workloads are large: one stands at a time.
-CWorkload& WorkloadOf(int iContacts)
+CWorkload& WorkloadOf(int iContacts, wchar_t surname = 0)
 {
     static std::unique_ptr<CWorkload> pWorkload;
-    if (pWorkload == nullptr || pWorkload->Contacts() != iContacts)
+    if (pWorkload == nullptr || pWorkload->Contacts() != iContacts ||
+        pWorkload->Surname() != surname)
     {
         pWorkload.reset();
-        pWorkload = std::make_unique<CWorkload>(iContacts);
+        pWorkload = std::make_unique<CWorkload>(iContacts, surname);
     }
     return *pWorkload;
 }
@@ -64,6 +66,20 @@ double Percentile(std::vector<double> vValues, int iPercent)
     std::sort(vValues.begin(), vValues.end());
     const size_t uIndex = (vValues.size() * static_cast<size_t>(iPercent) + 99) / 100;
     return vValues[std::max<size_t>(uIndex, 1) - 1];
+}
+
+// Searches the store, or a previous result, for everybody.
+tag_LocalizerResult* SearchAll(CLocalizerLogic& logic, IME_SEARCH_TYPE eType,
+                               const std::wstring& strText, tag_LocalizerResult* pPrevious)
+{
+    CFilterChain chain;
+    wchar_t szInput[INPUT_BUFFER] = {};
+    std::copy(strText.begin(), strText.end(), szInput);
+    wchar_t szWords[WORD_BUFFER] = {};
+    long lMask = 0;
+    tag_LocalizerResult* pResult = nullptr;
+    logic.Search(pPrevious, szInput, eType, &chain, 0, &pResult, &lMask, szWords);
+    return pResult;
 }
 
 // Types all queries key by key and measures every keystroke.
@@ -125,18 +141,11 @@ private:
     tag_LocalizerResult* Search(IME_SEARCH_TYPE eType, const std::wstring& strText,
                                 tag_LocalizerResult* pPrevious)
     {
-        wchar_t szInput[INPUT_BUFFER] = {};
-        std::copy(strText.begin(), strText.end(), szInput);
-        wchar_t szWords[WORD_BUFFER] = {};
-        long lMask = 0;
-        tag_LocalizerResult* pResult = nullptr;
-        m_logic.Search(pPrevious, szInput, eType, &m_chain, 0, &pResult, &lMask, szWords);
-        return pResult;
+        return SearchAll(m_logic, eType, strText, pPrevious);
     }
 
     bool m_bNarrow;
     CLocalizerLogic m_logic;
-    CFilterChain m_chain;
 };
 
 // Time of the selection alone for the first character of a text.
@@ -276,6 +285,35 @@ void Narrowed(benchmark::State& state)
     }
 }
 
+// Contacts of one surname, typed by its initial, so that all of them match and are ranked: in the
+// whole store, and in a result that came in another order. Beside sorting as many matches.
+void OneSurname(benchmark::State& state)
+{
+    const int iContacts = static_cast<int>(state.range(0));
+    WorkloadOf(iContacts, L'\u5F20');
+    for (auto _ : state)
+    {
+        CLocalizerLogic logic;
+        tag_LocalizerResult* pResult = nullptr;
+        tag_LocalizerResult* pPrevious = nullptr;
+        const auto release = [&] { logic.FreeSearchResult(pResult); };
+        const auto measure = [&](const char* szCounter, const wchar_t* szText)
+        {
+            const auto search = [&]
+            { pResult = SearchAll(logic, IME_SEARCH_WORD, szText, pPrevious); };
+            state.counters[szCounter] = MedianSeconds(MEASURE_RUNS, search, release) * MICROSECONDS;
+        };
+        measure("whole_us", L"z");
+        pPrevious = SearchAll(logic, IME_SEARCH_WORD, L"", nullptr);
+        std::mt19937 rng(1);
+        std::shuffle(pPrevious->pDetail, pPrevious->pDetail + pPrevious->iResultNum, rng);
+        measure("shuffled_us", L"z");
+        logic.FreeSearchResult(pPrevious);
+        state.counters["sort_us"] = SortFloor(iContacts) * MICROSECONDS;
+        state.counters["entries_us"] = EntriesFloor(iContacts) * MICROSECONDS;
+    }
+}
+
 // Allowed: 1.8 times reading the database, copying to fresh memory and rewriting the file.
 void Build(benchmark::State& state)
 {
@@ -352,21 +390,25 @@ void Floors(benchmark::State& state)
 
 void RegisterAll()
 {
+    const auto add = [](int iSize, const char* szName, void (*pfnBench)(benchmark::State&))
+    {
+        benchmark::RegisterBenchmark(szName, pfnBench)
+            ->Arg(iSize)
+            ->Iterations(1)
+            ->Unit(benchmark::kMillisecond);
+    };
     for (const int iSize : SIZES)
     {
-        const auto add = [iSize](const char* szName, void (*pfnBench)(benchmark::State&))
-        {
-            benchmark::RegisterBenchmark(szName, pfnBench)
-                ->Arg(iSize)
-                ->Iterations(1)
-                ->Unit(benchmark::kMillisecond);
-        };
-        add("floors", Floors);
-        add("whole_store", WholeStore);
-        add("lock_held", LockHeld);
-        add("narrowed", Narrowed);
-        add("build", Build);
-        add("changes", Changes);
+        add(iSize, "floors", Floors);
+        add(iSize, "whole_store", WholeStore);
+        add(iSize, "lock_held", LockHeld);
+        add(iSize, "narrowed", Narrowed);
+        add(iSize, "build", Build);
+        add(iSize, "changes", Changes);
+    }
+    for (const int iSize : SIZES)
+    {
+        add(iSize, "one_surname", OneSurname);
     }
 }
 

@@ -76,7 +76,7 @@ private:
 
 } // namespace
 
-CWorkload::CWorkload(int iContacts) : m_iContacts(iContacts)
+CWorkload::CWorkload(int iContacts, wchar_t surname) : m_iContacts(iContacts), m_surname(surname)
 {
     std::string strTemplate = (fs::temp_directory_path() / "qv_bench_XXXXXX").string();
     Require(mkdtemp(strTemplate.data()) != nullptr, "no temporary directory");
@@ -111,7 +111,7 @@ void CWorkload::FillDatabase() const
     database.Execute("begin");
     for (int i = 1; i <= m_iContacts; ++i)
     {
-        const std::wstring strName = names.Next();
+        const std::wstring strName = m_surname == 0 ? names.Next() : names.NextOf(m_surname);
         tag_ProviderContact contact;
         contact.iId = i;
         contact.strName = ToUtf8(strName);

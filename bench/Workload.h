@@ -8,12 +8,14 @@
 class CWorkload
 {
 public:
-    explicit CWorkload(int iContacts);
+    // With a surname, all contacts bear it.
+    explicit CWorkload(int iContacts, wchar_t surname = 0);
     ~CWorkload();
     CWorkload(const CWorkload&) = delete;
     CWorkload& operator=(const CWorkload&) = delete;
 
     int Contacts() const { return m_iContacts; }
+    wchar_t Surname() const { return m_surname; }
     // Makes the directory the library's again after another workload was made.
     void Activate() const;
 
@@ -21,6 +23,7 @@ private:
     void FillDatabase() const;
 
     int m_iContacts;
+    wchar_t m_surname;
     std::string m_strRoot;
 };
 

@@ -8,12 +8,12 @@
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
 
+#include <algorithm>
 #include <cstring>
 #include <gtest/gtest.h>
 #include <string>
 #include <vector>
 
-constexpr int DEBUG_LINE = 3;
 constexpr int ERROR_LINE = 6;
 
 using Lines = std::vector<std::string>;
@@ -22,10 +22,6 @@ using Records = std::vector<tag_ContactsStruct>;
 inline bool operator==(const tag_ContactReg& left, const tag_ContactReg& right)
 {
     return std::memcmp(&left, &right, sizeof(left)) == 0;
-}
-inline std::ostream& operator<<(std::ostream& stream, const tag_ContactReg& reg)
-{
-    return stream << '{' << reg.iTotalNum << ", " << reg.iSortType << ", " << reg.iMemSize << '}';
 }
 
 // A store manager in a data directory of its own, and the store's files as bytes.
@@ -43,10 +39,7 @@ protected:
             record.iSortIndex = i;
             record.llLastTimeContacted = 5'000'000'000LL + i;
             record.szName[0] = static_cast<wchar_t>('a' + i % 26);
-            for (int k = 0; k < i % (CONTACT_MAX_KEY + 1); ++k)
-            {
-                record.szLocalizerKey[k] = static_cast<wchar_t>(0x1000 + i + k);
-            }
+            std::fill_n(record.szLocalizerKey, i % (CONTACT_MAX_KEY + 1), 0x1000 + i);
         }
         return vRecords;
     }
@@ -66,10 +59,9 @@ protected:
     {
         return CDataDirectory::ReadBytes(CDataPaths::ContactRecords());
     }
-    static std::string RegFile() { return CDataDirectory::ReadBytes(CDataPaths::ContactReg()); }
     static tag_ContactReg Reg()
     {
-        const std::string strBytes = RegFile();
+        const std::string strBytes = CDataDirectory::ReadBytes(CDataPaths::ContactReg());
         tag_ContactReg reg = {-77, -77, -77};
         EXPECT_EQ(strBytes.size(), sizeof(reg));
         std::memcpy(&reg, strBytes.data(), std::min(sizeof(reg), strBytes.size()));

@@ -13,11 +13,6 @@ std::string ListText(std::vector<long long> vIds)
     return CIdList(static_cast<long>(vIds.size()), vIds.data()).Text();
 }
 
-bool CanListAll(std::vector<long long> vIds)
-{
-    return CIdList::CanListAll(static_cast<long>(vIds.size()), vIds.data());
-}
-
 } // namespace
 
 TEST(IdList, WritesTheLow32BitsOfEachIdSigned)
@@ -33,11 +28,11 @@ TEST(IdList, StopsBehindTheIdThatReachesTheLimit)
     std::vector<long long> vIds(163, 1234567890);
     ASSERT_EQ(1796U + 1, ListText(vIds).size());
     vIds.push_back(-2147483648LL);
-    EXPECT_TRUE(CanListAll(vIds));
+    EXPECT_TRUE(CIdList::CanListAll(164, vIds.data()));
     const std::string strFull = ListText(vIds);
     EXPECT_EQ(1796U + 12 + 1, strFull.size());
     EXPECT_EQ(",-2147483648)", strFull.substr(strFull.size() - 13));
     vIds.push_back(1);
-    EXPECT_FALSE(CanListAll(vIds));
+    EXPECT_FALSE(CIdList::CanListAll(165, vIds.data()));
     EXPECT_EQ(strFull, ListText(vIds));
 }

@@ -14,15 +14,13 @@
 
 constexpr int DEBUG_LINE = 3;
 constexpr int ERROR_LINE = 6;
-constexpr const char* DB_TAG = "QV_ContactsLocalize_SO";
+using Lines = std::vector<std::string>;
 
-constexpr const char* LINE_MERGE_SHORT = "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>>"
-                                         "ReadAllLocalizer: iIndex < pRecord->RecordNum\n";
-constexpr const char* LINE_CONTACTS_STEP =
-    " QV_Contacts>>QV_ContactsLocalize_SO>> select from contacts sqlite3_step ERROR result=";
-constexpr const char* LINE_LOCALIZER_STEP =
-    "QV_Contacts>>QV_ContactsLocalize_SO>> SQLiteOperator>>ReadAllLocalizer: sqlite3_step  error "
-    "from localizer";
+// "1.2.3" and so on up to iLast.
+inline std::string IdText(int iLast)
+{
+    return iLast == 1 ? "1" : IdText(iLast - 1) + "." + std::to_string(iLast);
+}
 
 // What a read leaves, released with the object.
 struct tag_ReadSet : tag_ContactsInfo
@@ -34,12 +32,9 @@ struct tag_ReadSet : tag_ContactsInfo
 
     std::vector<int> Ids() const
     {
-        std::vector<int> vIds;
-        vIds.reserve(static_cast<size_t>(RecordNum));
-        for (int i = 0; i < RecordNum; ++i)
-        {
-            vIds.push_back(pContacts[i].iContactID);
-        }
+        std::vector<int> vIds(static_cast<size_t>(RecordNum));
+        std::transform(pContacts, pContacts + RecordNum, vIds.begin(),
+                       [](const auto& record) { return record.iContactID; });
         return vIds;
     }
 };

@@ -10,10 +10,9 @@
 #include "Common/DataPaths.h"
 #include "Core/LocalizerLogic.h"
 #include "MemManager/MemManger.h"
-#include "Platform/LogSink.h"
+#include "tests/Support/ChildProcess.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/StoreImage.h"
-#include "tests/stress/Board.h"
 #include "tests/stress/Process.h"
 #include "tests/stress/ProviderActions.h"
 #include "tests/stress/SearchPlan.h"
@@ -21,24 +20,16 @@
 
 #include <algorithm>
 #include <chrono>
-#include <csignal>
-#include <ctime>
-#include <fcntl.h>
 #include <filesystem>
 #include <iostream>
 #include <iterator>
-#include <map>
 #include <memory>
 #include <set>
-#include <stdexcept>
-#include <sys/file.h>
-#include <sys/wait.h>
+#include <sys/time.h>
 #include <unistd.h>
 
 namespace
 {
-
-using Clock = std::chrono::steady_clock;
 
 constexpr int CONTACTS = 1000;
 constexpr int READER_PLANS = 10;
@@ -49,73 +40,49 @@ constexpr ACTION_KIND VICTIMS[] = {ACTION_CONTACTS,  ACTION_BUILD, ACTION_TIME,
                                    ACTION_SORT_TYPE, ACTION_ALL,   ACTION_STATUS};
 constexpr ACTION_KIND REPAIRS[] = {ACTION_BUILD, ACTION_CONTACTS, ACTION_ALL, ACTION_STATUS};
 
-int64_t MicrosecondsSince(Clock::time_point start)
+// The change that a process to be killed works on.
+struct tag_Victim
 {
-    return std::chrono::duration_cast<std::chrono::microseconds>(Clock::now() - start).count();
-}
+    static constexpr int MAX_IDS = 400;
+
+    int iMicroseconds; // how long it took when it was not killed
+    int iIds;
+    int aiIds[MAX_IDS];
+};
 
 // --- The processes -----------------------------------------------------------------------------
 
-// Lets the system kill this process after a while.
-class CDeathTimer
+// Lets the system kill this process, by a signal that nobody takes, after a while or never.
+void SetDeathTimer(int iMicroseconds)
 {
-public:
-    explicit CDeathTimer(int iMicroseconds)
-    {
-        sigevent event = {};
-        event.sigev_notify = SIGEV_SIGNAL;
-        event.sigev_signo = SIGKILL;
-        timer_create(CLOCK_MONOTONIC, &event, &m_timer);
-        itimerspec time = {};
-        time.it_value.tv_sec = iMicroseconds / 1'000'000;
-        time.it_value.tv_nsec = iMicroseconds % 1'000'000 * 1000L;
-        timer_settime(m_timer, 0, &time, nullptr); // a time of 0 starts nothing
-    }
-    ~CDeathTimer() { timer_delete(m_timer); }
-    CDeathTimer(const CDeathTimer&) = delete;
-    CDeathTimer& operator=(const CDeathTimer&) = delete;
-
-private:
-    timer_t m_timer = {};
-};
-
-int RunVictim(const std::string& strRoot, unsigned int uSeed, ACTION_KIND eKind, int iDelay)
-{
-    const CBoard board(strRoot);
-    CProviderActions provider(uSeed);
-    const tag_Action action = provider.Change(eKind);
-    for (size_t i = 0; i < action.vIds.size(); ++i)
-    {
-        board->aiIds[i] = static_cast<int32_t>(action.vIds[i]);
-    }
-    board->iIds = static_cast<int32_t>(action.vIds.size());
-    CLocalizerLogic logic;
-    const Clock::time_point start = Clock::now();
-    {
-        const CDeathTimer timer(iDelay);
-        CProviderActions::Notify(logic, action);
-    }
-    board->llMicroseconds = MicrosecondsSince(start);
-    return 0;
+    const itimerval time = {{0, 0}, {iMicroseconds / 1'000'000, iMicroseconds % 1'000'000}};
+    setitimer(ITIMER_REAL, &time, nullptr);
 }
 
-// Meets what a killed writer left in every way that reads.
-int RunReader(unsigned int uSeed)
+void RunVictim(tag_Victim& victim, unsigned int uSeed, ACTION_KIND eKind, int iDelay)
+{
+    const tag_Action action = CProviderActions(uSeed).Change(eKind);
+    std::copy(action.vIds.begin(), action.vIds.end(), victim.aiIds);
+    victim.iIds = static_cast<int>(action.vIds.size());
+    CLocalizerLogic logic;
+    const auto start = std::chrono::steady_clock::now();
+    SetDeathTimer(iDelay);
+    CProviderActions::Notify(logic, action);
+    SetDeathTimer(NEVER);
+    const std::chrono::duration<double, std::micro> time = std::chrono::steady_clock::now() - start;
+    victim.iMicroseconds = static_cast<int>(time.count());
+}
+
+// Meets what a killed writer left. That a result holds a contact twice is allowed here: a patch
+// may be cut between moving records up and counting them.
+void RunReader(unsigned int uSeed)
 {
     alarm(READER_SECONDS);
     std::mt19937 random(uSeed);
     CLocalizerLogic logic;
     for (int i = 0; i < READER_PLANS; ++i)
     {
-        tag_SearchPlan plan = AnyPlan(random);
-        try
-        {
-            RunPlan(logic, plan);
-        }
-        catch (const CFoundTwice&)
-        {
-            // Allowed here: a patch was cut between moving records up and counting them.
-        }
+        RunPlan(logic, AnyPlan(random));
     }
     CMemManger store;
     tag_ContactsInfo* pInfo = nullptr;
@@ -123,8 +90,8 @@ int RunReader(unsigned int uSeed)
     const std::unique_ptr<tag_ContactsInfo> info(pInfo);
     const std::unique_ptr<tag_ContactsStruct[]> records(pInfo->pContacts);
     int iTotal = 0;
-    const int iMemSize = store.GetMemSize(&iTotal);
-    return pInfo->RecordNum == iTotal && iMemSize >= 0 && logic.OnGetSortType() >= 0 ? 0 : 1;
+    Require(store.GetMemSize(&iTotal) >= 0 && pInfo->RecordNum == iTotal, "a damaged store");
+    Require(logic.OnGetSortType() >= 0, "a damaged sort type");
 }
 
 // --- The inspection ----------------------------------------------------------------------------
@@ -138,29 +105,8 @@ enum REMAINS
     REMAINS_KINDS
 };
 
-void Require(bool bTrue, const std::string& strWhat)
-{
-    if (!bTrue)
-    {
-        throw std::runtime_error(strWhat);
-    }
-}
-
-bool IsLockFree()
-{
-    const int iFd = open(CDataPaths::LockFile(), O_RDWR | O_CREAT | O_CLOEXEC, 0777);
-    const bool bFree = flock(iFd, LOCK_EX | LOCK_NB) == 0;
-    close(iFd);
-    return bFree;
-}
-
-bool HasReg()
-{
-    return CDataDirectory::ReadBytes(CDataPaths::ContactReg()).size() == sizeof(tag_ContactReg);
-}
-
 // The image without some contacts, without who is online, and numbered anew.
-tag_StoreImage Without(tag_StoreImage image, const std::set<int32_t>& setIds)
+tag_StoreImage Without(tag_StoreImage image, const std::set<int>& setIds)
 {
     auto& vRecords = image.vRecords;
     vRecords.erase(std::remove_if(vRecords.begin(), vRecords.end(),
@@ -179,17 +125,17 @@ tag_StoreImage Without(tag_StoreImage image, const std::set<int32_t>& setIds)
 class CCrashTest
 {
 public:
-    explicit CCrashTest(unsigned int uSeed) : m_random(uSeed), m_board(m_directory.Root())
+    explicit CCrashTest(unsigned int uSeed) : m_random(uSeed)
     {
         m_directory.InstallPinyinTable();
         CProviderActions(uSeed).Fill(CONTACTS);
-        Require(m_logic.MemInit(true) == 0, "the first build failed");
+        Require(CLocalizerLogic().MemInit(true) == 0, "the first build failed");
         for (const ACTION_KIND eKind : VICTIMS)
         {
             StartVictim(eKind, NEVER);
-            m_mapTime[eKind] = m_board->llMicroseconds;
+            m_aiTime[eKind] = m_victim->iMicroseconds;
         }
-        m_logic.OnContactsTableChanged();
+        CLocalizerLogic().OnContactsTableChanged();
     }
 
     // Lets one process of the kind die and looks after it.
@@ -204,27 +150,23 @@ public:
                 std::filesystem::remove(CDataPaths::ContactRecords());
             }
         } while (!StartVictim(eKind, AnyDelay(eKind)));
-        Require(IsLockFree(), "the lock is still held");
-        CProcess reader({"reader", m_directory.Root(), std::to_string(m_random()), "0", "0"});
-        RequireSuccess("a reader", reader.Wait());
+        CLockHolder().Kill(); // throws when the lock is still held
+        const auto uSeed = static_cast<unsigned int>(m_random());
+        Require(!CProcess([uSeed] { RunReader(uSeed); }).WasKilled("a reader"), "a reader died");
         const REMAINS eRemains = Inspect();
-        ++m_mapRemains[{eKind, eRemains}];
+        ++m_aiRemains[eKind][eRemains];
         Repair(eRemains);
     }
 
     void Print() const
     {
-        std::cout << "killed while         nothing yet  unfinished  whole\n";
+        std::cout << "\nLeft by those that were killed:\n";
         for (const ACTION_KIND eKind : VICTIMS)
         {
-            std::cout << "  " << ActionName(eKind)
-                      << std::string(22 - std::string(ActionName(eKind)).size(), ' ');
-            for (int i = 0; i < REMAINS_KINDS; ++i)
-            {
-                const auto it = m_mapRemains.find({eKind, i});
-                std::cout << (it == m_mapRemains.end() ? 0 : it->second) << "\t\t";
-            }
-            std::cout << '\n';
+            const int* piRemains = m_aiRemains[eKind];
+            std::cout << ActionName(eKind) << ": " << piRemains[REMAINS_NOTHING]
+                      << " times nothing yet, " << piRemains[REMAINS_MARKED] << " unfinished, "
+                      << piRemains[REMAINS_WHOLE] << " whole\n";
         }
         std::cout << m_iSurvivors << " processes were done before they could be killed\n";
     }
@@ -235,35 +177,25 @@ private:
     // A point of the whole work, or as often of its second half, where the files are written.
     int AnyDelay(ACTION_KIND eKind)
     {
-        const int iTime = static_cast<int>(m_mapTime[eKind]) + 1;
+        const int iTime = m_aiTime[eKind] + 1;
         return Pick(2) == 0 ? 1 + Pick(iTime) : iTime / 2 + Pick(iTime / 2 + 1) + 1;
     }
 
     // False when the process was done before its time.
     bool StartVictim(ACTION_KIND eKind, int iDelay)
     {
-        CProcess victim({"victim", m_directory.Root(), std::to_string(m_random()),
-                         std::to_string(eKind), std::to_string(iDelay)});
-        const int iStatus = victim.Wait();
-        if (WIFSIGNALED(iStatus) && WTERMSIG(iStatus) == SIGKILL)
-        {
-            return true;
-        }
-        RequireSuccess("a victim", iStatus);
-        ++m_iSurvivors;
-        return false;
-    }
-
-    std::set<int32_t> TouchedIds() const
-    {
-        return {m_board->aiIds, m_board->aiIds + m_board->iIds};
+        const auto uSeed = static_cast<unsigned int>(m_random());
+        const bool bKilled =
+            CProcess([&] { RunVictim(*m_victim, uSeed, eKind, iDelay); }).WasKilled("a victim");
+        m_iSurvivors += bKilled ? 0 : 1;
+        return bKilled;
     }
 
     // A store that does not ask for a rebuild is right in all but the contacts of the change that
     // was cut, and holds each of those at most once.
     REMAINS Inspect()
     {
-        if (!HasReg())
+        if (CDataDirectory::ReadBytes(CDataPaths::ContactReg()).size() != sizeof(tag_ContactReg))
         {
             return REMAINS_NOTHING;
         }
@@ -275,7 +207,7 @@ private:
         }
         const std::string strFault = FaultOf(image);
         Require(strFault.empty(), "a store that looks whole: " + strFault);
-        const std::set<int32_t> setIds = TouchedIds();
+        const std::set<int> setIds(m_victim->aiIds, m_victim->aiIds + m_victim->iIds);
         const std::string strDifference =
             DifferenceOf(Without(image, setIds),
                          Without(FreshBuild(m_directory.Root(), image.reg.iSortType), setIds));
@@ -286,9 +218,10 @@ private:
     void RequireNoRepair()
     {
         const std::string strReg = CDataDirectory::ReadBytes(CDataPaths::ContactReg());
-        Require(m_logic.MemInit(false) == 0, "MemInit(false) failed");
-        m_logic.OnContactTimeChanged(1, 1'700'000'000'000);
-        m_logic.OnContactStarChanged(2, 1);
+        CLocalizerLogic logic;
+        Require(logic.MemInit(false) == 0, "MemInit(false) failed");
+        logic.OnContactTimeChanged(1, 1'700'000'000'000);
+        logic.OnContactStarChanged(2, 1);
         Require(CDataDirectory::ReadBytes(CDataPaths::ContactReg()) == strReg,
                 "a time or a star took the mark away");
     }
@@ -298,86 +231,42 @@ private:
         tag_Action action;
         action.eKind = REPAIRS[Pick(static_cast<int>(std::size(REPAIRS)))];
         action.vIds = {1, 2, 3};
-        CProviderActions::Notify(m_logic, action);
+        CLocalizerLogic logic;
+        CProviderActions::Notify(logic, action);
         if (eRemains == REMAINS_WHOLE)
         {
             // The cut notification, delivered again.
-            m_logic.OnContactsTableChanged();
+            logic.OnContactsTableChanged();
         }
-        const tag_StoreImage store = ReadStore();
-        Require(!IsMarked(store.reg), "still asking for a rebuild after one");
-        const std::string strDifference =
-            DifferenceOf(store, FreshBuild(m_directory.Root(), store.reg.iSortType));
-        Require(strDifference.empty(), std::string("after a repair by ") +
-                                           ActionName(action.eKind) + ": " + strDifference);
+        RequireFreshStore(m_directory.Root(), ActionName(action.eKind));
     }
 
     std::mt19937 m_random;
     CDataDirectory m_directory;
-    CBoard m_board;
-    CLocalizerLogic m_logic;
-    std::map<int, int64_t> m_mapTime; // microseconds that a kind takes
-    std::map<std::pair<int, int>, int> m_mapRemains;
+    CShared<tag_Victim> m_victim;
+    int m_aiTime[ACTION_KINDS] = {}; // microseconds that a kind takes
+    int m_aiRemains[ACTION_KINDS][REMAINS_KINDS] = {};
     int m_iSurvivors = 0;
 };
 
-int RunKills(int iKills, unsigned int uSeed)
+void RunKills(int iKills, unsigned int uSeed)
 {
-    const Clock::time_point start = Clock::now();
     std::cout << iKills << " kills, seed " << uSeed << std::endl;
     CCrashTest test(uSeed);
     for (int i = 0; i < iKills; ++i)
     {
-        try
-        {
-            test.KillOne(VICTIMS[static_cast<size_t>(i) % std::size(VICTIMS)]);
-        }
-        catch (const std::exception& error)
-        {
-            throw std::runtime_error(
-                "kill " + std::to_string(i) + " during " +
-                ActionName(VICTIMS[static_cast<size_t>(i) % std::size(VICTIMS)]) + ": " +
-                error.what());
-        }
+        const ACTION_KIND eKind = VICTIMS[static_cast<size_t>(i) % std::size(VICTIMS)];
+        std::cout << "kill " << i << " during " << ActionName(eKind) << '\r' << std::flush;
+        test.KillOne(eKind);
     }
     test.Print();
-    std::cout << "Done in " << MicrosecondsSince(start) / 1'000'000 << " s" << std::endl;
-    return 0;
-}
-
-int RunRole(const std::vector<std::string>& vArguments)
-{
-    CDataPaths::SetRoot(vArguments[1].c_str());
-    const auto uSeed = static_cast<unsigned int>(std::stoul(vArguments[2]));
-    return vArguments[0] == "reader"
-               ? RunReader(uSeed)
-               : RunVictim(vArguments[1], uSeed, static_cast<ACTION_KIND>(std::stoi(vArguments[3])),
-                           std::stoi(vArguments[4]));
-}
-
-void Silence(void* /*pContext*/, int /*iPriority*/, const char* /*szTag*/, const char* /*szText*/)
-{
 }
 
 } // namespace
 
 int main(int argc, char** argv)
 {
-    const std::vector<std::string> vArguments(argv + 1, argv + argc);
-    CLogSink::Set(&Silence, nullptr);
-    try
-    {
-        if (vArguments.size() == 5)
-        {
-            return RunRole(vArguments);
-        }
-        return RunKills(
-            vArguments.empty() ? 20 : std::stoi(vArguments[0]),
-            vArguments.size() < 2 ? 1U : static_cast<unsigned int>(std::stoul(vArguments[1])));
-    }
-    catch (const std::exception& error)
-    {
-        std::cerr << "qv_crash: " << error.what() << std::endl;
-        return 1;
-    }
+    return RunProgram(argc, argv, {20, 1},
+                      [](const std::vector<int>& vNumbers)
+                      { RunKills(vNumbers[0], static_cast<unsigned int>(vNumbers[1])); });
 }

@@ -1,28 +1,44 @@
 #include "tests/stress/Process.h"
 
-#include <cerrno>
+#include "Platform/LogSink.h"
+
+#include <chrono>
 #include <csignal>
-#include <ctime>
+#include <iostream>
 #include <stdexcept>
 #include <sys/wait.h>
+#include <thread>
 #include <unistd.h>
 
-CProcess::CProcess(const std::vector<std::string>& vArguments) : m_iPid(fork())
+namespace
 {
-    if (m_iPid < 0)
+
+int RunGuarded(const std::function<void()>& fnRun)
+{
+    try
     {
-        throw std::runtime_error("no process could be started");
+        fnRun();
+        return 0;
     }
+    catch (const std::exception& error)
+    {
+        std::cerr << error.what() << std::endl;
+        return 1;
+    }
+}
+
+void Silence(void* /*pContext*/, int /*iPriority*/, const char* /*szTag*/, const char* /*szText*/)
+{
+}
+
+} // namespace
+
+CProcess::CProcess(const std::function<void()>& fnBody) : m_iPid(fork())
+{
+    Require(m_iPid >= 0, "no process could be started");
     if (m_iPid == 0)
     {
-        std::vector<char*> vArgv = {const_cast<char*>("qv_stress")};
-        for (const std::string& strArgument : vArguments)
-        {
-            vArgv.push_back(const_cast<char*>(strArgument.c_str()));
-        }
-        vArgv.push_back(nullptr);
-        execv(QV_STRESS_PROGRAM, vArgv.data());
-        _exit(127);
+        _exit(RunGuarded(fnBody));
     }
 }
 
@@ -31,44 +47,48 @@ CProcess::~CProcess()
     if (m_iPid > 0)
     {
         kill(m_iPid, SIGKILL);
-        Wait();
+        waitpid(m_iPid, nullptr, 0);
     }
 }
 
-int CProcess::Wait()
+bool CProcess::WasKilled(const std::string& strName)
 {
-    while (m_iPid > 0 && waitpid(m_iPid, &m_iStatus, 0) < 0 && errno == EINTR)
-    {
-    }
+    int iStatus = 0;
+    waitpid(m_iPid, &iStatus, 0);
     m_iPid = -1;
-    return m_iStatus;
+    const bool bKilled = WIFSIGNALED(iStatus) && WTERMSIG(iStatus) == SIGALRM;
+    Require(bKilled || iStatus == 0, strName + " ended with status " + std::to_string(iStatus));
+    return bKilled;
 }
 
-bool CProcess::HasEnded()
+void Require(bool bTrue, const std::string& strText)
 {
-    if (m_iPid > 0 && waitpid(m_iPid, &m_iStatus, WNOHANG) == m_iPid)
+    if (!bTrue)
     {
-        m_iPid = -1;
-    }
-    return m_iPid < 0;
-}
-
-void RequireSuccess(const std::string& strName, int iStatus)
-{
-    if (WIFSIGNALED(iStatus))
-    {
-        throw std::runtime_error(strName + " died of signal " + std::to_string(WTERMSIG(iStatus)));
-    }
-    if (WEXITSTATUS(iStatus) != 0)
-    {
-        throw std::runtime_error(strName + " ended with " + std::to_string(WEXITSTATUS(iStatus)));
+        throw std::runtime_error(strText);
     }
 }
 
-void SleepMicroseconds(unsigned int uMicroseconds)
+void SleepMicroseconds(unsigned long uMicroseconds)
 {
-    constexpr unsigned int PER_SECOND = 1'000'000;
-    timespec time = {static_cast<time_t>(uMicroseconds / PER_SECOND),
-                     static_cast<long>(uMicroseconds % PER_SECOND) * 1000L};
-    nanosleep(&time, nullptr);
+    std::this_thread::sleep_for(std::chrono::microseconds(uMicroseconds));
+}
+
+int RunProgram(int argc, char** argv, std::vector<int> vNumbers,
+               const std::function<void(const std::vector<int>&)>& fnRun)
+{
+    const auto start = std::chrono::steady_clock::now();
+    CLogSink::Set(&Silence, nullptr);
+    const int iResult = RunGuarded(
+        [&]
+        {
+            for (size_t i = 1; i < static_cast<size_t>(argc) && i <= vNumbers.size(); ++i)
+            {
+                vNumbers[i - 1] = std::stoi(argv[i]);
+            }
+            fnRun(vNumbers);
+        });
+    const std::chrono::duration<double> time = std::chrono::steady_clock::now() - start;
+    std::cout << "Done in " << static_cast<int>(time.count()) << " s" << std::endl;
+    return iResult;
 }

@@ -1,33 +1,57 @@
 #ifndef QV_TESTS_STRESS_PROCESS_H
 #define QV_TESTS_STRESS_PROCESS_H
 
+#include <functional>
 #include <string>
+#include <sys/mman.h>
 #include <sys/types.h>
 #include <vector>
 
-// Another process of the running program, started anew with its own arguments.
+// Another process, which runs the body and fails when that throws. No database may be open when
+// it starts: SQLite does not outlive a fork.
 class CProcess
 {
 public:
-    explicit CProcess(const std::vector<std::string>& vArguments);
+    explicit CProcess(const std::function<void()>& fnBody);
     // Kills a process that was not waited for.
     ~CProcess();
     CProcess(const CProcess&) = delete;
     CProcess& operator=(const CProcess&) = delete;
 
-    // The status of the ended process, as waitpid tells it.
-    int Wait();
-    // Whether it ended; waits for nothing.
-    bool HasEnded();
+    // Whether the process was killed by an alarm; false when it succeeded, std::runtime_error
+    // with the name when it ended in any other way.
+    bool WasKilled(const std::string& strName);
 
 private:
     pid_t m_iPid;
-    int m_iStatus = 0;
 };
 
-// Throws std::runtime_error, with what the status says, unless the process ended with 0.
-void RequireSuccess(const std::string& strName, int iStatus);
+// Memory, zero at first, that this process has in common with those that it starts later.
+template <typename T>
+class CShared
+{
+public:
+    CShared() : m_pMemory(mmap(nullptr, sizeof(T), PROT_READ | PROT_WRITE, FLAGS, -1, 0)) {}
+    ~CShared() { munmap(m_pMemory, sizeof(T)); }
+    CShared(const CShared&) = delete;
+    CShared& operator=(const CShared&) = delete;
 
-void SleepMicroseconds(unsigned int uMicroseconds);
+    T* operator->() const { return static_cast<T*>(m_pMemory); }
+    T& operator*() const { return *static_cast<T*>(m_pMemory); }
+
+private:
+    static constexpr int FLAGS = MAP_SHARED | MAP_ANONYMOUS;
+    void* m_pMemory;
+};
+
+// Throws std::runtime_error with the text unless bTrue.
+void Require(bool bTrue, const std::string& strText);
+
+void SleepMicroseconds(unsigned long uMicroseconds);
+
+// The main function of a program: runs it with the numbers of its arguments, or those given for
+// missing ones, and tells what it threw. The library's log goes nowhere.
+int RunProgram(int argc, char** argv, std::vector<int> vNumbers,
+               const std::function<void(const std::vector<int>&)>& fnRun);
 
 #endif

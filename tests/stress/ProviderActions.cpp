@@ -5,11 +5,11 @@
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/StoreImage.h"
+#include "tests/stress/Process.h"
 
 #include <algorithm>
 #include <iterator>
 #include <sqlite3.h>
-#include <stdexcept>
 
 namespace
 {
@@ -27,16 +27,6 @@ constexpr const char* NAME_PARTS[] = {"张", "王", "李", "重", "单", "曾", 
                                       "li", " ",  "7",  "#",  "é",  "〇",  "晓明", "O'N"};
 constexpr const char* LISTS[] = {"", "1", "2", "1.2.3", "3.4", "5..7"};
 
-std::string Quoted(const std::string& strText)
-{
-    std::string strQuoted = "'";
-    for (const char c : strText)
-    {
-        strQuoted += c == '\'' ? std::string("''") : std::string(1, c);
-    }
-    return strQuoted + "'";
-}
-
 } // namespace
 
 const char* ActionName(ACTION_KIND eKind)
@@ -49,11 +39,9 @@ const char* ActionName(ACTION_KIND eKind)
 
 CProviderActions::CProviderActions(unsigned int uSeed) : m_random(uSeed)
 {
-    if (!CDataDirectory::Exists(CDataPaths::PinyinMapping()) &&
-        CQVLocalizerManager::InitMapFile() != 0)
-    {
-        throw std::runtime_error("no pinyin mapping could be made");
-    }
+    Require(CDataDirectory::Exists(CDataPaths::PinyinMapping()) ||
+                CQVLocalizerManager::InitMapFile() == 0,
+            "no pinyin mapping could be made");
 }
 
 void CProviderActions::Fill(int iContacts)
@@ -79,28 +67,30 @@ tag_Action CProviderActions::Change(ACTION_KIND eKind)
         ChangeContacts(action.vIds);
         break;
     case ACTION_STATUS:
-        ChangeStatus();
+        for (int i = 1 + Pick(MAX_CHANGED); i > 0; --i)
+        {
+            m_database.SetOnline(FIRST_STATUS_ID + AnyVisible(), Pick(2) == 0);
+        }
         break;
     case ACTION_TIME:
         action.vIds = {AnyVisible()};
-        action.llTime = LatestTime() + 1000;
-        m_database.SetLastTime(static_cast<int>(action.vIds[0]), action.llTime);
+        action.llValue = LatestTime() + 1000;
+        m_database.SetLastTime(static_cast<int>(action.vIds[0]), action.llValue);
         break;
     case ACTION_STAR:
         action.vIds = {AnyVisible()};
-        action.bStarred = Pick(2) == 0;
-        m_database.SetStarred(static_cast<int>(action.vIds[0]), action.bStarred);
+        action.llValue = Pick(2);
+        m_database.SetStarred(static_cast<int>(action.vIds[0]), action.llValue != 0);
         break;
     case ACTION_SORT_TYPE:
-        action.iSortType = CLocalizerLogic().OnGetSortType() == 0 ? 1 : 0;
+        action.llValue = CLocalizerLogic().OnGetSortType() == 0 ? 1 : 0;
         break;
-    case ACTION_BUILD:
-    case ACTION_KINDS:
+    default: // nothing to change before a build
         break;
     }
-    if (eKind == ACTION_MANY)
+    while (eKind == ACTION_MANY && action.vIds.size() < LONG_LIST)
     {
-        PadList(action.vIds);
+        action.vIds.push_back(FIRST_UNKNOWN_ID + static_cast<long long>(action.vIds.size()));
     }
     m_database.Execute("commit");
     return action;
@@ -108,12 +98,10 @@ tag_Action CProviderActions::Change(ACTION_KIND eKind)
 
 ACTION_KIND CProviderActions::AnyKind()
 {
-    constexpr ACTION_KIND KINDS[] = {
-        ACTION_CONTACTS, ACTION_CONTACTS, ACTION_CONTACTS, ACTION_CONTACTS, ACTION_CONTACTS,
-        ACTION_CONTACTS, ACTION_CONTACTS, ACTION_STATUS,   ACTION_STATUS,   ACTION_TIME,
-        ACTION_TIME,     ACTION_TIME,     ACTION_TIME,     ACTION_STAR,     ACTION_STAR,
-        ACTION_STAR,     ACTION_ALL,      ACTION_MANY,     ACTION_BUILD,    ACTION_SORT_TYPE};
-    return KINDS[Pick(static_cast<int>(std::size(KINDS)))];
+    constexpr ACTION_KIND KINDS[] = {ACTION_CONTACTS, ACTION_CONTACTS, ACTION_CONTACTS,
+                                     ACTION_CONTACTS, ACTION_STATUS,   ACTION_TIME,
+                                     ACTION_TIME,     ACTION_STAR};
+    return Pick(5) == 0 ? static_cast<ACTION_KIND>(Pick(ACTION_KINDS)) : AnyOf(KINDS);
 }
 
 void CProviderActions::Notify(CLocalizerLogic& logic, tag_Action action)
@@ -128,13 +116,14 @@ void CProviderActions::Notify(CLocalizerLogic& logic, tag_Action action)
         logic.OnStatusUpdatesTableChanged(0, nullptr);
         break;
     case ACTION_TIME:
-        logic.OnContactTimeChanged(static_cast<long>(action.vIds[0]), action.llTime);
+        logic.OnContactTimeChanged(static_cast<long>(action.vIds[0]), action.llValue);
         break;
     case ACTION_STAR:
-        logic.OnContactStarChanged(static_cast<long>(action.vIds[0]), action.bStarred ? 1 : 0);
+        logic.OnContactStarChanged(static_cast<long>(action.vIds[0]),
+                                   static_cast<int>(action.llValue));
         break;
     case ACTION_SORT_TYPE:
-        logic.SetSortType(action.iSortType);
+        logic.SetSortType(static_cast<int>(action.llValue));
         break;
     case ACTION_BUILD:
         while (logic.MemInit(true) != 0)
@@ -153,10 +142,7 @@ int CProviderActions::Ask(const std::string& strSql)
 {
     sqlite3_stmt* pStatement = nullptr;
     sqlite3_prepare_v2(m_database.Handle(), strSql.c_str(), -1, &pStatement, nullptr);
-    if (sqlite3_step(pStatement) != SQLITE_ROW)
-    {
-        throw std::runtime_error("no row: " + strSql);
-    }
+    Require(sqlite3_step(pStatement) == SQLITE_ROW, "no row: " + strSql);
     const int iAnswer = sqlite3_column_int(pStatement, 0);
     sqlite3_finalize(pStatement);
     return iAnswer;
@@ -181,7 +167,7 @@ std::string CProviderActions::AnyName()
     std::string strName;
     for (int i = Pick(4); i > 0; --i)
     {
-        strName += NAME_PARTS[Pick(static_cast<int>(std::size(NAME_PARTS)))];
+        strName += AnyOf(NAME_PARTS);
     }
     return strName;
 }
@@ -192,8 +178,8 @@ tag_ProviderContact CProviderActions::AnyContact(int iId)
     contact.iId = iId;
     contact.strName = AnyName();
     contact.strKey = LocalizerKeyOf(contact.strName);
-    contact.strGroups = LISTS[Pick(static_cast<int>(std::size(LISTS)))];
-    contact.strAccounts = LISTS[Pick(static_cast<int>(std::size(LISTS)))];
+    contact.strGroups = AnyOf(LISTS);
+    contact.strAccounts = AnyOf(LISTS);
     contact.llLastTime = Pick(3) == 0 ? 0 : FIRST_TIME - Pick(1'000'000'000);
     contact.iStatusId = FIRST_STATUS_ID + iId;
     contact.bPhone = Pick(2) == 0;
@@ -206,32 +192,30 @@ tag_ProviderContact CProviderActions::AnyContact(int iId)
 void CProviderActions::ChangeContact(int iId)
 {
     const std::string strId = std::to_string(iId);
+    const int iChange = Pick(6);
     if (Ask("select count(*) from contacts where _id=" + strId) == 0)
     {
         m_database.Put(AnyContact(iId));
-        return;
     }
-    switch (Pick(6))
+    else if (iChange == 0)
     {
-    case 0:
         m_database.Remove(iId);
-        break;
-    case 1:
+    }
+    else if (iChange == 1)
+    {
         m_database.SetVisible(iId,
                               Ask("select count(*) from visible_contacts where _id=" + strId) == 0);
-        break;
-    case 2:
-    case 3:
+    }
+    else if (iChange < 4)
     {
         const std::string strName = AnyName();
         m_database.SetName(iId, strName, LocalizerKeyOf(strName));
-        break;
     }
-    default:
+    else
+    {
         m_database.Execute("update contacts set has_phone_number=1-has_phone_number where _id=" +
-                           strId + "; update localizer set group_id=" +
-                           Quoted(LISTS[Pick(static_cast<int>(std::size(LISTS)))]) +
-                           ", hasMail=1-hasMail where contact_id=" + strId);
+                           strId + "; update localizer set group_id='" + AnyOf(LISTS) +
+                           "', hasMail=1-hasMail where contact_id=" + strId);
     }
 }
 
@@ -246,21 +230,5 @@ void CProviderActions::ChangeContacts(std::vector<long long>& vIds)
             vIds.push_back(iId);
             ChangeContact(iId);
         }
-    }
-}
-
-void CProviderActions::ChangeStatus()
-{
-    for (int i = 1 + Pick(MAX_CHANGED); i > 0; --i)
-    {
-        m_database.SetOnline(FIRST_STATUS_ID + AnyVisible(), Pick(2) == 0);
-    }
-}
-
-void CProviderActions::PadList(std::vector<long long>& vIds)
-{
-    while (vIds.size() < LONG_LIST)
-    {
-        vIds.push_back(FIRST_UNKNOWN_ID + static_cast<long long>(vIds.size()));
     }
 }

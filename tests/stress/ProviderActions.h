@@ -28,9 +28,7 @@ struct tag_Action
 {
     ACTION_KIND eKind = ACTION_ALL;
     std::vector<long long> vIds{}; // the contacts concerned
-    long long llTime = 0;
-    bool bStarred = false;
-    int iSortType = 0;
+    long long llValue = 0;         // the time, sort type or whether it is a favourite
 };
 
 // The provider: random changes of its database that keep the rules under which the index ends
@@ -53,6 +51,11 @@ public:
 
 private:
     int Pick(int iNum) { return static_cast<int>(m_random() % static_cast<unsigned int>(iNum)); }
+    template <typename T, size_t N>
+    T AnyOf(T const (&all)[N])
+    {
+        return all[Pick(static_cast<int>(N))];
+    }
     int Ask(const std::string& strSql);
     long long LatestTime();
     int AnyVisible();
@@ -60,8 +63,6 @@ private:
     tag_ProviderContact AnyContact(int iId);
     void ChangeContact(int iId);
     void ChangeContacts(std::vector<long long>& vIds);
-    void ChangeStatus();
-    void PadList(std::vector<long long>& vIds);
 
     std::mt19937 m_random;
     CProviderDatabase m_database;

@@ -5,9 +5,7 @@
 
 #include <cstdint>
 #include <random>
-#include <stdexcept>
 #include <string>
-#include <utility>
 #include <vector>
 
 class CLocalizerLogic;
@@ -15,7 +13,11 @@ class CLocalizerLogic;
 // A search of the store and the narrowing searches that follow it while somebody types.
 struct tag_SearchPlan
 {
-    std::vector<std::pair<int, QVLong32>> vFilters{}; // kind and id
+    static constexpr size_t MAX_FILTERS = 3;
+
+    int iFilters = 0;
+    int aiKinds[MAX_FILTERS] = {};
+    QVLong32 alIds[MAX_FILTERS] = {};
     IME_SEARCH_TYPE eType = IME_SEARCH_WORD;
     std::vector<std::wstring> vTexts{}; // each typed on from the one before
 };
@@ -27,14 +29,9 @@ struct tag_SearchOutcome
     uint64_t uHash = 0;  // every byte of every result but the index characters
     uint64_t uIndex = 0; // the index characters, which depend on the sort type
     int iFound = 0;      // contacts of the first search
+    int iTwice = 0;      // entries of contacts that a result holds already
 };
-// A result that holds a contact twice.
-class CFoundTwice : public std::runtime_error
-{
-public:
-    using std::runtime_error::runtime_error;
-};
-// CFoundTwice, or std::runtime_error when a search fails.
-tag_SearchOutcome RunPlan(CLocalizerLogic& logic, const tag_SearchPlan& plan);
+// std::runtime_error when a search fails.
+tag_SearchOutcome RunPlan(CLocalizerLogic& logic, tag_SearchPlan plan);
 
 #endif

@@ -3,6 +3,7 @@
 #include "Common/DataPaths.h"
 #include "Common/NameOrder.h"
 #include "tests/Support/DataDirectory.h"
+#include "tests/stress/Process.h"
 
 #include <cstring>
 #include <set>
@@ -76,6 +77,14 @@ std::string FaultOf(const tag_StoreImage& image)
         }
     }
     return {};
+}
+
+void RequireFreshStore(const std::string& strRoot, const std::string& strText)
+{
+    const tag_StoreImage store = ReadStore();
+    Require(!IsMarked(store.reg), strText + ": still asking for a rebuild");
+    const std::string strDifference = DifferenceOf(store, FreshBuild(strRoot, store.reg.iSortType));
+    Require(strDifference.empty(), strText + ": not a fresh build: " + strDifference);
 }
 
 void InstallStore(const tag_StoreImage& image, int iSortType)

@@ -22,6 +22,10 @@ private:
 // and, where the capacity does not ask for a rebuild, another order than that of the sort type.
 std::string FaultOf(const tag_StoreImage& image);
 
+// Throws std::runtime_error, which begins with the text, unless the store of strRoot, the present
+// root, is what a fresh build makes and asks for no rebuild.
+void RequireFreshStore(const std::string& strRoot, const std::string& strText);
+
 // Makes the image the store of the library's present root. The sort type is given apart.
 void InstallStore(const tag_StoreImage& image, int iSortType);
 

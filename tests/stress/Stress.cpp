@@ -10,34 +10,51 @@
 #include "Core/LocalizerLogic.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "MemManager/SingleMutex.h"
-#include "Platform/LogSink.h"
 #include "tests/Support/DataDirectory.h"
+#include "tests/Support/LogCapture.h"
 #include "tests/Support/StoreImage.h"
-#include "tests/stress/Board.h"
 #include "tests/stress/Process.h"
 #include "tests/stress/ProviderActions.h"
 #include "tests/stress/SearchPlan.h"
 #include "tests/stress/StateJournal.h"
 
-#include <chrono>
-#include <cstring>
+#include <algorithm>
+#include <atomic>
 #include <fstream>
 #include <iostream>
-#include <map>
 #include <memory>
-#include <stdexcept>
 
 namespace
 {
 
-constexpr int SEARCHERS = 4;
+constexpr unsigned int SEARCHERS = 4;
 constexpr int CONTACTS = 250;
 constexpr unsigned int MAX_SEARCH_PAUSE = 20'000; // microseconds, as all below
 constexpr unsigned int MAX_HOLD = 8'000;
 constexpr unsigned int LONG_HOLD = 1'200'000; // refuses a search for good
 constexpr unsigned int MAX_HOLD_PAUSE = 30'000;
 constexpr unsigned int LONG_HOLD_ONE_IN = 120;
-constexpr unsigned int POLL = 500;
+
+// What the library logs when it gives up taking the lock.
+constexpr int ERROR_LINE = 6;
+constexpr const char* REFUSED = "QV_Contacts:CopyContactsResult write share memo lock false return";
+
+// What the processes tell each other. The provider's change number iBegun is under
+// way or done, number iDone is done and the store's state after it is written down.
+struct tag_Board
+{
+    std::atomic<int> iBegun;
+    std::atomic<int> iDone;
+    std::atomic<int> iStop;
+
+    // What all rounds did.
+    std::atomic<int> iHolds; // how often the lock was held to annoy the others
+    int aiKinds[ACTION_KINDS];
+    int iSearches;
+    int iRefused;
+    int iNonEmpty;
+    int iMarked; // states that asked for a rebuild
+};
 
 // One plan as a searcher ran it.
 struct tag_Observation
@@ -49,283 +66,174 @@ struct tag_Observation
     tag_SearchOutcome outcome;
 };
 
-unsigned int Below(std::mt19937& random, unsigned int uLimit)
-{
-    return static_cast<unsigned int>(random() % uLimit);
-}
-
-std::string ObservationFile(const std::string& strRoot, int iSearcher)
-{
-    return strRoot + "/observed." + std::to_string(iSearcher);
-}
-
-// Tells whether the library gave up taking the lock.
-class CRefusalWatch
-{
-public:
-    CRefusalWatch() { CLogSink::Set(&CRefusalWatch::Receive, this); }
-    ~CRefusalWatch() { CLogSink::Set(nullptr, nullptr); }
-    CRefusalWatch(const CRefusalWatch&) = delete;
-    CRefusalWatch& operator=(const CRefusalWatch&) = delete;
-
-    bool Take()
-    {
-        const bool bRefused = m_bRefused;
-        m_bRefused = false;
-        return bRefused;
-    }
-
-private:
-    static void Receive(void* pContext, int /*iPriority*/, const char* /*szTag*/,
-                        const char* szText)
-    {
-        if (std::strcmp(szText,
-                        "QV_Contacts:CopyContactsResult write share memo lock false return") == 0)
-        {
-            static_cast<CRefusalWatch*>(pContext)->m_bRefused = true;
-        }
-    }
-
-    bool m_bRefused = false;
-};
-
 // --- The processes -----------------------------------------------------------------------------
 
-void WaitFor(const std::atomic<int32_t>& iFlag)
+void RunProvider(tag_Board& board, const CStateJournal& journal, unsigned int uSeed, int iChanges)
 {
-    while (iFlag == 0)
-    {
-        SleepMicroseconds(POLL);
-    }
-}
-
-int RunProvider(const std::string& strRoot, unsigned int uSeed, int iChanges)
-{
-    const CBoard board(strRoot);
-    const CStateJournal journal(strRoot);
     CProviderActions provider(uSeed);
-    provider.Fill(CONTACTS);
     CLocalizerLogic logic;
-    tag_Action build;
-    build.eKind = ACTION_BUILD;
-    CProviderActions::Notify(logic, build);
-    journal.Write(0, ReadStore());
-    board->iReady = 1;
-    WaitFor(board->iGo);
-    std::ofstream kinds(strRoot + "/kinds");
     for (int i = 1; i <= iChanges; ++i)
     {
         const ACTION_KIND eKind = provider.AnyKind();
         const tag_Action action = provider.Change(eKind);
-        board->iBegun = i;
+        board.iBegun = i;
         CProviderActions::Notify(logic, action);
         journal.Write(i, ReadStore());
-        board->iDone = i;
-        kinds << eKind << '\n';
+        board.iDone = i;
+        ++board.aiKinds[eKind];
     }
-    return 0;
 }
 
-int RunSearcher(const std::string& strRoot, unsigned int uSeed, int iSearcher)
+void RunSearcher(const tag_Board& board, const std::string& strFile, unsigned int uSeed)
 {
-    const CBoard board(strRoot);
-    CRefusalWatch refusals;
+    CLogCapture log;
     CLocalizerLogic logic;
     std::mt19937 random(uSeed);
-    std::ofstream file(ObservationFile(strRoot, iSearcher), std::ios::binary);
-    while (board->iStop == 0)
+    std::ofstream file(strFile, std::ios::binary);
+    while (board.iStop == 0)
     {
+        log.Clear();
         tag_Observation observed = {};
         observed.uPlanSeed = static_cast<uint32_t>(random());
         std::mt19937 planRandom(observed.uPlanSeed);
         const tag_SearchPlan plan = AnyPlan(planRandom);
-        observed.iFirstState = board->iDone;
+        observed.iFirstState = board.iDone;
         observed.outcome = RunPlan(logic, plan);
-        observed.iLastState = board->iBegun;
-        observed.bRefused = refusals.Take() ? 1 : 0;
+        observed.iLastState = board.iBegun;
+        observed.bRefused = log.Count(ERROR_LINE, REFUSED);
         file.write(reinterpret_cast<const char*>(&observed), sizeof(observed));
-        SleepMicroseconds(Below(random, MAX_SEARCH_PAUSE + 1));
+        SleepMicroseconds(random() % MAX_SEARCH_PAUSE);
     }
-    return 0;
 }
 
-int RunLockHolder(const std::string& strRoot, unsigned int uSeed)
+void RunLockHolder(tag_Board& board, unsigned int uSeed)
 {
-    const CBoard board(strRoot);
     std::mt19937 random(uSeed);
-    while (board->iStop == 0)
+    while (board.iStop == 0)
     {
         int iFd = 0;
         if (CSingleMutex::Lock(&iFd) == 1)
         {
-            const bool bLong = Below(random, LONG_HOLD_ONE_IN) == 0;
-            SleepMicroseconds(bLong ? LONG_HOLD : Below(random, MAX_HOLD));
+            const bool bLong = random() % LONG_HOLD_ONE_IN == 0;
+            SleepMicroseconds(bLong ? LONG_HOLD : random() % MAX_HOLD);
             CSingleMutex::UnLock(&iFd);
-            ++board->iHolds;
+            ++board.iHolds;
         }
-        SleepMicroseconds(Below(random, MAX_HOLD_PAUSE));
+        SleepMicroseconds(random() % MAX_HOLD_PAUSE);
     }
-    return 0;
 }
 
 // --- A round -----------------------------------------------------------------------------------
 
-struct tag_Totals
-{
-    std::map<int, int> mapKinds{};
-    int iSearches = 0;
-    int iRefused = 0;
-    int iNonEmpty = 0;
-    int iMarked = 0; // states that asked for a rebuild
-    int iHolds = 0;
-};
-
 class CRound
 {
 public:
-    CRound(unsigned int uSeed, int iChanges) : m_uSeed(uSeed), m_iChanges(iChanges)
+    CRound(tag_Board& board, unsigned int uSeed, int iChanges)
+        : m_board(board), m_uSeed(uSeed), m_iChanges(iChanges), m_journal(m_directory.Root())
     {
+        m_board.iBegun = m_board.iDone = m_board.iStop = 0;
         m_directory.InstallPinyinTable();
+        CProviderActions(uSeed).Fill(CONTACTS);
+        Require(CLocalizerLogic().MemInit(true) == 0, "the first build failed");
+        m_journal.Write(0, ReadStore());
     }
 
-    void Run(tag_Totals& totals)
+    void Run()
     {
-        RunProcesses(totals);
-        CompareWithFreshBuild();
-        ReadObservations(totals);
-        CheckStates(totals);
+        RunProcesses();
+        CLocalizerLogic().OnStatusUpdatesTableChanged(0, nullptr);
+        RequireFreshStore(m_directory.Root(), "after the round");
+        ReadObservations();
+        CheckStates();
         CheckObservations();
     }
 
 private:
-    std::unique_ptr<CProcess> Start(const char* szRole, unsigned int uNumber)
+    void RunProcesses()
     {
-        return std::make_unique<CProcess>(std::vector<std::string>{
-            szRole, m_directory.Root(), std::to_string(m_uSeed * 100 + uNumber),
-            std::to_string(szRole == std::string("provider") ? m_iChanges
-                                                             : static_cast<int>(uNumber))});
-    }
-
-    void RunProcesses(tag_Totals& totals)
-    {
-        const CBoard board(m_directory.Root());
-        const auto pProvider = Start("provider", 99);
-        while (board->iReady == 0 && !pProvider->HasEnded())
-        {
-            SleepMicroseconds(POLL);
-        }
         std::vector<std::unique_ptr<CProcess>> vOthers;
         for (unsigned int i = 0; i < SEARCHERS; ++i)
         {
-            vOthers.push_back(Start("searcher", i));
+            const auto fnRun = [&] { RunSearcher(m_board, ObservationFile(i), m_uSeed * 100 + i); };
+            vOthers.push_back(std::make_unique<CProcess>(fnRun));
         }
-        vOthers.push_back(Start("holder", SEARCHERS));
-        board->iGo = 1;
-        RequireSuccess("the provider", pProvider->Wait());
-        board->iStop = 1;
+        vOthers.push_back(std::make_unique<CProcess>([&] { RunLockHolder(m_board, m_uSeed); }));
+        CProcess provider([&] { RunProvider(m_board, m_journal, m_uSeed * 100 + 99, m_iChanges); });
+        Require(!provider.WasKilled("the provider"), "the provider was killed");
+        m_board.iStop = 1;
         for (const auto& pProcess : vOthers)
         {
-            RequireSuccess("a searcher or the lock holder", pProcess->Wait());
-        }
-        totals.iHolds += board->iHolds;
-        std::ifstream kinds(m_directory.Root() + "/kinds");
-        for (int iKind = 0; kinds >> iKind;)
-        {
-            ++totals.mapKinds[iKind];
+            Require(!pProcess->WasKilled("a searcher or the lock holder"), "a process was killed");
         }
     }
 
-    void CompareWithFreshBuild()
+    std::string ObservationFile(unsigned int uSearcher) const
     {
-        CLocalizerLogic().OnStatusUpdatesTableChanged(0, nullptr);
-        const tag_StoreImage store = ReadStore();
-        const std::string strDifference =
-            DifferenceOf(store, FreshBuild(m_directory.Root(), store.reg.iSortType));
-        if (!strDifference.empty() || IsMarked(store.reg))
-        {
-            throw std::runtime_error("the store is not what a fresh build makes: " + strDifference);
-        }
+        return m_directory.Root() + "/observed." + std::to_string(uSearcher);
     }
 
-    void ReadObservations(tag_Totals& totals)
+    void ReadObservations()
     {
-        for (int i = 0; i < SEARCHERS; ++i)
+        for (unsigned int i = 0; i < SEARCHERS; ++i)
         {
-            std::ifstream file(ObservationFile(m_directory.Root(), i), std::ios::binary);
+            std::ifstream file(ObservationFile(i), std::ios::binary);
             tag_Observation observed = {};
             while (file.read(reinterpret_cast<char*>(&observed), sizeof(observed)))
             {
-                ++totals.iSearches;
-                totals.iRefused += observed.bRefused;
-                totals.iNonEmpty += observed.outcome.iFound > 0 ? 1 : 0;
+                ++m_board.iSearches;
+                m_board.iRefused += observed.bRefused;
+                m_board.iNonEmpty += observed.outcome.iFound > 0 ? 1 : 0;
+                Require(observed.outcome.iTwice == 0, "a contact found twice");
                 if (observed.bRefused == 0)
                 {
                     m_vOpen.push_back(observed);
                 }
-                else if (observed.outcome.iFound != 0)
+                else
                 {
-                    throw std::runtime_error("contacts found without the lock");
+                    Require(observed.outcome.iFound == 0, "contacts found without the lock");
                 }
             }
         }
     }
 
-    void CheckStates(tag_Totals& totals)
+    void CheckStates()
     {
-        const CStateJournal journal(m_directory.Root());
         for (int i = 0; i <= m_iChanges; ++i)
         {
-            const tag_StoreImage image = journal.Read(i);
+            const tag_StoreImage image = m_journal.Read(i);
             const std::string strFault = FaultOf(image);
-            if (!strFault.empty())
-            {
-                throw std::runtime_error("state " + std::to_string(i) + ": " + strFault);
-            }
-            totals.iMarked += IsMarked(image.reg) ? 1 : 0;
+            Require(strFault.empty(), "state " + std::to_string(i) + ": " + strFault);
+            m_board.iMarked += IsMarked(image.reg) ? 1 : 0;
         }
     }
 
     // Repeats every search in the states that it may have seen, until none is left open.
     void CheckObservations()
     {
-        const CStateJournal journal(m_directory.Root());
         const CDataDirectory replay;
         replay.InstallPinyinTable();
         CLocalizerLogic logic;
         CQVLocalizerManager::InitMapFile();
         for (int i = 0; i <= m_iChanges; ++i)
         {
-            const tag_StoreImage image = journal.Read(i);
+            const tag_StoreImage image = m_journal.Read(i);
             // The index characters may be of either sort type while one is being set.
             for (const int iSortType : {STORE_ORDER_NAME, STORE_ORDER_TIME})
             {
                 InstallStore(image, iSortType);
-                CloseObservations(logic, i);
+                m_vOpen.erase(std::remove_if(m_vOpen.begin(), m_vOpen.end(),
+                                             [&](const tag_Observation& observed)
+                                             { return IsOfState(logic, observed, i); }),
+                              m_vOpen.end());
             }
         }
         CDataPaths::SetRoot(m_directory.Root().c_str());
-        if (!m_vOpen.empty())
-        {
-            const tag_Observation& observed = m_vOpen.front();
-            throw std::runtime_error(std::to_string(m_vOpen.size()) +
+        const tag_Observation observed = m_vOpen.empty() ? tag_Observation{} : m_vOpen.front();
+        Require(m_vOpen.empty(), std::to_string(m_vOpen.size()) +
                                      " results are of no state of the store; plan " +
                                      std::to_string(observed.uPlanSeed) + " in states " +
                                      std::to_string(observed.iFirstState) + " to " +
                                      std::to_string(observed.iLastState));
-        }
-    }
-
-    void CloseObservations(CLocalizerLogic& logic, int iState)
-    {
-        std::vector<tag_Observation> vOpen;
-        for (const tag_Observation& observed : m_vOpen)
-        {
-            if (!IsOfState(logic, observed, iState))
-            {
-                vOpen.push_back(observed);
-            }
-        }
-        m_vOpen.swap(vOpen);
     }
 
     static bool IsOfState(CLocalizerLogic& logic, const tag_Observation& observed, int iState)
@@ -339,18 +247,21 @@ private:
         return outcome.uHash == observed.outcome.uHash && outcome.uIndex == observed.outcome.uIndex;
     }
 
+    tag_Board& m_board;
     unsigned int m_uSeed;
     int m_iChanges;
     CDataDirectory m_directory;
+    CStateJournal m_journal;
     std::vector<tag_Observation> m_vOpen; // not known yet to be right
 };
 
-void Print(const tag_Totals& totals)
+void Print(const tag_Board& totals)
 {
     std::cout << "Changes:";
-    for (const auto& [iKind, iCount] : totals.mapKinds)
+    for (int i = 0; i < ACTION_KINDS; ++i)
     {
-        std::cout << ' ' << iCount << ' ' << ActionName(static_cast<ACTION_KIND>(iKind)) << ',';
+        std::cout << ' ' << totals.aiKinds[i] << ' ' << ActionName(static_cast<ACTION_KIND>(i))
+                  << ',';
     }
     std::cout << " with " << totals.iMarked << " states that asked for a rebuild\n"
               << "Searches: " << totals.iSearches << " typed through and checked, "
@@ -359,62 +270,25 @@ void Print(const tag_Totals& totals)
               << "The lock was held " << totals.iHolds << " times\n";
 }
 
-int RunRounds(int iRounds, unsigned int uSeed, int iChanges)
+void RunRounds(int iRounds, unsigned int uSeed, int iChanges)
 {
-    const auto start = std::chrono::steady_clock::now();
-    tag_Totals totals;
+    const CShared<tag_Board> board;
     for (int i = 0; i < iRounds; ++i)
     {
         const unsigned int uRoundSeed = uSeed + static_cast<unsigned int>(i);
         std::cout << "Round " << i + 1 << " of " << iRounds << ", seed " << uRoundSeed << ", "
                   << iChanges << " changes" << std::endl;
-        CRound(uRoundSeed, iChanges).Run(totals);
+        CRound(*board, uRoundSeed, iChanges).Run();
     }
-    Print(totals);
-    std::cout << "Done in "
-              << std::chrono::duration_cast<std::chrono::seconds>(std::chrono::steady_clock::now() -
-                                                                  start)
-                     .count()
-              << " s" << std::endl;
-    return 0;
-}
-
-int RunRole(const std::vector<std::string>& vArguments)
-{
-    const std::string& strRoot = vArguments[1];
-    const auto uSeed = static_cast<unsigned int>(std::stoul(vArguments[2]));
-    CDataPaths::SetRoot(strRoot.c_str());
-    if (vArguments[0] == "provider")
-    {
-        return RunProvider(strRoot, uSeed, std::stoi(vArguments[3]));
-    }
-    return vArguments[0] == "searcher" ? RunSearcher(strRoot, uSeed, std::stoi(vArguments[3]))
-                                       : RunLockHolder(strRoot, uSeed);
-}
-
-void Silence(void* /*pContext*/, int /*iPriority*/, const char* /*szTag*/, const char* /*szText*/)
-{
+    Print(*board);
 }
 
 } // namespace
 
 int main(int argc, char** argv)
 {
-    const std::vector<std::string> vArguments(argv + 1, argv + argc);
-    CLogSink::Set(&Silence, nullptr);
-    try
-    {
-        if (vArguments.size() == 4)
-        {
-            return RunRole(vArguments);
-        }
-        const auto Number = [&vArguments](size_t uPlace, int iDefault)
-        { return vArguments.size() > uPlace ? std::stoi(vArguments[uPlace]) : iDefault; };
-        return RunRounds(Number(0, 2), static_cast<unsigned int>(Number(1, 1)), Number(2, 25));
-    }
-    catch (const std::exception& error)
-    {
-        std::cerr << "qv_stress: " << error.what() << std::endl;
-        return 1;
-    }
+    return RunProgram(
+        argc, argv, {2, 1, 25},
+        [](const std::vector<int>& vNumbers)
+        { RunRounds(vNumbers[0], static_cast<unsigned int>(vNumbers[1]), vNumbers[2]); });
 }

@@ -16,7 +16,7 @@
 #include "tests/stress/Process.h"
 #include "tests/stress/ProviderActions.h"
 #include "tests/stress/SearchPlan.h"
-#include "tests/stress/StateJournal.h"
+#include "tests/stress/StoreFaults.h"
 
 #include <algorithm>
 #include <chrono>

@@ -16,7 +16,7 @@
 #include "tests/stress/Process.h"
 #include "tests/stress/ProviderActions.h"
 #include "tests/stress/SearchPlan.h"
-#include "tests/stress/StateJournal.h"
+#include "tests/stress/StoreFaults.h"
 
 #include <algorithm>
 #include <atomic>
@@ -68,22 +68,6 @@ struct tag_Observation
 
 // --- The processes -----------------------------------------------------------------------------
 
-void RunProvider(tag_Board& board, const CStateJournal& journal, unsigned int uSeed, int iChanges)
-{
-    CProviderActions provider(uSeed);
-    CLocalizerLogic logic;
-    for (int i = 1; i <= iChanges; ++i)
-    {
-        const ACTION_KIND eKind = provider.AnyKind();
-        const tag_Action action = provider.Change(eKind);
-        board.iBegun = i;
-        CProviderActions::Notify(logic, action);
-        journal.Write(i, ReadStore());
-        board.iDone = i;
-        ++board.aiKinds[eKind];
-    }
-}
-
 void RunSearcher(const tag_Board& board, const std::string& strFile, unsigned int uSeed)
 {
     CLogCapture log;
@@ -125,17 +109,32 @@ void RunLockHolder(tag_Board& board, unsigned int uSeed)
 
 // --- A round -----------------------------------------------------------------------------------
 
+template <typename T>
+std::string BytesOf(const T* pData, size_t uCount)
+{
+    return {reinterpret_cast<const char*>(pData), uCount * sizeof(T)};
+}
+
+// Makes the image the store of the library's present root. The sort type is given apart.
+void InstallStore(const tag_StoreImage& image, int iSortType)
+{
+    const tag_ContactReg reg = {image.reg.iTotalNum, iSortType, 0};
+    CDataDirectory::WriteBytes(CDataPaths::ContactRecords(),
+                               BytesOf(image.vRecords.data(), image.vRecords.size()));
+    CDataDirectory::WriteBytes(CDataPaths::ContactReg(), BytesOf(&reg, 1));
+}
+
 class CRound
 {
 public:
     CRound(tag_Board& board, unsigned int uSeed, int iChanges)
-        : m_board(board), m_uSeed(uSeed), m_iChanges(iChanges), m_journal(m_directory.Root())
+        : m_board(board), m_uSeed(uSeed), m_iChanges(iChanges)
     {
         m_board.iBegun = m_board.iDone = m_board.iStop = 0;
         m_directory.InstallPinyinTable();
         CProviderActions(uSeed).Fill(CONTACTS);
         Require(CLocalizerLogic().MemInit(true) == 0, "the first build failed");
-        m_journal.Write(0, ReadStore());
+        m_vStates.push_back(ReadStore());
     }
 
     void Run()
@@ -158,12 +157,28 @@ private:
             vOthers.push_back(std::make_unique<CProcess>(fnRun));
         }
         vOthers.push_back(std::make_unique<CProcess>([&] { RunLockHolder(m_board, m_uSeed); }));
-        CProcess provider([&] { RunProvider(m_board, m_journal, m_uSeed * 100 + 99, m_iChanges); });
-        Require(!provider.WasKilled("the provider"), "the provider was killed");
+        RunProvider();
         m_board.iStop = 1;
         for (const auto& pProcess : vOthers)
         {
             Require(!pProcess->WasKilled("a searcher or the lock holder"), "a process was killed");
+        }
+    }
+
+    // In this process, which writes down each state of the store.
+    void RunProvider()
+    {
+        CProviderActions provider(m_uSeed);
+        CLocalizerLogic logic;
+        for (int i = 1; i <= m_iChanges; ++i)
+        {
+            const ACTION_KIND eKind = provider.AnyKind();
+            const tag_Action action = provider.Change(eKind);
+            m_board.iBegun = i;
+            CProviderActions::Notify(logic, action);
+            m_vStates.push_back(ReadStore());
+            m_board.iDone = i;
+            ++m_board.aiKinds[eKind];
         }
     }
 
@@ -198,11 +213,10 @@ private:
 
     void CheckStates()
     {
-        for (int i = 0; i <= m_iChanges; ++i)
+        for (const tag_StoreImage& image : m_vStates)
         {
-            const tag_StoreImage image = m_journal.Read(i);
             const std::string strFault = FaultOf(image);
-            Require(strFault.empty(), "state " + std::to_string(i) + ": " + strFault);
+            Require(strFault.empty(), "a state: " + strFault);
             m_board.iMarked += IsMarked(image.reg) ? 1 : 0;
         }
     }
@@ -216,11 +230,10 @@ private:
         CQVLocalizerManager::InitMapFile();
         for (int i = 0; i <= m_iChanges; ++i)
         {
-            const tag_StoreImage image = m_journal.Read(i);
             // The index characters may be of either sort type while one is being set.
             for (const int iSortType : {STORE_ORDER_NAME, STORE_ORDER_TIME})
             {
-                InstallStore(image, iSortType);
+                InstallStore(m_vStates[static_cast<size_t>(i)], iSortType);
                 m_vOpen.erase(std::remove_if(m_vOpen.begin(), m_vOpen.end(),
                                              [&](const tag_Observation& observed)
                                              { return IsOfState(logic, observed, i); }),
@@ -251,8 +264,8 @@ private:
     unsigned int m_uSeed;
     int m_iChanges;
     CDataDirectory m_directory;
-    CStateJournal m_journal;
-    std::vector<tag_Observation> m_vOpen; // not known yet to be right
+    std::vector<tag_StoreImage> m_vStates{}; // before the first change and after each
+    std::vector<tag_Observation> m_vOpen;    // not known yet to be right
 };
 
 void Print(const tag_Board& totals)

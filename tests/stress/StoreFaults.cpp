@@ -1,8 +1,6 @@
-#include "tests/stress/StateJournal.h"
+#include "tests/stress/StoreFaults.h"
 
-#include "Common/DataPaths.h"
 #include "Common/NameOrder.h"
-#include "tests/Support/DataDirectory.h"
 #include "tests/stress/Process.h"
 
 #include <cstring>
@@ -10,17 +8,6 @@
 
 namespace
 {
-
-std::string RecordBytes(const tag_StoreImage& image)
-{
-    return {reinterpret_cast<const char*>(image.vRecords.data()),
-            image.vRecords.size() * sizeof(tag_ContactsStruct)};
-}
-
-std::string RegBytes(const tag_ContactReg& reg)
-{
-    return {reinterpret_cast<const char*>(&reg), sizeof(reg)};
-}
 
 bool IsBuiltRecord(const tag_ContactsStruct& record)
 {
@@ -37,23 +24,6 @@ bool IsInOrder(const tag_ContactsStruct& first, const tag_ContactsStruct& second
 }
 
 } // namespace
-
-void CStateJournal::Write(int iState, const tag_StoreImage& image) const
-{
-    CDataDirectory::WriteBytes(m_strBase + std::to_string(iState),
-                               RegBytes(image.reg) + RecordBytes(image));
-}
-
-tag_StoreImage CStateJournal::Read(int iState) const
-{
-    const std::string strBytes = CDataDirectory::ReadBytes(m_strBase + std::to_string(iState));
-    tag_StoreImage image;
-    std::memcpy(&image.reg, strBytes.data(), sizeof(image.reg));
-    image.vRecords.resize(static_cast<size_t>(image.reg.iTotalNum));
-    std::memcpy(static_cast<void*>(image.vRecords.data()), strBytes.data() + sizeof(image.reg),
-                image.vRecords.size() * sizeof(tag_ContactsStruct));
-    return image;
-}
 
 std::string FaultOf(const tag_StoreImage& image)
 {
@@ -85,11 +55,4 @@ void RequireFreshStore(const std::string& strRoot, const std::string& strText)
     Require(!IsMarked(store.reg), strText + ": still asking for a rebuild");
     const std::string strDifference = DifferenceOf(store, FreshBuild(strRoot, store.reg.iSortType));
     Require(strDifference.empty(), strText + ": not a fresh build: " + strDifference);
-}
-
-void InstallStore(const tag_StoreImage& image, int iSortType)
-{
-    const tag_ContactReg reg = {image.reg.iTotalNum, iSortType, 0};
-    CDataDirectory::WriteBytes(CDataPaths::ContactRecords(), RecordBytes(image));
-    CDataDirectory::WriteBytes(CDataPaths::ContactReg(), RegBytes(reg));
 }

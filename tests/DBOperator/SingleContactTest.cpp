@@ -1,8 +1,6 @@
-#include "DBOperator/DBOperatorFactory.h"
 #include "tests/DBOperator/ReaderFixture.h"
 
 #include <cstring>
-#include <memory>
 #include <numeric>
 
 namespace
@@ -27,14 +25,6 @@ TEST(DBOperatorInterface, KeepsTheOrderOfItsSlots)
     EXPECT_EQ(3U, SlotOf(&CDBOperator::ReadAllLocalizer));
     EXPECT_EQ(4U, SlotOf(&CDBOperator::ReadContactsByID));
     EXPECT_EQ(5U, SlotOf(&CDBOperator::ReadAllSmsOnlineStatus));
-}
-
-TEST(DBOperatorFactory, MakesTheKnownKindOnly)
-{
-    const std::unique_ptr<CDBOperator> pOperator(
-        CDBOperatorFactory::CreateDBOperator(DB_OPERATOR_SQLITE));
-    EXPECT_NE(nullptr, dynamic_cast<CSQLiteOperator*>(pOperator.get()));
-    EXPECT_EQ(nullptr, CDBOperatorFactory::CreateDBOperator(static_cast<DB_OPERATOR_TYPE>(1)));
 }
 
 TEST(ParseIDString, StoresWhatTheTextHolds)

@@ -4,11 +4,11 @@
 #include "Filter/Filter.h"
 #include "Filter/FilterChain.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
-#include "tests/stress/Process.h"
 
 #include <iterator>
 #include <memory>
 #include <set>
+#include <stdexcept>
 
 namespace
 {
@@ -91,7 +91,10 @@ tag_SearchOutcome RunPlan(CLocalizerLogic& logic, tag_SearchPlan plan)
         wchar_t szWords[CN_WORD_MAX + 1] = {};
         const int iRet = logic.Search(last.get(), strTyped.data(), plan.eType, pChain, 0, &pResult,
                                       &lMask, szWords);
-        Require(iRet == 0 && pResult != nullptr, "a search failed with " + std::to_string(iRet));
+        if (iRet != 0 || pResult == nullptr)
+        {
+            throw std::runtime_error("a search failed with " + std::to_string(iRet));
+        }
         outcome.iFound = last == nullptr ? pResult->iResultNum : outcome.iFound;
         last.reset(pResult, [&logic](auto* pSet) { logic.FreeSearchResult(pSet); });
         outcome.iTwice += AddResult(*pResult, hash, index);

@@ -10,11 +10,12 @@
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/ProviderDatabase.h"
+#include "tests/Support/StoreImage.h"
 
 #include <cstring>
 #include <gtest/gtest.h>
 #include <memory>
-#include <ostream>
+#include <regex>
 #include <string>
 #include <utility>
 #include <vector>
@@ -23,15 +24,12 @@ constexpr int DEBUG_LINE = 3;
 constexpr int ERROR_LINE = 6;
 
 using Ids = std::vector<int>;
+using Lines = std::vector<std::string>;
 using Records = std::vector<tag_ContactsStruct>;
 
 inline bool operator==(const tag_ContactReg& left, const tag_ContactReg& right)
 {
     return std::memcmp(&left, &right, sizeof(left)) == 0;
-}
-inline std::ostream& operator<<(std::ostream& stream, const tag_ContactReg& reg)
-{
-    return stream << '{' << reg.iTotalNum << ", " << reg.iSortType << ", " << reg.iMemSize << '}';
 }
 
 inline std::wstring Wide(const std::string& strUtf8)
@@ -66,18 +64,18 @@ protected:
         long lMask = MASK_UNSET; // as DoSearch left it
         std::wstring strInput{}; // the caller's buffer afterwards
         std::string strWords{};  // candidate characters in UTF-8
-        size_t uWordUnits = 0;   // how many of them
 
-        Ids Contacts() const
+        template <typename Field>
+        std::vector<Field> Column(Field tag_LocalizerDetail::*pField) const
         {
-            Ids vIds;
+            std::vector<Field> vFields;
             for (int i = 0; set != nullptr && i < set->iResultNum; ++i)
             {
-                vIds.push_back(set->pDetail[i].iContactID);
+                vFields.push_back(set->pDetail[i].*pField);
             }
-            return vIds;
+            return vFields;
         }
-        const tag_LocalizerDetail& Entry(int i) const { return set->pDetail[i]; }
+        Ids Contacts() const { return Column(&tag_LocalizerDetail::iContactID); }
     };
 
     static constexpr long MASK_UNSET = -77;
@@ -88,28 +86,16 @@ protected:
         m_log.Clear();
     }
 
-    // Fills the key of the contact the way the provider does, through a mapping handle.
-    void FillKey(tag_ProviderContact* pContact)
+    // Stores contacts with their keys, without building the index.
+    void Store(std::vector<tag_ProviderContact> vContacts)
     {
         if (!CDataDirectory::Exists(CDataPaths::PinyinMapping()))
         {
             ASSERT_EQ(CQVLocalizerManager::InitMapFile(), 0);
         }
-        const long hMap = m_logic.CreatePinYinFileMapping();
-        ASSERT_GT(hMap, 0);
-        std::wstring strName = Wide(pContact->strName);
-        wchar_t szCodes[CONTACT_MAX_KEY + 1] = {};
-        EXPECT_EQ(m_logic.GetLocalizerString(hMap, strName.data(), szCodes), 0);
-        EXPECT_EQ(m_logic.ReleasePinYinFileMapping(hMap), 0);
-        pContact->strKey = Narrow(szCodes);
-    }
-
-    // Stores contacts with their keys, without building the index.
-    void Store(std::vector<tag_ProviderContact> vContacts)
-    {
         for (tag_ProviderContact& contact : vContacts)
         {
-            FillKey(&contact);
+            contact.strKey = LocalizerKeyOf(contact.strName);
         }
         m_provider.PutAll(vContacts);
     }
@@ -128,34 +114,18 @@ protected:
         m_log.Clear();
     }
 
-    // A chain of filters from pairs of kind and id.
-    std::unique_ptr<CFilterChain> Chain(const std::vector<std::pair<int, QVLong32>>& vFilters)
+    std::unique_ptr<CFilterChain> Chain(int iKind, QVLong32 lId)
     {
-        std::vector<int> vKinds(vFilters.size() + 1); // never empty: data() is not null
-        std::vector<QVLong32> vFilterIds(vFilters.size() + 1);
-        for (size_t i = 0; i < vFilters.size(); ++i)
-        {
-            vKinds[i] = vFilters[i].first;
-            vFilterIds[i] = vFilters[i].second;
-        }
         CFilterChain* pChain = nullptr;
-        EXPECT_EQ(m_logic.CreateFilterChain(vKinds.data(), vFilterIds.data(),
-                                            static_cast<int>(vFilters.size()), &pChain),
-                  0);
+        EXPECT_EQ(m_logic.CreateFilterChain(&iKind, &lId, 1, &pChain), 0);
         return std::unique_ptr<CFilterChain>(pChain);
     }
 
     tag_Found Search(const std::string& strInput, IME_SEARCH_TYPE eType = IME_SEARCH_WORD,
                      const Set& pLast = nullptr, CFilterChain* pChain = nullptr)
     {
-        return SearchWide(Wide(strInput), eType, pLast, pChain);
-    }
-
-    tag_Found SearchWide(const std::wstring& strInput, IME_SEARCH_TYPE eType = IME_SEARCH_WORD,
-                         const Set& pLast = nullptr, CFilterChain* pChain = nullptr)
-    {
         tag_Found found;
-        found.strInput = strInput;
+        found.strInput = Wide(strInput);
         wchar_t szWords[CN_WORD_MAX + 1] = {};
         tag_LocalizerResult* pResult = nullptr;
         found.iRet = m_logic.Search(pLast.get(), found.strInput.data(), eType,
@@ -167,7 +137,6 @@ protected:
                             { EXPECT_EQ(m_logic.FreeSearchResult(pSet), 0); });
         }
         EXPECT_EQ(szWords[CN_WORD_MAX], 0) << "more than the caller has room for";
-        found.uWordUnits = std::wcslen(szWords);
         found.strWords = Narrow(szWords);
         return found;
     }
@@ -176,17 +145,6 @@ protected:
     {
         return CDataDirectory::ReadBytes(CDataPaths::ContactRecords());
     }
-    // The first iNum records of the file.
-    static Records StoredRecords(int iNum)
-    {
-        Records vRecords(static_cast<size_t>(iNum));
-        const std::string strBytes = RecordsFile();
-        const size_t uBytes = vRecords.size() * sizeof(tag_ContactsStruct);
-        EXPECT_GE(strBytes.size(), uBytes);
-        std::memcpy(static_cast<void*>(vRecords.data()), strBytes.data(),
-                    std::min(strBytes.size(), uBytes));
-        return vRecords;
-    }
     static tag_ContactReg Reg()
     {
         const std::string strBytes = CDataDirectory::ReadBytes(CDataPaths::ContactReg());
@@ -194,6 +152,37 @@ protected:
         EXPECT_EQ(strBytes.size(), sizeof(reg));
         std::memcpy(&reg, strBytes.data(), std::min(sizeof(reg), strBytes.size()));
         return reg;
+    }
+
+    static void SetReg(const tag_ContactReg& reg)
+    {
+        CDataDirectory::WriteBytes(CDataPaths::ContactReg(),
+                                   {reinterpret_cast<const char*>(&reg), sizeof(reg)});
+    }
+
+    // The store is whole and the one that a build from the database makes.
+    void ExpectFresh(const std::string& strWhat = "")
+    {
+        const tag_StoreImage store = ReadStore();
+        EXPECT_FALSE(IsMarked(store.reg)) << strWhat;
+        EXPECT_EQ(DifferenceOf(store, FreshBuild(m_directory.Root(), store.reg.iSortType)), "")
+            << strWhat;
+    }
+
+    // The log without the milliseconds, which differ from run to run, and without SQL texts.
+    std::vector<tag_LogLine> Told() const
+    {
+        static const std::regex TIME("(time =|EXIT takes) [0-9]+");
+        std::vector<tag_LogLine> vTold;
+        for (tag_LogLine line : m_log.Lines())
+        {
+            line.strText = std::regex_replace(line.strText, TIME, "$1 ms");
+            if (line.strText.find("sqlstat_") == std::string::npos)
+            {
+                vTold.push_back(line);
+            }
+        }
+        return vTold;
     }
 
     CDataDirectory m_directory;

@@ -128,6 +128,9 @@ TEST_F(CContactChangesTest, TellsEachStepAndRenewsAContactInItsSlot)
         EXPECT_EQ(vLines, vExpected);
     }
     EXPECT_EQ(m_logic.OnGetSortType(), STORE_ORDER_TIME);
+    Store({Contact(9, "阿")});
+    Notify({9});
+    EXPECT_EQ(ReadStore().vRecords.at(1).iSortIndex, 1) << "its slot in time order";
     ExpectFresh();
 }
 
@@ -240,6 +243,12 @@ TEST_F(CContactChangesTest, RebuildsWhereAPatchCannotDo)
             ExpectLockFree();
         }
     }
+    // A contact that went without being told still takes the room of a new one.
+    m_provider.Remove(1);
+    Store({Contact(10, "旧")});
+    SetReg({9, 0, 9});
+    Notify({10});
+    ExpectFresh();
 }
 
 // A change that could not be written is not forgotten: the next notification makes up for it.

@@ -195,11 +195,7 @@ void CountKeystrokes(benchmark::State& state, const std::vector<tag_Keystroke>& 
         std::max_element(vKeystrokes.begin(), vKeystrokes.end(),
                          [](const tag_Keystroke& a, const tag_Keystroke& b)
                          { return a.dSeconds / a.dAllowed < b.dSeconds / b.dAllowed; });
-    std::string strWorst;
-    for (size_t i = 0; i < worst->uTyped; ++i)
-    {
-        strWorst += static_cast<char>(worst->pQuery->szText[i]);
-    }
+    const std::string strWorst = ToUtf8(std::wstring(worst->pQuery->szText, worst->uTyped));
     state.SetLabel("worst share: " + strWorst + ", " + std::to_string(worst->iAfter) + " found");
     state.counters["keystrokes"] = static_cast<double>(vKeystrokes.size());
     state.counters["p50_us"] = Percentile(vTimes, 50);

@@ -28,14 +28,6 @@ constexpr int GROUPS = 12;
 constexpr int ACCOUNTS = 3;
 constexpr std::chrono::seconds SETTLING_TIME(3);
 
-std::string ToUtf8(const std::wstring& strText)
-{
-    std::string strUtf8(strText.size() * 3 + 1, '\0');
-    strUtf8.resize(static_cast<size_t>(
-        Unicode2Utf8(strText.c_str(), strUtf8.data(), static_cast<int>(strText.size()))));
-    return strUtf8;
-}
-
 void Require(bool bDone, const char* szWhat)
 {
     if (!bDone)
@@ -75,6 +67,14 @@ private:
 };
 
 } // namespace
+
+std::string ToUtf8(const std::wstring& strText)
+{
+    std::string strUtf8(strText.size() * 3 + 1, '\0');
+    strUtf8.resize(static_cast<size_t>(
+        Unicode2Utf8(strText.c_str(), strUtf8.data(), static_cast<int>(strText.size()))));
+    return strUtf8;
+}
 
 CWorkload::CWorkload(int iContacts, wchar_t surname) : m_iContacts(iContacts), m_surname(surname)
 {

@@ -19,11 +19,12 @@ inline int PieceLength(const wchar_t* szPiece)
     return iLength;
 }
 
-// Whether the first iLength units of the piece begin the spelling. Spellings are ASCII.
+// Whether the first iLength units of the piece, none of them 0, begin the spelling. Spellings are
+// ASCII, and in a damaged table one may fill its slot without a terminator.
 inline bool BeginsSpelling(const wchar_t* szPiece, int iLength,
                            const char (&szSpelling)[PY_MAX_LETTERS + 1])
 {
-    if (szSpelling[0] == 0 || iLength > SpellingLength(szSpelling))
+    if (szSpelling[0] == 0 || iLength > PY_MAX_LETTERS + 1)
     {
         return false;
     }

@@ -31,6 +31,7 @@ CPieceTable::CPieceTable(CQVLocalizerManager& matcher, const CReadingSets& sets,
     std::fill_n(m_pEnds.get(), iInputLen * KeyCount(), NOT_ASKED);
     for (int iOffset = 0; iOffset < iInputLen; ++iOffset)
     {
+        m_aszUnits[iOffset][0] = szInput[iOffset];
         if (IsLastPieceValid(iOffset))
         {
             m_uValidLast = static_cast<uint16_t>(m_uValidLast | (1U << iOffset));
@@ -40,6 +41,10 @@ CPieceTable::CPieceTable(CQVLocalizerManager& matcher, const CReadingSets& sets,
 
 wchar_t* CPieceTable::Piece(int iOffset, int iEnd)
 {
+    if (iEnd == iOffset + 1)
+    {
+        return m_aszUnits[iOffset];
+    }
     CQVLocalizerManager::SubString(m_szInput, m_iInputLen, m_szPiece, iOffset, iEnd);
     m_szPiece[iEnd - iOffset] = 0;
     return m_szPiece;

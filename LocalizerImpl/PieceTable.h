@@ -105,7 +105,8 @@ private:
     bool m_bChineseTyped = false; // the text holds units that are Chinese codes
     uint16_t m_uValidLast = 0;    // offsets whose last piece the matcher finds worth trying
     std::unique_ptr<tag_PieceRow[]> m_pRows;
-    std::unique_ptr<uint16_t[]> m_pEnds; // by offset, then by key
+    std::unique_ptr<uint16_t[]> m_pEnds;       // by offset, then by key
+    wchar_t m_aszUnits[LOC_MAX_INPUT][2] = {}; // the pieces of one character, asked for most
     wchar_t m_szPiece[LOC_PIECE_BUFFER] = {};
 };
 

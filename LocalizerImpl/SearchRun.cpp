@@ -42,14 +42,9 @@ public:
         for (int iKey = 0; iKey < m_table.KeyCount(); ++iKey)
         {
             const tag_PieceRow& row = m_table.RowOf(iKey);
-            const wchar_t code = m_table.CompactCodeOf(iKey);
-            if (row.uLastOffsets != 0 && IsHanZiCode(CodeBits(code)))
+            if (row.uLastOffsets != 0 || row.bBehindRun)
             {
-                TakeLastPieces(m_sets.Records()[HanZiRecord(code)], row.uLastOffsets);
-            }
-            if (row.bBehindRun)
-            {
-                m_manager.CreateMaskWord(m_sets.Records(), code);
+                TakeRow(row, m_table.CompactCodeOf(iKey));
             }
         }
     }
@@ -59,6 +54,18 @@ private:
     {
         PYOFWORDS record = m_sets.RecordOf(find.code);
         TakeLastPiece(record, m_table.InputLength() - 1 - __builtin_ctz(find.Split()));
+    }
+
+    void TakeRow(const tag_PieceRow& row, wchar_t code)
+    {
+        if (row.uLastOffsets != 0 && IsHanZiCode(CodeBits(code)))
+        {
+            TakeLastPieces(m_sets.Records()[HanZiRecord(code)], row.uLastOffsets);
+        }
+        if (row.bBehindRun)
+        {
+            m_manager.CreateMaskWord(m_sets.Records(), code);
+        }
     }
 
     // The records of the sets have no character, so these add to the mask alone.

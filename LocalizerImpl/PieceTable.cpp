@@ -7,7 +7,6 @@ namespace
 {
 
 constexpr wchar_t NO_CODE = 0;
-constexpr wchar_t UPPER_BIT = 0x10000;
 
 bool IsChineseUnit(wchar_t unit)
 {
@@ -19,7 +18,6 @@ bool IsChineseUnit(wchar_t unit)
 CPieceTable::CPieceTable(CQVLocalizerManager& matcher, const CReadingSets& sets,
                          const wchar_t* szInput, int iInputLen)
     : m_matcher(matcher), m_sets(sets), m_szInput(szInput), m_iInputLen(iInputLen),
-      m_iFirstOther(sets.Count()), m_iFirstTyped(sets.Count() + PLACE_COUNT),
       m_bChineseTyped(std::any_of(szInput, szInput + iInputLen, IsChineseUnit)),
       m_pRows(new (std::nothrow) tag_PieceRow[static_cast<size_t>(KeyCount())]()),
       m_pEnds(new (std::nothrow) uint16_t[static_cast<size_t>(iInputLen * KeyCount())])
@@ -62,57 +60,24 @@ bool CPieceTable::IsLastPieceValid(int iOffset)
 int CPieceTable::KeyOfTyped(wchar_t code) const
 {
     const wchar_t* pEnd = m_szInput + m_iInputLen;
-    const wchar_t* pTyped = std::find(m_szInput, pEnd, code);
-    return pTyped != pEnd ? m_iFirstTyped + static_cast<int>(pTyped - m_szInput)
-                          : m_sets.SetOf(code);
-}
-
-// LOC_OTHER with upper bits, which only a damaged record holds, is not LOC_OTHER for the mask.
-int CPieceTable::PlaceOfRare(uint16_t uCode, wchar_t code)
-{
-    if (IsDigitCode(uCode))
-    {
-        return PLACE_DIGIT + (uCode - LOC_DIGIT_BASE);
-    }
-    if (uCode == LOC_OTHER)
-    {
-        return code == LOC_OTHER ? PLACE_OTHER : PLACE_WIDE_OTHER;
-    }
-    return PLACE_UNKNOWN;
+    const wchar_t* pTyped = IsChineseUnit(code) ? std::find(m_szInput, pEnd, code) : pEnd;
+    return pTyped != pEnd ? m_sets.KeyCount() + static_cast<int>(pTyped - m_szInput)
+                          : m_sets.KeyOf(code);
 }
 
 wchar_t CPieceTable::CompactCodeOf(int iKey) const
 {
-    if (iKey < m_iFirstOther)
-    {
-        return LOC_HANZI_BASE + iKey;
-    }
-    if (iKey >= m_iFirstTyped)
-    {
-        return m_sets.CompactCode(TypedUnit(iKey));
-    }
-    const int iPlace = iKey - m_iFirstOther;
-    if (iPlace < PLACE_DIGIT)
-    {
-        return LOC_ALPHA_BASE + iPlace;
-    }
-    if (iPlace < PLACE_OTHER)
-    {
-        return LOC_DIGIT_BASE + (iPlace - PLACE_DIGIT);
-    }
-    if (iPlace == PLACE_UNKNOWN)
-    {
-        return NO_CODE;
-    }
-    return iPlace == PLACE_OTHER ? LOC_OTHER : LOC_OTHER | UPPER_BIT;
+    const bool bTyped = iKey >= m_sets.KeyCount();
+    return m_sets.CompactCodeOf(bTyped ? m_sets.KeyOf(TypedUnit(iKey)) : iKey);
 }
 
 wchar_t CPieceTable::TypedUnit(int iKey) const
 {
-    return iKey < m_iFirstTyped ? NO_CODE : m_szInput[iKey - m_iFirstTyped];
+    const int iUnit = iKey - m_sets.KeyCount();
+    return iUnit < 0 ? NO_CODE : m_szInput[iUnit];
 }
 
-unsigned CPieceTable::Ask(int iKey, int iOffset)
+unsigned CPieceTable::AskEnds(int iKey, int iOffset)
 {
     unsigned uEnds = 0;
     unsigned uFull = 0;

@@ -42,17 +42,12 @@ public:
     // False for want of memory; then nothing else may be called.
     bool IsReady() const { return m_pRows != nullptr && m_pEnds != nullptr; }
 
-    // Keys are 0..KeyCount() - 1, first one for each set of readings. Whatever a damaged record
-    // holds has a key too.
-    int KeyCount() const { return m_iFirstTyped + LOC_MAX_INPUT; }
+    // The keys of the sets, and behind them one for each typed character. Whatever a damaged
+    // record holds has a key too.
+    int KeyCount() const { return m_sets.KeyCount() + LOC_MAX_INPUT; }
     int KeyOf(wchar_t code) const
     {
-        const uint16_t uCode = CodeBits(code);
-        if (IsHanZiCode(uCode))
-        {
-            return m_bChineseTyped ? KeyOfTyped(code) : m_sets.SetOf(code);
-        }
-        return m_iFirstOther + PlaceOfOther(uCode, code);
+        return m_bChineseTyped ? KeyOfTyped(code) : m_sets.KeyOf(code);
     }
     // A code that stands for the key in the table of the sets.
     wchar_t CompactCodeOf(int iKey) const;
@@ -62,8 +57,39 @@ public:
     unsigned Ends(int iKey, int iOffset)
     {
         const uint16_t uEnds = m_pEnds[PlaceOf(iKey, iOffset)];
-        return uEnds != NOT_ASKED ? uEnds : Ask(iKey, iOffset);
+        return uEnds != NOT_ASKED ? uEnds : AskEnds(iKey, iOffset);
     }
+
+    // The same two answers for a loop over many names, as long as the table lives: where they are
+    // is taken out of the objects once.
+    class CLookup
+    {
+    public:
+        explicit CLookup(CPieceTable& table)
+            : m_table(table), m_pKeys(table.m_sets.Keys()), m_pEnds(table.m_pEnds.get()),
+              m_iKeys(table.KeyCount()),
+              m_uCodes(table.m_bChineseTyped ? 0 : CReadingSets::CODE_COUNT)
+        {
+        }
+
+        int KeyOf(wchar_t code) const
+        {
+            const uint32_t uCode = static_cast<uint32_t>(code);
+            return uCode < m_uCodes ? m_pKeys[uCode] : m_table.KeyOf(code);
+        }
+        unsigned Ends(int iKey, int iOffset) const
+        {
+            const uint16_t uEnds = m_pEnds[iOffset * m_iKeys + iKey];
+            return uEnds != NOT_ASKED ? uEnds : m_table.AskEnds(iKey, iOffset);
+        }
+
+    private:
+        CPieceTable& m_table;
+        const uint16_t* m_pKeys;
+        const uint16_t* m_pEnds;
+        int m_iKeys;
+        uint32_t m_uCodes; // that have their key in m_pKeys
+    };
 
     tag_PieceRow& RowOf(int iKey) { return m_pRows[iKey]; }
     int InputLength() const { return m_iInputLen; }
@@ -72,26 +98,12 @@ public:
     wchar_t* Piece(int iOffset, int iEnd);
 
 private:
-    // Places of the codes that are not Chinese, behind the sets; then a place for each typed
-    // character.
-    static constexpr int PLACE_ALPHA = 0;
-    static constexpr int PLACE_DIGIT = PLACE_ALPHA + LOC_ALPHA_COUNT;
-    static constexpr int PLACE_OTHER = PLACE_DIGIT + LOC_DIGIT_COUNT;
-    static constexpr int PLACE_WIDE_OTHER = PLACE_OTHER + 1; // LOC_OTHER with upper bits set
-    static constexpr int PLACE_UNKNOWN = PLACE_OTHER + 2;
-    static constexpr int PLACE_COUNT = PLACE_OTHER + 3;
     static constexpr uint16_t NOT_ASKED = UINT16_MAX;
 
-    static int PlaceOfOther(uint16_t uCode, wchar_t code)
-    {
-        return IsAlphaCode(uCode) ? PLACE_ALPHA + (uCode - LOC_ALPHA_BASE)
-                                  : PlaceOfRare(uCode, code);
-    }
-    static int PlaceOfRare(uint16_t uCode, wchar_t code);
     int PlaceOf(int iKey, int iOffset) const { return iOffset * KeyCount() + iKey; }
     int KeyOfTyped(wchar_t code) const;
     wchar_t TypedUnit(int iKey) const;
-    unsigned Ask(int iKey, int iOffset);
+    unsigned AskEnds(int iKey, int iOffset);
     bool Fits(int iKey, wchar_t* szPiece, bool& bFull);
     bool FitsChinese(int iKey, wchar_t* szPiece, bool& bFull);
     bool IsLastPieceValid(int iOffset);
@@ -100,8 +112,6 @@ private:
     const CReadingSets& m_sets;
     const wchar_t* m_szInput;
     int m_iInputLen;
-    int m_iFirstOther;
-    int m_iFirstTyped;
     bool m_bChineseTyped = false; // the text holds units that are Chinese codes
     uint16_t m_uValidLast = 0;    // offsets whose last piece the matcher finds worth trying
     std::unique_ptr<tag_PieceRow[]> m_pRows;

@@ -153,18 +153,19 @@ CReadingSets::Ptr CReadingSets::Make(const PYOFWORDS* pMap)
 bool CReadingSets::Fill(const PYOFWORDS* pMap)
 {
     CReadingIndex index(pMap);
-    m_pSetOf.reset(new (std::nothrow) uint16_t[PY_WORD_COUNT]);
+    m_pKeyOf.reset(new (std::nothrow) uint16_t[CODE_COUNT]);
     m_pWords.reset(new (std::nothrow) tag_Word[PY_WORD_COUNT]);
-    if (!index.IsReady() || m_pSetOf == nullptr || m_pWords == nullptr)
+    if (!index.IsReady() || m_pKeyOf == nullptr || m_pWords == nullptr)
     {
         return false;
     }
     for (int i = 0; i < PY_WORD_COUNT; ++i)
     {
-        m_pSetOf[i] = static_cast<uint16_t>(index.Number(i));
+        m_pKeyOf[LOC_HANZI_BASE + i] = static_cast<uint16_t>(index.Number(i));
         std::memcpy(m_pWords[i].szWord, pMap[i].szWord, sizeof(tag_Word));
     }
     m_iCount = index.Count();
+    FillOtherKeys();
     m_pRecords.reset(new (std::nothrow) PYOFWORDS[static_cast<size_t>(m_iCount)]);
     for (int i = 0; m_pRecords != nullptr && i < m_iCount; ++i)
     {
@@ -174,9 +175,64 @@ bool CReadingSets::Fill(const PYOFWORDS* pMap)
     return m_pRecords != nullptr;
 }
 
+void CReadingSets::FillOtherKeys()
+{
+    for (uint32_t uCode = 0; uCode < CODE_COUNT; ++uCode)
+    {
+        const uint16_t uBits = static_cast<uint16_t>(uCode);
+        int iPlace = uCode == LOC_OTHER ? PLACE_OTHER : PLACE_UNKNOWN;
+        if (IsAlphaCode(uBits))
+        {
+            iPlace = PLACE_ALPHA + (uBits - LOC_ALPHA_BASE);
+        }
+        else if (IsDigitCode(uBits))
+        {
+            iPlace = PLACE_DIGIT + (uBits - LOC_DIGIT_BASE);
+        }
+        if (!IsHanZiCode(uBits))
+        {
+            m_pKeyOf[uCode] = static_cast<uint16_t>(m_iCount + iPlace);
+        }
+    }
+}
+
+int CReadingSets::KeyOfWide(wchar_t code) const
+{
+    const uint16_t uCode = CodeBits(code);
+    if (uCode == LOC_OTHER)
+    {
+        return m_iCount + PLACE_WIDE_OTHER;
+    }
+    return uCode < CODE_COUNT ? m_pKeyOf[uCode] : m_iCount + PLACE_UNKNOWN;
+}
+
+wchar_t CReadingSets::CompactCodeOf(int iKey) const
+{
+    constexpr wchar_t NO_CODE = 0;
+    constexpr wchar_t UPPER_BIT = 0x10000;
+    const int iPlace = iKey - m_iCount;
+    if (iPlace < PLACE_ALPHA)
+    {
+        return LOC_HANZI_BASE + iKey;
+    }
+    if (iPlace < PLACE_DIGIT)
+    {
+        return LOC_ALPHA_BASE + iPlace;
+    }
+    if (iPlace < PLACE_OTHER)
+    {
+        return LOC_DIGIT_BASE + (iPlace - PLACE_DIGIT);
+    }
+    if (iPlace == PLACE_UNKNOWN)
+    {
+        return NO_CODE;
+    }
+    return iPlace == PLACE_OTHER ? LOC_OTHER : LOC_OTHER | UPPER_BIT;
+}
+
 PYOFWORDS CReadingSets::RecordOf(wchar_t code) const
 {
-    PYOFWORDS record = m_pRecords[SetOf(code)];
+    PYOFWORDS record = m_pRecords[KeyOf(CodeBits(code))];
     std::memcpy(record.szWord, m_pWords[HanZiRecord(code)].szWord, sizeof(tag_Word));
     return record;
 }

@@ -4,9 +4,10 @@
 // The pinyin table without its repetitions.
 //
 // 15,422 characters share about a thousand sets of readings, and what a typed piece does on a
-// character depends on its set alone. The sets form a table of their own, in which a character
-// has a compact code: LOC_HANZI_BASE + its set. Whatever takes a table and a code takes this table
-// and a compact code too.
+// character depends on its set alone. So every code has a key: characters with the same readings
+// share one, letters, digits and the rest have theirs behind. The sets form a table of their own,
+// in which a key has a compact code: LOC_HANZI_BASE + the set, or the code itself where it is no
+// Chinese one. Whatever takes a table and a code takes this table and a compact code too.
 
 #include "Common/FileStamp.h"
 #include "Core/LocalizerCodes.h"
@@ -25,7 +26,7 @@ public:
     using Ptr = std::unique_ptr<const CReadingSets, tag_Release>;
 
     // The sets of a mapped table whose stamp was read before it was mapped; null for want of
-    // memory. They are a copy: no mapping is kept. The process keeps the last ones, about 140 KB,
+    // memory. They are a copy: no mapping is kept. The process keeps the last ones, about 150 KB,
     // for as long as the stamp stays the same, so that a keystroke does not go through the
     // table's 170 pages again. Any thread may call.
     static Ptr Of(const PYOFWORDS* pMap, const tag_FileStamp& stamp);
@@ -37,17 +38,32 @@ public:
     // By set; their characters are empty.
     PYOFWORDS* Records() const { return m_pRecords.get(); }
 
-    // The set of a Chinese code.
-    int SetOf(wchar_t code) const { return m_pSetOf[HanZiRecord(code)]; }
-    // Any code as one for Records().
-    wchar_t CompactCode(wchar_t code) const
+    // Keys are 0..KeyCount() - 1, first one for each set. A code acts by its low 16 bits, except
+    // that LOC_OTHER with upper bits set, which only a damaged record holds, has another key.
+    int KeyCount() const { return m_iCount + PLACE_COUNT; }
+    int KeyOf(wchar_t code) const
     {
-        return IsHanZiCode(CodeBits(code)) ? LOC_HANZI_BASE + SetOf(code) : code;
+        const uint32_t uCode = static_cast<uint32_t>(code);
+        return uCode < CODE_COUNT ? m_pKeyOf[uCode] : KeyOfWide(code);
     }
+    // The keys of the codes below CODE_COUNT, which are all that sound records hold.
+    const uint16_t* Keys() const { return m_pKeyOf.get(); }
+    // Up to the last code of all.
+    static constexpr uint32_t CODE_COUNT = LOC_DIGIT_BASE + LOC_DIGIT_COUNT;
+    wchar_t CompactCodeOf(int iKey) const;
+
     // The record of a Chinese code as the pinyin table has it.
     PYOFWORDS RecordOf(wchar_t code) const;
 
 private:
+    // The keys behind the sets.
+    static constexpr int PLACE_ALPHA = 0;
+    static constexpr int PLACE_DIGIT = PLACE_ALPHA + LOC_ALPHA_COUNT;
+    static constexpr int PLACE_OTHER = PLACE_DIGIT + LOC_DIGIT_COUNT;
+    static constexpr int PLACE_WIDE_OTHER = PLACE_OTHER + 1;
+    static constexpr int PLACE_UNKNOWN = PLACE_OTHER + 2;
+    static constexpr int PLACE_COUNT = PLACE_OTHER + 3;
+
     struct tag_Word
     {
         char szWord[sizeof(PYOFWORDS::szWord)];
@@ -59,11 +75,13 @@ private:
     ~CReadingSets() = default;
     static Ptr Make(const PYOFWORDS* pMap);
     bool Fill(const PYOFWORDS* pMap);
+    void FillOtherKeys();
+    int KeyOfWide(wchar_t code) const;
     Ptr Share() const;
 
     int m_iCount = 0;
-    std::unique_ptr<uint16_t[]> m_pSetOf; // by record of the pinyin table
-    std::unique_ptr<tag_Word[]> m_pWords; // the same
+    std::unique_ptr<uint16_t[]> m_pKeyOf; // by code
+    std::unique_ptr<tag_Word[]> m_pWords; // by record of the pinyin table
     std::unique_ptr<PYOFWORDS[]> m_pRecords;
     mutable std::atomic<int> m_iUsers{1};
 };

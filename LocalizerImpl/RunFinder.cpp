@@ -19,32 +19,43 @@ CRunFinder::CRunFinder(CPieceTable& table, bool bAnywhere)
 {
 }
 
-// All starts and splits at once: which offsets are reached behind each character.
+// All starts and splits at once: which offsets are reached behind each character. Names come sorted
+// for the most part, so one begins as the name before it did, and goes on from there.
 bool CRunFinder::CanMatch(const wchar_t* pCodes)
 {
-    const unsigned uEnd = 1U << m_table.InputLength();
-    unsigned uReached = 0;
-    for (int i = 0; i < CONTACT_MAX_KEY && pCodes[i] != 0; ++i)
+    int i = 0;
+    while (i < m_iKeys && pCodes[i] == m_aLastCodes[i])
     {
-        const int iKey = m_table.KeyOf(pCodes[i]);
-        m_aiKeys[i] = iKey;
-        unsigned uNext = m_bAnywhere || i == 0 ? m_table.Ends(iKey, 0) : 0;
+        ++i;
+    }
+    if (i < m_iKeys || !m_bReachesEnd)
+    {
+        GoOn(pCodes, i);
+    }
+    return m_bReachesEnd;
+}
+
+// Follows the codes from number i on, up to the end of the text or of the name.
+void CRunFinder::GoOn(const wchar_t* pCodes, int i)
+{
+    const CPieceTable::CLookup table(m_table);
+    const unsigned uEnd = 1U << m_table.InputLength();
+    unsigned uReached = m_auReached[i];
+    for (; i < CONTACT_MAX_KEY && pCodes[i] != 0 && (uReached & uEnd) == 0; ++i)
+    {
+        const int iKey = table.KeyOf(pCodes[i]);
+        unsigned uNext = m_bAnywhere || i == 0 ? table.Ends(iKey, 0) : 0;
         for (unsigned uOffsets = uReached; uOffsets != 0; uOffsets &= uOffsets - 1)
         {
-            uNext |= m_table.Ends(iKey, LowestBit(uOffsets));
+            uNext |= table.Ends(iKey, LowestBit(uOffsets));
         }
-        if ((uNext & uEnd) != 0)
-        {
-            m_iLength = i + 1;
-            return true;
-        }
-        if (uNext == 0 && !m_bAnywhere)
-        {
-            return false;
-        }
+        m_aLastCodes[i] = pCodes[i];
+        m_aiKeys[i] = iKey;
+        m_auReached[i + 1] = uNext;
         uReached = uNext;
     }
-    return false;
+    m_iKeys = i;
+    m_bReachesEnd = (uReached & uEnd) != 0;
 }
 
 bool CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& match)
@@ -58,9 +69,10 @@ bool CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& 
     m_uLastSplit = 0;
     std::fill_n(m_auSeen, m_iSplitWords, 0);
     m_match = {MATCH_LIST, 0, UINT16_MAX};
-    for (; m_iLength < CONTACT_MAX_KEY && pCodes[m_iLength] != 0; ++m_iLength)
+    m_iLength = NameLength(pCodes);
+    for (int i = m_iKeys; i < m_iLength; ++i)
     {
-        m_aiKeys[m_iLength] = m_table.KeyOf(pCodes[m_iLength]);
+        m_aiKeys[i] = m_table.KeyOf(pCodes[i]);
     }
     const int iStarts = m_bAnywhere ? m_iLength : 1;
     for (m_iStart = 0; m_iStart < iStarts; ++m_iStart)

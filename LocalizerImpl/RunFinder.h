@@ -41,6 +41,7 @@ private:
     static constexpr int WORD_BITS = 64;
     static constexpr int SPLIT_WORDS = (1 << (LOC_MAX_INPUT - 1)) / WORD_BITS;
 
+    void GoOn(const wchar_t* pCodes, int i);
     void Extend(int iPiece, int iOffset, uint32_t uSplit, bool bAllFull);
     void Record(int iPieces, int iLastOffset, uint32_t uSplit, bool bAllFull);
     void MarkFound(int iPieces, int iLastOffset, uint32_t uSplit);
@@ -51,7 +52,12 @@ private:
     bool m_bAnywhere;
     int m_iSplitWords; // of m_auSeen that the text's splits need
     const wchar_t* m_pCodes = nullptr;
-    int m_aiKeys[CONTACT_MAX_KEY] = {}; // of the first m_iLength codes
+    // The last name as far as it was followed: codes, their keys, the offsets reached before each.
+    wchar_t m_aLastCodes[CONTACT_MAX_KEY] = {};
+    int m_aiKeys[CONTACT_MAX_KEY] = {};
+    unsigned m_auReached[CONTACT_MAX_KEY + 1] = {};
+    int m_iKeys = 0;
+    bool m_bReachesEnd = false;
     int m_iLength = 0;
     int m_iStart = 0;
     int32_t m_iCandidate = 0;

@@ -186,7 +186,8 @@ wchar_t CSearchRun::IndexCharacter(const tag_LocalizerDetail& detail, int bTimeO
     else
     {
         CQVLocalizerManager::GetFirstWord(
-            m_sets->Records(), m_sets->CompactCode(detail.szLocalizerKey[0]), szFirstWord);
+            m_sets->Records(), m_sets->CompactCodeOf(m_sets->KeyOf(detail.szLocalizerKey[0])),
+            szFirstWord);
     }
     return szFirstWord[0];
 }

@@ -62,8 +62,8 @@ TEST_F(ReadingSets, HoldEveryRecordOnce)
         ASSERT_EQ(std::memcmp(&record, m_pMap + i, sizeof(record)), 0) << i;
         const std::string strReadings(m_pMap[i].szPinyin[0],
                                       sizeof(record) - sizeof(record.szWord));
-        const auto place = setOfReadings.emplace(strReadings, sets->SetOf(code)).first;
-        ASSERT_EQ(place->second, sets->SetOf(code)) << i;
+        const auto place = setOfReadings.emplace(strReadings, sets->KeyOf(code)).first;
+        ASSERT_EQ(place->second, sets->KeyOf(code)) << i;
     }
     EXPECT_EQ(static_cast<int>(setOfReadings.size()), sets->Count());
 }

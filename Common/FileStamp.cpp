@@ -2,6 +2,7 @@
 
 #include <sys/stat.h>
 
+#include <algorithm>
 #include <ctime>
 
 namespace
@@ -26,6 +27,8 @@ tag_FileStamp ReadFileStamp(const char* szPath)
     stamp.llChanged = info.st_ctim.tv_sec;
     stamp.iModifiedNs = static_cast<int32_t>(info.st_mtim.tv_nsec);
     stamp.iChangedNs = static_cast<int32_t>(info.st_ctim.tv_nsec);
+    const int64_t llLatest = std::max(stamp.llModified, stamp.llChanged);
+    stamp.bSettled = std::time(nullptr) - llLatest >= SETTLED_AFTER_SECONDS;
     return stamp;
 }
 
@@ -34,10 +37,4 @@ bool IsSameStamp(const tag_FileStamp& a, const tag_FileStamp& b)
     return a.uDevice == b.uDevice && a.uInode == b.uInode && a.llSize == b.llSize &&
            a.llModified == b.llModified && a.llChanged == b.llChanged &&
            a.iModifiedNs == b.iModifiedNs && a.iChangedNs == b.iChangedNs;
-}
-
-bool IsSettled(const tag_FileStamp& stamp)
-{
-    return stamp.uInode != 0 &&
-           static_cast<int64_t>(std::time(nullptr)) - stamp.llModified >= SETTLED_AFTER_SECONDS;
 }

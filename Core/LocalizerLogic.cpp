@@ -240,11 +240,10 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
         return pSource == nullptr ? -1 : 0;
     }
     const CStopwatch watch;
-    int iRet = iBegun;
-    if (iBegun == 0)
+    int iRet = iBegun == 0 ? run.Find(*pSource, bTimeOrder) : iBegun;
+    if (iRet >= 0)
     {
-        const int iFound = run.Find(*pSource, bTimeOrder);
-        *ppResult = HandOut(run, copy, *pSource, iFound, pMask, szWordOut);
+        *ppResult = HandOut(run, copy, *pSource, iRet, pMask, szWordOut);
         iRet = *ppResult != nullptr ? 0 : -1;
     }
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search IFL_Search time = %d\n", watch.Elapsed());

@@ -8,29 +8,35 @@
 
 #include <utils/Vector.h>
 
-// Length of a piece, counted to one more than a reading has letters: longer pieces fit none.
+// Bytes of a spelling's slot, which in a damaged table may all be letters.
+constexpr int SPELLING_SLOT = PY_MAX_LETTERS + 1;
+
+// Length of a piece, counted to one more than a slot holds: longer pieces fit none.
 inline int PieceLength(const wchar_t* szPiece)
 {
     int iLength = 0;
-    while (iLength <= PY_MAX_LETTERS && szPiece[iLength] != 0)
+    while (iLength <= SPELLING_SLOT && szPiece[iLength] != 0)
     {
         ++iLength;
     }
     return iLength;
 }
 
-// Whether the first iLength units of the piece, none of them 0, begin the spelling. Spellings are
-// ASCII, and in a damaged table one may fill its slot without a terminator.
+constexpr uint32_t ASCII_MAX = 0x7F;
+
+// Whether the first iLength units of the piece, none of them 0, begin the spelling. Only ASCII
+// fits.
 inline bool BeginsSpelling(const wchar_t* szPiece, int iLength,
-                           const char (&szSpelling)[PY_MAX_LETTERS + 1])
+                           const char (&szSpelling)[SPELLING_SLOT])
 {
-    if (szSpelling[0] == 0 || iLength > PY_MAX_LETTERS + 1)
+    if (szSpelling[0] == 0 || iLength > SPELLING_SLOT)
     {
         return false;
     }
     for (int i = 0; i < iLength; ++i)
     {
-        if (szPiece[i] != static_cast<wchar_t>(static_cast<unsigned char>(szSpelling[i])))
+        const uint32_t uUnit = static_cast<uint32_t>(szPiece[i]);
+        if (uUnit != static_cast<unsigned char>(szSpelling[i]) || uUnit > ASCII_MAX)
         {
             return false;
         }

@@ -18,23 +18,58 @@ bool IsChineseUnit(wchar_t unit)
 CPieceTable::CPieceTable(CQVLocalizerManager& matcher, const CReadingSets& sets,
                          const wchar_t* szInput, int iInputLen)
     : m_matcher(matcher), m_sets(sets), m_szInput(szInput), m_iInputLen(iInputLen),
-      m_bChineseTyped(std::any_of(szInput, szInput + iInputLen, IsChineseUnit)),
+      m_pKeys(sets.Keys()),
       m_pRows(new (std::nothrow) tag_PieceRow[static_cast<size_t>(KeyCount())]()),
       m_pEnds(new (std::nothrow) uint16_t[static_cast<size_t>(iInputLen * KeyCount())])
 {
-    if (!IsReady())
+    if (m_pRows != nullptr && m_pEnds != nullptr)
     {
-        return;
+        std::fill_n(m_pEnds.get(), iInputLen * KeyCount(), NOT_ASKED);
+        m_bReady = AskLastPieces() && AddTypedKeys();
     }
-    std::fill_n(m_pEnds.get(), iInputLen * KeyCount(), NOT_ASKED);
-    for (int iOffset = 0; iOffset < iInputLen; ++iOffset)
+}
+
+// Finds out which offsets have a last piece that is worth trying. False without memory.
+bool CPieceTable::AskLastPieces()
+{
+    for (int iOffset = 0; iOffset < m_iInputLen; ++iOffset)
     {
-        m_aszUnits[iOffset][0] = szInput[iOffset];
-        if (IsLastPieceValid(iOffset))
+        m_aszUnits[iOffset][0] = m_szInput[iOffset];
+        android::Vector<wchar_t*> vPieces;
+        if (vPieces.add(Piece(iOffset, m_iInputLen)) < 0)
         {
-            m_uValidLast = static_cast<uint16_t>(m_uValidLast | (1U << iOffset));
+            return false;
+        }
+        const int bValid = m_matcher.IsValid(vPieces) != 0 ? 1 : 0;
+        m_uValidLast = static_cast<uint16_t>(m_uValidLast | (bValid << iOffset));
+    }
+    return true;
+}
+
+// A typed Chinese character fits its own code alone, all 32 bits of it, and no other code of the
+// set. False without memory.
+bool CPieceTable::AddTypedKeys()
+{
+    if (std::none_of(m_szInput, m_szInput + m_iInputLen, IsChineseUnit))
+    {
+        return true;
+    }
+    m_pOwnKeys.reset(new (std::nothrow) uint16_t[CReadingSets::CODE_COUNT]);
+    if (m_pOwnKeys == nullptr)
+    {
+        return false;
+    }
+    std::copy_n(m_sets.Keys(), CReadingSets::CODE_COUNT, m_pOwnKeys.get());
+    m_pKeys = m_pOwnKeys.get();
+    for (int i = 0; i < m_iInputLen; ++i)
+    {
+        const wchar_t unit = m_szInput[i];
+        if (IsHanZiCode(CodeBits(unit)) && static_cast<wchar_t>(CodeBits(unit)) == unit)
+        {
+            m_pOwnKeys[CodeBits(unit)] = static_cast<uint16_t>(m_sets.KeyCount() + i);
         }
     }
+    return true;
 }
 
 wchar_t* CPieceTable::Piece(int iOffset, int iEnd)
@@ -48,16 +83,7 @@ wchar_t* CPieceTable::Piece(int iOffset, int iEnd)
     return m_szPiece;
 }
 
-bool CPieceTable::IsLastPieceValid(int iOffset)
-{
-    android::Vector<wchar_t*> vPieces;
-    vPieces.push(Piece(iOffset, m_iInputLen));
-    return m_matcher.IsValid(vPieces) != 0;
-}
-
-// A typed Chinese character fits its own code alone, all 32 bits of it, and no other code of the
-// set.
-int CPieceTable::KeyOfTyped(wchar_t code) const
+int CPieceTable::KeyOfWide(wchar_t code) const
 {
     const wchar_t* pEnd = m_szInput + m_iInputLen;
     const wchar_t* pTyped = IsChineseUnit(code) ? std::find(m_szInput, pEnd, code) : pEnd;

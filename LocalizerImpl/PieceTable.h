@@ -40,14 +40,15 @@ public:
     CPieceTable& operator=(const CPieceTable&) = delete;
 
     // False for want of memory; then nothing else may be called.
-    bool IsReady() const { return m_pRows != nullptr && m_pEnds != nullptr; }
+    bool IsReady() const { return m_bReady; }
 
     // The keys of the sets, and behind them one for each typed character. Whatever a damaged
     // record holds has a key too.
-    int KeyCount() const { return m_sets.KeyCount() + LOC_MAX_INPUT; }
+    int KeyCount() const { return m_sets.KeyCount() + m_iInputLen; }
     int KeyOf(wchar_t code) const
     {
-        return m_bChineseTyped ? KeyOfTyped(code) : m_sets.KeyOf(code);
+        const uint32_t uCode = static_cast<uint32_t>(code);
+        return uCode < CReadingSets::CODE_COUNT ? m_pKeys[uCode] : KeyOfWide(code);
     }
     // A code that stands for the key in the table of the sets.
     wchar_t CompactCodeOf(int iKey) const;
@@ -66,16 +67,15 @@ public:
     {
     public:
         explicit CLookup(CPieceTable& table)
-            : m_table(table), m_pKeys(table.m_sets.Keys()), m_pEnds(table.m_pEnds.get()),
-              m_iKeys(table.KeyCount()),
-              m_uCodes(table.m_bChineseTyped ? 0 : CReadingSets::CODE_COUNT)
+            : m_table(table), m_pKeys(table.m_pKeys), m_pEnds(table.m_pEnds.get()),
+              m_iKeys(table.KeyCount())
         {
         }
 
         int KeyOf(wchar_t code) const
         {
             const uint32_t uCode = static_cast<uint32_t>(code);
-            return uCode < m_uCodes ? m_pKeys[uCode] : m_table.KeyOf(code);
+            return uCode < CReadingSets::CODE_COUNT ? m_pKeys[uCode] : m_table.KeyOfWide(code);
         }
         unsigned Ends(int iKey, int iOffset) const
         {
@@ -88,11 +88,11 @@ public:
         const uint16_t* m_pKeys;
         const uint16_t* m_pEnds;
         int m_iKeys;
-        uint32_t m_uCodes; // that have their key in m_pKeys
     };
 
     tag_PieceRow& RowOf(int iKey) { return m_pRows[iKey]; }
     int InputLength() const { return m_iInputLen; }
+    const CReadingSets& Sets() const { return m_sets; }
 
     // The piece from iOffset to iEnd, valid until the next call.
     wchar_t* Piece(int iOffset, int iEnd);
@@ -101,19 +101,22 @@ private:
     static constexpr uint16_t NOT_ASKED = UINT16_MAX;
 
     int PlaceOf(int iKey, int iOffset) const { return iOffset * KeyCount() + iKey; }
-    int KeyOfTyped(wchar_t code) const;
+    bool AddTypedKeys();
+    int KeyOfWide(wchar_t code) const;
     wchar_t TypedUnit(int iKey) const;
     unsigned AskEnds(int iKey, int iOffset);
     bool Fits(int iKey, wchar_t* szPiece, bool& bFull);
     bool FitsChinese(int iKey, wchar_t* szPiece, bool& bFull);
-    bool IsLastPieceValid(int iOffset);
+    bool AskLastPieces();
 
     CQVLocalizerManager& m_matcher;
     const CReadingSets& m_sets;
     const wchar_t* m_szInput;
     int m_iInputLen;
-    bool m_bChineseTyped = false; // the text holds units that are Chinese codes
-    uint16_t m_uValidLast = 0;    // offsets whose last piece the matcher finds worth trying
+    const uint16_t* m_pKeys; // of the codes below CReadingSets::CODE_COUNT
+    bool m_bReady = false;
+    uint16_t m_uValidLast = 0; // offsets whose last piece the matcher finds worth trying
+    std::unique_ptr<uint16_t[]> m_pOwnKeys; // where a Chinese character was typed
     std::unique_ptr<tag_PieceRow[]> m_pRows;
     std::unique_ptr<uint16_t[]> m_pEnds;       // by offset, then by key
     wchar_t m_aszUnits[LOC_MAX_INPUT][2] = {}; // the pieces of one character, asked for most

@@ -49,12 +49,17 @@ int CQVLocalizerManager::DoSearch(tag_LocalizerResult* pCandidates, wchar_t* szI
     }
     CSearchRun run(*this);
     const int iRet = run.Begin(szInput);
-    if (iRet == 0)
+    if (iRet != 0)
     {
-        run.Find(*pCandidates, bTimeOrder);
-        run.Finish(*pCandidates, pResult, pMask, szWordOut);
+        return iRet;
     }
-    return iRet;
+    const int iFound = run.Find(*pCandidates, bTimeOrder);
+    if (iFound < 0)
+    {
+        return iFound;
+    }
+    run.Finish(*pCandidates, pResult, pMask, szWordOut);
+    return 0;
 }
 
 int CQVLocalizerManager::DoCompare(PYOFWORDS* pMap, tag_LocalizerDetail* pDetail,

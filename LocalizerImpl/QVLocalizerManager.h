@@ -51,9 +51,11 @@ public:
     virtual ~CQVLocalizerManager();
 
     // One piece of the typed text against one character of a name; 1 = it fits, 0 = it does not
-    // or the piece is null. CmpChineseWord gets the table, the character's code and record, the
-    // mask of the search, whether the piece is the last of the text, and sets bFull to whether
-    // the piece is a whole reading; the codes of the other three are cut to 16 bits. What a
+    // or the piece is null. CmpChineseWord gets a table, the character's code and record, none of
+    // them to be written, the mask of the search, whether the piece is the last of the text, and
+    // sets bFull to whether the piece is a whole reading; the codes of the other three are cut to
+    // 16 bits. A search asks once for all characters with the same readings, without a code, then
+    // for those that it reports, with their record. What a
     // matcher answers depends on nothing but the code and the piece, and where a piece fits, each
     // of its beginnings fits too: the search relies on both.
     virtual int CmpChineseWord(PYOFWORDS* pMap, wchar_t code, PYOFWORDS& record, wchar_t* szPiece,

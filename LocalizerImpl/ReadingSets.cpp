@@ -80,22 +80,28 @@ private:
 
 } // namespace
 
-// The sets that the process keeps from one search to the next.
+// The sets that the process keeps from one search to the next. No one waits for the mutex: in a
+// child forked at the wrong moment it stays taken for good, and making the sets anew is cheap.
 class CKeptSets
 {
 public:
     CReadingSets::Ptr Lend(const tag_FileStamp& stamp)
     {
-        const std::lock_guard<std::mutex> lock(m_mutex);
-        return m_pSets != nullptr && IsSameStamp(stamp, m_stamp) ? m_pSets->Share() : nullptr;
+        const std::unique_lock<std::mutex> lock(m_mutex, std::try_to_lock);
+        return lock.owns_lock() && m_pSets != nullptr && IsSameStamp(stamp, m_stamp)
+                   ? m_pSets->Share()
+                   : nullptr;
     }
 
     void Keep(const CReadingSets& sets, const tag_FileStamp& stamp)
     {
         CReadingSets::Ptr pSets = sets.Share();
-        const std::lock_guard<std::mutex> lock(m_mutex);
-        m_pSets.swap(pSets);
-        m_stamp = stamp;
+        const std::unique_lock<std::mutex> lock(m_mutex, std::try_to_lock);
+        if (lock.owns_lock())
+        {
+            m_pSets.swap(pSets);
+            m_stamp = stamp;
+        }
     }
 
 private:
@@ -107,10 +113,12 @@ private:
 namespace
 {
 
+// Never destroyed, since other threads may search while the process exits.
 CKeptSets& KeptSets()
 {
-    static CKeptSets kept;
-    return kept;
+    alignas(CKeptSets) static unsigned char acPlace[sizeof(CKeptSets)];
+    static CKeptSets* pKept = new (acPlace) CKeptSets;
+    return *pKept;
 }
 
 } // namespace
@@ -121,7 +129,7 @@ CReadingSets::Ptr CReadingSets::Of(const PYOFWORDS* pMap, const tag_FileStamp& s
     if (pSets == nullptr)
     {
         pSets = Make(pMap);
-        if (pSets != nullptr && IsSettled(stamp))
+        if (pSets != nullptr && stamp.bSettled)
         {
             KeptSets().Keep(*pSets, stamp);
         }

@@ -7,7 +7,8 @@
 // character depends on its set alone. So every code has a key: characters with the same readings
 // share one, letters, digits and the rest have theirs behind. The sets form a table of their own,
 // in which a key has a compact code: LOC_HANZI_BASE + the set, or the code itself where it is no
-// Chinese one. Whatever takes a table and a code takes this table and a compact code too.
+// Chinese one. What asks a table for the readings of a code takes this table and a compact code
+// too.
 
 #include "Common/FileStamp.h"
 #include "Core/LocalizerCodes.h"
@@ -26,16 +27,16 @@ public:
     using Ptr = std::unique_ptr<const CReadingSets, tag_Release>;
 
     // The sets of a mapped table whose stamp was read before it was mapped; null for want of
-    // memory. They are a copy: no mapping is kept. The process keeps the last ones, about 150 KB,
-    // for as long as the stamp stays the same, so that a keystroke does not go through the
-    // table's 170 pages again. Any thread may call.
+    // memory. They are a copy: no mapping is kept. The process keeps the last ones whose stamp was
+    // settled, about 150 KB, and gives them out again as long as the stamp is the same, so that a
+    // keystroke does not go through the table's 170 pages again. Any thread may call.
     static Ptr Of(const PYOFWORDS* pMap, const tag_FileStamp& stamp);
 
     CReadingSets(const CReadingSets&) = delete;
     CReadingSets& operator=(const CReadingSets&) = delete;
 
     int Count() const { return m_iCount; }
-    // By set; their characters are empty.
+    // By set; their characters are empty. Shared by all searches: to be read only.
     PYOFWORDS* Records() const { return m_pRecords.get(); }
 
     // Keys are 0..KeyCount() - 1, first one for each set. A code acts by its low 16 bits, except

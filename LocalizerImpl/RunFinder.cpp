@@ -135,7 +135,7 @@ void CRunFinder::MarkFound(int iPieces, int iLastOffset, uint32_t uSplit)
     const uint16_t uLastCode = CodeBits(m_pCodes[iLast]);
     if (m_firstFound.IsEarly(uSplit, m_iCandidate) && IsHanZiCode(uLastCode))
     {
-        m_firstFound.Add(uSplit, m_iCandidate, uLastCode);
+        m_firstFound.Add(uSplit, m_iCandidate, uLastCode, m_table.Sets());
     }
     if (iLast + 1 < m_iLength)
     {

@@ -141,20 +141,19 @@ bool CSearchRun::MayMatch(const wchar_t* pCodes)
 
 int CSearchRun::Find(const tag_LocalizerResult& candidates, int bTimeOrder)
 {
-    if (m_manager.m_iInputLen == 0)
+    const bool bFound =
+        m_manager.m_iInputLen == 0 ? ListAll(candidates, bTimeOrder) : FindMatches(candidates);
+    if (!bFound)
     {
-        ListAll(candidates, bTimeOrder);
-    }
-    else
-    {
-        FindMatches(candidates);
+        m_manager.m_vLocateArray.clear();
+        return LOC_ERR_MAP;
     }
     CFindingsWriter(m_manager, *m_sets, m_manager.m_stMask, *m_pieces)
         .Write(m_finder->FirstFound());
     return static_cast<int>(m_manager.m_vLocateArray.size());
 }
 
-void CSearchRun::ListAll(const tag_LocalizerResult& candidates, int bTimeOrder)
+bool CSearchRun::ListAll(const tag_LocalizerResult& candidates, int bTimeOrder)
 {
     if (bTimeOrder != 0)
     {
@@ -162,7 +161,10 @@ void CSearchRun::ListAll(const tag_LocalizerResult& candidates, int bTimeOrder)
     }
     const int iOffered = m_manager.m_bMatchAnywhere != 0 ? CONTACT_MAX_KEY : 1;
     const int iCount = candidates.pDetail == nullptr ? 0 : candidates.iResultNum;
-    m_manager.m_vLocateArray.setCapacity(static_cast<size_t>(std::max(iCount, 0)));
+    if (m_manager.m_vLocateArray.setCapacity(static_cast<size_t>(std::max(iCount, 0))) < 0)
+    {
+        return false;
+    }
     for (int32_t i = 0; i < iCount; ++i)
     {
         const tag_LocalizerDetail& detail = candidates.pDetail[i];
@@ -174,6 +176,7 @@ void CSearchRun::ListAll(const tag_LocalizerResult& candidates, int bTimeOrder)
             m_pieces->RowOf(m_pieces->KeyOf(detail.szLocalizerKey[iCode])).bBehindRun = true;
         }
     }
+    return true;
 }
 
 wchar_t CSearchRun::IndexCharacter(const tag_LocalizerDetail& detail, int bTimeOrder)
@@ -192,7 +195,7 @@ wchar_t CSearchRun::IndexCharacter(const tag_LocalizerDetail& detail, int bTimeO
     return szFirstWord[0];
 }
 
-void CSearchRun::FindMatches(const tag_LocalizerResult& candidates)
+bool CSearchRun::FindMatches(const tag_LocalizerResult& candidates)
 {
     android::Vector<_MatchResult>& vMatches = m_manager.m_vLocateArray;
     android::Vector<uint16_t> vFirstSplits; // when each match was first found
@@ -200,16 +203,14 @@ void CSearchRun::FindMatches(const tag_LocalizerResult& candidates)
     {
         tag_NameMatch match;
         if (m_finder->Find(candidates.pDetail[i].szLocalizerKey, i, match) &&
-            vFirstSplits.add(match.uFirstSplit) >= 0)
+            (vFirstSplits.add(match.uFirstSplit) < 0 ||
+             vMatches.add({i, match.iMatchType, match.iMatchPos, 0}) < 0))
         {
-            vMatches.push({i, match.iMatchType, match.iMatchPos, 0});
+            return false;
         }
     }
-    const int iMatches = static_cast<int>(vMatches.size());
-    if (iMatches > 1 && RankMatches(vMatches, vFirstSplits.array(), candidates.pDetail) != 0)
-    {
-        CQVLocalizerManager::LocalResultQuickSort(vMatches, 0, iMatches - 1, candidates.pDetail);
-    }
+    return vMatches.size() < 2 ||
+           RankMatches(vMatches, vFirstSplits.array(), candidates.pDetail) == 0;
 }
 
 void CSearchRun::Finish(const tag_LocalizerResult& candidates, tag_LocalizerResult* pResult,

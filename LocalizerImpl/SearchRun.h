@@ -34,7 +34,8 @@ public:
     bool MayMatch(const wchar_t* pCodes) override;
 
     // After Begin returned 0. An empty text lists all candidates in their order, with time
-    // buckets as index characters when bTimeOrder is not 0. Returns the number of matches.
+    // buckets as index characters when bTimeOrder is not 0. Returns the number of matches, or
+    // LOC_ERR_MAP without memory to note them; then the run is over.
     int Find(const tag_LocalizerResult& candidates, int bTimeOrder);
 
     // Writes the matches of Find into *pResult (null: nowhere; without an array: none), which has
@@ -49,8 +50,8 @@ public:
 private:
     void WriteKeys(long* pMask, wchar_t* szWordOut);
     void RankInPlace(tag_LocalizerDetail* pDetail);
-    void ListAll(const tag_LocalizerResult& candidates, int bTimeOrder);
-    void FindMatches(const tag_LocalizerResult& candidates);
+    bool ListAll(const tag_LocalizerResult& candidates, int bTimeOrder);
+    bool FindMatches(const tag_LocalizerResult& candidates);
     wchar_t IndexCharacter(const tag_LocalizerDetail& detail, int bTimeOrder);
     void WriteEntries(const tag_LocalizerResult& candidates, tag_LocalizerResult& result) const;
     void WriteCandidateWords(wchar_t* szWordOut) const;

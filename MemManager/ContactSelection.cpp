@@ -69,8 +69,8 @@ struct tag_OpenStore
 };
 
 // Makes the entries from the records where they lie. That holds the lock no longer than copying
-// the records would: of each one or two cache lines are read, and entries are an eighth of them.
-// Room for all is taken, but only what is written costs memory.
+// the records would: of each a few cache lines are read, and entries are an eighth of them.
+// Room for all is taken, but most of it is never touched.
 // Returns whether the array is dense: what is spare is no more than what is used.
 bool SelectFromStore(tag_OpenStore* pStore, const CFilterChain& chain, CCandidateTest* pTest,
                      tag_LocalizerResult* pResult)

@@ -3,13 +3,10 @@
 #include "tests/LocalizerImpl/LocalizerFixture.h"
 
 #include "Common/DataPaths.h"
+#include "Common/SystemTime.h"
 #include "LocalizerImpl/PinyinTable.h"
 #include "LocalizerImpl/ReadingSets.h"
 
-#include <fcntl.h>
-#include <sys/stat.h>
-
-#include <ctime>
 #include <map>
 
 namespace
@@ -34,12 +31,13 @@ protected:
         ASSERT_EQ(CQVLocalizerManager::InitMapFile(), 0);
     }
 
-    // As if the table had been written long ago.
-    static void Age(long lSeconds)
+    // Waits until the table counts as written long ago.
+    static void Settle()
     {
-        const timespec then = {std::time(nullptr) - lSeconds, 0};
-        const timespec aTimes[] = {then, then};
-        ASSERT_EQ(utimensat(AT_FDCWD, CDataPaths::PinyinMapping(), aTimes, 0), 0);
+        while (!ReadFileStamp(CDataPaths::PinyinMapping()).bSettled)
+        {
+            Sleep(50);
+        }
     }
 
     static std::string FirstReading(const CReadingSets::Ptr& sets)
@@ -70,12 +68,11 @@ TEST_F(ReadingSets, HoldEveryRecordOnce)
 
 TEST_F(ReadingSets, AreKeptWhileTheTableStaysTheSame)
 {
-    Age(10);
+    Settle();
     const CReadingSets::Ptr first = Open();
     const std::string strFirst = FirstReading(first);
     EXPECT_EQ(Open().get(), first.get());
     Install("aaa");
-    Age(20);
     EXPECT_EQ(FirstReading(Open()), "aaa");
     EXPECT_EQ(FirstReading(first), strFirst) << "the older one is still in use";
 }

@@ -174,13 +174,34 @@ bool CReadingSets::Fill(const PYOFWORDS* pMap)
     }
     m_iCount = index.Count();
     FillOtherKeys();
-    m_pRecords.reset(new (std::nothrow) PYOFWORDS[static_cast<size_t>(m_iCount)]);
-    for (int i = 0; m_pRecords != nullptr && i < m_iCount; ++i)
+    if (!MakeRoomForSets())
+    {
+        return false;
+    }
+    for (int i = 0; i < m_iCount; ++i)
     {
         m_pRecords[i] = index.FirstOf(i);
         std::memset(m_pRecords[i].szWord, 0, sizeof(tag_Word));
+        m_pInitials[i] = InitialsOf(m_pRecords[i]);
     }
-    return m_pRecords != nullptr;
+    return true;
+}
+
+bool CReadingSets::MakeRoomForSets()
+{
+    m_pRecords.reset(new (std::nothrow) PYOFWORDS[static_cast<size_t>(m_iCount)]);
+    m_pInitials.reset(new (std::nothrow) uint64_t[static_cast<size_t>(m_iCount)]);
+    return m_pRecords != nullptr && m_pInitials != nullptr;
+}
+
+uint64_t CReadingSets::InitialsOf(const PYOFWORDS& record)
+{
+    uint64_t uInitials = 0;
+    for (int i = 0; i < PY_READINGS; ++i)
+    {
+        uInitials |= InitialBit(record.szPinyin[i][0]) | InitialBit(record.szPinyinNum[i][0]);
+    }
+    return uInitials;
 }
 
 void CReadingSets::FillOtherKeys()

@@ -39,6 +39,13 @@ public:
     // By set; their characters are empty. Shared by all searches: to be read only.
     PYOFWORDS* Records() const { return m_pRecords.get(); }
 
+    // False when no spelling of the set, in letters or digits, begins with the unit.
+    bool MayBegin(int iSet, wchar_t unit) const
+    {
+        const uint64_t uBit = InitialBit(unit);
+        return uBit == 0 || (m_pInitials[iSet] & uBit) != 0;
+    }
+
     // Keys are 0..KeyCount() - 1, first one for each set. A code acts by its low 16 bits, except
     // that LOC_OTHER with upper bits set, which only a damaged record holds, has another key.
     int KeyCount() const { return m_iCount + PLACE_COUNT; }
@@ -65,6 +72,17 @@ private:
     static constexpr int PLACE_UNKNOWN = PLACE_OTHER + 2;
     static constexpr int PLACE_COUNT = PLACE_OTHER + 3;
 
+    // 0 for units that are neither a small letter nor a digit: nothing is kept of these.
+    static uint64_t InitialBit(wchar_t unit)
+    {
+        if (unit >= L'a' && unit <= L'z')
+        {
+            return uint64_t{1} << (unit - L'a');
+        }
+        return unit >= L'0' && unit <= L'9' ? uint64_t{1} << (LOC_ALPHA_COUNT + unit - L'0') : 0;
+    }
+    static uint64_t InitialsOf(const PYOFWORDS& record);
+
     struct tag_Word
     {
         char szWord[sizeof(PYOFWORDS::szWord)];
@@ -76,6 +94,7 @@ private:
     ~CReadingSets() = default;
     static Ptr Make(const PYOFWORDS* pMap);
     bool Fill(const PYOFWORDS* pMap);
+    bool MakeRoomForSets();
     void FillOtherKeys();
     int KeyOfWide(wchar_t code) const;
     Ptr Share() const;
@@ -84,6 +103,7 @@ private:
     std::unique_ptr<uint16_t[]> m_pKeyOf; // by code
     std::unique_ptr<tag_Word[]> m_pWords; // by record of the pinyin table
     std::unique_ptr<PYOFWORDS[]> m_pRecords;
+    std::unique_ptr<uint64_t[]> m_pInitials; // by set: the first units of its spellings
     mutable std::atomic<int> m_iUsers{1};
 };
 

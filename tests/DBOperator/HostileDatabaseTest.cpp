@@ -76,7 +76,8 @@ TEST_F(CHostileTest, AMissingColumnFailsTheRead)
     m_clProvider.Execute("alter table contacts drop column photo_file_id");
     CSQLiteOperator clReader;
     const CLogCapture log;
-    EXPECT_EQ(-1, clReader.ReadAllLocalizer(&set, 0, nullptr));
+    tag_ReadSet another;
+    EXPECT_EQ(-1, clReader.ReadAllLocalizer(&another, 0, nullptr));
     EXPECT_EQ(Lines{" QV_Contacts>>QV_ContactsLocalize_SO>> select from contacts ERROR result=1"},
               log.Texts(ERROR_LINE));
 }

@@ -11,7 +11,8 @@
 constexpr int LOC_ERR_MAP = -1000;   // the pinyin table cannot be built, opened or asked
 constexpr int LOC_ERR_PARAM = -1005; // a missing argument, or an input that is too long
 
-// Codes: one per character of a name, 0 ends the array.
+// Codes: one per character of a name, LOC_NO_CODE ends the array.
+constexpr wchar_t LOC_NO_CODE = 0;
 constexpr wchar_t LOC_HANZI_BASE = 0x1000; // + record of the pinyin table
 constexpr wchar_t LOC_ALPHA_BASE = 0x4F00; // + place in the alphabet, case not kept
 constexpr wchar_t LOC_OTHER = 0x5000;      // space, punctuation, characters not in the table

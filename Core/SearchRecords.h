@@ -46,6 +46,21 @@ constexpr int32_t MATCH_PARTIAL = 1;  // some character took only the beginning 
 constexpr int32_t MATCH_FULL = 2;     // every Chinese character took a whole reading
 constexpr int32_t MATCH_INITIALS = 3; // one typed character per name character
 
+// iMatchPos from the places of the first and the last matched character, and back.
+constexpr int MATCH_POS_BITS = 16;
+constexpr int32_t MatchPosition(int iFirst, int iLast)
+{
+    return (iFirst << MATCH_POS_BITS) | iLast;
+}
+constexpr int MatchFirst(int32_t iMatchPos)
+{
+    return static_cast<int>(static_cast<uint32_t>(iMatchPos) >> MATCH_POS_BITS);
+}
+constexpr int MatchLast(int32_t iMatchPos)
+{
+    return static_cast<uint16_t>(iMatchPos);
+}
+
 // One match of a running search.
 struct _MatchResult
 {

@@ -13,8 +13,6 @@
 namespace
 {
 
-constexpr int POSITION_BITS = 16;
-constexpr uint32_t POSITION_MASK = 0xFFFF;
 constexpr int SPLIT_SHIFT = 32; // a discovery key: split above, place in the vector below
 constexpr int RANGE_STACK_DEPTH = 32;
 
@@ -29,14 +27,14 @@ constexpr uint32_t SIGN_BIT = 0x80000000;
 constexpr int BUCKET_POSITION_BITS = 4;
 constexpr int BUCKET_COUNT = (MATCH_INITIALS + 1) << (2 * BUCKET_POSITION_BITS);
 
-uint32_t StartOf(const _MatchResult& match)
+int StartOf(const _MatchResult& match)
 {
-    return static_cast<uint32_t>(match.iMatchPos) >> POSITION_BITS;
+    return MatchFirst(match.iMatchPos);
 }
 
-uint32_t EndOf(const _MatchResult& match)
+int EndOf(const _MatchResult& match)
 {
-    return static_cast<uint32_t>(match.iMatchPos) & POSITION_MASK;
+    return MatchLast(match.iMatchPos);
 }
 
 // The first three keys, the fourth being the place in name order: -1, 0 or 1.
@@ -106,12 +104,11 @@ int PartitionMatches(android::Vector<_MatchResult>& vMatches, int iLow, int iHig
 
 int BucketOf(const _MatchResult& match)
 {
-    constexpr uint32_t FIELD = (1U << BUCKET_POSITION_BITS) - 1;
-    const uint32_t uKind = static_cast<uint32_t>(MATCH_INITIALS - match.iMatchType);
-    const uint32_t uStart = StartOf(match) & FIELD;
-    const uint32_t uSpan = (FIELD - (EndOf(match) - StartOf(match))) & FIELD;
-    return static_cast<int>((((uKind << BUCKET_POSITION_BITS) | uStart) << BUCKET_POSITION_BITS) |
-                            uSpan);
+    constexpr int FIELD = (1 << BUCKET_POSITION_BITS) - 1;
+    const int iKind = MATCH_INITIALS - match.iMatchType;
+    const int iStart = StartOf(match) & FIELD;
+    const int iSpan = (FIELD - (EndOf(match) - StartOf(match))) & FIELD;
+    return (((iKind << BUCKET_POSITION_BITS) | iStart) << BUCKET_POSITION_BITS) | iSpan;
 }
 
 // A match by its entry's place in name order.

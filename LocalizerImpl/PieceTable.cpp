@@ -6,8 +6,6 @@
 namespace
 {
 
-constexpr wchar_t NO_CODE = 0;
-
 bool IsChineseUnit(wchar_t unit)
 {
     return IsHanZiCode(CodeBits(unit));
@@ -100,7 +98,7 @@ wchar_t CPieceTable::CompactCodeOf(int iKey) const
 wchar_t CPieceTable::TypedUnit(int iKey) const
 {
     const int iUnit = iKey - m_sets.KeyCount();
-    return iUnit < 0 ? NO_CODE : m_szInput[iUnit];
+    return iUnit < 0 ? LOC_NO_CODE : m_szInput[iUnit];
 }
 
 unsigned CPieceTable::AskEnds(int iKey, int iOffset)

@@ -13,14 +13,6 @@
 #include <algorithm>
 #include <iterator>
 
-namespace
-{
-
-constexpr int POSITION_BITS = 16; // of iMatchPos: start above, end below
-constexpr uint32_t POSITION_MASK = 0xFFFF;
-
-} // namespace
-
 CQVLocalizerManager::CQVLocalizerManager(int bMatchAnywhere)
     : m_stCNWords{}, m_iInputLen(0), m_stMask{}, m_bMatchAnywhere(bMatchAnywhere), m_llNowMs(0)
 {
@@ -232,9 +224,8 @@ int CQVLocalizerManager::JudgeAllEnglish(tag_LocalizerDetail* pDetail)
     {
         return 0;
     }
-    const uint32_t uPos = static_cast<uint32_t>(pDetail->iMatchPos);
-    const int iEnd = std::min(static_cast<int>(uPos & POSITION_MASK), CONTACT_MAX_KEY);
-    for (int i = static_cast<int>(uPos >> POSITION_BITS); i <= iEnd; ++i)
+    const int iLast = std::min(MatchLast(pDetail->iMatchPos), CONTACT_MAX_KEY);
+    for (int i = MatchFirst(pDetail->iMatchPos); i <= iLast; ++i)
     {
         const wchar_t code = pDetail->szLocalizerKey[i];
         if (!IsAlpha(CodeBits(code)) && code != LOC_OTHER)

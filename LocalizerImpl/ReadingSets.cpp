@@ -237,7 +237,6 @@ int CReadingSets::KeyOfWide(wchar_t code) const
 
 wchar_t CReadingSets::CompactCodeOf(int iKey) const
 {
-    constexpr wchar_t NO_CODE = 0;
     constexpr wchar_t UPPER_BIT = 0x10000;
     const int iPlace = iKey - m_iCount;
     if (iPlace < PLACE_ALPHA)
@@ -254,7 +253,7 @@ wchar_t CReadingSets::CompactCodeOf(int iKey) const
     }
     if (iPlace == PLACE_UNKNOWN)
     {
-        return NO_CODE;
+        return LOC_NO_CODE;
     }
     return iPlace == PLACE_OTHER ? LOC_OTHER : LOC_OTHER | UPPER_BIT;
 }

@@ -118,7 +118,7 @@ void CRunFinder::Record(int iPieces, int iLastOffset, uint32_t uSplit, bool bAll
     if (uSplit > m_uLastSplit)
     {
         m_uLastSplit = uSplit;
-        m_match.iMatchPos = MatchPosition(m_iStart, iPieces);
+        m_match.iMatchPos = MatchPosition(m_iStart, m_iStart + iPieces - 1);
         m_match.iMatchType = bAllFull ? MATCH_FULL : MATCH_PARTIAL;
         if (iPieces == m_table.InputLength())
         {

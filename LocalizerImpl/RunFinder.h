@@ -77,10 +77,4 @@ inline int NameLength(const wchar_t* pCodes)
     return iLength;
 }
 
-// The place of a run of iPieces characters from iStart on.
-constexpr int32_t MatchPosition(int iStart, int iPieces)
-{
-    return (iStart << 16) | (iStart + iPieces - 1);
-}
-
 #endif

@@ -15,12 +15,12 @@
 #include "LocalizerImpl/RankingOrder.h"
 
 #include <algorithm>
+#include <climits>
 #include <ctime>
 
 namespace
 {
 
-constexpr wchar_t NO_CODE = 0;
 constexpr int64_t MS_PER_SECOND = 1000;
 
 // Feeds the mask and the candidate characters of a manager from what a search marked.
@@ -81,7 +81,7 @@ private:
     void TakeLastPiece(PYOFWORDS& record, int iOffset)
     {
         int iFull = 0;
-        m_manager.CmpChineseWord(m_sets.Records(), NO_CODE, record,
+        m_manager.CmpChineseWord(m_sets.Records(), LOC_NO_CODE, record,
                                  m_table.Piece(iOffset, m_table.InputLength()), &m_mask, 1, iFull);
     }
 
@@ -107,8 +107,7 @@ int CSearchRun::Begin(wchar_t* szInput)
     }
     _wcslwr(szInput);
     m_manager.ClearSearch();
-    const size_t uLength = _wcslen(szInput);
-    m_manager.m_iInputLen = static_cast<int>(std::min<size_t>(uLength, LOC_MAX_INPUT + 1));
+    m_manager.m_iInputLen = static_cast<int>(std::min<size_t>(_wcslen(szInput), INT_MAX));
     if (m_manager.m_iInputLen > LOC_MAX_INPUT)
     {
         return LOC_ERR_PARAM;

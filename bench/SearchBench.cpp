@@ -16,6 +16,7 @@
 #include "bench/Queries.h"
 #include "bench/Workload.h"
 #include "tests/Support/ProviderDatabase.h"
+#include "tests/Support/WideText.h"
 
 #include <benchmark/benchmark.h>
 
@@ -195,7 +196,7 @@ void CountKeystrokes(benchmark::State& state, const std::vector<tag_Keystroke>& 
         std::max_element(vKeystrokes.begin(), vKeystrokes.end(),
                          [](const tag_Keystroke& a, const tag_Keystroke& b)
                          { return a.dSeconds / a.dAllowed < b.dSeconds / b.dAllowed; });
-    const std::string strWorst = ToUtf8(std::wstring(worst->pQuery->szText, worst->uTyped));
+    const std::string strWorst = Narrow(std::wstring(worst->pQuery->szText, worst->uTyped));
     state.SetLabel("worst share: " + strWorst + ", " + std::to_string(worst->iAfter) + " found");
     state.counters["keystrokes"] = static_cast<double>(vKeystrokes.size());
     state.counters["p50_us"] = Percentile(vTimes, 50);

@@ -1,12 +1,12 @@
 #include "bench/Workload.h"
 
 #include "Common/DataPaths.h"
-#include "Common/Utf8.h"
 #include "Core/LocalizerLogic.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "Platform/LogSink.h"
 #include "bench/NameSource.h"
 #include "tests/Support/ProviderDatabase.h"
+#include "tests/Support/WideText.h"
 
 #include <chrono>
 #include <cstdlib>
@@ -68,14 +68,6 @@ private:
 
 } // namespace
 
-std::string ToUtf8(const std::wstring& strText)
-{
-    std::string strUtf8(strText.size() * 3 + 1, '\0');
-    strUtf8.resize(static_cast<size_t>(
-        Unicode2Utf8(strText.c_str(), strUtf8.data(), static_cast<int>(strText.size()))));
-    return strUtf8;
-}
-
 CWorkload::CWorkload(int iContacts, wchar_t surname) : m_iContacts(iContacts), m_surname(surname)
 {
     std::string strTemplate = (fs::temp_directory_path() / "qv_bench_XXXXXX").string();
@@ -114,8 +106,8 @@ void CWorkload::FillDatabase() const
         const std::wstring strName = m_surname == 0 ? names.Next() : names.NextOf(m_surname);
         tag_ProviderContact contact;
         contact.iId = i;
-        contact.strName = ToUtf8(strName);
-        contact.strKey = ToUtf8(keys.KeyOf(strName));
+        contact.strName = Narrow(strName);
+        contact.strKey = Narrow(keys.KeyOf(strName));
         contact.strGroups = std::to_string(1 + i % GROUPS);
         contact.strAccounts = std::to_string(1 + i % ACCOUNTS);
         contact.llLastTime = FIRST_TIME_MS + (i * 7919LL % TIME_STEPS) * HOUR_MS;

@@ -3,8 +3,6 @@
 
 #include <string>
 
-std::string ToUtf8(const std::wstring& strText);
-
 // A provider database of iContacts realistic contacts and the index built from it, in a directory
 // of their own that is removed with the object. It becomes the library's data directory.
 class CWorkload

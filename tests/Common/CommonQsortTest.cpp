@@ -84,7 +84,7 @@ protected:
         return vRecords;
     }
 
-    // --- The steps, word for word --------------------------------------------------------------
+    // --- The steps, one by one -----------------------------------------------------------------
 
     static void PlainQuickSort(Contact* a, int lo, int hi)
     {

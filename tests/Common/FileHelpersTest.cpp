@@ -1,7 +1,7 @@
 #include "Common/FileHelpers.h"
 
-#include "Common/Utf8.h"
 #include "tests/Support/DataDirectory.h"
+#include "tests/Support/WideText.h"
 
 #include <gtest/gtest.h>
 
@@ -23,15 +23,6 @@ const char* const HOSTILE_NAMES[] = {" blank around ",
                                      "~",
                                      "-rf",
                                      "张三"};
-
-std::wstring Wide(const std::string& strText)
-{
-    std::wstring strWide(strText.size(), L'\0');
-    const int iUnits =
-        Utf82Unicode(strText.c_str(), strWide.data(), static_cast<int>(strText.size()));
-    strWide.resize(static_cast<size_t>(iUnits));
-    return strWide;
-}
 
 // Each test works with relative names in a directory of its own.
 class FileHelpers : public testing::Test

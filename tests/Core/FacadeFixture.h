@@ -2,7 +2,6 @@
 #define QV_TESTS_CORE_FACADEFIXTURE_H
 
 #include "Common/DataPaths.h"
-#include "Common/Utf8.h"
 #include "Core/LocalizerCodes.h"
 #include "Core/LocalizerLogic.h"
 #include "Filter/FilterChain.h"
@@ -10,7 +9,9 @@
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/ProviderDatabase.h"
+#include "tests/Support/StoreFiles.h"
 #include "tests/Support/StoreImage.h"
+#include "tests/Support/WideText.h"
 
 #include <cstring>
 #include <gtest/gtest.h>
@@ -20,34 +21,7 @@
 #include <utility>
 #include <vector>
 
-constexpr int DEBUG_LINE = 3;
-constexpr int ERROR_LINE = 6;
-
 using Ids = std::vector<int>;
-using Lines = std::vector<std::string>;
-using Records = std::vector<tag_ContactsStruct>;
-
-inline bool operator==(const tag_ContactReg& left, const tag_ContactReg& right)
-{
-    return std::memcmp(&left, &right, sizeof(left)) == 0;
-}
-
-inline std::wstring Wide(const std::string& strUtf8)
-{
-    std::wstring strWide(strUtf8.size(), L'\0');
-    const int iUnits =
-        Utf82Unicode(strUtf8.c_str(), strWide.data(), static_cast<int>(strUtf8.size()) - 1);
-    strWide.resize(static_cast<size_t>(std::max(iUnits, 0)));
-    return strWide;
-}
-
-inline std::string Narrow(const std::wstring& strWide)
-{
-    std::string strUtf8(strWide.size() * 3, '\0');
-    strUtf8.resize(static_cast<size_t>(
-        Unicode2Utf8(strWide.c_str(), strUtf8.data(), static_cast<int>(strWide.size()) - 1)));
-    return strUtf8;
-}
 
 // A provider database and a facade in a data directory of their own, with the pinyin table in
 // place but no index. Every result set that a search hands out is released with the test.
@@ -139,25 +113,6 @@ protected:
         EXPECT_EQ(szWords[CN_WORD_MAX], 0) << "more than the caller has room for";
         found.strWords = Narrow(szWords);
         return found;
-    }
-
-    static std::string RecordsFile()
-    {
-        return CDataDirectory::ReadBytes(CDataPaths::ContactRecords());
-    }
-    static tag_ContactReg Reg()
-    {
-        const std::string strBytes = CDataDirectory::ReadBytes(CDataPaths::ContactReg());
-        tag_ContactReg reg = {-77, -77, -77};
-        EXPECT_EQ(strBytes.size(), sizeof(reg));
-        std::memcpy(&reg, strBytes.data(), std::min(sizeof(reg), strBytes.size()));
-        return reg;
-    }
-
-    static void SetReg(const tag_ContactReg& reg)
-    {
-        CDataDirectory::WriteBytes(CDataPaths::ContactReg(),
-                                   {reinterpret_cast<const char*>(&reg), sizeof(reg)});
     }
 
     // The store is whole and the one that a build from the database makes.

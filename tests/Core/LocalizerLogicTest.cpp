@@ -10,12 +10,6 @@
 namespace
 {
 
-std::string BytesOf(const Records& vRecords)
-{
-    return {reinterpret_cast<const char*>(vRecords.data()),
-            vRecords.size() * sizeof(tag_ContactsStruct)};
-}
-
 class CMemInitTest : public CFacadeTest
 {
 protected:

@@ -12,10 +12,6 @@
 #include <algorithm>
 #include <functional>
 
-constexpr int DEBUG_LINE = 3;
-constexpr int ERROR_LINE = 6;
-using Lines = std::vector<std::string>;
-
 // "1.2.3" and so on up to iLast.
 inline std::string IdText(int iLast)
 {

@@ -10,9 +10,6 @@
 #include <cstring>
 #include <string>
 
-constexpr int DEBUG_LINE = 3;
-constexpr int ERROR_LINE = 6;
-
 // The built pinyin table, installed and mapped, in a data directory of its own.
 class LocalizerFixture : public testing::Test
 {

@@ -2,6 +2,7 @@
 
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "LocalizerImpl/RankingOrder.h"
+#include "tests/LocalizerImpl/PlainQuickSort.h"
 #include "tests/Support/MemoryFailure.h"
 
 #include <gtest/gtest.h>
@@ -24,41 +25,6 @@ std::tuple<int, int, int, int> KeysOf(const _MatchResult& match, const Details& 
     const int iSpan = (match.iMatchPos & 0xFFFF) - iStart + 1;
     return {-match.iMatchType, iStart, -iSpan,
             vDetails[static_cast<size_t>(match.iIndex)].iSortIndex};
-}
-
-// The quicksort, word for word.
-void PlainQuickSort(_MatchResult* v, int iLow, int iHigh, const Details& vDetails)
-{
-    if (iLow >= iHigh)
-    {
-        return;
-    }
-    const _MatchResult pivot = v[iLow];
-    const auto pivotKeys = KeysOf(pivot, vDetails);
-    int i = iLow;
-    int j = iHigh;
-    while (i < j)
-    {
-        while (j > i && !(KeysOf(v[j], vDetails) < pivotKeys))
-        {
-            --j;
-        }
-        if (j > i)
-        {
-            v[i++] = v[j];
-        }
-        while (i < j && !(KeysOf(v[i], vDetails) > pivotKeys))
-        {
-            ++i;
-        }
-        if (i < j)
-        {
-            v[j--] = v[i];
-        }
-    }
-    v[i] = pivot;
-    PlainQuickSort(v, iLow, i - 1, vDetails);
-    PlainQuickSort(v, i + 1, iHigh, vDetails);
 }
 
 void Fill(android::Vector<_MatchResult>& vTarget, const Matches& vMatches)
@@ -122,7 +88,9 @@ TEST(MatchRanking, LeavesEqualMatchesWhereTheQuicksortLeavesThem)
         Fill(vSorted, vExpected);
         android::Vector<_MatchResult> vRanked;
         Fill(vRanked, test.vMatches);
-        PlainQuickSort(vExpected.data(), 0, iLast, test.vDetails);
+        PlainQuickSort(vExpected.data(), 0, iLast,
+                       [&](const _MatchResult& a, const _MatchResult& b)
+                       { return KeysOf(a, test.vDetails) < KeysOf(b, test.vDetails); });
         CQVLocalizerManager::LocalResultQuickSort(vSorted, 0, iLast, test.vDetails.data());
         ASSERT_EQ(Indexes(vSorted), Indexes(vExpected)) << "round " << iRound;
         EXPECT_EQ(RankMatches(vRanked, test.vFirstSplits.data(), test.vDetails.data()), 0);

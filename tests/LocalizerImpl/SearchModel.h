@@ -52,7 +52,6 @@ private:
     void OfferLastPiece(wchar_t code, const std::wstring& strPiece);
     void OfferNext(wchar_t code);
     static bool ComesBefore(const tag_Found& a, const tag_Found& b);
-    void Sort(int iLow, int iHigh);
     const char* Spelling(wchar_t code, int iReading, bool bKeys) const;
 
     const PYOFWORDS* m_pTable;

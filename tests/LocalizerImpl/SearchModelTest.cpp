@@ -3,11 +3,12 @@
 
 #include "tests/LocalizerImpl/SearchModel.h"
 
-#include "Common/Utf8.h"
 #include "LocalizerImpl/QVNumLocalizerManager.h"
 #include "LocalizerImpl/QVWordLocalizerManager.h"
 #include "LocalizerImpl/Syllables.h"
+#include "tests/LocalizerImpl/PlainQuickSort.h"
 #include "tests/Support/DataDirectory.h"
+#include "tests/Support/WideText.h"
 
 #include <gtest/gtest.h>
 
@@ -15,20 +16,13 @@
 #include <cstring>
 #include <memory>
 #include <random>
+#include <tuple>
 
 namespace
 {
 
 constexpr unsigned SEED = 20240229;
 constexpr size_t CANDIDATES = 20;
-
-std::string Narrow(const std::wstring& strText)
-{
-    std::string strUtf8(strText.size() * 3, '\0');
-    strUtf8.resize(static_cast<size_t>(
-        Unicode2Utf8(strText.c_str(), strUtf8.data(), static_cast<int>(strText.size()))));
-    return strUtf8;
-}
 
 } // namespace
 
@@ -228,50 +222,9 @@ void CSearchModel::Succeed(const Pieces& vPieces, const std::wstring& strCodes, 
 
 bool CSearchModel::ComesBefore(const tag_Found& a, const tag_Found& b)
 {
-    if (a.iType != b.iType)
-    {
-        return a.iType > b.iType;
-    }
-    if (a.iStart != b.iStart)
-    {
-        return a.iStart < b.iStart;
-    }
-    return a.iPieces != b.iPieces ? a.iPieces > b.iPieces : a.iSortIndex < b.iSortIndex;
-}
-
-// Quicksort around the first entry; equal entries end where it happens to leave them.
-void CSearchModel::Sort(int iLow, int iHigh)
-{
-    const auto at = [this](int i) -> tag_Found& { return m_vFound[static_cast<size_t>(i)]; };
-    if (iLow >= iHigh)
-    {
-        return;
-    }
-    const tag_Found pivot = at(iLow);
-    int i = iLow;
-    int j = iHigh;
-    while (i < j)
-    {
-        while (j > i && !ComesBefore(at(j), pivot))
-        {
-            --j;
-        }
-        if (j > i)
-        {
-            at(i++) = at(j);
-        }
-        while (i < j && !ComesBefore(pivot, at(i)))
-        {
-            ++i;
-        }
-        if (i < j)
-        {
-            at(j--) = at(i);
-        }
-    }
-    at(i) = pivot;
-    Sort(iLow, i - 1);
-    Sort(i + 1, iHigh);
+    const auto keys = [](const tag_Found& found)
+    { return std::tuple(-found.iType, found.iStart, -found.iPieces, found.iSortIndex); };
+    return keys(a) < keys(b);
 }
 
 tag_Answer CSearchModel::Search(const std::vector<tag_LocalizerDetail>& vCandidates,
@@ -288,7 +241,7 @@ tag_Answer CSearchModel::Search(const std::vector<tag_LocalizerDetail>& vCandida
             Try(vPieces, vCandidates[i], i);
         }
     }
-    Sort(0, static_cast<int>(m_vFound.size()) - 1);
+    PlainQuickSort(m_vFound.data(), 0, static_cast<int>(m_vFound.size()) - 1, ComesBefore);
     tag_Answer answer;
     for (const tag_Found& found : m_vFound)
     {

@@ -23,7 +23,7 @@ TEST_F(ContactStore, RewritesTheStore)
     EXPECT_EQ(Build(vFew), 0);
     EXPECT_EQ(Reg(), (tag_ContactReg{20, 1, 1020}));
     EXPECT_EQ(RecordsFile(),
-              Bytes(vFew) + Bytes(vOld).substr(20 * 704) + std::string(1000 * 704, '\0'))
+              BytesOf(vFew) + BytesOf(vOld).substr(20 * 704) + std::string(1000 * 704, '\0'))
         << "slots behind the new records keep what they held, the file its length";
     int iTotal = 0;
     EXPECT_EQ(m_store.GetMemSize(&iTotal), 1020);
@@ -88,10 +88,10 @@ TEST_F(ContactStore, MarksABuildThatIsNotFinished)
             tag_ContactsInfo info = {90, reinterpret_cast<tag_ContactsStruct*>(pSource)};
             CMemManger().InitContactRecord(&info);
         });
-    EXPECT_NE(RecordsFile().substr(0, 704), Bytes(vOld).substr(0, 704)) << "some were written";
+    EXPECT_NE(RecordsFile().substr(0, 704), BytesOf(vOld).substr(0, 704)) << "some were written";
     EXPECT_EQ(Reg(), (tag_ContactReg{100, 0, 0}));
     EXPECT_EQ(Build(vOld), 0) << "the lock is free";
-    EXPECT_EQ(RecordsFile().substr(0, 100 * 704), Bytes(vOld));
+    EXPECT_EQ(RecordsFile().substr(0, 100 * 704), BytesOf(vOld));
 }
 
 TEST_F(ContactStore, CopiesAllRecordsOutAsSoonAsItHasTheLock)

@@ -19,8 +19,6 @@
 namespace
 {
 
-using Lines = std::vector<std::string>;
-
 // The error text as it stands at the end of most lines.
 std::string ErrorText(int iError, const char* szBetween = " : ")
 {
@@ -35,7 +33,7 @@ protected:
     // The error lines since the last call, without the numbers of the descriptors.
     Lines Errors()
     {
-        Lines vTexts = m_log.Texts(6);
+        Lines vTexts = m_log.Texts(ERROR_LINE);
         for (std::string& strText : vTexts)
         {
             strText = std::regex_replace(strText, std::regex("hFile=[0-9]+"), "hFile=#");

@@ -17,9 +17,6 @@ namespace
 
 namespace fs = std::filesystem;
 
-constexpr int DEBUG_LINE = 3;
-using Lines = std::vector<std::string>;
-
 std::ptrdiff_t OpenDescriptors()
 {
     return std::distance(fs::directory_iterator("/proc/self/fd"), fs::directory_iterator());

@@ -15,8 +15,6 @@
 namespace
 {
 
-constexpr uid_t NOBODY = 65534;
-
 [[noreturn]] void RunAndLeave(const std::function<void()>& fnBody)
 {
     fnBody();
@@ -61,15 +59,6 @@ int StatusOfChild(const std::function<void()>& fnBody)
         RunAndLeave(fnBody);
     }
     return WaitFor(iPid);
-}
-
-void DropRoot()
-{
-    if (geteuid() == 0 &&
-        (setresgid(NOBODY, NOBODY, NOBODY) != 0 || setresuid(NOBODY, NOBODY, NOBODY) != 0))
-    {
-        throw std::runtime_error("cannot give up root");
-    }
 }
 
 CLockHolder::CLockHolder()

@@ -11,9 +11,6 @@ bool RunInChild(const std::function<void()>& fnBody);
 // The same without expectations: the child's status as waitpid tells it; its output is dropped.
 int StatusOfChild(const std::function<void()>& fnBody);
 
-// Gives up root for good, in a child; done already when the tests do not run as root.
-void DropRoot();
-
 // A second process that holds the store lock for as long as the object lives, or until Kill.
 class CLockHolder
 {

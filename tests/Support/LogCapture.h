@@ -4,6 +4,11 @@
 #include <string>
 #include <vector>
 
+constexpr int DEBUG_LINE = 3;
+constexpr int ERROR_LINE = 6;
+
+using Lines = std::vector<std::string>;
+
 // One line of the library's log.
 struct tag_LogLine
 {

@@ -4,7 +4,7 @@
 #include "Common/NameOrder.h"
 #include "Common/Utf8.h"
 #include "Core/LocalizerLogic.h"
-#include "tests/Support/DataDirectory.h"
+#include "tests/Support/StoreFiles.h"
 
 #include <algorithm>
 #include <cstdlib>
@@ -17,8 +17,6 @@ namespace fs = std::filesystem;
 
 namespace
 {
-
-using Records = std::vector<tag_ContactsStruct>;
 
 // A root of its own beside another one, whose database and pinyin table it uses.
 class CSecondRoot
@@ -59,96 +57,57 @@ void Build(CLocalizerLogic& logic)
     }
 }
 
-// Whether a has to stand behind b.
-bool SortsBehind(const tag_ContactsStruct& a, const tag_ContactsStruct& b, int iSortType)
+Records ById(Records vRecords)
 {
-    return iSortType == STORE_ORDER_TIME ? a.llLastTimeContacted < b.llLastTimeContacted
-                                         : NameSortsBehind(a, b);
-}
-
-// The end of the run of records with the sort keys of record uFirst.
-size_t RunEnd(const Records& vRecords, size_t uFirst, int iSortType)
-{
-    size_t uEnd = uFirst + 1;
-    while (uEnd < vRecords.size() && !SortsBehind(vRecords[uEnd], vRecords[uFirst], iSortType))
-    {
-        ++uEnd;
-    }
-    return uEnd;
-}
-
-// The records uFirst to uEnd - 1 by their ids and without their places.
-Records Comparable(const Records& vRecords, size_t uFirst, size_t uEnd)
-{
-    Records vRun(vRecords.begin() + static_cast<std::ptrdiff_t>(uFirst),
-                 vRecords.begin() + static_cast<std::ptrdiff_t>(uEnd));
-    for (tag_ContactsStruct& record : vRun)
-    {
-        record.iSortIndex = 0;
-    }
-    std::sort(vRun.begin(), vRun.end(),
+    std::sort(vRecords.begin(), vRecords.end(),
               [](const auto& a, const auto& b) { return a.iContactID < b.iContactID; });
-    return vRun;
+    return vRecords;
 }
 
-// The first byte that differs, the record's size when none does.
-size_t FirstDifference(const tag_ContactsStruct& a, const tag_ContactsStruct& b)
+// The first byte that differs in records without their places, the record's size when none does.
+size_t FirstDifference(tag_ContactsStruct a, tag_ContactsStruct b)
 {
+    a.iSortIndex = b.iSortIndex = 0;
     const char* pA = reinterpret_cast<const char*>(&a);
     return static_cast<size_t>(
         std::mismatch(pA, pA + sizeof(a), reinterpret_cast<const char*>(&b)).first - pA);
 }
 
-std::string RunDifference(const Records& vStore, const Records& vFresh, size_t uFirst)
+std::string RecordDifference(const Records& vStore, const Records& vFresh)
 {
-    std::ostringstream text;
     for (size_t i = 0; i < vFresh.size(); ++i)
     {
-        if (vStore[i].iContactID != vFresh[i].iContactID)
-        {
-            text << "slots from " << uFirst << ": contact " << vStore[i].iContactID
-                 << " instead of " << vFresh[i].iContactID;
-            return text.str();
-        }
         const size_t uByte = FirstDifference(vStore[i], vFresh[i]);
         if (uByte < sizeof(tag_ContactsStruct))
         {
-            text << "contact " << vStore[i].iContactID << " differs from byte " << uByte;
-            return text.str();
+            return "contact " + std::to_string(vStore[i].iContactID) + " differs from contact " +
+                   std::to_string(vFresh[i].iContactID) + " from byte " + std::to_string(uByte);
         }
     }
     return {};
 }
 
-std::string PlaceDifference(const tag_StoreImage& store)
+bool IsInPlace(const Records& vRecords, size_t uSlot, int iSortType)
 {
-    for (size_t i = 0; i < store.vRecords.size(); ++i)
+    const tag_ContactsStruct& record = vRecords[uSlot];
+    if (iSortType == STORE_ORDER_TIME)
     {
-        if (store.vRecords[i].iSortIndex != static_cast<int32_t>(i))
-        {
-            return "slot " + std::to_string(i) + " has iSortIndex " +
-                   std::to_string(store.vRecords[i].iSortIndex);
-        }
+        return uSlot == 0 || vRecords[uSlot - 1].llLastTimeContacted >= record.llLastTimeContacted;
     }
-    return {};
+    return record.iSortIndex == static_cast<int32_t>(uSlot) &&
+           (uSlot == 0 || !NameSortsBehind(vRecords[uSlot - 1], record));
 }
 
 } // namespace
 
 tag_StoreImage ReadStore()
 {
-    const std::string strReg = CDataDirectory::ReadBytes(CDataPaths::ContactReg());
-    const std::string strRecords = CDataDirectory::ReadBytes(CDataPaths::ContactRecords());
-    tag_StoreImage image;
-    if (strReg.size() != sizeof(image.reg))
-    {
-        throw std::runtime_error("ContactsReg.bin is no registration record");
-    }
-    std::memcpy(&image.reg, strReg.data(), sizeof(image.reg));
+    const std::string strRecords = RecordsFile();
+    tag_StoreImage image = {Reg(), {}};
     const size_t uBytes = static_cast<size_t>(image.reg.iTotalNum) * sizeof(tag_ContactsStruct);
     if (image.reg.iTotalNum < 0 || uBytes > strRecords.size())
     {
-        throw std::runtime_error("ContactsLocalizer.bin is too short for its records");
+        throw std::runtime_error("the store's files do not fit together");
     }
     image.vRecords.resize(static_cast<size_t>(image.reg.iTotalNum));
     if (uBytes > 0)
@@ -180,17 +139,20 @@ std::string DifferenceOf(const tag_StoreImage& store, const tag_StoreImage& fres
              << " instead of " << fresh.reg.iTotalNum << " in order " << fresh.reg.iSortType;
         return text.str();
     }
-    const int iSortType = fresh.reg.iSortType;
-    std::string strDifference;
-    for (size_t i = 0; i < fresh.vRecords.size() && strDifference.empty();)
+    const std::string strDifference = RecordDifference(ById(store.vRecords), ById(fresh.vRecords));
+    return strDifference.empty() ? OrderFaultOf(store) : strDifference;
+}
+
+std::string OrderFaultOf(const tag_StoreImage& image)
+{
+    for (size_t i = 0; i < image.vRecords.size(); ++i)
     {
-        const size_t uEnd = RunEnd(fresh.vRecords, i, iSortType);
-        strDifference = RunDifference(Comparable(store.vRecords, i, uEnd),
-                                      Comparable(fresh.vRecords, i, uEnd), i);
-        i = uEnd;
+        if (!IsInPlace(image.vRecords, i, image.reg.iSortType))
+        {
+            return "a wrong order in slot " + std::to_string(i);
+        }
     }
-    return strDifference.empty() && iSortType == STORE_ORDER_NAME ? PlaceDifference(store)
-                                                                  : strDifference;
+    return {};
 }
 
 std::string LocalizerKeyOf(const std::string& strName)

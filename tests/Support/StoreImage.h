@@ -22,9 +22,13 @@ tag_StoreImage ReadStore();
 tag_StoreImage FreshBuild(const std::string& strRoot, int iSortType);
 
 // What makes the store another one than the fresh build, empty when nothing does: the counts and
-// sort type, the bytes of every record but its iSortIndex, the order up to records with equal
-// sort keys, and in name order an iSortIndex that is not the slot. The capacity is not compared.
+// sort type, the bytes of every record but its iSortIndex, the order. The capacity is not
+// compared, nor the order of records with equal sort keys.
 std::string DifferenceOf(const tag_StoreImage& store, const tag_StoreImage& fresh);
+
+// The first record that is not in the order of the sort type or, in name order, has an iSortIndex
+// that is not its slot; empty when there is none.
+std::string OrderFaultOf(const tag_StoreImage& image);
 
 // Whether the capacity asks for a rebuild.
 inline bool IsMarked(const tag_ContactReg& reg)

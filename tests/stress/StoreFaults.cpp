@@ -1,6 +1,5 @@
 #include "tests/stress/StoreFaults.h"
 
-#include "Common/NameOrder.h"
 #include "tests/stress/Process.h"
 
 #include <cstring>
@@ -15,12 +14,6 @@ bool IsBuiltRecord(const tag_ContactsStruct& record)
     return record.iContactID > 0 && record.iPadding == 0 && record.szName[0] != 0 &&
            record.szName[CONTACT_MAX_NAME] == 0 && record.szLocalizerKey[CONTACT_MAX_KEY] == 0 &&
            std::memcmp(record.szReserved, empty.szReserved, sizeof(empty.szReserved)) == 0;
-}
-
-bool IsInOrder(const tag_ContactsStruct& first, const tag_ContactsStruct& second, int iSortType)
-{
-    return iSortType == STORE_ORDER_TIME ? first.llLastTimeContacted >= second.llLastTimeContacted
-                                         : !NameSortsBehind(first, second);
 }
 
 } // namespace
@@ -40,13 +33,8 @@ std::string FaultOf(const tag_StoreImage& image)
         {
             return "contact " + std::to_string(record.iContactID) + " again" + strSlot;
         }
-        if (i > 0 && !IsMarked(image.reg) &&
-            !IsInOrder(image.vRecords[i - 1], record, image.reg.iSortType))
-        {
-            return "a wrong order" + strSlot;
-        }
     }
-    return {};
+    return IsMarked(image.reg) ? std::string() : OrderFaultOf(image);
 }
 
 void RequireFreshStore(const std::string& strRoot, const std::string& strText)

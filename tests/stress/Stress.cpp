@@ -12,6 +12,7 @@
 #include "MemManager/SingleMutex.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
+#include "tests/Support/StoreFiles.h"
 #include "tests/Support/StoreImage.h"
 #include "tests/stress/Process.h"
 #include "tests/stress/ProviderActions.h"
@@ -36,7 +37,6 @@ constexpr unsigned int MAX_HOLD_PAUSE = 30'000;
 constexpr unsigned int LONG_HOLD_ONE_IN = 120;
 
 // What the library logs when it gives up taking the lock.
-constexpr int ERROR_LINE = 6;
 constexpr const char* REFUSED = "QV_Contacts:CopyContactsResult write share memo lock false return";
 
 // What the processes tell each other. The provider's change number iBegun is under
@@ -109,19 +109,11 @@ void RunLockHolder(tag_Board& board, unsigned int uSeed)
 
 // --- A round -----------------------------------------------------------------------------------
 
-template <typename T>
-std::string BytesOf(const T* pData, size_t uCount)
-{
-    return {reinterpret_cast<const char*>(pData), uCount * sizeof(T)};
-}
-
 // Makes the image the store of the library's present root. The sort type is given apart.
 void InstallStore(const tag_StoreImage& image, int iSortType)
 {
-    const tag_ContactReg reg = {image.reg.iTotalNum, iSortType, 0};
-    CDataDirectory::WriteBytes(CDataPaths::ContactRecords(),
-                               BytesOf(image.vRecords.data(), image.vRecords.size()));
-    CDataDirectory::WriteBytes(CDataPaths::ContactReg(), BytesOf(&reg, 1));
+    CDataDirectory::WriteBytes(CDataPaths::ContactRecords(), BytesOf(image.vRecords));
+    SetReg({image.reg.iTotalNum, iSortType, 0});
 }
 
 class CRound

@@ -50,7 +50,7 @@ public:
     // all contacts that pass pFilterChain, or for IME_SEARCH_SPECIAL within the special numbers.
     // pFilterChain is never null, also where it is not used.
     //   szInput    at most 10 characters; its letters become lowercase and its Chinese characters
-    //              their codes, in place
+    //              their codes, in place, also in a search that fails afterwards
     //   ppResult   gets a set of its own, released with FreeSearchResult: the matches, best
     //              first; null when only its memory could not be had; untouched after any earlier
     //              failure

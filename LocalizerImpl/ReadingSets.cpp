@@ -223,6 +223,7 @@ void CReadingSets::FillOtherKeys()
             m_pKeyOf[uCode] = static_cast<uint16_t>(m_iCount + iPlace);
         }
     }
+    m_pKeyOf[LOC_NO_CODE] = static_cast<uint16_t>(EndKey());
 }
 
 int CReadingSets::KeyOfWide(wchar_t code) const
@@ -232,7 +233,7 @@ int CReadingSets::KeyOfWide(wchar_t code) const
     {
         return m_iCount + PLACE_WIDE_OTHER;
     }
-    return uCode < CODE_COUNT ? m_pKeyOf[uCode] : m_iCount + PLACE_UNKNOWN;
+    return uCode != LOC_NO_CODE && uCode < CODE_COUNT ? m_pKeyOf[uCode] : m_iCount + PLACE_UNKNOWN;
 }
 
 wchar_t CReadingSets::CompactCodeOf(int iKey) const
@@ -251,7 +252,7 @@ wchar_t CReadingSets::CompactCodeOf(int iKey) const
     {
         return LOC_DIGIT_BASE + (iPlace - PLACE_DIGIT);
     }
-    if (iPlace == PLACE_UNKNOWN)
+    if (iPlace == PLACE_UNKNOWN || iPlace == PLACE_END)
     {
         return LOC_NO_CODE;
     }

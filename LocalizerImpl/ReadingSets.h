@@ -47,7 +47,8 @@ public:
     }
 
     // Keys are 0..KeyCount() - 1, first one for each set. A code acts by its low 16 bits, except
-    // that LOC_OTHER with upper bits set, which only a damaged record holds, has another key.
+    // that LOC_OTHER and LOC_NO_CODE have other keys with upper bits set, which only a damaged
+    // record holds.
     int KeyCount() const { return m_iCount + PLACE_COUNT; }
     int KeyOf(wchar_t code) const
     {
@@ -59,6 +60,8 @@ public:
     // Up to the last code of all.
     static constexpr uint32_t CODE_COUNT = LOC_DIGIT_BASE + LOC_DIGIT_COUNT;
     wchar_t CompactCodeOf(int iKey) const;
+    // The key of LOC_NO_CODE, which no other code has.
+    int EndKey() const { return m_iCount + PLACE_END; }
 
     // The record of a Chinese code as the pinyin table has it.
     PYOFWORDS RecordOf(wchar_t code) const;
@@ -70,7 +73,8 @@ private:
     static constexpr int PLACE_OTHER = PLACE_DIGIT + LOC_DIGIT_COUNT;
     static constexpr int PLACE_WIDE_OTHER = PLACE_OTHER + 1;
     static constexpr int PLACE_UNKNOWN = PLACE_OTHER + 2;
-    static constexpr int PLACE_COUNT = PLACE_OTHER + 3;
+    static constexpr int PLACE_END = PLACE_OTHER + 3; // of LOC_NO_CODE alone
+    static constexpr int PLACE_COUNT = PLACE_OTHER + 4;
 
     // 0 for units that are neither a small letter nor a digit: nothing is kept of these.
     static uint64_t InitialBit(wchar_t unit)

@@ -14,63 +14,20 @@ int LowestBit(unsigned uBits)
 } // namespace
 
 CRunFinder::CRunFinder(CPieceTable& table, bool bAnywhere)
-    : m_table(table), m_bAnywhere(bAnywhere),
+    : m_table(table), m_states(table, bAnywhere), m_bAnywhere(bAnywhere),
       m_iSplitWords(((1 << std::max(table.InputLength() - 1, 0)) + WORD_BITS - 1) / WORD_BITS)
 {
 }
 
-// All starts and splits at once: which offsets are reached behind each character. Names come sorted
-// for the most part, so one begins as the name before it did, and goes on from there.
-bool CRunFinder::CanMatch(const wchar_t* pCodes)
+tag_NameMatch CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate)
 {
-    int i = 0;
-    while (i < m_iKeys && pCodes[i] == m_aLastCodes[i])
-    {
-        ++i;
-    }
-    if (i < m_iKeys || !m_bReachesEnd)
-    {
-        GoOn(pCodes, i);
-    }
-    return m_bReachesEnd;
-}
-
-// Follows the codes from number i on, up to the end of the text or of the name.
-void CRunFinder::GoOn(const wchar_t* pCodes, int i)
-{
-    const CPieceTable::CLookup table(m_table);
-    const unsigned uEnd = 1U << m_table.InputLength();
-    unsigned uReached = m_auReached[i];
-    for (; i < CONTACT_MAX_KEY && pCodes[i] != 0 && (uReached & uEnd) == 0; ++i)
-    {
-        const int iKey = table.KeyOf(pCodes[i]);
-        unsigned uNext = m_bAnywhere || i == 0 ? table.Ends(iKey, 0) : 0;
-        for (unsigned uOffsets = uReached; uOffsets != 0; uOffsets &= uOffsets - 1)
-        {
-            uNext |= table.Ends(iKey, LowestBit(uOffsets));
-        }
-        m_aLastCodes[i] = pCodes[i];
-        m_aiKeys[i] = iKey;
-        m_auReached[i + 1] = uNext;
-        uReached = uNext;
-    }
-    m_iKeys = i;
-    m_bReachesEnd = (uReached & uEnd) != 0;
-}
-
-bool CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& match)
-{
-    if (!CanMatch(pCodes))
-    {
-        return false;
-    }
     m_pCodes = pCodes;
     m_iCandidate = iCandidate;
     m_uLastSplit = 0;
     std::fill_n(m_auSeen, m_iSplitWords, 0);
     m_match = {MATCH_LIST, 0, UINT16_MAX};
     m_iLength = NameLength(pCodes);
-    for (int i = m_iKeys; i < m_iLength; ++i)
+    for (int i = 0; i < m_iLength; ++i)
     {
         m_aiKeys[i] = m_table.KeyOf(pCodes[i]);
     }
@@ -82,8 +39,7 @@ bool CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& 
             Extend(0, 0, 0, true);
         }
     }
-    match = m_match;
-    return true;
+    return m_match;
 }
 
 // Lays one more piece, from iOffset on, on the run's character number iPiece.

@@ -3,6 +3,7 @@
 
 #include "LocalizerImpl/FirstFound.h"
 #include "LocalizerImpl/PieceTable.h"
+#include "LocalizerImpl/ReachStates.h"
 
 #include <cstdint>
 
@@ -27,13 +28,16 @@ public:
     // bAnywhere false: runs begin at a name's first character only.
     CRunFinder(CPieceTable& table, bool bAnywhere);
 
-    // Whether the text spells a run of the name with these codes (at most CONTACT_MAX_KEY, ending
-    // at the first 0).
-    bool CanMatch(const wchar_t* pCodes);
+    // False for want of memory; then nothing else may be called.
+    bool IsReady() const { return m_states.IsReady(); }
 
-    // The same; then match tells how, and the rows of the characters that took a last piece or
-    // stood behind a run are marked, and the former noted as found by candidate iCandidate.
-    bool Find(const wchar_t* pCodes, int32_t iCandidate, tag_NameMatch& match);
+    // Whether the text spells a run of the name with these CONTACT_MAX_KEY codes, of which those
+    // from the first LOC_NO_CODE on do not count.
+    bool CanMatch(const wchar_t* pCodes) { return m_states.Accept(pCodes); }
+
+    // How a name matches that CanMatch. The rows of the characters that took a last piece or stood
+    // behind a run are marked, and the former noted as found by candidate iCandidate.
+    tag_NameMatch Find(const wchar_t* pCodes, int32_t iCandidate);
 
     const CFirstFound& FirstFound() const { return m_firstFound; }
 
@@ -41,23 +45,18 @@ private:
     static constexpr int WORD_BITS = 64;
     static constexpr int SPLIT_WORDS = (1 << (LOC_MAX_INPUT - 1)) / WORD_BITS;
 
-    void GoOn(const wchar_t* pCodes, int i);
     void Extend(int iPiece, int iOffset, uint32_t uSplit, bool bAllFull);
     void Record(int iPieces, int iLastOffset, uint32_t uSplit, bool bAllFull);
     void MarkFound(int iPieces, int iLastOffset, uint32_t uSplit);
     bool MarkSeen(uint32_t uSplit);
 
     CPieceTable& m_table;
+    CReachStates m_states;
     CFirstFound m_firstFound;
     bool m_bAnywhere;
     int m_iSplitWords; // of m_auSeen that the text's splits need
     const wchar_t* m_pCodes = nullptr;
-    // The last name as far as it was followed: codes, their keys, the offsets reached before each.
-    wchar_t m_aLastCodes[CONTACT_MAX_KEY] = {};
     int m_aiKeys[CONTACT_MAX_KEY] = {};
-    unsigned m_auReached[CONTACT_MAX_KEY + 1] = {};
-    int m_iKeys = 0;
-    bool m_bReachesEnd = false;
     int m_iLength = 0;
     int m_iStart = 0;
     int32_t m_iCandidate = 0;

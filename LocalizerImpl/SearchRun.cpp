@@ -130,6 +130,11 @@ int CSearchRun::Begin(wchar_t* szInput)
         return LOC_ERR_MAP;
     }
     m_finder.emplace(*m_pieces, m_manager.m_bMatchAnywhere != 0);
+    if (!m_finder->IsReady())
+    {
+        m_finder.reset();
+        return LOC_ERR_MAP;
+    }
     return 0;
 }
 
@@ -200,10 +205,14 @@ bool CSearchRun::FindMatches(const tag_LocalizerResult& candidates)
     android::Vector<uint16_t> vFirstSplits; // when each match was first found
     for (int32_t i = 0; candidates.pDetail != nullptr && i < candidates.iResultNum; ++i)
     {
-        tag_NameMatch match;
-        if (m_finder->Find(candidates.pDetail[i].szLocalizerKey, i, match) &&
-            (vFirstSplits.add(match.uFirstSplit) < 0 ||
-             vMatches.add({i, match.iMatchType, match.iMatchPos, 0}) < 0))
+        const wchar_t* pCodes = candidates.pDetail[i].szLocalizerKey;
+        if (!m_finder->CanMatch(pCodes))
+        {
+            continue;
+        }
+        const tag_NameMatch match = m_finder->Find(pCodes, i);
+        if (vFirstSplits.add(match.uFirstSplit) < 0 ||
+            vMatches.add({i, match.iMatchType, match.iMatchPos, 0}) < 0)
         {
             return false;
         }

@@ -3,6 +3,7 @@
 
 #include "tests/LocalizerImpl/SearchModel.h"
 
+#include "Common/DataPaths.h"
 #include "LocalizerImpl/QVNumLocalizerManager.h"
 #include "LocalizerImpl/QVWordLocalizerManager.h"
 #include "LocalizerImpl/Syllables.h"
@@ -444,6 +445,43 @@ const tag_RandomCase RANDOM_CASES[] = {
     {"as many names as a fast path sees", 1500, 900, 1, 25},
     {"few characters, many matches", 1200, 6, 1, 12},
 };
+
+// Spellings of two letters and two keys that no person has: nearly every character has readings
+// of its own, and texts are cut in ways that leave many different offsets reached.
+TEST_F(CSearchModelTest, ATableOfRandomReadings)
+{
+    std::string strTable = CDataDirectory::ReadBytes(m_directory.File("pyfile.bin"));
+    std::mt19937 random(SEED);
+    for (size_t i = 0; i < PY_WORD_COUNT; ++i)
+    {
+        for (size_t k = 0; k < size_t{2} * PY_READINGS; ++k)
+        {
+            char* szSpelling = &strTable[i * sizeof(PYOFWORDS) + offsetof(PYOFWORDS, szPinyin) +
+                                         k * (PY_MAX_LETTERS + 1)];
+            std::fill_n(szSpelling, PY_MAX_LETTERS + 1, '\0');
+            std::generate_n(szSpelling, random() % (PY_MAX_LETTERS + 1),
+                            [&] { return (k < PY_READINGS ? "an" : "26")[random() % 2]; });
+        }
+    }
+    CDataDirectory::WriteBytes(CDataPaths::PinyinMapping(), strTable);
+    CRandomNames names(Table(), SEED);
+    std::vector<tag_LocalizerDetail> vNames;
+    for (int i = 0; i < 120; ++i)
+    {
+        vNames.push_back(MakeDetail(i, i, names.Codes(PY_WORD_COUNT)));
+    }
+    for (int t = 0; t < 24 && !HasFailure(); ++t)
+    {
+        std::wstring strText;
+        std::vector<tag_LocalizerDetail> vNarrowed = vNames;
+        while (strText.size() < 10)
+        {
+            strText += (t % 2 == 0 ? L"26" : L"an")[random() % 2];
+            vNarrowed = Check(vNarrowed, strText, t % 2 == 0);
+        }
+        Check(vNames, strText, t % 2 == 0, false);
+    }
+}
 
 TEST_F(CSearchModelTest, LongTextsOverRandomNamesTypedKeyByKey)
 {

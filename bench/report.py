@@ -27,7 +27,8 @@ Machine: {cpu}, {cores} cores; {date}.
 Floors, in the same run: `copy` maps the store file, copies its records into touched memory and
 unmaps; `copy-fresh` the same into memory fresh from the system; `scan` reads all result entries;
 `entries` copies them into fresh memory; `sql` steps through the statements of a full read;
-`rewrite` copies the records into a shared mapping of an existing file.
+`rewrite` copies the records into a shared mapping of an existing file. A keystroke is held
+against a `scan` measured before its text was typed and `entries` measured right behind it.
 """
 
 

@@ -8,8 +8,8 @@ class CCandidateTest
 public:
     virtual ~CCandidateTest() = default;
 
-    // False when no contact with these codes (at most CONTACT_MAX_KEY, ending at the first 0) can
-    // be in the search's result.
+    // False when no contact with these CONTACT_MAX_KEY codes, of which those from the first 0 on do
+    // not count, can be in the search's result.
     virtual bool MayMatch(const wchar_t* pCodes) = 0;
 };
 

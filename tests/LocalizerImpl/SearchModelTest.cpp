@@ -339,6 +339,10 @@ TEST_F(CSearchModelTest, EveryShortTextOverCraftedNames)
     {
         const int i = static_cast<int>(vNames.size());
         vNames.push_back(MakeDetail(100 + i, i / 2, CodesOf(szName))); // places in pairs
+        if (i % 2 == 0 && CodesOf(szName).size() < 3)
+        {
+            vNames.back().szLocalizerKey[3] = CodesOf(L"张")[0]; // behind the end
+        }
     }
     const std::pair<std::wstring, bool> ALPHABETS[] = {{L"zhansi#张", false}, {L"246972", true}};
     for (const auto& [strAlphabet, bDigits] : ALPHABETS)

@@ -458,13 +458,14 @@ TEST_F(CSearchModelTest, ATableOfRandomReadings)
     std::mt19937 random(SEED);
     for (size_t i = 0; i < PY_WORD_COUNT; ++i)
     {
-        for (size_t k = 0; k < size_t{2} * PY_READINGS; ++k)
+        char* pSpelling = &strTable[i * sizeof(PYOFWORDS) + offsetof(PYOFWORDS, szPinyin)];
+        for (const char* szUnits : {"an", "an", "an", "26", "26", "26"})
         {
-            char* szSpelling = &strTable[i * sizeof(PYOFWORDS) + offsetof(PYOFWORDS, szPinyin) +
-                                         k * (PY_MAX_LETTERS + 1)];
-            std::fill_n(szSpelling, PY_MAX_LETTERS + 1, '\0');
-            std::generate_n(szSpelling, random() % (PY_MAX_LETTERS + 1),
-                            [&] { return (k < PY_READINGS ? "an" : "26")[random() % 2]; });
+            const size_t uLength = random() % (PY_MAX_LETTERS + 1);
+            for (size_t k = 0; k <= PY_MAX_LETTERS; ++k)
+            {
+                *pSpelling++ = k < uLength ? szUnits[random() % 2] : '\0';
+            }
         }
     }
     CDataDirectory::WriteBytes(CDataPaths::PinyinMapping(), strTable);

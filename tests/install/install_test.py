@@ -1,7 +1,7 @@
 """Installs the build into a temporary prefix and uses it as others would: every installed header
 alone, and the program of docs/embedding.md built with CMake and with pkg-config.
 
-install_test.py CMAKE BUILD_DIR SOURCE_DIR COMPILER [TOOLCHAIN EMULATOR LIBRARIES]
+install_test.py CMAKE GENERATOR BUILD_DIR SOURCE_DIR COMPILER [TOOLCHAIN EMULATOR LIBRARIES]
 
 The last three belong to a build for another processor: its toolchain file, the command that runs
 its programs, and where the libraries lie that ours needs.
@@ -15,8 +15,8 @@ import sys
 import tempfile
 import unittest
 
-CMAKE, BUILD, SOURCE, COMPILER = sys.argv[1:5]
-TOOLCHAIN, EMULATOR, LIBRARIES = sys.argv[5:] or ("", "", "")
+CMAKE, GENERATOR, BUILD, SOURCE, COMPILER = sys.argv[1:6]
+TOOLCHAIN, EMULATOR, LIBRARIES = sys.argv[6:] or ("", "", "")
 LINK_SEARCH = [f"-Wl,-rpath-link,{LIBRARIES}"] if LIBRARIES else []
 WARNINGS = ["-std=c++17", "-Wall", "-Wextra", "-Wpedantic", "-Wshadow", "-Wconversion", "-Werror",
             "-Wno-psabi"]
@@ -99,7 +99,8 @@ class InstallTest(unittest.TestCase):
         (project / "CMakeLists.txt").write_text(CONSUMER, encoding="utf-8")
         (project / "main.cpp").write_text(program_of_the_docs(), encoding="utf-8")
         cross = [f"-DCMAKE_TOOLCHAIN_FILE={TOOLCHAIN}"] if TOOLCHAIN else []
-        run(CMAKE, "-S", project, "-B", project / "build", f"-DCMAKE_CXX_COMPILER={COMPILER}",
+        run(CMAKE, "-G", GENERATOR, "-S", project, "-B", project / "build",
+            f"-DCMAKE_CXX_COMPILER={COMPILER}",
             f"-DCMAKE_CXX_FLAGS={' '.join(WARNINGS[1:] + LINK_SEARCH)}",
             f"-DQV_Localize_DIR={self.installed('**/QV_LocalizeConfig.cmake')[0].parent}", *cross)
         run(CMAKE, "--build", project / "build")

@@ -1,5 +1,7 @@
 #include "LocalizerImpl/LowMapping.h"
 
+#include "MemManager/StoreFile.h"
+
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <unistd.h>
@@ -40,7 +42,7 @@ bool CLowMapping::IsHandle(const void* pMap)
 
 void* CLowMapping::Map(const char* szPath, size_t uSize)
 {
-    const int iFd = open(szPath, O_RDONLY | O_CLOEXEC);
+    const int iFd = OpenStoreFile(szPath, O_RDONLY);
     if (iFd < 0)
     {
         return MAP_FAILED;

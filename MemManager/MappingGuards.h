@@ -101,9 +101,13 @@ public:
     CStoreLock(const CStoreLock&) = delete;
     CStoreLock& operator=(const CStoreLock&) = delete;
 
-    // One attempt, without waiting; only called while the lock is not held.
-    bool TryLock() { return CSingleMutex::Lock(&m_iFd) == 1; }
+    // One attempt, without waiting; only called while the lock is not held. The quiet one writes
+    // no log line.
+    bool TryLock() { return Note(CSingleMutex::TryLock(&m_iFd)); }
+    bool TryLockQuietly() { return Note(CSingleMutex::TryLockQuietly(&m_iFd)); }
     bool IsHeld() const { return m_iFd != 0; }
+    // Whether the last attempt failed for another reason than that somebody holds the lock.
+    bool IsUnavailable() const { return m_eLast == LOCK_UNAVAILABLE; }
     // Releases the lock if it is held.
     void Release()
     {
@@ -115,7 +119,14 @@ public:
     }
 
 private:
+    bool Note(LOCK_RESULT eResult)
+    {
+        m_eLast = eResult;
+        return eResult == LOCK_TAKEN;
+    }
+
     int m_iFd = 0;
+    LOCK_RESULT m_eLast = LOCK_REFUSED;
 };
 
 #endif

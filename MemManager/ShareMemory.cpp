@@ -1,6 +1,7 @@
 #include "MemManager/ShareMemory.h"
 
 #include "Common/Log.h"
+#include "MemManager/StoreFile.h"
 
 #include <cerrno>
 #include <cstdint>
@@ -151,7 +152,7 @@ tag_OpenOutcome OpenForWriting(const char* szPath, size_t uSize)
 {
     umask(0);
     tag_OpenOutcome outcome = {MAP_FAILED, -1, 0};
-    outcome.iFd = open(szPath, O_RDWR | O_CREAT | O_CLOEXEC, SHARED_FILE_MODE);
+    outcome.iFd = OpenStoreFile(szPath, O_RDWR | O_CREAT, SHARED_FILE_MODE);
     if (outcome.iFd < 0)
     {
         outcome.iError = errno;
@@ -184,7 +185,7 @@ void* MapPrivate(int iFd, size_t uSize, int* piError)
 tag_OpenOutcome OpenForReading(const char* szPath, size_t uSize)
 {
     tag_OpenOutcome outcome = {MAP_FAILED, -1, 0};
-    outcome.iFd = open(szPath, O_RDONLY | O_CLOEXEC);
+    outcome.iFd = OpenStoreFile(szPath, O_RDONLY);
     if (outcome.iFd < 0)
     {
         outcome.iError = errno;

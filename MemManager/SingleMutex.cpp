@@ -2,7 +2,9 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
+#include "MemManager/StoreFile.h"
 
+#include <cerrno>
 #include <fcntl.h>
 #include <sys/file.h>
 #include <sys/stat.h>
@@ -23,7 +25,9 @@ int MoveAboveStandard(int iFd)
         return iFd;
     }
     const int iMoved = fcntl(iFd, F_DUPFD_CLOEXEC, FIRST_FREE_FD);
+    const int iError = errno;
     close(iFd);
+    errno = iError;
     return iMoved;
 }
 
@@ -31,13 +35,43 @@ int OpenLockFile()
 {
     umask(0);
     return MoveAboveStandard(
-        open(CDataPaths::LockFile(), O_RDWR | O_CREAT | O_CLOEXEC, LOCK_FILE_MODE));
+        OpenStoreFile(CDataPaths::LockFile(), O_RDWR | O_CREAT, LOCK_FILE_MODE));
 }
 
-int LogLockResult(int iResult)
+// Locks the open file. A refusal or failure closes it.
+LOCK_RESULT LockOpenFile(int iFd)
 {
-    QV_LOGD(QV_LOG_TAG, "QV_Contacts:LOCK RET = %d ", iResult);
-    return iResult;
+    if (flock(iFd, LOCK_EX | LOCK_NB) == 0)
+    {
+        return LOCK_TAKEN;
+    }
+    const int iError = errno;
+    close(iFd);
+    errno = iError;
+    return iError == EWOULDBLOCK || iError == EINTR ? LOCK_REFUSED : LOCK_UNAVAILABLE;
+}
+
+// Whether an open file is the lock file, or was until that was deleted.
+bool IsLockFile(const struct stat& opened)
+{
+    struct stat named = {};
+    if (stat(CDataPaths::LockFile(), &named) == 0 && named.st_dev == opened.st_dev &&
+        named.st_ino == opened.st_ino)
+    {
+        return true;
+    }
+    return S_ISREG(opened.st_mode) && opened.st_nlink == 0 && opened.st_size == 0;
+}
+
+bool ReleaseLock(int iFd)
+{
+    if (!CSingleMutex::IsHeld(iFd))
+    {
+        return false;
+    }
+    const bool bReleased = flock(iFd, LOCK_UN) == 0;
+    close(iFd);
+    return bReleased;
 }
 
 int LogUnlockResult(int iResult)
@@ -48,24 +82,36 @@ int LogUnlockResult(int iResult)
 
 } // namespace
 
-int CSingleMutex::Lock(int* pFd)
+LOCK_RESULT CSingleMutex::TryLockQuietly(int* pFd)
+{
+    *pFd = 0;
+    const int iFd = OpenLockFile();
+    const LOCK_RESULT eResult = iFd < 0 ? LOCK_UNAVAILABLE : LockOpenFile(iFd);
+    if (eResult == LOCK_TAKEN)
+    {
+        *pFd = iFd;
+    }
+    return eResult;
+}
+
+LOCK_RESULT CSingleMutex::TryLock(int* pFd)
 {
     QV_LOGD(QV_LOG_TAG, "QV_Contacts:Lock TRY LOCK");
+    const LOCK_RESULT eResult = TryLockQuietly(pFd);
+    const int iError = errno;
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts:LOCK RET = %d ", eResult == LOCK_TAKEN ? 1 : 0);
+    errno = iError;
+    return eResult;
+}
+
+int CSingleMutex::Lock(int* pFd)
+{
     if (pFd == nullptr)
     {
+        QV_LOGD(QV_LOG_TAG, "QV_Contacts:Lock TRY LOCK");
         return 0;
     }
-    *pFd = OpenLockFile();
-    if (*pFd > 0 && flock(*pFd, LOCK_EX | LOCK_NB) == 0)
-    {
-        return LogLockResult(1);
-    }
-    if (*pFd > 0)
-    {
-        close(*pFd);
-    }
-    *pFd = 0;
-    return LogLockResult(0);
+    return TryLock(pFd) == LOCK_TAKEN ? 1 : 0;
 }
 
 int CSingleMutex::UnLock(int* pFd)
@@ -75,11 +121,11 @@ int CSingleMutex::UnLock(int* pFd)
     {
         return 0;
     }
-    if (*pFd == 0)
-    {
-        return LogUnlockResult(1);
-    }
-    const bool bReleased = flock(*pFd, LOCK_UN) == 0;
-    close(*pFd);
-    return LogUnlockResult(bReleased ? 1 : 0);
+    return LogUnlockResult(*pFd == 0 || ReleaseLock(*pFd) ? 1 : 0);
+}
+
+bool CSingleMutex::IsHeld(int iFd)
+{
+    struct stat opened = {};
+    return iFd > 0 && fstat(iFd, &opened) == 0 && IsLockFile(opened);
 }

@@ -58,16 +58,51 @@ TEST_F(SingleMutex, RefusesASecondHolderUntilTheFirstDies)
     EXPECT_TRUE(CStoreLock().TryLock());
 }
 
-TEST_F(SingleMutex, TellsWhatCannotBeReleased)
+TEST_F(SingleMutex, LeavesAloneWhatWasClosedBehindItsBack)
 {
     int iFd = 0;
     EXPECT_EQ(CSingleMutex::UnLock(&iFd), 1) << "nothing is held";
-    iFd = open("/dev/null", O_RDONLY);
+    ASSERT_EQ(CSingleMutex::Lock(&iFd), 1);
+    EXPECT_TRUE(CSingleMutex::IsHeld(iFd));
     close(iFd);
+    EXPECT_FALSE(CSingleMutex::IsHeld(iFd));
+    const int iOther = open("/dev/null", O_RDONLY);
+    ASSERT_EQ(iOther, iFd) << "the number has a new owner";
+    EXPECT_FALSE(CSingleMutex::IsHeld(iFd));
     m_log.Clear();
     EXPECT_EQ(CSingleMutex::UnLock(&iFd), 0);
     EXPECT_EQ(m_log.Texts(DEBUG_LINE),
               (Lines{"QV_Contacts:UnLock TRY UNLOCK", "QV_Contacts:UNLOCK RET = 0 "}));
+    EXPECT_EQ(fcntl(iOther, F_GETFD), 0) << "it is not ours to close";
+    EXPECT_EQ(CSingleMutex::Lock(&iFd), 1);
+    fs::remove(CDataPaths::LockFile());
+    EXPECT_TRUE(CSingleMutex::IsHeld(iFd)) << "also without its name";
+    EXPECT_EQ(CSingleMutex::UnLock(&iFd), 1);
+    EXPECT_EQ(fcntl(iFd, F_GETFD), -1);
+    close(iOther);
+}
+
+TEST_F(SingleMutex, TellsAHeldLockFromNone)
+{
+    CStoreLock lock;
+    {
+        const CLockHolder holder;
+        EXPECT_FALSE(lock.TryLock());
+        EXPECT_FALSE(lock.IsUnavailable());
+    }
+    fs::remove(CDataPaths::LockFile());
+    ASSERT_EQ(mkfifo(CDataPaths::LockFile(), 0700), 0);
+    EXPECT_FALSE(lock.TryLock());
+    EXPECT_TRUE(lock.IsUnavailable()) << "a pipe";
+    fs::remove(CDataPaths::LockFile());
+    fs::create_directory(CDataPaths::LockFile());
+    m_log.Clear();
+    EXPECT_FALSE(lock.TryLockQuietly());
+    EXPECT_TRUE(lock.IsUnavailable()) << "a directory";
+    EXPECT_EQ(m_log.Texts(DEBUG_LINE), Lines{});
+    fs::remove(CDataPaths::LockFile());
+    EXPECT_TRUE(lock.TryLockQuietly());
+    EXPECT_FALSE(lock.IsUnavailable());
 }
 
 } // namespace

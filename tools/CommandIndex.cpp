@@ -6,6 +6,7 @@
 #include "MemManager/MemManger.h"
 #include "tools/DataDirectory.h"
 #include "tools/LibraryLog.h"
+#include "tools/PrintableText.h"
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
@@ -58,9 +59,10 @@ void BuildIndex(const CDataDirectory& directory, const CLibraryLog& log)
     const int iResult = logic.MemInit(true);
     if (iResult != 0)
     {
-        throw CToolError(TOOL_EXIT_FAILED, FailureText(iResult) + log.Errors(),
+        throw CToolError(TOOL_EXIT_FAILED, FailureText(iResult),
                          "Check that the database is a contacts database, that the files can be "
-                         "written and that no other process holds the store.");
+                         "written and that no other process holds the store.",
+                         log.Errors());
     }
 }
 
@@ -89,7 +91,8 @@ void PrintFile(const char* szPath)
 
 void PrintFiles()
 {
-    std::cout << "Files in " << fs::path(CDataPaths::ContactReg()).parent_path().string() << ":\n";
+    std::cout << "Files in "
+              << PrintableText(fs::path(CDataPaths::ContactReg()).parent_path().string()) << ":\n";
     for (const char* szPath : {CDataPaths::PinyinMapping(), CDataPaths::ContactRecords(),
                                CDataPaths::ContactReg(), CDataPaths::LockFile()})
     {

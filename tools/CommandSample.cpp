@@ -3,6 +3,7 @@
 #include "Common/DataPaths.h"
 #include "tools/DataDirectory.h"
 #include "tools/LocalizerKeys.h"
+#include "tools/PrintableText.h"
 #include "tools/SampleContacts.h"
 #include "tools/SampleDatabase.h"
 #include "tools/ToolError.h"
@@ -84,7 +85,8 @@ auto CountIf(const std::vector<tag_SampleContact>& vContacts, Test test)
 void PrintSummary(const std::vector<tag_SampleContact>& vContacts)
 {
     using Contact = const tag_SampleContact&;
-    std::cout << "Wrote " << vContacts.size() << " contacts to " << CDataPaths::Database() << ":\n"
+    std::cout << "Wrote " << vContacts.size() << " contacts to "
+              << PrintableText(CDataPaths::Database()) << ":\n"
               << "  " << CountIf(vContacts, [](Contact c) { return c.bVisible; }) << " visible, "
               << CountIf(vContacts, [](Contact c) { return c.bStarred; }) << " starred, "
               << CountIf(vContacts, [](Contact c) { return c.bSecret; }) << " secret (group -1), "

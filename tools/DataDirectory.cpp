@@ -2,6 +2,7 @@
 
 #include "Common/DataPaths.h"
 #include "Core/LocalizerLogic.h"
+#include "tools/PrintableText.h"
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
@@ -10,6 +11,8 @@
 #include <cctype>
 #include <cstring>
 #include <filesystem>
+#include <iomanip>
+#include <sstream>
 #include <system_error>
 
 namespace fs = std::filesystem;
@@ -54,12 +57,36 @@ bool IsPlain(char c)
            std::strchr("/._-+@%:=,", c) != nullptr;
 }
 
+// For a word that cannot be shown as it is: with escapes that bash and zsh read back.
+std::string QuotedBytes(const std::string& strWord)
+{
+    std::ostringstream quoted;
+    quoted << "$'" << std::hex << std::setfill('0');
+    for (const char c : strWord)
+    {
+        if (IsPlain(c))
+        {
+            quoted << c;
+        }
+        else
+        {
+            quoted << "\\x" << std::setw(2) << static_cast<int>(static_cast<unsigned char>(c));
+        }
+    }
+    quoted << '\'';
+    return quoted.str();
+}
+
 // A word that a shell reads as it stands.
 std::string Quoted(const std::string& strWord)
 {
     if (std::all_of(strWord.begin(), strWord.end(), IsPlain))
     {
         return strWord;
+    }
+    if (PrintableText(strWord) != strWord)
+    {
+        return QuotedBytes(strWord);
     }
     std::string strQuoted = "'";
     for (const char c : strWord)

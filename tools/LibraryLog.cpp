@@ -58,16 +58,6 @@ int CLibraryLog::PhaseTime(const char* szPhase) const
     return iTime;
 }
 
-std::string CLibraryLog::Errors() const
-{
-    std::string strErrors;
-    for (const std::string& strLine : m_vErrors)
-    {
-        strErrors += "\n  " + strLine;
-    }
-    return strErrors;
-}
-
 void CLibraryLog::Collect(void* pContext, int iPriority, const char* /*szTag*/, const char* szText)
 {
     CLibraryLog& log = *static_cast<CLibraryLog*>(pContext);

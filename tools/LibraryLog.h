@@ -19,8 +19,8 @@ public:
 
     // The milliseconds of the last line "QV_Contacts: <szPhase> time = <n>", -1 without one.
     int PhaseTime(const char* szPhase) const;
-    // The lines of error priority, each on an indented line of its own; empty without one.
-    std::string Errors() const;
+    // The lines of error priority.
+    const std::vector<std::string>& Errors() const { return m_vErrors; }
 
 private:
     static void Collect(void* pContext, int iPriority, const char* szTag, const char* szText);

@@ -14,8 +14,8 @@ void MakeSharedTable()
     CLibraryLog log;
     if (CQVLocalizerManager::InitMapFile() != 0)
     {
-        throw CToolError(TOOL_EXIT_FAILED,
-                         "the library could not make its pinyin table" + log.Errors());
+        throw CToolError(TOOL_EXIT_FAILED, "the library could not make its pinyin table", "",
+                         log.Errors());
     }
 }
 

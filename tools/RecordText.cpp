@@ -1,9 +1,12 @@
 #include "tools/RecordText.h"
 
+#include "tools/PrintableText.h"
 #include "tools/Utf8Text.h"
 
 #include <ctime>
+#include <cwchar>
 #include <iomanip>
+#include <iterator>
 #include <ostream>
 #include <sstream>
 
@@ -67,7 +70,13 @@ std::string ListText(const QVLong32* plIDs, int iMax)
 
 std::string SpellingText(const tag_ContactsStruct& record)
 {
-    return record.szName[0] == NAME_EMPTY_MARK ? "(no name)" : Utf8Text(record.szName);
+    if (record.szName[0] == NAME_EMPTY_MARK)
+    {
+        return "(no name)";
+    }
+    // A damaged record may lack the terminator.
+    return PrintableText(
+        Utf8Text({record.szName, wcsnlen(record.szName, std::size(record.szName))}));
 }
 
 std::string CodesText(const tag_ContactsStruct& record)

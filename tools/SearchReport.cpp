@@ -1,6 +1,7 @@
 #include "tools/SearchReport.h"
 
 #include "LocalizerImpl/QVLocalizerManager.h"
+#include "tools/PrintableText.h"
 #include "tools/Utf8Text.h"
 
 namespace
@@ -22,19 +23,18 @@ int LastMatched(const tag_LocalizerDetail& detail)
 }
 
 std::string MarkedName(const tag_FoundContact& contact, const tag_SearchStep& step,
-                       const char* szBegin, const char* szEnd)
+                       const tag_Marking& marking)
 {
-    if (step.strTyped.empty())
-    {
-        return contact.strName;
-    }
+    const bool bMark = !step.strTyped.empty();
     std::string strMarked;
     int iCharacter = 0; // a name has one code per character
     for (const std::string& strCharacter : Characters(contact.strName))
     {
-        const bool bFirst = iCharacter == FirstMatched(contact.detail);
-        const bool bLast = iCharacter == LastMatched(contact.detail);
-        strMarked += (bFirst ? szBegin : "") + strCharacter + (bLast ? szEnd : "");
+        const bool bFirst = bMark && iCharacter == FirstMatched(contact.detail);
+        const bool bLast = bMark && iCharacter == LastMatched(contact.detail);
+        strMarked += bFirst ? marking.szBegin : "";
+        strMarked += marking.bPrintable ? PrintableText(strCharacter) : strCharacter;
+        strMarked += bLast ? marking.szEnd : "";
         ++iCharacter;
     }
     return strMarked;

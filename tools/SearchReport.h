@@ -24,10 +24,18 @@ void PrintSearchText(std::ostream& stream, const tag_SearchReport& report, bool 
 // One JSON document for programs; `qvlocalize search --help` describes it.
 void PrintSearchJson(std::ostream& stream, const tag_SearchReport& report);
 
-// Parts of both forms. The matched characters of a name between szBegin and szEnd; an empty text
-// (nothing typed) marks none.
+// Parts of both forms. What stands around the matched characters of a name, and whether the name
+// is escaped for people.
+struct tag_Marking
+{
+    const char* szBegin;
+    const char* szEnd;
+    bool bPrintable;
+};
+constexpr tag_Marking EXACT_MARKING = {"[", "]", false};
+// An empty text (nothing typed) marks nothing.
 std::string MarkedName(const tag_FoundContact& contact, const tag_SearchStep& step,
-                       const char* szBegin = "[", const char* szEnd = "]");
+                       const tag_Marking& marking = EXACT_MARKING);
 // Index of the first and the last matched character.
 int FirstMatched(const tag_LocalizerDetail& detail);
 int LastMatched(const tag_LocalizerDetail& detail);

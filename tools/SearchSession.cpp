@@ -21,8 +21,8 @@ constexpr int TIME_SECTIONS = 6;
 
 [[noreturn]] void Fail(int iResult, const CLibraryLog& log)
 {
-    throw CToolError(TOOL_EXIT_FAILED,
-                     "the search failed (result " + std::to_string(iResult) + ")" + log.Errors());
+    throw CToolError(TOOL_EXIT_FAILED, "the search failed (result " + std::to_string(iResult) + ")",
+                     "", log.Errors());
 }
 
 // A store that cannot be read gives an empty result and lines in the log, not a result code.
@@ -30,8 +30,9 @@ void RequireStoreRead(const tag_LocalizerResult& result, const CLibraryLog& log)
 {
     if (result.iResultNum == 0 && !log.Errors().empty())
     {
-        throw CToolError(TOOL_EXIT_FAILED, "the index could not be read" + log.Errors(),
-                         "Try again when no other process holds it, or build it anew.");
+        throw CToolError(TOOL_EXIT_FAILED, "the index could not be read",
+                         "Try again when no other process holds it, or build it anew.",
+                         log.Errors());
     }
 }
 

@@ -1,3 +1,4 @@
+#include "tools/PrintableText.h"
 #include "tools/SearchReport.h"
 
 #include <iomanip>
@@ -6,8 +7,8 @@
 namespace
 {
 
-constexpr const char* BOLD_BEGIN = "[\033[1m";
-constexpr const char* BOLD_END = "\033[0m]";
+constexpr tag_Marking PLAIN_MARKING = {"[", "]", true};
+constexpr tag_Marking BOLD_MARKING = {"[\033[1m", "\033[0m]", true};
 constexpr int NUMBER_WIDTH = 5;
 constexpr int ID_WIDTH = 6;
 
@@ -27,7 +28,7 @@ void PrintFilters(std::ostream& stream, const tag_SearchReport& report)
 
 void PrintHeading(std::ostream& stream, const tag_SearchReport& report)
 {
-    stream << "Search \"" << report.strInput << "\" (" << report.strType << ", "
+    stream << "Search \"" << PrintableText(report.strInput) << "\" (" << report.strType << ", "
            << (report.bNarrow ? "each key narrows the matches before it"
                               : "each key searches the whole index");
     PrintFilters(stream, report);
@@ -48,8 +49,7 @@ void PrintContact(std::ostream& stream, const tag_SearchStep& step, const tag_Fo
         stream << "(no name)\n";
         return;
     }
-    stream << (bBold ? MarkedName(contact, step, BOLD_BEGIN, BOLD_END) : MarkedName(contact, step))
-           << '\n';
+    stream << MarkedName(contact, step, bBold ? BOLD_MARKING : PLAIN_MARKING) << '\n';
 }
 
 void PrintContacts(std::ostream& stream, const tag_SearchStep& step, bool bBold)
@@ -86,14 +86,14 @@ void PrintWords(std::ostream& stream, const char* szLabel, const std::vector<std
     stream << szLabel;
     for (const std::string& strWord : vWords)
     {
-        stream << ' ' << strWord;
+        stream << ' ' << PrintableText(strWord);
     }
     stream << (vWords.empty() ? " none\n" : "\n");
 }
 
 void PrintStep(std::ostream& stream, const tag_SearchStep& step, bool bBold)
 {
-    stream << "\n> " << step.strTyped << "_   " << step.iTotal
+    stream << "\n> " << PrintableText(step.strTyped) << "_   " << step.iTotal
            << (step.iTotal == 1 ? " match\n" : " matches\n");
     PrintContacts(stream, step, bBold);
     PrintSections(stream, step);

@@ -3,6 +3,8 @@
 
 #include <stdexcept>
 #include <string>
+#include <utility>
+#include <vector>
 
 // What the tool tells the program that called it.
 enum TOOL_EXIT : int
@@ -13,21 +15,26 @@ enum TOOL_EXIT : int
     TOOL_EXIT_MISSING = 3, // a file that another subcommand makes is not there
 };
 
-// Ends a subcommand: what is wrong, and what to do about it (may be empty).
+// Ends a subcommand: what is wrong, what to do about it (may be empty), and the log lines that tell
+// more. Control characters in them are escaped when the error is shown.
 class CToolError : public std::runtime_error
 {
 public:
-    CToolError(TOOL_EXIT eExit, const std::string& strWhat, const std::string& strAdvice = "")
-        : std::runtime_error(strWhat), m_eExit(eExit), m_strAdvice(strAdvice)
+    CToolError(TOOL_EXIT eExit, const std::string& strWhat, std::string strAdvice = "",
+               std::vector<std::string> vDetails = {})
+        : std::runtime_error(strWhat), m_eExit(eExit), m_strAdvice(std::move(strAdvice)),
+          m_vDetails(std::move(vDetails))
     {
     }
 
     TOOL_EXIT Exit() const { return m_eExit; }
     const std::string& Advice() const { return m_strAdvice; }
+    const std::vector<std::string>& Details() const { return m_vDetails; }
 
 private:
     TOOL_EXIT m_eExit;
     std::string m_strAdvice;
+    std::vector<std::string> m_vDetails;
 };
 
 #endif

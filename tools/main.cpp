@@ -1,11 +1,13 @@
 #include "tools/Commands.h"
 #include "tools/LibraryLog.h"
+#include "tools/PrintableText.h"
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
 
 #include <exception>
 #include <iostream>
+#include <string>
 
 namespace
 {
@@ -14,6 +16,12 @@ constexpr const char* EXIT_CODES = "Exit codes: 0 done (also a search without ma
                                    "1 the library or the system failed,\n"
                                    "2 wrong use of the command line, 3 no database, pinyin table "
                                    "or index there.";
+
+std::string UsageError(const CLI::App* /*pApp*/, const CLI::Error& error)
+{
+    return std::string("qvlocalize: ") + PrintableText(error.what()) +
+           "\nRun with --help for more information.\n";
+}
 
 void AddCommands(CLI::App& app)
 {
@@ -28,10 +36,14 @@ void AddCommands(CLI::App& app)
 
 int Report(const CToolError& error)
 {
-    std::cerr << "qvlocalize: " << error.what() << '\n';
+    std::cerr << "qvlocalize: " << PrintableText(error.what()) << '\n';
+    for (const std::string& strDetail : error.Details())
+    {
+        std::cerr << "  " << PrintableText(strDetail) << '\n';
+    }
     if (!error.Advice().empty())
     {
-        std::cerr << error.Advice() << '\n';
+        std::cerr << PrintableText(error.Advice()) << '\n';
     }
     return error.Exit();
 }
@@ -64,6 +76,7 @@ int main(int argc, char** argv)
         CLI::App app("Builds, shows and searches the contact index of a provider's data "
                      "directory.",
                      "qvlocalize");
+        app.failure_message(&UsageError); // inherited by the subcommands
         AddCommands(app);
         return RunCommandLine(app, argc, argv);
     }

@@ -268,6 +268,68 @@ class NotifyTest(ToolTest):
         self.check("notify", "status", code=MISSING)
 
 
+class EscapesTest(ToolTest):
+    """Texts of others reach the terminal with their control characters escaped."""
+
+    ESCAPED = [  # of a name, and what people see of it
+        ("E\x1b[31m\n\t\x7f", r"E\x1b[31m\x0a\x09\x7f"),
+        ("E\x85\x9b\u061c\u200e\u200f", r"E\u0085\u009b\u061c\u200e\u200f"),
+        ("E\u2028\u2029\u202a\u202e", r"E\u2028\u2029\u202a\u202e"),
+        ("E\u2066\u2069\u206f", r"E\u2066\u2069\u206f"),
+        ("E\\x1b 张\u3000\xa0\xad", "E\\x1b 张\u3000\xa0\xad"),
+        (b"E.\x80\xc3\xe5\xbc.", r"E.\x80\xc3\xe5\xbc."),
+        (b"E\xc1\x9b\xed\xa0\x80\xe0\x9f\xbf", r"E\xc1\x9b\xed\xa0\x80\xe0\x9f\xbf"),
+        (b"E\xf0\x9f\x98\x80\xf4\x90\x80\x80\xf8", "E\U0001f600" + r"\xf4\x90\x80\x80\xf8"),
+    ]
+
+    @classmethod
+    def setUpClass(cls):
+        super().setUpClass()
+        with contextlib.closing(sqlite3.connect(cls.data / "databases/contacts2.db")) as database:
+            for contact, (name, _) in enumerate(cls.ESCAPED, 1):
+                database.execute("UPDATE localizer SET localizerkey = ?, display_name = "
+                                 "CAST(? AS TEXT) WHERE contact_id = ?",
+                                 ("\u4f04", name, contact))
+            database.commit()
+        assert run(cls.data, "index").returncode == DONE
+
+    def printed(self, *call, code=DONE):
+        """What a call prints for people, as long as nothing in it is more than text."""
+        process = self.check(*call, code=code)
+        text = process.stdout + process.stderr
+        self.assertNotRegex(text, "[\0-\x09\x0b-\x1f\x7f-\x9f\u061c\u200e\u200f\u2028-\u202e"
+                                  "\u2066-\u206f]", call)
+        return text
+
+    def test_names(self):
+        found = re.findall(r"contact [1-8] +(.*)\n",
+                           self.printed("search", "e", "--once", "--limit", "0"))
+        self.assertEqual(sorted(shown for _, shown in self.ESCAPED),
+                         sorted(name.replace("[E]", "E") for name in found))
+        self.assertIn(r"e\x1b[31m\x0a\x09\x7f", self.printed("show", "--limit", "0"))
+
+    def test_arguments_and_paths(self):
+        typed = "\x1b\x7f\x9b\u202e"
+        shown = r"\x1b\x7f\u009b\u202e"
+        self.assertIn(f'Search "{shown}"', self.printed("search", typed))
+        self.assertIn(f"> {shown}_", self.printed("search", typed))
+        self.assertIn(shown, self.printed("search", "a", "--" + typed, code=USAGE))
+        self.assertIn(shown, self.printed("search", "a", "--type", typed, code=USAGE))
+        data = self.root / f"line\n{typed}'"
+        shutil.copytree(self.data, data)
+        self.addCleanup(setattr, self, "data", self.data)
+        self.data = data
+        self.assertIn(rf"line\x0a{shown}'/files:", self.printed("index"))
+        self.assertIn(rf"line\x0a{shown}'/databases", self.printed("sample", code=USAGE))
+        (data / "databases/contacts2.db").unlink()
+        error = self.printed("index", code=MISSING)
+        self.assertIn(rf"line\x0a{shown}'/databases", error)
+        advised = re.search(r"--data-dir (.*)", error).group(1)
+        self.assertEqual(str(data), subprocess.run(["bash", "-c", "printf %s " + advised],
+                                                   capture_output=True, encoding="utf-8",
+                                                   check=True).stdout)
+
+
 class ErrorsTest(ToolTest):
     def fails(self, directory, code, text, command, *arguments):
         process = run(directory, command, *arguments)

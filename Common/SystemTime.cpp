@@ -1,9 +1,10 @@
 #include "Common/SystemTime.h"
 
 #include <sys/time.h>
-#include <unistd.h>
 
+#include <chrono>
 #include <ctime>
+#include <thread>
 
 namespace
 {
@@ -11,9 +12,6 @@ namespace
 constexpr int MICROS_PER_MILLI = 1000;
 constexpr int MICROS_PER_SECOND = 1000000;
 constexpr int FIRST_YEAR = 1900; // that a broken-down time counts from
-
-// The last pause that every usleep takes: a second or more may be refused.
-constexpr unsigned MAX_PAUSE_MILLIS = 999;
 
 timeval WallClock()
 {
@@ -51,11 +49,7 @@ int32_t GetTickCount()
 
 void Sleep(unsigned int uMilliseconds)
 {
-    for (; uMilliseconds > MAX_PAUSE_MILLIS; uMilliseconds -= MAX_PAUSE_MILLIS)
-    {
-        usleep(MAX_PAUSE_MILLIS * MICROS_PER_MILLI);
-    }
-    usleep(uMilliseconds * MICROS_PER_MILLI);
+    std::this_thread::sleep_for(std::chrono::milliseconds(uMilliseconds));
 }
 
 void GetLocalTime(tag_SystemTime* pTime)

@@ -37,7 +37,7 @@ extern "C"
     // of two readings means anything, and it is taken unsigned, since the count wraps.
     QV_EXPORT int32_t GetTickCount();
 
-    // Pauses the calling thread; a signal may end the pause early.
+    // Pauses the calling thread for the whole time, whatever signals it handles meanwhile.
     QV_EXPORT void Sleep(unsigned int uMilliseconds);
 
     // The wall clock as a calendar time.

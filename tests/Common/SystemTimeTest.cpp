@@ -1,8 +1,10 @@
 #include "Common/SystemTime.h"
 
 #include <gtest/gtest.h>
+#include <sys/time.h>
 
 #include <chrono>
+#include <csignal>
 #include <cstdlib>
 #include <cstring>
 #include <ctime>
@@ -54,4 +56,22 @@ TEST(SystemTime, TicksAreTheLowBitsOfTheWallClock)
     const uint32_t uTicks = static_cast<uint32_t>(GetTickCount());
     const uint32_t uAfter = Milliseconds();
     EXPECT_LE(uTicks - uBefore, uAfter - uBefore);
+}
+
+TEST(SystemTime, SignalsDoNotShortenAPause)
+{
+    constexpr auto PAUSE = std::chrono::milliseconds(60);
+    struct sigaction action = {};
+    struct sigaction previous = {};
+    action.sa_handler = [](int /*iSignal*/) {};
+    ASSERT_EQ(0, sigaction(SIGALRM, &action, &previous));
+    const itimerval often = {{0, 500}, {0, 500}};
+    const itimerval never = {};
+    ASSERT_EQ(0, setitimer(ITIMER_REAL, &often, nullptr));
+    const auto start = std::chrono::steady_clock::now();
+    Sleep(static_cast<unsigned>(PAUSE.count()));
+    const auto pause = std::chrono::steady_clock::now() - start;
+    setitimer(ITIMER_REAL, &never, nullptr);
+    sigaction(SIGALRM, &previous, nullptr);
+    EXPECT_GE(pause, PAUSE);
 }

@@ -66,6 +66,7 @@ TEST_F(ContactStore, GivesUpAfterFiveRefusals)
     }
     vExpected.back().erase(12, 1); // the last line alone has no blank there
     EXPECT_EQ(m_log.Texts(ERROR_LINE), vExpected);
+    EXPECT_EQ(m_log.Count(DEBUG_LINE, "QV_Contacts:Lock TRY LOCK"), 10) << "retries are silent";
     EXPECT_EQ(Reg(), (tag_ContactReg{2, 0, 1002}));
     ASSERT_NE(pSet, nullptr);
     EXPECT_EQ(pSet->pDetail, nullptr);

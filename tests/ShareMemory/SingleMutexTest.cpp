@@ -1,11 +1,13 @@
 #include "MemManager/SingleMutex.h"
 
 #include "Common/DataPaths.h"
-#include "MemManager/MappingGuards.h"
+#include "MemManager/LockAttempts.h"
+#include "Platform/LogSink.h"
 #include "tests/Support/ChildProcess.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
 
+#include <cstring>
 #include <fcntl.h>
 #include <filesystem>
 #include <gtest/gtest.h>
@@ -56,6 +58,26 @@ TEST_F(SingleMutex, RefusesASecondHolderUntilTheFirstDies)
               (Lines{"QV_Contacts:Lock TRY LOCK", "QV_Contacts:LOCK RET = 0 "}));
     holder.Kill();
     EXPECT_TRUE(CStoreLock().TryLock());
+}
+
+TEST_F(SingleMutex, IsTakenInThePauseInWhichItBecomesFree)
+{
+    CLockHolder holder;
+    // The first refusal is what ends the other holder.
+    const auto pfnSink =
+        [](void* pContext, int /*iPriority*/, const char* /*szTag*/, const char* szText)
+    {
+        if (std::strcmp(szText, "QV_Contacts:LOCK RET = 0 ") == 0)
+        {
+            static_cast<CLockHolder*>(pContext)->Kill();
+        }
+    };
+    CLogSink::Set(pfnSink, &holder);
+    CStoreLock lock;
+    int iRefused = 0;
+    EXPECT_TRUE(TryStoreLock(&lock, [&](int /*iAttempt*/) { ++iRefused; }));
+    CLogSink::Set(nullptr, nullptr);
+    EXPECT_EQ(iRefused, 0);
 }
 
 TEST_F(SingleMutex, LeavesAloneWhatWasClosedBehindItsBack)

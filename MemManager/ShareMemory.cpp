@@ -3,11 +3,13 @@
 #include "Common/Log.h"
 #include "MemManager/StoreFile.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdint>
 #include <cstring>
 #include <fcntl.h>
 #include <limits>
+#include <sys/file.h>
 #include <sys/mman.h>
 #include <sys/resource.h>
 #include <sys/stat.h>
@@ -18,6 +20,10 @@ namespace
 
 constexpr mode_t SHARED_FILE_MODE = 0777;
 
+constexpr off_t ZERO_PAGE_SIZE = 4096;
+constexpr char ZERO_PAGE[ZERO_PAGE_SIZE] = {};
+constexpr off_t SMALLEST_BLOCK = 1024; // of the file systems that cannot reserve space
+
 // What became of an open call. pAddr is MAP_FAILED on failure; iFd is then -1 when the file could
 // not be opened, else the number of the descriptor, which is closed by now.
 struct tag_OpenOutcome
@@ -25,13 +31,6 @@ struct tag_OpenOutcome
     void* pAddr;
     int iFd;
     int iError; // errno of the failing step
-};
-
-// The end of a file as it was before it was extended.
-struct tag_FileEnd
-{
-    off_t iLength;
-    char cLast; // the byte that becomes 0, when the file reaches so far
 };
 
 const char* PathOrEmpty(const char* szPath)
@@ -51,75 +50,135 @@ bool IsAboveSizeLimit(size_t uSize)
     return getrlimit(RLIMIT_FSIZE, &limit) == 0 && uSize > limit.rlim_cur;
 }
 
-// Whether a refusal to reserve space means that this file system never reserves any.
+// Whether a refusal to reserve space means that this system never reserves any.
 bool CannotReserve(int iError)
 {
-    return iError == EOPNOTSUPP || iError == EINVAL || iError == ENOSYS;
+    return iError == EOPNOTSUPP || iError == EINVAL || iError == ENOSYS || iError == EPERM;
 }
 
-// Gives every byte of the range its place on the disk; 0 or errno.
+// Asks the system to give every byte of the range its place on the disk; 0 or errno.
 int ReserveSpace(int iFd, off_t iSize)
 {
 #if defined(__ANDROID__) && __ANDROID_API__ < 21
     // The platform's C library has no call for it yet.
     (void)iFd;
     (void)iSize;
-    return 0;
+    return ENOSYS;
 #else
     int iResult = 0;
     do
     {
         iResult = fallocate(iFd, 0, 0, iSize);
     } while (iResult != 0 && errno == EINTR);
-    return iResult == 0 || CannotReserve(errno) ? 0 : errno;
+    return iResult == 0 ? 0 : errno;
 #endif
 }
 
-// Notes how the file ends; 0 or errno.
-int ReadFileEnd(int iFd, off_t iSize, tag_FileEnd* pEnd)
+// Writes zeros at iFrom, up to the next whole page but not behind iEnd. Returns how many, or -1.
+ssize_t WriteZeros(int iFd, off_t iFrom, off_t iEnd)
 {
-    struct stat info = {};
-    if (fstat(iFd, &info) != 0)
+    const off_t iNum = std::min(iEnd - iFrom, ZERO_PAGE_SIZE - iFrom % ZERO_PAGE_SIZE);
+    errno = EIO; // in case that nothing is written without an error
+    const ssize_t iWritten = pwrite(iFd, ZERO_PAGE, static_cast<size_t>(iNum), iFrom);
+    return iWritten > 0 ? iWritten : -1;
+}
+
+// Fills iFrom to iEnd with zeros; 0 or errno.
+int FillWithZeros(int iFd, off_t iFrom, off_t iEnd)
+{
+    while (iFrom < iEnd)
     {
-        return errno;
-    }
-    pEnd->iLength = static_cast<off_t>(info.st_size);
-    pEnd->cLast = 0;
-    errno = EIO; // in case that nothing is read without an error
-    if (pEnd->iLength >= iSize && pread(iFd, &pEnd->cLast, 1, iSize - 1) != 1)
-    {
-        return errno;
+        const ssize_t iWritten = WriteZeros(iFd, iFrom, iEnd);
+        if (iWritten < 0 && errno != EINTR)
+        {
+            return errno;
+        }
+        iFrom += std::max<ssize_t>(iWritten, 0);
     }
     return 0;
 }
 
-void RestoreFileEnd(int iFd, off_t iSize, const tag_FileEnd& end)
+// Gives the holes of the first iEnd bytes their place on the disk; 0 or errno. Not every file
+// system tells its holes, so every block that reads as zeros is written once more.
+int FillHoles(int iFd, off_t iEnd)
 {
-    if (end.iLength < iSize)
+    char acBlock[SMALLEST_BLOCK];
+    for (off_t iFrom = 0; iFrom < iEnd; iFrom += SMALLEST_BLOCK)
     {
-        (void)!ftruncate(iFd, end.iLength);
+        const ssize_t iRead = pread(iFd, acBlock, sizeof(acBlock), iFrom);
+        if (iRead < 0)
+        {
+            return errno;
+        }
+        const bool bZeros = std::memcmp(acBlock, ZERO_PAGE, static_cast<size_t>(iRead)) == 0;
+        const int iError =
+            bZeros ? FillWithZeros(iFd, iFrom, std::min<off_t>(iFrom + iRead, iEnd)) : 0;
+        if (iError != 0)
+        {
+            return iError;
+        }
     }
-    else
+    return 0;
+}
+
+// Makes a file of iLength bytes at least iSize bytes long and all of these written; 0 or errno.
+int ExtendFile(int iFd, off_t iLength, off_t iSize)
+{
+    int iError = ReserveSpace(iFd, iSize);
+    if (CannotReserve(iError))
     {
-        (void)!pwrite(iFd, &end.cLast, 1, iSize - 1);
+        iError = FillHoles(iFd, std::min(iLength, iSize));
+        iError = iError == 0 ? FillWithZeros(iFd, iLength, iSize) : iError;
+    }
+    return iError;
+}
+
+// The length of a file, -1 with errno.
+off_t FileLength(int iFd)
+{
+    struct stat info = {};
+    return fstat(iFd, &info) == 0 ? static_cast<off_t>(info.st_size) : -1;
+}
+
+// Gives back what a failed extension took, also behind the end that the file still has. A file that
+// is as long as it was to become stays: others may use it by now.
+void GiveBack(int iFd, off_t iLength, off_t iSize)
+{
+    const off_t iReached = FileLength(iFd);
+    if (iReached >= iLength && iReached < iSize)
+    {
+        static_cast<void>(!ftruncate(iFd, iLength));
     }
 }
 
-// Makes the file at least iSize bytes long, all of them on the disk, the last of them 0; 0 or
-// errno.
-int ExtendFile(int iFd, off_t iSize)
+// Makes the file at least iSize bytes long, all of them on the disk; 0 or errno. Whoever extends a
+// file locks it, so that nobody gives back what another one has extended meanwhile.
+int ReserveFile(int iFd, off_t iSize)
 {
-    const int iError = ReserveSpace(iFd, iSize);
-    if (iError != 0)
+    const off_t iLength = FileLength(iFd);
+    if (iLength < 0)
     {
-        return iError;
+        return errno;
     }
-    const char cZero = 0;
-    errno = EIO; // in case that nothing is written without an error
-    return pwrite(iFd, &cZero, 1, iSize - 1) == 1 ? 0 : errno;
+    if (iLength >= iSize)
+    {
+        return ExtendFile(iFd, iLength, iSize);
+    }
+    const bool bAlone = flock(iFd, LOCK_EX) == 0;
+    const off_t iLockedLength = FileLength(iFd);
+    if (iLockedLength < 0)
+    {
+        return errno;
+    }
+    const int iError = ExtendFile(iFd, iLockedLength, iSize);
+    if (iError != 0 && bAlone)
+    {
+        GiveBack(iFd, iLockedLength, iSize);
+    }
+    return iError;
 }
 
-// Extends and maps an open file; what was changed is taken back on failure.
+// Extends and maps an open file and makes the last byte of the range 0.
 void* MapShared(int iFd, size_t uSize, int* piError)
 {
     if (uSize == 0 || IsAboveSizeLimit(uSize))
@@ -127,23 +186,22 @@ void* MapShared(int iFd, size_t uSize, int* piError)
         *piError = uSize == 0 ? EINVAL : EFBIG;
         return MAP_FAILED;
     }
-    const off_t iSize = static_cast<off_t>(uSize);
-    tag_FileEnd end = {};
-    *piError = ReadFileEnd(iFd, iSize, &end);
+    *piError = ReserveFile(iFd, static_cast<off_t>(uSize));
     if (*piError != 0)
     {
         return MAP_FAILED;
     }
-    void* pAddr = MAP_FAILED;
-    *piError = ExtendFile(iFd, iSize);
-    if (*piError == 0)
-    {
-        pAddr = mmap(nullptr, uSize, PROT_READ | PROT_WRITE, MAP_SHARED, iFd, 0);
-        *piError = errno;
-    }
+    void* pAddr = mmap(nullptr, uSize, PROT_READ | PROT_WRITE, MAP_SHARED, iFd, 0);
     if (pAddr == MAP_FAILED)
     {
-        RestoreFileEnd(iFd, iSize, end);
+        *piError = errno;
+        return MAP_FAILED;
+    }
+    *piError = FillWithZeros(iFd, static_cast<off_t>(uSize) - 1, static_cast<off_t>(uSize));
+    if (*piError != 0)
+    {
+        munmap(pAddr, uSize);
+        return MAP_FAILED;
     }
     return pAddr;
 }

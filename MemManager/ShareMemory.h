@@ -17,11 +17,14 @@ extern "C"
     // missing file is created with permission bits 0777. A file shorter than uSize is extended
     // with zero bytes, a longer one keeps its length; the byte at uSize - 1 becomes 0.
     // Every byte of the range gets its place on the disk before it is mapped, so that writing
-    // through the mapping cannot kill the process; file systems that cannot reserve space are
-    // trusted. When the file cannot have that size (disk full: ENOSPC; above the process's
-    // file-size limit: EFBIG; size 0: EINVAL), the file gets its old length and content back and
-    // -1 is returned, with the line of a failed mapping. A file that had to be created then
-    // stays, empty.
+    // through the mapping cannot kill the process. Where the system cannot reserve space, zeros
+    // are written behind the file's end and wherever it reads as zeros; that takes a read of the
+    // whole range.
+    // When the file cannot have that size (disk full: ENOSPC; above the process's file-size
+    // limit: EFBIG; size 0: EINVAL), it gets its old length back and -1 is returned, with the
+    // line of a failed mapping. A file that had to be created then stays, empty. Only a file that
+    // has reached the size stays so when it then cannot be mapped: others may use it already.
+    // Calls that extend the same file wait for each other.
     QV_EXPORT void* OpenShareMemory(const char* szPath, size_t uSize);
     QV_EXPORT void* OpenWriteShareMemory(const char* szPath, size_t uSize);
 

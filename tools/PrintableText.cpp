@@ -121,8 +121,8 @@ std::string PrintableText(const std::string& strText)
             ++uAt;
             continue;
         }
-        strPrintable += IsEscaped(uCharacter) ? Escape("\\u%04x", uCharacter)
-                                              : strText.substr(uAt, uBytes);
+        strPrintable +=
+            IsEscaped(uCharacter) ? Escape("\\u%04x", uCharacter) : strText.substr(uAt, uBytes);
         uAt += uBytes;
     }
     return strPrintable;

@@ -117,8 +117,8 @@ unsigned CPieceTable::AskEnds(int iKey, int iOffset)
         uEnds |= static_cast<unsigned>(bTried) << iEnd;
         uFull |= static_cast<unsigned>(bTried && bFull) << iEnd;
     }
-    m_pRows[iKey].auFull[iOffset] = static_cast<uint16_t>(uFull);
-    m_pEnds[PlaceOf(iKey, iOffset)] = static_cast<uint16_t>(uEnds);
+    RowOf(iKey).auFull[iOffset] = static_cast<uint16_t>(uFull);
+    *EndsOf(iKey, iOffset) = static_cast<uint16_t>(uEnds);
     return uEnds;
 }
 

@@ -57,7 +57,7 @@ public:
     // the first one, which tells most names apart, stays in the nearest cache.
     unsigned Ends(int iKey, int iOffset)
     {
-        const uint16_t uEnds = m_pEnds[PlaceOf(iKey, iOffset)];
+        const uint16_t uEnds = *EndsOf(iKey, iOffset);
         return uEnds != NOT_ASKED ? uEnds : AskEnds(iKey, iOffset);
     }
 
@@ -90,7 +90,7 @@ public:
         int m_iKeys;
     };
 
-    tag_PieceRow& RowOf(int iKey) { return m_pRows[iKey]; }
+    tag_PieceRow& RowOf(int iKey) { return m_pRows.get()[iKey]; }
     int InputLength() const { return m_iInputLen; }
     const CReadingSets& Sets() const { return m_sets; }
 
@@ -100,7 +100,10 @@ public:
 private:
     static constexpr uint16_t NOT_ASKED = UINT16_MAX;
 
-    int PlaceOf(int iKey, int iOffset) const { return iOffset * KeyCount() + iKey; }
+    uint16_t* EndsOf(int iKey, int iOffset)
+    {
+        return m_pEnds.get() + (iOffset * KeyCount() + iKey);
+    }
     bool AddTypedKeys();
     int KeyOfWide(wchar_t code) const;
     wchar_t TypedUnit(int iKey) const;

@@ -47,7 +47,7 @@ private:
     static constexpr int MOST_STATES = 64;
     static constexpr int MOST_STEPS = 64 * 1024; // only a damaged table has many keys
 
-    uint8_t* StepOf(int iState, int iKey) { return &m_pNext[iState * m_iKeys + iKey]; }
+    uint8_t* StepOf(int iState, int iKey) { return m_pNext.get() + (iState * m_iKeys + iKey); }
     bool GoOn(const wchar_t* pCodes, int iState);
     int Step(int iState, int iKey);
     unsigned ReachedBehind(int iState, int iKey);

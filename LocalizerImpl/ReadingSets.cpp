@@ -49,7 +49,7 @@ public:
     bool IsReady() const { return m_pSlots != nullptr && m_pFirstOf != nullptr; }
     int Count() const { return m_iCount; }
     // The record that a set was first met in.
-    const PYOFWORDS& FirstOf(int iSet) const { return m_pMap[m_pFirstOf[iSet]]; }
+    const PYOFWORDS& FirstOf(int iSet) const { return m_pMap[m_pFirstOf.get()[iSet]]; }
 
     int Number(int iRecord)
     {
@@ -64,7 +64,7 @@ public:
             }
             uSlot = (uSlot + 1) % SLOT_COUNT;
         }
-        m_pFirstOf[m_iCount] = static_cast<uint16_t>(iRecord);
+        m_pFirstOf.get()[m_iCount] = static_cast<uint16_t>(iRecord);
         m_pSlots[uSlot] = static_cast<uint16_t>(m_iCount + 1);
         return m_iCount++;
     }
@@ -167,10 +167,12 @@ bool CReadingSets::Fill(const PYOFWORDS* pMap)
     {
         return false;
     }
+    uint16_t* pKeys = m_pKeyOf.get() + LOC_HANZI_BASE;
+    tag_Word* pWords = m_pWords.get();
     for (int i = 0; i < PY_WORD_COUNT; ++i)
     {
-        m_pKeyOf[LOC_HANZI_BASE + i] = static_cast<uint16_t>(index.Number(i));
-        std::memcpy(m_pWords[i].szWord, pMap[i].szWord, sizeof(tag_Word));
+        pKeys[i] = static_cast<uint16_t>(index.Number(i));
+        std::memcpy(pWords[i].szWord, pMap[i].szWord, sizeof(tag_Word));
     }
     m_iCount = index.Count();
     FillOtherKeys();
@@ -178,11 +180,13 @@ bool CReadingSets::Fill(const PYOFWORDS* pMap)
     {
         return false;
     }
+    PYOFWORDS* pRecords = m_pRecords.get();
+    uint64_t* pInitials = m_pInitials.get();
     for (int i = 0; i < m_iCount; ++i)
     {
-        m_pRecords[i] = index.FirstOf(i);
-        std::memset(m_pRecords[i].szWord, 0, sizeof(tag_Word));
-        m_pInitials[i] = InitialsOf(m_pRecords[i]);
+        pRecords[i] = index.FirstOf(i);
+        std::memset(pRecords[i].szWord, 0, sizeof(tag_Word));
+        pInitials[i] = InitialsOf(pRecords[i]);
     }
     return true;
 }
@@ -261,7 +265,7 @@ wchar_t CReadingSets::CompactCodeOf(int iKey) const
 
 PYOFWORDS CReadingSets::RecordOf(wchar_t code) const
 {
-    PYOFWORDS record = m_pRecords[KeyOf(CodeBits(code))];
-    std::memcpy(record.szWord, m_pWords[HanZiRecord(code)].szWord, sizeof(tag_Word));
+    PYOFWORDS record = Records()[KeyOf(CodeBits(code))];
+    std::memcpy(record.szWord, m_pWords.get()[HanZiRecord(code)].szWord, sizeof(tag_Word));
     return record;
 }

@@ -43,7 +43,7 @@ public:
     bool MayBegin(int iSet, wchar_t unit) const
     {
         const uint64_t uBit = InitialBit(unit);
-        return uBit == 0 || (m_pInitials[iSet] & uBit) != 0;
+        return uBit == 0 || (m_pInitials.get()[iSet] & uBit) != 0;
     }
 
     // Keys are 0..KeyCount() - 1, first one for each set. A code acts by its low 16 bits, except

@@ -74,7 +74,7 @@ void SetStatus(tag_SampleContact& contact, int iIndex)
     if (iIndex % 4 == 1)
     {
         contact.llStatusUpdateID = 1000 + iIndex;
-        contact.strStatus = STATUS_TEXTS[iIndex / 4 % std::size(STATUS_TEXTS)];
+        contact.strStatus = STATUS_TEXTS[static_cast<size_t>(iIndex) / 4 % std::size(STATUS_TEXTS)];
     }
 }
 

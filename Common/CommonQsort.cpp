@@ -73,6 +73,8 @@ private:
 
 } // namespace
 
+Common_Qsort::Common_Qsort() = default;
+
 Common_Qsort::~Common_Qsort()
 {
     FreeBuffers();

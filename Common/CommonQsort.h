@@ -3,8 +3,8 @@
 
 #include "Common/Export.h"
 
-// What an array holds and how it is ordered.
-enum Common_Sort_enum
+// What an array holds and how it is ordered. Any int may be passed: the sorter refuses others.
+enum Common_Sort_enum : int
 {
     SORT_NAME = 0,  // tag_ContactsStruct by name key, nameless contacts last
     SORT_TIME = 1,  // tag_ContactsStruct by last contact, most recent first
@@ -18,7 +18,7 @@ enum Common_Sort_enum
 class QV_EXPORT Common_Qsort
 {
 public:
-    Common_Qsort() = default;
+    Common_Qsort();
     ~Common_Qsort();
     Common_Qsort(const Common_Qsort&) = delete;
     Common_Qsort& operator=(const Common_Qsort&) = delete;

@@ -6,7 +6,7 @@
 #include "Core/ContactRecords.h"
 
 // What the typed text is and where it is searched.
-enum IME_SEARCH_TYPE
+enum IME_SEARCH_TYPE : int
 {
     IME_SEARCH_WORD = 0,   // letters, over the contacts
     IME_SEARCH_NUM = 1,    // keypad digits, over the contacts

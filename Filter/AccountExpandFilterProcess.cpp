@@ -10,13 +10,13 @@ namespace
 constexpr const char* TRACE_TAG = "Filter/AccountExpandFilterProcess";
 
 // The chain itself is searched: it is as short as a list of its ids, and needs no memory.
-bool IsExcluded(QVLong32 lAccountID, const CFilterChain& chain)
+bool IsExcluded(QVLong32 lAccountID, CFilterChain& chain)
 {
     for (int k = 0; k < chain.GetFilterNum(); ++k)
     {
         const CFilter* pFilter = chain.GetFilterByNo(k);
         if (pFilter != nullptr && pFilter->m_iType == FILTER_ACCOUNT_EXPAND &&
-            static_cast<const CAccountExpandFilter*>(pFilter)->GetAccountID() == lAccountID)
+            static_cast<const CAccountExpandFilter*>(pFilter)->m_iID == lAccountID)
         {
             return true;
         }
@@ -24,7 +24,7 @@ bool IsExcluded(QVLong32 lAccountID, const CFilterChain& chain)
     return false;
 }
 
-bool AreAllExcluded(const QVLong32* plAccounts, int iCount, const CFilterChain& chain)
+bool AreAllExcluded(const QVLong32* plAccounts, int iCount, CFilterChain& chain)
 {
     for (int i = 0; i < iCount; ++i)
     {
@@ -36,26 +36,30 @@ bool AreAllExcluded(const QVLong32* plAccounts, int iCount, const CFilterChain& 
     return iCount > 0;
 }
 
-} // namespace
-
-int AccountExpandFilterProcess::IsSameAccountEx(int iID, const QVLong32* plList, int iNum,
-                                                const CFilterChain& chain)
+bool IsConfined(int iID, const QVLong32* plList, int iNum, CFilterChain& chain)
 {
     const int iCount = CountIds(plList, iNum);
     if (iCount == 1)
     {
-        return plList[0] == iID ? 1 : 0;
+        return plList[0] == iID;
     }
     QV_LOGD(TRACE_TAG, "QV_Contacts: IsSameAccountEx ACCOUNT SUM= %d\n", iCount);
-    return AreAllExcluded(plList, iCount, chain) ? 1 : 0;
+    return AreAllExcluded(plList, iCount, chain);
+}
+
+} // namespace
+
+int AccountExpandFilterProcess::IsSameAccountEx(int iID, QVLong32* plList, int iNum,
+                                                CFilterChain& chain)
+{
+    return IsConfined(iID, plList, iNum, chain) ? 1 : 0;
 }
 
 bool AccountExpandFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                                       const CFilterChain& chain)
+                                       CFilterChain& chain)
 {
     const CAccountExpandFilter& account = static_cast<const CAccountExpandFilter&>(filter);
-    return IsSameAccountEx(account.GetAccountID(), record.lAccountID, CONTACT_MAX_ACCOUNTS,
-                           chain) == 0;
+    return !IsConfined(account.m_iID, record.lAccountID, CONTACT_MAX_ACCOUNTS, chain);
 }
 
 int AccountExpandFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)

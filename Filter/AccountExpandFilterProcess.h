@@ -11,15 +11,14 @@ class QV_EXPORT AccountExpandFilterProcess : public FilterProcess
 public:
     // The kind of filter served, and its rule.
     static constexpr int KIND = FILTER_ACCOUNT_EXPAND;
-    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                      const CFilterChain& chain);
+    QV_INTERNAL static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                                  CFilterChain& chain);
 
     // 1 when a contact with the accounts at plList (at most iNum, ending at the first 0) is to go:
     // its one account is iID, or it has several and each is the id of a filter of this kind in the
-    // chain. Else 0. Unless there is exactly one account, their number is logged. Allocates
-    // nothing.
-    static int IsSameAccountEx(int iID, const QVLong32* plList, int iNum,
-                               const CFilterChain& chain);
+    // chain. Else 0. Unless there is exactly one account, their number is logged. Reads
+    // list and chain only and allocates nothing.
+    int IsSameAccountEx(int iID, QVLong32* plList, int iNum, CFilterChain& chain);
 
     int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
 };

@@ -2,16 +2,16 @@
 
 #include "Filter/IdList.h"
 
-int AccountFilterProcess::IsSameAccount(int iID, const QVLong32* plList, int iNum)
+int AccountFilterProcess::IsSameAccount(int iID, QVLong32* plList, int iNum)
 {
     return IsInIdList(iID, plList, iNum) ? 1 : 0;
 }
 
 bool AccountFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                                 const CFilterChain& /*chain*/)
+                                 CFilterChain& /*chain*/)
 {
     const CAccountFilter& account = static_cast<const CAccountFilter&>(filter);
-    return IsSameAccount(account.GetAccountID(), record.lAccountID, CONTACT_MAX_ACCOUNTS) == 1;
+    return IsInIdList(account.m_iID, record.lAccountID, CONTACT_MAX_ACCOUNTS);
 }
 
 int AccountFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)

@@ -10,12 +10,12 @@ class QV_EXPORT AccountFilterProcess : public FilterProcess
 public:
     // The kind of filter served, and its rule.
     static constexpr int KIND = FILTER_ACCOUNT;
-    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                      const CFilterChain& chain);
+    QV_INTERNAL static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                                  CFilterChain& chain);
 
     // 1 when iID stands among the iNum accounts at plList, else 0. The list ends at its first 0,
-    // which is itself compared: id 0 matches every list that has a 0.
-    static int IsSameAccount(int iID, const QVLong32* plList, int iNum);
+    // which is itself compared: id 0 matches every list that has a 0. The list is only read.
+    int IsSameAccount(int iID, QVLong32* plList, int iNum);
 
     int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
 };

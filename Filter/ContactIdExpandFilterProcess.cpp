@@ -1,10 +1,10 @@
 #include "Filter/ContactIdExpandFilterProcess.h"
 
 bool ContactIdExpandFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                                         const CFilterChain& /*chain*/)
+                                         CFilterChain& /*chain*/)
 {
     const CContactIdExpandFilter& contact = static_cast<const CContactIdExpandFilter&>(filter);
-    return record.iContactID != contact.GetContactID();
+    return record.iContactID != contact.m_iID;
 }
 
 int ContactIdExpandFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)

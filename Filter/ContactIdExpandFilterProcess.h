@@ -10,8 +10,8 @@ class QV_EXPORT ContactIdExpandFilterProcess : public FilterProcess
 public:
     // The kind of filter served, and its rule.
     static constexpr int KIND = FILTER_CONTACT_ID_EXPAND;
-    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                      const CFilterChain& chain);
+    QV_INTERNAL static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                                  CFilterChain& chain);
 
     int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
 };

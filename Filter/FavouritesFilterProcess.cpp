@@ -1,7 +1,7 @@
 #include "Filter/FavouritesFilterProcess.h"
 
 bool FavouritesFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
-                                    const CFilterChain& /*chain*/)
+                                    CFilterChain& /*chain*/)
 {
     return (record.iFlags & CONTACT_FLAG_STARRED) != 0;
 }

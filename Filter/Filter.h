@@ -40,7 +40,7 @@ class QV_EXPORT CGroupFilter : public CFilter
 public:
     // The group that the filter is about, by its id.
     explicit CGroupFilter(int iGroupID);
-    int GetGroupID() const { return m_iID; }
+    int GetGroupID();
     int32_t m_iID;
 };
 static_assert(sizeof(void*) != 4 || sizeof(CGroupFilter) == 12, "part of the interface");
@@ -51,7 +51,7 @@ class QV_EXPORT CGroupExpandFilter : public CFilter
 public:
     // The group that the filter is about, by its id.
     explicit CGroupExpandFilter(int iGroupID);
-    int GetGroupID() const { return m_iID; }
+    int GetGroupID();
     int32_t m_iID;
 };
 
@@ -61,7 +61,7 @@ class QV_EXPORT CAccountFilter : public CFilter
 public:
     // The account that the filter is about, by its id.
     explicit CAccountFilter(int iAccountID);
-    int GetAccountID() const { return m_iID; }
+    int GetAccountID();
     int32_t m_iID;
 };
 
@@ -71,7 +71,7 @@ class QV_EXPORT CAccountExpandFilter : public CFilter
 public:
     // The account that the filter is about, by its id.
     explicit CAccountExpandFilter(int iAccountID);
-    int GetAccountID() const { return m_iID; }
+    int GetAccountID();
     int32_t m_iID;
 };
 
@@ -81,7 +81,7 @@ class QV_EXPORT CContactIdExpandFilter : public CFilter
 public:
     // The contact that the filter is about, by its id.
     explicit CContactIdExpandFilter(int iContactID);
-    int GetContactID() const { return m_iID; }
+    int GetContactID();
     int32_t m_iID;
 };
 

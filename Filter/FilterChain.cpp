@@ -21,12 +21,12 @@ void CFilterChain::SetFilter(CFilter* pFilter)
     }
 }
 
-int CFilterChain::GetFilterNum() const
+int CFilterChain::GetFilterNum()
 {
     return static_cast<int>(m_vFilters.size());
 }
 
-CFilter* CFilterChain::GetFilterByNo(int iNo) const
+CFilter* CFilterChain::GetFilterByNo(int iNo)
 {
     // As an unsigned number a negative index lies behind every place.
     const size_t uIndex = static_cast<unsigned int>(iNo);

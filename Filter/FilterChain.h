@@ -21,11 +21,11 @@ public:
     void SetFilter(CFilter* pFilter);
 
     // The number of places, null filters included.
-    int GetFilterNum() const;
+    int GetFilterNum();
 
     // The filter at iNo, from 0 in the order of appending, still owned by the chain; null when
     // there is no such place.
-    CFilter* GetFilterByNo(int iNo) const;
+    CFilter* GetFilterByNo(int iNo);
 
 private:
     android::Vector<CFilter*> m_vFilters;

@@ -13,7 +13,7 @@ struct tag_RuleInUse
 {
     RecordRuleFn pfnKeeps;
     const CFilter& filter;
-    const CFilterChain& chain;
+    CFilterChain& chain;
 
     bool Keeps(const tag_ContactsStruct& record) const { return pfnKeeps(record, filter, chain); }
 };

@@ -10,7 +10,7 @@ class CFilterChain;
 // Whether a filter lets a record pass. The filter is of the class that belongs to the rule's
 // kind; chain is the one it stands in.
 using RecordRuleFn = bool (*)(const tag_ContactsStruct& record, const CFilter& filter,
-                              const CFilterChain& chain);
+                              CFilterChain& chain);
 
 // One step of the pipeline that narrows a set of records by a chain of filters. Each subclass
 // serves the filters of one kind and states two things: that kind (KIND) and its rule (Keeps).
@@ -36,8 +36,8 @@ public:
 
 protected:
     // The body of every FilterRecord.
-    int FilterByRule(tag_ContactsInfo* pInfo, CFilterChain& chain, int iKind,
-                     RecordRuleFn pfnKeeps);
+    QV_INTERNAL int FilterByRule(tag_ContactsInfo* pInfo, CFilterChain& chain, int iKind,
+                                 RecordRuleFn pfnKeeps);
 };
 static_assert(sizeof(void*) != 4 || sizeof(FilterProcess) == 8, "part of the interface");
 

@@ -1,13 +1,12 @@
 #include "Filter/GroupExpandFilterProcess.h"
 
-#include "Filter/AccountFilterProcess.h"
+#include "Filter/IdList.h"
 
 bool GroupExpandFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                                     const CFilterChain& /*chain*/)
+                                     CFilterChain& /*chain*/)
 {
     const CGroupExpandFilter& group = static_cast<const CGroupExpandFilter&>(filter);
-    return AccountFilterProcess::IsSameAccount(group.GetGroupID(), record.lGroupID,
-                                               CONTACT_MAX_GROUPS) == 0;
+    return !IsInIdList(group.m_iID, record.lGroupID, CONTACT_MAX_GROUPS);
 }
 
 int GroupExpandFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)

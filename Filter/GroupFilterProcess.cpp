@@ -2,16 +2,16 @@
 
 #include "Filter/IdList.h"
 
-int GroupFilterProcess::IsSameGroup(int iID, const QVLong32* plList, int iNum)
+int GroupFilterProcess::IsSameGroup(int iID, QVLong32* plList, int iNum)
 {
     return IsInIdList(iID, plList, iNum) ? 1 : 0;
 }
 
 bool GroupFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                               const CFilterChain& /*chain*/)
+                               CFilterChain& /*chain*/)
 {
     const CGroupFilter& group = static_cast<const CGroupFilter&>(filter);
-    return IsSameGroup(group.GetGroupID(), record.lGroupID, CONTACT_MAX_GROUPS) == 1;
+    return IsInIdList(group.m_iID, record.lGroupID, CONTACT_MAX_GROUPS);
 }
 
 int GroupFilterProcess::FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain)

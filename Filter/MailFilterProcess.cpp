@@ -1,7 +1,7 @@
 #include "Filter/MailFilterProcess.h"
 
 bool MailFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
-                              const CFilterChain& /*chain*/)
+                              CFilterChain& /*chain*/)
 {
     return (record.iFlags & CONTACT_FLAG_MAIL) != 0;
 }

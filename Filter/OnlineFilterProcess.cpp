@@ -10,7 +10,7 @@ constexpr const char* TRACE_TAG = "Filter/OnlineFilterProcess";
 } // namespace
 
 bool OnlineFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
-                                const CFilterChain& /*chain*/)
+                                CFilterChain& /*chain*/)
 {
     const bool bOnline = (record.iFlags & CONTACT_FLAG_ONLINE) != 0;
     if (bOnline)

@@ -10,8 +10,8 @@ class QV_EXPORT OnlineFilterProcess : public FilterProcess
 public:
     // The kind of filter served, and its rule.
     static constexpr int KIND = FILTER_ONLINE;
-    static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                      const CFilterChain& chain);
+    QV_INTERNAL static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                                  CFilterChain& chain);
 
     int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
 };

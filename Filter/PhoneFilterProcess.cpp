@@ -1,7 +1,7 @@
 #include "Filter/PhoneFilterProcess.h"
 
 bool PhoneFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
-                               const CFilterChain& /*chain*/)
+                               CFilterChain& /*chain*/)
 {
     return (record.iFlags & CONTACT_FLAG_PHONE) != 0;
 }

@@ -1,7 +1,7 @@
 #include "Filter/PostalFilterProcess.h"
 
 bool PostalFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
-                                const CFilterChain& /*chain*/)
+                                CFilterChain& /*chain*/)
 {
     return (record.iFlags & CONTACT_FLAG_ADDRESS) != 0;
 }

@@ -52,7 +52,7 @@ bool WritesLogLines(int iKind)
 
 } // namespace
 
-bool CRecordTest::CanTest(const CFilterChain& chain)
+bool CRecordTest::CanTest(CFilterChain& chain)
 {
     for (int k = 0; k < chain.GetFilterNum(); ++k)
     {

@@ -11,19 +11,19 @@ class CFilterChain;
 class CRecordTest
 {
 public:
-    explicit CRecordTest(const CFilterChain& chain) : m_chain(chain) {}
+    explicit CRecordTest(CFilterChain& chain) : m_chain(chain) {}
 
     // Whether the object can take the pipeline's place for this chain. False when a filter's
     // process writes log lines (FILTER_ACCOUNT_EXPAND, FILTER_ONLINE), which come in another
     // order and number record by record, and when a filter is of an unknown kind. Null filters
     // do not matter.
-    static bool CanTest(const CFilterChain& chain);
+    static bool CanTest(CFilterChain& chain);
 
     // Whether the record passes every filter of the chain.
     bool Keeps(const tag_ContactsStruct& record) const;
 
 private:
-    const CFilterChain& m_chain;
+    CFilterChain& m_chain;
 };
 
 #endif

@@ -422,12 +422,12 @@ void CQVLocalizerManager::GetFirstWord(PYOFWORDS* pMap, wchar_t code, wchar_t* s
         return;
     }
     szOut[0] = 0;
-    if (IsAlpha(CodeBits(code)))
+    if (IsAlphaCode(CodeBits(code)))
     {
         szOut[0] = L'A' + static_cast<wchar_t>(CodeBits(code) - LOC_ALPHA_BASE);
         return;
     }
-    if (!IsHanZi(CodeBits(code)))
+    if (!IsHanZiCode(CodeBits(code)))
     {
         szOut[0] = L'#';
         return;

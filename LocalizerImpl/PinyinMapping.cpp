@@ -172,6 +172,26 @@ int CQVLocalizerManager::FindRecord(const PYOFWORDS* pMap, const char* szKey)
     return bFound ? static_cast<int>(pFound - pMap) : -1;
 }
 
+bool CQVLocalizerManager::IsHanZi(unsigned short code)
+{
+    return IsHanZiCode(code);
+}
+
+bool CQVLocalizerManager::IsGBWord(unsigned short uRecord)
+{
+    return IsGBIndex(uRecord);
+}
+
+bool CQVLocalizerManager::IsAlpha(unsigned short code)
+{
+    return IsAlphaCode(code);
+}
+
+bool CQVLocalizerManager::IsDigtal(unsigned short code)
+{
+    return IsDigitCode(code);
+}
+
 bool CQVLocalizerManager::IsEnglishWord(wchar_t unit)
 {
     return (unit >= L'A' && unit <= L'Z') || (unit >= L'a' && unit <= L'z');

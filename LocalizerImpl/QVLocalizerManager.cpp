@@ -112,11 +112,11 @@ bool CQVLocalizerManager::ComparePiece(PYOFWORDS* pMap, wchar_t code, wchar_t* s
                                        int& bRunFull)
 {
     const uint16_t uCode = CodeBits(code);
-    if (IsAlpha(uCode))
+    if (IsAlphaCode(uCode))
     {
         return CmpEnglishWords(uCode, szPiece) != 0;
     }
-    if (IsHanZi(uCode))
+    if (IsHanZiCode(uCode))
     {
         int bFull = 0;
         const int iFits = CmpChineseWord(pMap, code, pMap[HanZiRecord(code)], szPiece, &m_stMask,
@@ -124,7 +124,7 @@ bool CQVLocalizerManager::ComparePiece(PYOFWORDS* pMap, wchar_t code, wchar_t* s
         bRunFull = bRunFull != 0 ? bFull : 0;
         return iFits != 0;
     }
-    if (IsDigtal(uCode))
+    if (IsDigitCode(uCode))
     {
         return CmpDigitalWord(uCode, szPiece) != 0;
     }
@@ -147,7 +147,7 @@ void CQVLocalizerManager::ProcessInputCNWord(PYOFWORDS* pMap, wchar_t* szInput)
         Ft2Jt(szCharacter);
         wchar_t szCodes[CONTACT_MAX_KEY] = {};
         TranslateNameToLocal(pMap, szCharacter, szCodes);
-        if (IsHanZi(CodeBits(szCodes[0])))
+        if (IsHanZiCode(CodeBits(szCodes[0])))
         {
             *pUnit = szCodes[0];
         }
@@ -165,7 +165,7 @@ int CQVLocalizerManager::CreateMaskWord(PYOFWORDS* pMap, wchar_t code)
         m_stMask = {}; // a full input takes no further key
         return 1;
     }
-    if (IsAlpha(CodeBits(code)))
+    if (IsAlphaCode(CodeBits(code)))
     {
         m_stMask.lMask |= 1U << (CodeBits(code) - LOC_ALPHA_BASE);
     }
@@ -182,7 +182,7 @@ void CQVLocalizerManager::CreateCNWordMask(PYOFWORDS* pMap, wchar_t code)
     {
         return;
     }
-    if (IsHanZi(CodeBits(code)))
+    if (IsHanZiCode(CodeBits(code)))
     {
         for (const auto& szReading : pMap[HanZiRecord(code)].szPinyin)
         {
@@ -192,7 +192,7 @@ void CQVLocalizerManager::CreateCNWordMask(PYOFWORDS* pMap, wchar_t code)
             }
         }
     }
-    else if (code == LOC_OTHER || IsDigtal(CodeBits(code)))
+    else if (code == LOC_OTHER || IsDigitCode(CodeBits(code)))
     {
         m_stMask.lMask |= MASK_OTHER;
     }
@@ -228,7 +228,7 @@ int CQVLocalizerManager::JudgeAllEnglish(tag_LocalizerDetail* pDetail)
     for (int i = MatchFirst(pDetail->iMatchPos); i <= iLast; ++i)
     {
         const wchar_t code = pDetail->szLocalizerKey[i];
-        if (!IsAlpha(CodeBits(code)) && code != LOC_OTHER)
+        if (!IsAlphaCode(CodeBits(code)) && code != LOC_OTHER)
         {
             return 0;
         }

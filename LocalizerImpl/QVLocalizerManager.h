@@ -88,13 +88,13 @@ public:
     static int ReleasePinYinFileMapping(long hMap);
 
     // Record of a character (zero-terminated UTF-8) in the table, -1 when it has none.
-    static int FindRecord(const PYOFWORDS* pMap, const char* szKey);
+    QV_INTERNAL static int FindRecord(const PYOFWORDS* pMap, const char* szKey);
 
     // Classes of codes (cut to 16 bits) and of characters.
-    static bool IsHanZi(unsigned short code) { return IsHanZiCode(code); }
-    static bool IsGBWord(unsigned short uRecord) { return IsGBIndex(uRecord); }
-    static bool IsAlpha(unsigned short code) { return IsAlphaCode(code); }
-    static bool IsDigtal(unsigned short code) { return IsDigitCode(code); }
+    static bool IsHanZi(unsigned short code);
+    static bool IsGBWord(unsigned short uRecord);
+    static bool IsAlpha(unsigned short code);
+    static bool IsDigtal(unsigned short code);
     static bool IsEnglishWord(wchar_t unit);
     static bool IsDigitalChar(wchar_t unit);
     // Whether szText begins at least one entry of g_pyWords; the empty text does.

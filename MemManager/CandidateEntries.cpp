@@ -53,8 +53,7 @@ void Prefetch(const tag_ContactsStruct& record)
 } // namespace
 
 CCandidateEntries::Counts CCandidateEntries::Select(const tag_ContactsStruct* pRecords, int iCount,
-                                                    const CFilterChain& chain,
-                                                    CCandidateTest* pTest,
+                                                    CFilterChain& chain, CCandidateTest* pTest,
                                                     tag_LocalizerDetail* pEntries)
 {
     const CRecordTest test(chain);

@@ -22,7 +22,7 @@ public:
     // Writes an entry for each of the iCount records that passes the chain, which has to be one
     // that CRecordTest::CanTest accepts, and that pTest (may be null) does not rule out. The
     // records are only read, so they may lie in a mapping; pEntries has room for iCount entries.
-    static Counts Select(const tag_ContactsStruct* pRecords, int iCount, const CFilterChain& chain,
+    static Counts Select(const tag_ContactsStruct* pRecords, int iCount, CFilterChain& chain,
                          CCandidateTest* pTest, tag_LocalizerDetail* pEntries);
 
     // Narrows the caller's copy of the records by the pipeline of filter processes and makes the

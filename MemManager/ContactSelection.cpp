@@ -72,7 +72,7 @@ struct tag_OpenStore
 // the records would: of each a few cache lines are read, and entries are an eighth of them.
 // Room for all is taken, but most of it is never touched.
 // Returns whether the array is dense: what is spare is no more than what is used.
-bool SelectFromStore(tag_OpenStore* pStore, const CFilterChain& chain, CCandidateTest* pTest,
+bool SelectFromStore(tag_OpenStore* pStore, CFilterChain& chain, CCandidateTest* pTest,
                      tag_LocalizerResult* pResult)
 {
     auto pEntries = NewUnderLock<tag_LocalizerDetail>(pStore->iCount);

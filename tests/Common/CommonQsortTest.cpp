@@ -8,6 +8,7 @@
 #include <gtest/gtest.h>
 
 #include <algorithm>
+#include <climits>
 #include <random>
 #include <string>
 #include <tuple>
@@ -227,5 +228,20 @@ TEST_P(Sorter, SearchesAtEveryLength)
                 m_sorter.Search_BinEx(pBase, iCount, pKey, GetParam(), bInsert, &bFound);
             ASSERT_EQ(std::pair(iMarked, bFound == 1), PlainSearch(a, key, bInsert == 1, true));
         }
+    }
+}
+
+TEST(CommonQsort, RefusesEveryValueThatIsNoOrder)
+{
+    for (const int iKind : {2, 4, -1, INT_MAX})
+    {
+        const auto eKind = static_cast<Common_Sort_enum>(iKind);
+        char szRecords[] = "ba";
+        char szKey[] = "a";
+        Common_Qsort sorter;
+        EXPECT_EQ(-1, sorter.QuickSort(szRecords, 2, eKind));
+        EXPECT_STREQ("ba", szRecords);
+        EXPECT_EQ(-1, sorter.Search_Bin(szRecords, 2, szKey, eKind, 1));
+        EXPECT_EQ(-1, sorter.QSORT_GT(szRecords, szKey));
     }
 }

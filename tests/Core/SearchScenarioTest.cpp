@@ -208,7 +208,7 @@ TEST_F(CSearchTest, FailsWithoutTouchingWhatItHandsOut)
     CFilterChain* pChain = &m_everybody;
     long lMask = MASK_UNSET;
     wchar_t szWords[CN_WORD_MAX] = {};
-    const auto eUnknown = static_cast<IME_SEARCH_TYPE>(3);
+    const auto eUnknown = static_cast<IME_SEARCH_TYPE>(-1);
     const auto Code = [&](auto... arguments) { return m_logic.Search(nullptr, arguments...); };
     EXPECT_EQ(Code(szInput, SPECIAL, nullptr, 0, ppResult, &lMask, szWords), -1);
     EXPECT_EQ(Code(szInput, WORD, pChain, 0, nullptr, &lMask, szWords), -1);

@@ -8,10 +8,13 @@
 #include <utility>
 #include <vector>
 
+#include "Filter/AccountExpandFilterProcess.h"
+#include "Filter/AccountFilterProcess.h"
 #include "Filter/FilterChain.h"
 #include "Filter/FilterChainBuilder.h"
 #include "Filter/FilterProcess.h"
 #include "Filter/FilterProcessFactory.h"
+#include "Filter/GroupFilterProcess.h"
 #include "Filter/RecordTest.h"
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/MemoryFailure.h"
@@ -292,6 +295,34 @@ TEST_F(CPipelineModel, TakesASetWithoutRecords)
         EXPECT_EQ(info.RecordNum, 0) << Case();
     }
     EXPECT_EQ(m_pFirst->FilterRecord(nullptr, *m_pChain), -1);
+}
+
+// The membership operations as programs call them, on an object and with lists of their own.
+TEST(Membership, ReadsAListUpToItsFirstZeroOrItsLength)
+{
+    QVLong32 lList[] = {3, 5, 0, 9};
+    const struct
+    {
+        int iID;
+        int iNum;
+        int iMember;
+        int iConfined; // to the accounts 3 and iID
+    } aCases[] = {{3, 4, 1, 0}, {5, 4, 1, 1}, {9, 4, 0, 0}, {0, 4, 1, 0}, {0, 2, 0, 0},
+                  {5, 1, 0, 0}, {3, 1, 1, 1}, {3, 0, 0, 0}, {0, -1, 0, 0}};
+    for (const auto& expected : aCases)
+    {
+        SCOPED_TRACE(testing::Message() << expected.iID << " of " << expected.iNum);
+        CFilterChain chain;
+        chain.SetFilter(new CAccountExpandFilter(3));
+        chain.SetFilter(new CAccountExpandFilter(expected.iID));
+        EXPECT_EQ(GroupFilterProcess().IsSameGroup(expected.iID, lList, expected.iNum),
+                  expected.iMember);
+        EXPECT_EQ(AccountFilterProcess().IsSameAccount(expected.iID, lList, expected.iNum),
+                  expected.iMember);
+        EXPECT_EQ(
+            AccountExpandFilterProcess().IsSameAccountEx(expected.iID, lList, expected.iNum, chain),
+            expected.iConfined);
+    }
 }
 
 } // namespace

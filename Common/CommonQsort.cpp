@@ -1,16 +1,19 @@
 #include "Common/CommonQsort.h"
 
 #include "Common/NameOrder.h"
+#include "Common/SearchSteps.h"
 #include "Common/SortSteps.h"
 #include "Core/ContactRecords.h"
 #include "Core/LocalizerCodes.h"
 
+#include <algorithm>
 #include <cstddef>
-#include <cstdlib>
 #include <cstring>
 
 namespace
 {
+
+constexpr size_t MAX_RECORD_SIZE = std::max<size_t>(sizeof(tag_ContactsStruct), PY_RECORD_SIZE);
 
 int RecordSize(Common_Sort_enum type)
 {
@@ -40,24 +43,24 @@ int CompareWords(const char* a, const char* b)
 class CRecordArray
 {
 public:
-    CRecordArray(Common_Qsort& sorter, char* pBase, size_t uSize, char* pHeld, char* pSwap)
-        : m_sorter(sorter), m_pBase(pBase), m_uSize(uSize), m_pHeld(pHeld), m_pSwap(pSwap)
+    CRecordArray(Common_Qsort& sorter, char* pBase, int iSize)
+        : m_sorter(sorter), m_pBase(pBase), m_uSize(static_cast<size_t>(iSize))
     {
     }
 
     bool Greater(int a, int b) { return m_sorter.QSORT_GT(At(a), At(b)) == 1; }
-    bool LessThanHeld(int a) { return m_sorter.QSORT_LT(At(a), m_pHeld) == 1; }
-    bool GreaterThanHeld(int a) { return m_sorter.QSORT_GT(At(a), m_pHeld) == 1; }
-    void Hold(int a) { std::memcpy(m_pHeld, At(a), m_uSize); }
-    void Release(int a) { std::memcpy(At(a), m_pHeld, m_uSize); }
+    bool LessThanHeld(int a) { return m_sorter.QSORT_LT(At(a), m_acHeld) == 1; }
+    bool GreaterThanHeld(int a) { return m_sorter.QSORT_GT(At(a), m_acHeld) == 1; }
+    void Hold(int a) { std::memcpy(m_acHeld, At(a), m_uSize); }
+    void Release(int a) { std::memcpy(At(a), m_acHeld, m_uSize); }
     void Move(int from, int to) { std::memcpy(At(to), At(from), m_uSize); }
     void Swap(int a, int b)
     {
         if (a != b)
         {
-            std::memcpy(m_pSwap, At(a), m_uSize);
+            std::memcpy(m_acSwap, At(a), m_uSize);
             std::memcpy(At(a), At(b), m_uSize);
-            std::memcpy(At(b), m_pSwap, m_uSize);
+            std::memcpy(At(b), m_acSwap, m_uSize);
         }
     }
 
@@ -67,42 +70,83 @@ private:
     Common_Qsort& m_sorter;
     char* m_pBase;
     size_t m_uSize;
-    char* m_pHeld;
-    char* m_pSwap;
+    alignas(tag_ContactsStruct) char m_acHeld[MAX_RECORD_SIZE]; // pivot, or record being inserted
+    alignas(tag_ContactsStruct) char m_acSwap[MAX_RECORD_SIZE]; // one side of an exchange
 };
+
+// A key beside the records of a sorted array.
+class CKeyedArray
+{
+public:
+    CKeyedArray(Common_Qsort& sorter, char* pBase, int iSize, char* pKey)
+        : m_sorter(sorter), m_pBase(pBase), m_uSize(static_cast<size_t>(iSize)), m_pKey(pKey)
+    {
+    }
+
+    bool KeyEquals(int i) { return m_sorter.QSORT_EQ(m_pKey, At(i)) == 1; }
+    bool KeyBefore(int i) { return m_sorter.QSORT_LT(m_pKey, At(i)) == 1; }
+    bool KeyBehind(int i) { return m_sorter.QSORT_GT(m_pKey, At(i)) == 1; }
+
+private:
+    char* At(int i) const { return m_pBase + static_cast<size_t>(i) * m_uSize; }
+
+    Common_Qsort& m_sorter;
+    char* m_pBase;
+    size_t m_uSize;
+    char* m_pKey;
+};
+
+int SearchExact(CKeyedArray& array, int iCount)
+{
+    const int iLast = iCount - 1;
+    if (iCount > 1 && (array.KeyBefore(0) || array.KeyBehind(iLast)))
+    {
+        return -1;
+    }
+    if (array.KeyEquals(0))
+    {
+        return 0;
+    }
+    if (iCount > 1 && array.KeyEquals(iLast))
+    {
+        return iLast;
+    }
+    bool bFound = false;
+    const int iPos = iCount > 1 ? SearchHalves(array, iCount, &bFound) : -1;
+    return bFound ? iPos : -1;
+}
+
+// The insertion place that prefers an equal first or last record to the place behind it.
+int SearchInsertion(CKeyedArray& array, int iCount, bool* pbFound)
+{
+    const int iLast = iCount - 1;
+    if (iCount == 1 && array.KeyBefore(0))
+    {
+        return 0;
+    }
+    if (iCount > 1 && !array.KeyBehind(0))
+    {
+        *pbFound = array.KeyEquals(0);
+        return 0;
+    }
+    if (iCount == 1 || !array.KeyBefore(iLast))
+    {
+        *pbFound = array.KeyEquals(iLast);
+        return *pbFound ? iLast : iCount;
+    }
+    return SearchHalves(array, iCount, pbFound);
+}
 
 } // namespace
 
 Common_Qsort::Common_Qsort() = default;
 
-Common_Qsort::~Common_Qsort()
-{
-    FreeBuffers();
-}
-
-void Common_Qsort::FreeBuffers()
-{
-    std::free(m_pKeyBuf);
-    std::free(m_pSwapBuf);
-    m_pKeyBuf = nullptr;
-    m_pSwapBuf = nullptr;
-}
+Common_Qsort::~Common_Qsort() = default;
 
 void Common_Qsort::InitInterData(Common_Sort_enum type)
 {
     m_eSortType = type;
-    const int iRecSize = RecordSize(type);
-    if (iRecSize == m_iRecSize && IsReady())
-    {
-        return; // one search a character: the buffers outlive the call
-    }
-    FreeBuffers();
-    m_iRecSize = iRecSize;
-    if (iRecSize > 0)
-    {
-        m_pKeyBuf = static_cast<char*>(std::malloc(static_cast<size_t>(iRecSize)));
-        m_pSwapBuf = static_cast<char*>(std::malloc(static_cast<size_t>(iRecSize)));
-    }
+    m_iRecSize = RecordSize(type);
 }
 
 int Common_Qsort::QuickSort(char* base, int count, Common_Sort_enum type)
@@ -125,7 +169,7 @@ void Common_Qsort::QuickSort1(char* base, int lo, int hi)
 {
     if (base != nullptr && IsReady())
     {
-        CRecordArray array(*this, base, static_cast<size_t>(m_iRecSize), m_pKeyBuf, m_pSwapBuf);
+        CRecordArray array(*this, base, m_iRecSize);
         SortPartitions(array, lo, hi);
     }
 }
@@ -134,41 +178,9 @@ void Common_Qsort::InsertionSort(char* base, int lo, int hi)
 {
     if (base != nullptr && IsReady())
     {
-        CRecordArray array(*this, base, static_cast<size_t>(m_iRecSize), m_pKeyBuf, m_pSwapBuf);
+        CRecordArray array(*this, base, m_iRecSize);
         SortInsertions(array, lo, hi);
     }
-}
-
-char* Common_Qsort::RecordAt(char* base, int iIndex) const
-{
-    return base + static_cast<ptrdiff_t>(iIndex) * m_iRecSize;
-}
-
-// Halves 0..count - 1: the index of an equal record (then *pbFound is true), or the place where
-// the key belongs.
-int Common_Qsort::SearchHalves(char* base, int count, char* key, bool* pbFound)
-{
-    int lo = 0;
-    int hi = count - 1;
-    while (lo <= hi)
-    {
-        const int mid = lo + (hi - lo) / 2;
-        char* pRecord = RecordAt(base, mid);
-        if (QSORT_EQ(key, pRecord) == 1)
-        {
-            *pbFound = true;
-            return mid;
-        }
-        if (QSORT_LT(key, pRecord) == 1)
-        {
-            hi = mid - 1;
-        }
-        else
-        {
-            lo = mid + 1;
-        }
-    }
-    return hi + 1;
 }
 
 // Whether there are records to look at; where there are none, *piResult is the answer. An empty
@@ -181,26 +193,6 @@ bool Common_Qsort::BeginSearch(const char* base, int count, const char* key, Com
     return IsReady() && count > 0 && base != nullptr && key != nullptr;
 }
 
-int Common_Qsort::SearchExact(char* base, int count, char* key)
-{
-    char* pLast = RecordAt(base, count - 1);
-    if (count > 1 && (QSORT_LT(key, base) == 1 || QSORT_GT(key, pLast) == 1))
-    {
-        return -1;
-    }
-    if (QSORT_EQ(key, base) == 1)
-    {
-        return 0;
-    }
-    if (count > 1 && QSORT_EQ(key, pLast) == 1)
-    {
-        return count - 1;
-    }
-    bool bFound = false;
-    const int iPos = count > 1 ? SearchHalves(base, count, key, &bFound) : -1;
-    return bFound ? iPos : -1;
-}
-
 int Common_Qsort::Search_Bin(char* base, int count, char* key, Common_Sort_enum type,
                              int bInsertPos)
 {
@@ -209,24 +201,8 @@ int Common_Qsort::Search_Bin(char* base, int count, char* key, Common_Sort_enum 
     {
         return iNoRecords;
     }
-    if (bInsertPos == 0)
-    {
-        return SearchExact(base, count, key);
-    }
-    if (count == 1)
-    {
-        return QSORT_LT(key, base) == 1 ? 0 : 1;
-    }
-    if (QSORT_GT(key, base) != 1)
-    {
-        return 0;
-    }
-    if (QSORT_LT(key, RecordAt(base, count - 1)) != 1)
-    {
-        return count;
-    }
-    bool bFound = false;
-    return SearchHalves(base, count, key, &bFound);
+    CKeyedArray array(*this, base, m_iRecSize, key);
+    return bInsertPos == 0 ? SearchExact(array, count) : SearchPlace(array, count);
 }
 
 int Common_Qsort::Search_BinEx(char* base, int count, char* key, Common_Sort_enum type,
@@ -237,43 +213,18 @@ int Common_Qsort::Search_BinEx(char* base, int count, char* key, Common_Sort_enu
     {
         return iNoRecords;
     }
+    CKeyedArray array(*this, base, m_iRecSize, key);
     if (bInsertPos == 0)
     {
-        return SearchExact(base, count, key);
+        return SearchExact(array, count);
     }
     bool bFound = false;
-    const int iPos = SearchInsertion(base, count, key, &bFound);
+    const int iPos = SearchInsertion(array, count, &bFound);
     if (bFound && pbFound != nullptr)
     {
         *pbFound = 1;
     }
     return iPos;
-}
-
-// The insertion place that prefers an equal first or last record to the place behind it.
-int Common_Qsort::SearchInsertion(char* base, int count, char* key, bool* pbFound)
-{
-    if (count == 1)
-    {
-        if (QSORT_LT(key, base) == 1)
-        {
-            return 0;
-        }
-        *pbFound = QSORT_EQ(key, base) == 1;
-        return *pbFound ? 0 : 1;
-    }
-    if (QSORT_GT(key, base) != 1)
-    {
-        *pbFound = QSORT_EQ(key, base) == 1;
-        return 0;
-    }
-    char* pLast = RecordAt(base, count - 1);
-    if (QSORT_LT(key, pLast) != 1)
-    {
-        *pbFound = QSORT_EQ(key, pLast) == 1;
-        return *pbFound ? count - 1 : count;
-    }
-    return SearchHalves(base, count, key, pbFound);
 }
 
 int Common_Qsort::QSORT_EQ(char* a, char* b)

@@ -12,9 +12,9 @@ enum Common_Sort_enum : int
 };
 
 // Sorts arrays of fixed-size records in place and searches sorted ones. One object serves calls
-// of different kinds one after another, one call at a time; it allocates two scratch records and
-// keeps them until its end. Any value that is not a Common_Sort_enum makes the sort and the
-// searches return -1 with nothing touched, and so does a scratch record that finds no memory.
+// of different kinds one after another, one call at a time. Nothing is allocated: a sort keeps its
+// two scratch records on the stack. Any value that is not a Common_Sort_enum makes the sort and the
+// searches return -1 with nothing touched.
 class QV_EXPORT Common_Qsort
 {
 public:
@@ -23,8 +23,7 @@ public:
     Common_Qsort(const Common_Qsort&) = delete;
     Common_Qsort& operator=(const Common_Qsort&) = delete;
 
-    // Makes the object ready for records of the kind. Scratch records of the right size are
-    // kept, others are replaced. Every sort and search begins with it.
+    // Makes the object ready for records of the kind. Every sort and search begins with it.
     void InitInterData(Common_Sort_enum type);
 
     // Sorts count records at base so that no record is QSORT_GT than its follower. Returns
@@ -56,19 +55,12 @@ public:
     int QSORT_LT(char* a, char* b);
 
 private:
-    bool IsReady() const { return m_pKeyBuf != nullptr && m_pSwapBuf != nullptr; }
-    QV_INTERNAL void FreeBuffers();
-    QV_INTERNAL char* RecordAt(char* base, int iIndex) const;
+    bool IsReady() const { return m_iRecSize > 0; }
     QV_INTERNAL bool BeginSearch(const char* base, int count, const char* key,
                                  Common_Sort_enum type, int bInsertPos, int* piResult);
-    QV_INTERNAL int SearchExact(char* base, int count, char* key);
-    QV_INTERNAL int SearchInsertion(char* base, int count, char* key, bool* pbFound);
-    QV_INTERNAL int SearchHalves(char* base, int count, char* key, bool* pbFound);
 
     Common_Sort_enum m_eSortType = SORT_NAME;
-    int m_iRecSize = 0;
-    char* m_pKeyBuf = nullptr;  // the pivot, or the record being inserted
-    char* m_pSwapBuf = nullptr; // one side of an exchange
+    int m_iRecSize = 0; // bytes, 0 for an unknown kind
 };
 
 #endif

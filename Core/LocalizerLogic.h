@@ -112,6 +112,12 @@ public:
     // The stored sort type, read from the file; 0 when there is no store or it is damaged.
     int OnGetSortType();
 
+    // Whether the constructor found memory for its parts.
+    QV_INTERNAL bool IsReady() const
+    {
+        return m_pclMemManger != nullptr && m_pDBOperator != nullptr;
+    }
+
 private:
     QV_INTERNAL int BuildIndex(tag_ContactsInfo& record);
     QV_INTERNAL int ReadContacts(tag_ContactsInfo& record);

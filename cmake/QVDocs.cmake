@@ -6,7 +6,7 @@ if(NOT DOXYGEN_FOUND)
 endif()
 find_package(Python3 REQUIRED COMPONENTS Interpreter)
 
-set(QV_DOXYGEN_INPUT ${QV_PUBLIC_HEADERS})
+set(QV_DOXYGEN_INPUT ${QV_PUBLIC_HEADERS} bindings/c/qvlocalize.h)
 list(TRANSFORM QV_DOXYGEN_INPUT PREPEND "${CMAKE_CURRENT_SOURCE_DIR}/")
 list(JOIN QV_DOXYGEN_INPUT " " QV_DOXYGEN_INPUT)
 configure_file(docs/Doxyfile.in ${CMAKE_BINARY_DIR}/Doxyfile @ONLY)

@@ -14,7 +14,7 @@ import sys
 ESCAPED = re.compile(r"[\\@<>#%&$]")
 TRAILING = re.compile(r"^(.*\S)\s*//\s?(.*)$")
 # Lines that open or close a scope or switch access, and those that are no declarations.
-TYPE = re.compile(r"\s*(class|struct|enum)\b")
+TYPE = re.compile(r"\s*(typedef )?(class|struct|enum)\b")
 NEUTRAL = re.compile(r"^\s*(#|[{}]|public:|protected:|private:|extern \"C\"$|template\b|namespace\b"
                      r"|class \w+;|struct \w+;|friend\b)")
 
@@ -90,7 +90,7 @@ def filtered(lines):
             comment = []
             out += block
         elif kind == "neutral":
-            if block[0].startswith("#define") and comment:
+            if block[0].startswith("#define") and (comment or TRAILING.match(block[0])):
                 block = documented(block, comment)
             if not block[0].startswith("#"):
                 comment = []  # another scope, or another access

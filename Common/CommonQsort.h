@@ -19,7 +19,7 @@ class QV_EXPORT Common_Qsort
 {
 public:
     Common_Qsort();
-    ~Common_Qsort();
+    ~Common_Qsort(); // NOLINT(performance-trivially-destructible): programs link it
     Common_Qsort(const Common_Qsort&) = delete;
     Common_Qsort& operator=(const Common_Qsort&) = delete;
 

@@ -1,10 +1,11 @@
 #include "Core/StorePatch.h"
 
 #include "Common/Log.h"
+#include "Core/SlotPlan.h"
+#include "MemManager/RecordSlots.h"
 
 #include <algorithm>
 #include <atomic>
-#include <cstring>
 #include <cwchar>
 
 namespace
@@ -15,13 +16,6 @@ namespace
 void OrderStores()
 {
     std::atomic_thread_fence(std::memory_order_seq_cst);
-}
-
-// Moves iCount records within the store by whole records.
-void MoveRecords(tag_ContactsStruct* pRecords, int iFrom, int iTo, int iCount)
-{
-    std::memmove(pRecords + iTo, pRecords + iFrom,
-                 static_cast<size_t>(iCount) * sizeof(tag_ContactsStruct));
 }
 
 bool IsSameName(const tag_ContactsStruct& a, const tag_ContactsStruct& b)
@@ -47,8 +41,22 @@ void CStoreMark::Finish()
     }
 }
 
+CChangedIds::CChangedIds(long long* pIds, int iNum) : m_pIds(pIds), m_iNum(iNum)
+{
+    for (int i = 0; i < iNum; ++i)
+    {
+        const unsigned uBit = static_cast<unsigned>(pIds[i]) % FILTER_BITS;
+        m_auFilter[uBit / WORD_BITS] |= uint64_t{1} << uBit % WORD_BITS;
+    }
+}
+
 bool CChangedIds::Take(int iContactID)
 {
+    const unsigned uBit = static_cast<unsigned>(iContactID) % FILTER_BITS;
+    if ((m_auFilter[uBit / WORD_BITS] >> uBit % WORD_BITS & 1U) == 0)
+    {
+        return false;
+    }
     long long* pEnd = m_pIds + m_iNum;
     long long* pFound = std::find(m_pIds, pEnd, static_cast<long long>(iContactID));
     if (pFound == pEnd)
@@ -91,7 +99,7 @@ bool CStorePatch::Renew(int iSlot, tag_ContactsInfo& changed)
         return false;
     }
     pFound->iSortIndex = slot.iSortIndex;
-    slot = *pFound;
+    WriteSlot(&slot, pFound);
     *pFound = *(pEnd - 1);
     --changed.RecordNum;
     QV_LOGD(QV_LOG_TAG,
@@ -103,43 +111,36 @@ bool CStorePatch::Renew(int iSlot, tag_ContactsInfo& changed)
 
 void CStorePatch::Remove(const int* piSlots, int iNum)
 {
-    for (int i = 0; i < iNum; ++i)
-    {
-        const int iFrom = piSlots[i] + 1;
-        const int iEnd = i + 1 < iNum ? piSlots[i + 1] : m_iCount;
-        MoveRecords(m_pRecords, iFrom, iFrom - (i + 1), iEnd - iFrom);
-    }
-    m_iCount -= iNum;
+    m_piRemoved = piSlots;
+    m_iRemoved = iNum;
 }
 
 PATCH_RESULT CStorePatch::Insert(tag_ContactsInfo& inserted)
 {
-    PATCH_RESULT eResult = PATCH_DONE;
-    for (int i = 0; i < inserted.RecordNum && eResult == PATCH_DONE; ++i)
+    int iInserted = 0;
+    do
     {
-        eResult = InsertOne(inserted.pContacts[i]);
-    }
-    return eResult;
+        iInserted += InsertSome(inserted.pContacts + iInserted, inserted.RecordNum - iInserted);
+    } while (m_iRemoved > 0 || (iInserted < inserted.RecordNum && m_iCount < m_iCapacity));
+    return iInserted < inserted.RecordNum ? PATCH_FULL : PATCH_DONE;
 }
 
-PATCH_RESULT CStorePatch::InsertOne(tag_ContactsStruct& record)
+// Carries out as much as one plan holds: the last removals, and when no other is left, the first
+// insertions. Returns the number of these.
+int CStorePatch::InsertSome(tag_ContactsStruct* pRecords, int iNum)
 {
-    if (m_iCount >= m_iCapacity)
+    const int iRemoved = std::min(m_iRemoved, CSlotPlan::MAX_CHANGES);
+    m_iRemoved -= iRemoved;
+    CSlotPlan plan(m_pRecords, m_iCount, m_piRemoved + m_iRemoved, iRemoved,
+                   IsTimeOrder() ? SORT_TIME : SORT_NAME);
+    int iInserted = 0;
+    while (m_iRemoved == 0 && iInserted < iNum && plan.Count() < m_iCapacity && !plan.IsFull())
     {
-        return PATCH_FULL;
+        plan.Insert(pRecords[iInserted++]);
     }
-    const int iSlot = m_sorter.Search_Bin(reinterpret_cast<char*>(m_pRecords), m_iCount,
-                                          reinterpret_cast<char*>(&record),
-                                          IsTimeOrder() ? SORT_TIME : SORT_NAME, 1);
-    if (iSlot < 0)
-    {
-        return PATCH_FAILED;
-    }
-    MoveRecords(m_pRecords, iSlot, iSlot + 1, m_iCount - iSlot);
-    record.iSortIndex = iSlot;
-    m_pRecords[iSlot] = record;
-    ++m_iCount;
-    return PATCH_DONE;
+    plan.Apply();
+    m_iCount = plan.Count();
+    return iInserted;
 }
 
 void CStorePatch::Renumber()
@@ -163,14 +164,13 @@ void CStorePatch::ClearUpTo(int iTotalNum)
     const int iEnd = std::min(iTotalNum, m_iCapacity);
     if (iEnd > m_iCount)
     {
-        std::memset(static_cast<void*>(m_pRecords + m_iCount), 0,
-                    static_cast<size_t>(iEnd - m_iCount) * sizeof(tag_ContactsStruct));
+        ClearSlots(m_pRecords + m_iCount, iEnd - m_iCount);
     }
 }
 
 void MoveToFront(tag_ContactsStruct* pRecords, int iSlot)
 {
     const tag_ContactsStruct moved = pRecords[iSlot];
-    MoveRecords(pRecords, 0, 1, iSlot);
-    pRecords[0] = moved;
+    MoveSlots(pRecords, 0, 1, iSlot);
+    WriteSlot(pRecords, &moved);
 }

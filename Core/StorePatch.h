@@ -3,8 +3,9 @@
 
 // Changes to stored records where they lie, under the store lock that the caller holds.
 
-#include "Common/CommonQsort.h"
 #include "Core/ContactRecords.h"
+
+#include <cstdint>
 
 // Keeps the registration record from looking complete while stored records change: its capacity
 // is 0 from construction on, which makes the next notification rebuild the store. Only Finish
@@ -33,15 +34,21 @@ private:
 class CChangedIds
 {
 public:
-    CChangedIds(long long* pIds, int iNum) : m_pIds(pIds), m_iNum(iNum) {}
+    CChangedIds(long long* pIds, int iNum);
 
     bool IsEmpty() const { return m_iNum == 0; }
     // Takes out the first id that equals the contact's; false when there is none.
     bool Take(int iContactID);
 
 private:
+    static constexpr unsigned FILTER_BITS = 4096;
+    static constexpr unsigned WORD_BITS = 64;
+
     long long* m_pIds;
     int m_iNum;
+    // A bit for the low bits of each id: most contacts of a store are told from the changed ones
+    // without a look at the list.
+    uint64_t m_auFilter[FILTER_BITS / WORD_BITS] = {};
 };
 
 enum PATCH_RESULT
@@ -68,10 +75,12 @@ public:
     // other contacts found are listed in piRemoved, as long as the list of ids, in increasing
     // order; their number is returned.
     int Match(CChangedIds& ids, tag_ContactsInfo& changed, int* piRemoved);
-    // Closes the gaps of iNum slots, listed in increasing order.
+    // Notes iNum slots, listed in increasing order, whose records leave the store with the next
+    // Insert. The list has to live until then.
     void Remove(const int* piSlots, int iNum);
-    // Puts every record of inserted, whose names are converted, where it belongs, its iSortIndex
-    // being its slot.
+    // Takes out what was noted and puts every record of inserted, whose names are converted, where
+    // it belongs, one after the other, its iSortIndex being its slot at that moment. Without room
+    // for all, the first ones are put in.
     PATCH_RESULT Insert(tag_ContactsInfo& inserted);
     // Numbers the records of a store in name order by their slots; does nothing in time order.
     void Renumber();
@@ -80,14 +89,15 @@ public:
 
 private:
     bool Renew(int iSlot, tag_ContactsInfo& changed);
-    PATCH_RESULT InsertOne(tag_ContactsStruct& record);
+    int InsertSome(tag_ContactsStruct* pRecords, int iNum);
     bool IsTimeOrder() const { return m_iSortType == STORE_ORDER_TIME; }
 
     tag_ContactsStruct* m_pRecords;
     int m_iCount;
     int m_iCapacity;
     int m_iSortType;
-    Common_Qsort m_sorter;
+    const int* m_piRemoved = nullptr; // slots whose records are to leave
+    int m_iRemoved = 0;
 };
 
 // Moves the record of iSlot to slot 0 and the records before it one slot up.

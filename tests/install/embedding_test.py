@@ -6,7 +6,8 @@ embedding_test.py ARGUMENT..., as installed.py tells
 import sys
 import unittest
 
-from installed import COMPILER, C_COMPILER, WARNINGS, InstalledTest, run
+from installed import (COMPILER, C_COMPILER, EMULATOR, WARNINGS, InstalledTest,
+                       program_of_the_docs, run)
 
 C99 = ["-std=c99", "-pedantic"]
 CONSUMER = """\
@@ -35,6 +36,14 @@ class EmbeddingTest(InstalledTest):
     def test_c_program_built_with_pkg_config(self):
         program = self.build_with_pkg_config("c", "qvlocalize", C_COMPILER, C99)
         self.check_program(program, self.sample("data_pkg_config"))
+
+    @unittest.skipIf(EMULATOR, "the interpreter loads this machine's libraries alone")
+    def test_python_program(self):
+        module, = self.installed("**/qvlocalize.py")
+        program = self.root / "program.py"
+        program.write_text(program_of_the_docs("python"), encoding="utf-8")
+        self.check_output(run(sys.executable, "-B", program, self.sample("data_python"),
+                              env={"PYTHONPATH": str(module.parent), "LC_ALL": "C.UTF-8"}))
 
 
 if __name__ == "__main__":

@@ -43,9 +43,9 @@ CSlotPlan::CSlotPlan(tag_ContactsStruct* pRecords, int iCount, const int* piRemo
 int CSlotPlan::CountBefore(int iSlot) const
 {
     const tag_Inserted* pEnd = m_aInserted + m_iInserted;
-    const tag_Inserted* pFound =
-        std::lower_bound(m_aInserted, pEnd, iSlot, [](const tag_Inserted& inserted, int iWanted)
-                         { return inserted.iSlot < iWanted; });
+    const tag_Inserted* pFound = std::lower_bound(m_aInserted, pEnd, iSlot,
+                                                  [](const tag_Inserted& inserted, int iWanted)
+                                                  { return inserted.iSlot < iWanted; });
     return static_cast<int>(pFound - m_aInserted);
 }
 
@@ -58,8 +58,9 @@ tag_ContactsStruct* CSlotPlan::At(int iSlot) const
     }
     const int iStaying = iSlot - iBefore; // counted among the records that do not leave
     const int* pFound = std::upper_bound(m_piRemoved, m_piRemoved + m_iRemoved, iStaying,
-                                         [this](int iWanted, const int& iRemoved)
-                                         { return iWanted < iRemoved - (&iRemoved - m_piRemoved); });
+                                         [this](int iWanted, const int& iRemoved) {
+                                             return iWanted < iRemoved - (&iRemoved - m_piRemoved);
+                                         });
     return m_pRecords + iStaying + (pFound - m_piRemoved);
 }
 

@@ -84,7 +84,7 @@ void FillFromContactsRow(const CSqlStatement& clRow, tag_ContactsStruct* pContac
     pContact->iFlags |= FlagBits(clRow, CONTACTS_SECRET, CONTACT_FLAG_SECRET);
 }
 
-void FillFromLocalizerRow(const CSqlStatement& clRow, int iMaxGroups, tag_ContactsStruct* pContact)
+bool FillFromLocalizerRow(const CSqlStatement& clRow, int iMaxGroups, tag_ContactsStruct* pContact)
 {
     CopyText(clRow, LOCALIZER_NAME, NAME_LAST_BYTE, pContact->szName, CONTACT_MAX_NAME);
     CopyText(clRow, LOCALIZER_KEY, KEY_LAST_BYTE, pContact->szLocalizerKey, CONTACT_MAX_KEY);
@@ -96,6 +96,7 @@ void FillFromLocalizerRow(const CSqlStatement& clRow, int iMaxGroups, tag_Contac
     ParseIdText(clRow.Text(LOCALIZER_ACCOUNTS), pContact->lAccountID, CONTACT_MAX_ACCOUNTS);
     pContact->iFlags |= FlagBits(clRow, LOCALIZER_MAIL, CONTACT_FLAG_MAIL);
     pContact->iFlags |= FlagBits(clRow, LOCALIZER_ADDRESS, CONTACT_FLAG_ADDRESS);
+    return !clRow.IsOutOfMemory();
 }
 
 void ParseIdText(const char* szText, QVLong32* pIds, int iMax)

@@ -21,8 +21,9 @@ constexpr int SINGLE_ROW_GROUPS = CONTACT_MAX_GROUPS;
 void FillFromContactsRow(const CSqlStatement& clRow, tag_ContactsStruct* pContact);
 
 // Columns: contact_id (not looked at), display_name, localizerkey, group_id, account_id, hasMail,
-// hasAddress. Comes after the contacts row, which tells whether the contact is secret.
-void FillFromLocalizerRow(const CSqlStatement& clRow, int iMaxGroups, tag_ContactsStruct* pContact);
+// hasAddress. Comes after the contacts row, which tells whether the contact is secret. False when
+// memory ran out, so that a text is missing.
+bool FillFromLocalizerRow(const CSqlStatement& clRow, int iMaxGroups, tag_ContactsStruct* pContact);
 
 // As CSQLiteOperator::ParseIDString.
 void ParseIdText(const char* szText, QVLong32* pIds, int iMax);

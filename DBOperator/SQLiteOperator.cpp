@@ -162,7 +162,11 @@ int MergeLocalizer(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
     {
         if (clRows.Int(LOCALIZER_ID_COLUMN) == pRecord->pContacts[iIndex].iContactID)
         {
-            FillFromLocalizerRow(clRows, ROW_GROUPS, &pRecord->pContacts[iIndex++]);
+            if (!FillFromLocalizerRow(clRows, ROW_GROUPS, &pRecord->pContacts[iIndex]))
+            {
+                break;
+            }
+            ++iIndex;
         }
         iRetCode = clRows.Step();
     }
@@ -434,9 +438,6 @@ int CSQLiteOperator::ReadLocalizerRow(int iContactID, tag_ContactsStruct* pConta
         return -1;
     }
     iFound = clRow.Step() == SQLITE_ROW ? 1 : 0;
-    if (iFound == 1 && clRow.Int(LOCALIZER_ID_COLUMN) == pContact->iContactID)
-    {
-        FillFromLocalizerRow(clRow, SINGLE_ROW_GROUPS, pContact);
-    }
-    return 0;
+    const bool bHasName = iFound == 1 && clRow.Int(LOCALIZER_ID_COLUMN) == pContact->iContactID;
+    return !bHasName || FillFromLocalizerRow(clRow, SINGLE_ROW_GROUPS, pContact) ? 0 : -1;
 }

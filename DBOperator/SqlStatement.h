@@ -30,11 +30,13 @@ public:
     // Columns of the current row; a value of another type is converted as SQLite does it.
     int Int(int iColumn) const { return sqlite3_column_int(m_pStatement, iColumn); }
     long long Int64(int iColumn) const { return sqlite3_column_int64(m_pStatement, iColumn); }
-    // Zero-terminated, null for NULL; valid until the next step.
+    // Zero-terminated, null for NULL and without memory; valid until the next step.
     const char* Text(int iColumn) const
     {
         return reinterpret_cast<const char*>(sqlite3_column_text(m_pStatement, iColumn));
     }
+    // Whether a text of the current row could not be had for want of memory.
+    bool IsOutOfMemory() const { return sqlite3_errcode(m_pDB) == SQLITE_NOMEM; }
     // Bytes of what Text returned last for the column.
     int Bytes(int iColumn) const { return sqlite3_column_bytes(m_pStatement, iColumn); }
 

@@ -232,7 +232,7 @@ bool BeginsReading(const PYOFWORDS& record, wchar_t unit)
 bool ReplaceLetters(const PYOFWORDS& record, int iPos, const wchar_t* szWord, wchar_t* szText)
 {
     const int iLength = static_cast<int>(_wcslen(szText));
-    for (int q = std::min(iPos, iLength) - 1; q >= 0; --q)
+    for (int q = std::min(std::max(iPos, 0), iLength) - 1; q >= 0; --q)
     {
         if (BeginsReading(record, szText[q]))
         {

@@ -3,6 +3,7 @@
 
 #include <sqlite3.h>
 
+#include <climits>
 #include <filesystem>
 
 namespace
@@ -19,6 +20,31 @@ int CatchConnection(sqlite3* pDB, char** /*pszError*/, const sqlite3_api_routine
     g_pReaderDB = pDB;
     return SQLITE_OK;
 }
+
+// SQLite's memory, of which only so many allocations are granted. SQLite is told before it starts,
+// and to ask for each allocation instead of keeping small ones at hand.
+class CSqliteMemory
+{
+public:
+    CSqliteMemory()
+    {
+        sqlite3_config(SQLITE_CONFIG_GETMALLOC, &s_system);
+        sqlite3_mem_methods methods = s_system;
+        methods.xMalloc = [](int iSize) { return IsRefused() ? nullptr : s_system.xMalloc(iSize); };
+        methods.xRealloc = [](void* pMemory, int iSize)
+        { return IsRefused() ? nullptr : s_system.xRealloc(pMemory, iSize); };
+        sqlite3_config(SQLITE_CONFIG_MALLOC, &methods);
+        sqlite3_config(SQLITE_CONFIG_LOOKASIDE, 0, 0);
+    }
+    static void Grant(int iNum) { s_iGranted = iNum; }
+    static bool RanOut() { return s_iGranted == 0; }
+
+private:
+    static bool IsRefused() { return s_iGranted == 0 || --s_iGranted == 0; }
+
+    static inline sqlite3_mem_methods s_system = {};
+    static inline int s_iGranted = INT_MAX;
+} g_sqliteMemory;
 
 bool StartsWith(const std::string& strText, const std::string& strStart)
 {
@@ -80,6 +106,41 @@ TEST_F(CHostileTest, AMissingColumnFailsTheRead)
     EXPECT_EQ(-1, clReader.ReadAllLocalizer(&another, 0, nullptr));
     EXPECT_EQ(Lines{" QV_Contacts>>QV_ContactsLocalize_SO>> select from contacts ERROR result=1"},
               log.Texts(ERROR_LINE));
+}
+
+// A refused allocation must not pass for an empty text: group ids that are numbers become text only
+// when they are asked for.
+TEST_F(CHostileTest, AReadWithoutMemoryFailsOrIsRight)
+{
+    m_clProvider.PutAll({{1, "a", "", "1.2"}, {2, "b", "", "7"}});
+    m_clProvider.Execute("create table t as select contact_id,display_name,localizerkey,"
+                         "cast(id as integer) group_id,account_id,hasMail,hasAddress from (select "
+                         "*,group_id id from localizer)");
+    m_clProvider.Execute("drop table localizer");
+    m_clProvider.Execute("alter table t rename to localizer");
+    int iFailed = 0;
+    for (bool bRanOut = true; bRanOut;)
+    {
+        CSQLiteOperator clReader;
+        tag_ReadSet set;
+        tag_ContactsStruct single = {};
+        int iFound = 0;
+        CSqliteMemory::Grant(iFailed + 1);
+        const int iAll = clReader.ReadAllLocalizer(&set, 0, nullptr);
+        const int iSingle = iAll == 0 ? clReader.ReadContactsByID(2, &single, iFound) : -1;
+        bRanOut = CSqliteMemory::RanOut();
+        CSqliteMemory::Grant(INT_MAX);
+        if (iAll == 0)
+        {
+            EXPECT_EQ(7, set.pContacts[1].lGroupID[0]) << iFailed;
+        }
+        if (iSingle == 0 && iFound == 1)
+        {
+            EXPECT_EQ(7, single.lGroupID[0]) << iFailed;
+        }
+        ++iFailed;
+    }
+    EXPECT_GT(iFailed, 50) << "SQLite asks for each allocation";
 }
 
 TEST_F(CHostileTest, ContactsGoneSinceTheCountFailTheReadAndNewOnesAreLeftOut)

@@ -121,6 +121,7 @@ TEST_F(NameConversion, PutsAPickedCharacterInPlaceOfItsLetters)
     EXPECT_EQ(Pick(L"ZhangSa", 7, L"三"), L"0 ZHANG三") << "what follows the letter goes";
     EXPECT_EQ(Pick(L"sss", 2, L"三"), L"0 S三") << "the last one before the position";
     EXPECT_EQ(Pick(L"sss", 99, L"三"), L"0 SS三");
+    EXPECT_EQ(Pick(L"sss", INT32_MIN, L"三"), L"0 sss") << "nothing is before it";
     EXPECT_EQ(Pick(L"liz", 3, L"长"), L"0 LI长") << "the second reading";
     EXPECT_EQ(Pick(L"Zhangs", 5, L"三"), L"0 zhangs") << "no letter fits";
     EXPECT_EQ(Pick(L"Li", 2, L"한"), L"-1000 li") << "not in the table";

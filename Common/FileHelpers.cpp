@@ -16,10 +16,8 @@ constexpr const char* EXECUTABLE_MARK = " r-xp ";
 constexpr int MAX_MAPS_LINE = 1023;
 constexpr int MAX_MAPS_READ = MAX_MAPS_LINE + 2; // with its line end and the terminator
 
-constexpr size_t COMMAND_BYTES = 1024;
 constexpr const char* MOVE_WORDS = "mv";
 constexpr const char* DELETE_WORDS = "rm -r";
-constexpr size_t WORDS_ROOM = 8; // for the longest words and the terminator
 constexpr const char* ESCAPED_QUOTE = "'\\''";
 constexpr size_t ESCAPED_QUOTE_BYTES = 4;
 constexpr size_t QUOTING_BYTES = 5; // a blank, two quotes, "./"
@@ -87,15 +85,48 @@ const char* PathOfMapping(const char* szLine, uintptr_t uAddress)
     return ulStart <= uAddress && uAddress < ulEnd ? szPath : nullptr;
 }
 
-// A shell command, put together in memory of the caller's: words, then quoted paths.
+// A shell command, put together in memory of its own: words, then quoted paths. Null when memory
+// ran out.
 class CShellCommand
 {
 public:
-    CShellCommand(const char* szWords, char* szBuffer, size_t uSize)
-        : m_szBuffer(szBuffer), m_uSize(uSize)
+    CShellCommand(const char* szWords, const char* const* pPaths, int iPaths)
+        : m_szText(static_cast<char*>(std::malloc(Room(szWords, pPaths, iPaths))))
     {
-        m_szBuffer[0] = 0;
+        if (m_szText == nullptr)
+        {
+            return;
+        }
         AddText(szWords);
+        for (int i = 0; i < iPaths; ++i)
+        {
+            AddPath(pPaths[i]);
+        }
+    }
+    ~CShellCommand() { std::free(m_szText); }
+    CShellCommand(const CShellCommand&) = delete;
+    CShellCommand& operator=(const CShellCommand&) = delete;
+
+    void Run() const
+    {
+        if (m_szText != nullptr)
+        {
+            // The callers report nothing of what becomes of the command.
+            const int iStatus = std::system(m_szText);
+            static_cast<void>(iStatus);
+        }
+    }
+
+private:
+    // Bytes for the words, the paths, as if they were all quotes, and the terminator.
+    static size_t Room(const char* szWords, const char* const* pPaths, int iPaths)
+    {
+        size_t uRoom = std::strlen(szWords) + 1;
+        for (int i = 0; i < iPaths; ++i)
+        {
+            uRoom += std::strlen(pPaths[i]) * ESCAPED_QUOTE_BYTES + QUOTING_BYTES;
+        }
+        return uRoom;
     }
 
     // Between quotes only a quote means something to the shell; a name that starts with a dash
@@ -111,32 +142,15 @@ public:
         AddText("'");
     }
 
-    void Run() const
-    {
-        if (m_bFits)
-        {
-            // The callers report nothing of what becomes of the command.
-            const int iStatus = std::system(m_szBuffer);
-            static_cast<void>(iStatus);
-        }
-    }
-
-private:
     void AddText(const char* szText)
     {
         const size_t uLength = std::strlen(szText);
-        m_bFits = m_bFits && uLength < m_uSize - m_uUsed;
-        if (m_bFits)
-        {
-            std::memcpy(m_szBuffer + m_uUsed, szText, uLength + 1);
-            m_uUsed += uLength;
-        }
+        std::memcpy(m_szText + m_uUsed, szText, uLength + 1);
+        m_uUsed += uLength;
     }
 
-    char* m_szBuffer;
-    size_t m_uSize;
+    char* m_szText;
     size_t m_uUsed = 0;
-    bool m_bFits = true;
 };
 
 // A wide path in UTF-8, released at the end of the scope; null when memory ran out.
@@ -162,41 +176,17 @@ private:
     char* m_szPath;
 };
 
-// Room that a command needs for the path, however many quotes it has.
-size_t QuotedRoom(const char* szPath)
+// Runs the words with the paths, unless one of them is null.
+void RunCommand(const char* szWords, const char* const* pPaths, int iPaths)
 {
-    return std::strlen(szPath) * ESCAPED_QUOTE_BYTES + QUOTING_BYTES;
-}
-
-void RunInBuffer(const char* szWords, const char* const* pPaths, int iPaths, char* szBuffer,
-                 size_t uSize)
-{
-    CShellCommand clCommand(szWords, szBuffer, uSize);
-    for (int i = 0; i < iPaths; ++i)
-    {
-        clCommand.AddPath(pPaths[i]);
-    }
-    clCommand.Run();
-}
-
-// Runs the words with the paths in a buffer that is large enough for any.
-void RunAnyLength(const char* szWords, const char* const* pPaths, int iPaths)
-{
-    size_t uSize = WORDS_ROOM;
     for (int i = 0; i < iPaths; ++i)
     {
         if (pPaths[i] == nullptr)
         {
             return;
         }
-        uSize += QuotedRoom(pPaths[i]);
     }
-    char* szBuffer = static_cast<char*>(std::malloc(uSize));
-    if (szBuffer != nullptr)
-    {
-        RunInBuffer(szWords, pPaths, iPaths, szBuffer, uSize);
-    }
-    std::free(szBuffer);
+    CShellCommand(szWords, pPaths, iPaths).Run();
 }
 
 } // namespace
@@ -228,22 +218,14 @@ int GetModuleFileName(void* /*hModule*/, wchar_t* szPath, int iLastByte)
 
 int _MoveFile(const char* szSource, const char* szTarget)
 {
-    if (szSource != nullptr && szTarget != nullptr)
-    {
-        const char* const pPaths[] = {szSource, szTarget};
-        char szCommand[COMMAND_BYTES];
-        RunInBuffer(MOVE_WORDS, pPaths, 2, szCommand, COMMAND_BYTES);
-    }
+    const char* const pPaths[] = {szSource, szTarget};
+    RunCommand(MOVE_WORDS, pPaths, 2);
     return 1;
 }
 
 int _DeleteFile(const char* szPath)
 {
-    if (szPath != nullptr)
-    {
-        char szCommand[COMMAND_BYTES];
-        RunInBuffer(DELETE_WORDS, &szPath, 1, szCommand, COMMAND_BYTES);
-    }
+    RunCommand(DELETE_WORDS, &szPath, 1);
     return 1;
 }
 
@@ -254,7 +236,7 @@ int _wc_MoveFile(const wchar_t* szSource, const wchar_t* szTarget)
         const CUtf8Path clSource(szSource);
         const CUtf8Path clTarget(szTarget);
         const char* const pPaths[] = {clSource.Get(), clTarget.Get()};
-        RunAnyLength(MOVE_WORDS, pPaths, 2);
+        RunCommand(MOVE_WORDS, pPaths, 2);
     }
     return 1;
 }
@@ -265,7 +247,7 @@ int _wc_DeleteFile(const wchar_t* szPath)
     {
         const CUtf8Path clPath(szPath);
         const char* const pPaths[] = {clPath.Get()};
-        RunAnyLength(DELETE_WORDS, pPaths, 1);
+        RunCommand(DELETE_WORDS, pPaths, 1);
     }
     return 1;
 }

@@ -13,14 +13,14 @@ extern "C"
     QV_EXPORT int GetModuleFileName(void* hModule, wchar_t* szPath, int iLastByte);
 
     // Move or delete with the shell's "mv" and "rm -r" (directories go with all they hold) and
-    // wait for the command; always 1, whatever became of it. Paths are quoted: blanks, quotes, $
-    // or a leading dash are only ever part of a name. The command with its quoted paths must stay
-    // below 1024 bytes, else it is not run; neither is it for a null path.
+    // wait for the command; always 1, whatever became of it. Paths of any length are quoted:
+    // blanks, quotes, $ or a leading dash are only ever part of a name. The command is not run
+    // for a null path or when memory runs out.
     QV_EXPORT int _MoveFile(const char* szSource, const char* szTarget);
     QV_EXPORT int _DeleteFile(const char* szPath);
 
-    // The same for wide paths of any length; not run when memory runs out. A unit that has no
-    // UTF-8 form in Unicode2Utf8 stands as U+FFFD in the path.
+    // The same for wide paths. A unit that has no UTF-8 form in Unicode2Utf8 stands as U+FFFD in
+    // the path.
     QV_EXPORT int _wc_MoveFile(const wchar_t* szSource, const wchar_t* szTarget);
     QV_EXPORT int _wc_DeleteFile(const wchar_t* szPath);
 }

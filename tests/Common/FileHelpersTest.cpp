@@ -65,23 +65,25 @@ TEST_F(FileHelpers, HostileNamesAreOnlyNames)
     EXPECT_EQ(0, Entries()) << "whole directories";
 }
 
-// rm -r 'PATH' is 8 bytes longer than the path and mv 'PATH' 'a' is 9.
-TEST_F(FileHelpers, NarrowCommandsStayBelowTheirBuffer)
+// What quoting adds, four bytes for each quote, takes nothing from the length of a path. A name
+// has at most 255 bytes; repeated slashes make the rest.
+TEST_F(FileHelpers, PathsMayBeLongAndFullOfQuotes)
 {
-    const auto PathOf = [](size_t uBytes)
+    const std::string strQuotes(200, '\'');
+    for (const size_t uSlashes : {size_t{815}, size_t{3800}})
     {
-        std::string strPath = "./file";
-        return strPath.insert(1, uBytes - strPath.size(), '/');
-    };
-    Make("file");
-    EXPECT_EQ(1, _DeleteFile(PathOf(1016).c_str()));
-    EXPECT_EQ(1, _MoveFile(PathOf(1015).c_str(), "a"));
-    EXPECT_EQ("file", CDataDirectory::ReadBytes("file"));
-    EXPECT_EQ(1, _MoveFile(PathOf(1014).c_str(), "a"));
-    EXPECT_FALSE(CDataDirectory::Exists("file"));
-    EXPECT_EQ(1, _MoveFile("a", PathOf(1014).c_str()));
-    EXPECT_EQ(1, _DeleteFile(PathOf(1015).c_str()));
-    EXPECT_EQ(0, Entries());
+        const std::string strPath = "." + std::string(uSlashes, '/') + strQuotes;
+        SCOPED_TRACE(strPath.size());
+        Make("file");
+        EXPECT_EQ(1, _MoveFile("file", strPath.c_str()));
+        EXPECT_EQ("file", CDataDirectory::ReadBytes(strQuotes));
+        EXPECT_EQ(1, _MoveFile(strPath.c_str(), "file"));
+        EXPECT_EQ(1, _MoveFile("file", strPath.c_str()));
+        EXPECT_EQ(1, _DeleteFile(strPath.c_str()));
+        EXPECT_EQ(0, Entries());
+    }
+    EXPECT_EQ(1, _MoveFile(nullptr, "file"));
+    EXPECT_EQ(1, _DeleteFile(nullptr));
 }
 
 TEST(ModuleFileName, IsTheFileThatHoldsTheLibrary)

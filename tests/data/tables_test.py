@@ -50,6 +50,13 @@ FOLDED_ON_PURPOSE = {"後": "后", "矽": "硅"}
 OUTSIDE_BIG5 = {"釺", "鍁"}
 FOLDED_NAMES = {"張": "张", "陳": "陈", "劉": "刘", "鍾": "钟", "葉": "叶", "蕭": "萧", "關": "关", "淨": "净"}
 
+# Forms of simplified characters with several readings: those of another form's word are not theirs, those that
+# are alive are, though the Unihan files may lack them.
+TRADITIONAL_READINGS = {
+    "纖": "xian", "縴": "qian", "噓": "xu", "說": "shuo shui", "賈": "jia gu", "員": "yuan yun", "綠": "lv lu",
+    "調": "diao tiao", "鯽": "ji", "錒": "a",
+}
+
 Rows = List[Tuple[str, str]]
 failures: List[str] = []
 
@@ -92,6 +99,12 @@ def check_pinyin_table(rows: Rows) -> None:
         check(1 <= len(readings) <= 3, f"{char} has {len(readings)} readings")
         check(len(set(readings)) == len(readings), f"{char} has a reading twice: {text}")
         check(all(reading in SYLLABLES for reading in readings), f"{char} has no syllable: {text}")
+
+
+def check_traditional_readings(rows: Rows) -> None:
+    readings = dict(rows)
+    for char, expected in TRADITIONAL_READINGS.items():
+        check(readings[char] == expected, f"{char} reads {readings[char]}, expected {expected}")
 
 
 def check_special_numbers(records: List[bytes]) -> None:
@@ -171,6 +184,7 @@ def main(arguments: List[str]) -> int:
     check_syllables()
     pinyin = read_rows("pinyin.tsv")
     check_pinyin_table(pinyin)
+    check_traditional_readings(pinyin)
     check_pyfile(pathlib.Path(arguments[0]), pinyin)
     rows = read_rows("folding.tsv")
     check_folding_columns(rows)

@@ -123,9 +123,13 @@ class ReadingSources:
             totals[syllable] = totals.get(syllable, 0) + int(count)
         return totals
 
+    def living(self, char: str) -> Set[str]:
+        """Every reading that a dictionary of today or the count of running text gives this very character."""
+        return {*self.standard(char), *self.older(char), *self.customary(char), *self.counts(char)}
+
     def attested(self, char: str) -> Set[str]:
         """Every reading that any dictionary gives the character, dead ones included."""
-        return {*self.standard(char), *self.older(char), *self.customary(char), *self.historical(char)}
+        return self.living(char) | {*self.historical(char)}
 
 
 def by_use(pool: Readings, counts: Dict[str, int], customary: Readings) -> Readings:
@@ -158,7 +162,11 @@ class ReadingRules:
         return by_use(pool, self._sources.counts(char), self._sources.customary(char))
 
     def _from_simplified(self, char: str) -> Readings:
-        """A traditional form reads as the simplified one does, as far as the two are the same word."""
+        """A traditional form reads as the simplified one does, as far as the two are the same word.
+
+        The first reading tells which word that is; a further one may belong to another traditional form and
+        needs a source that gives it to this one. The historical dictionary is none: it keeps what is dead.
+        """
         simplified = [s for s in listed_characters(self._simplified.get(char, "")) if self._is_standard(s) and s != char]
         if len(simplified) != 1:
             return []
@@ -166,7 +174,8 @@ class ReadingRules:
         if self._is_merger(simplified[0]):
             attested = self._sources.attested(char)
             readings = [r for r in readings if r in attested]
-        return readings
+        living = self._sources.living(char)
+        return readings[:1] + [r for r in readings[1:] if r in living]
 
     def _is_standard(self, char: str) -> bool:
         return bool(self._sources.standard(char))

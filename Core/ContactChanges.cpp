@@ -10,20 +10,17 @@
 #include "DBOperator/DBOperator.h"
 #include "DBOperator/IdList.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
-#include "MemManager/MappingGuards.h"
+#include "MemManager/HeldStore.h"
 #include "MemManager/MemManger.h"
-#include "MemManager/StoreCheck.h"
+#include "MemManager/StoreRegister.h"
 
+#include <algorithm>
 #include <cstdint>
 #include <memory>
 #include <new>
 
 namespace
 {
-
-// Milliseconds between attempts at the lock.
-constexpr unsigned int PATCH_LOCK_PAUSE = 100;
-constexpr unsigned int RECORD_LOCK_PAUSE = 50;
 
 constexpr long STARRED = 1;
 
@@ -45,89 +42,6 @@ public:
 
 private:
     tag_ContactsInfo m_info = {};
-};
-
-// The store as the patch and the status refresh hold it: the lock, then both write mappings.
-class CHeldStore
-{
-public:
-    // Waits for the lock without limit.
-    explicit CHeldStore(CMemManger& manager) : m_manager(manager)
-    {
-        while (m_manager.LockMemo() == 0)
-        {
-            QV_LOGE(QV_LOG_TAG, "QV_Contacts: OnContactsTableChanged1 Lock share mem false");
-            Sleep(PATCH_LOCK_PAUSE);
-        }
-    }
-    ~CHeldStore() { Release(); }
-    CHeldStore(const CHeldStore&) = delete;
-    CHeldStore& operator=(const CHeldStore&) = delete;
-
-    bool Open()
-    {
-        if (m_manager.OpenWriteShareMem(&m_pRecords, &m_pReg) != 0)
-        {
-            return false;
-        }
-        QV_LOGD(QV_LOG_TAG, "QV_Contacts: OnContactsTableChanged1 old contact count = %d\n",
-                m_pReg->iTotalNum);
-        return true;
-    }
-    void Release()
-    {
-        m_manager.CloseWriteShareMem();
-        m_manager.UnlockMemo();
-    }
-    tag_ContactsStruct* Records() const { return m_pRecords; }
-    tag_ContactReg& Reg() const { return *m_pReg; }
-
-private:
-    CMemManger& m_manager;
-    tag_ContactsStruct* m_pRecords = nullptr;
-    tag_ContactReg* m_pReg = nullptr;
-};
-
-// The stored records as the time and star changes hold them: a lock of their own and a write
-// mapping of the records in use.
-class CHeldRecords
-{
-public:
-    // Waits for the lock without limit, with szRefused for each refusal.
-    explicit CHeldRecords(const char* szRefused)
-    {
-        while (!m_lock.TryLock())
-        {
-            QV_LOGE(QV_LOG_TAG, "%s", szRefused);
-            Sleep(RECORD_LOCK_PAUSE);
-        }
-    }
-
-    // False when there are no records or they cannot be mapped.
-    bool Open()
-    {
-        return CStoreCheck::MapReg(&m_reg) == 0 && m_reg.iTotalNum > 0 &&
-               m_records.Open(CDataPaths::ContactRecords(), StoreBytes(m_reg.iTotalNum));
-    }
-    // The first slot of the contact, -1 when it is not stored.
-    int Find(long iContactID) const
-    {
-        for (int i = 0; i < m_reg.iTotalNum; ++i)
-        {
-            if (Records()[i].iContactID == iContactID)
-            {
-                return i;
-            }
-        }
-        return -1;
-    }
-    tag_ContactsStruct* Records() const { return m_records.As<tag_ContactsStruct>(); }
-    int SortType() const { return m_reg.iSortType; }
-
-private:
-    CStoreLock m_lock; // released behind the mapping
-    tag_ContactReg m_reg = {};
-    CWriteMapping m_records;
 };
 
 // Whether a read of the listed contacts gives them all. The reader writes 32 bits of each id: a
@@ -157,17 +71,25 @@ void SetContacted(tag_ContactsStruct& record, int64_t llTime)
 }
 
 // The contact becomes the most recent one, in a store ordered by that.
-void SetContactedFirst(tag_ContactsStruct* pRecords, int iSlot, int64_t llTime)
+void SetContactedFirst(const CHeldRecords& store, int iSlot, int64_t llTime)
 {
-    CWriteMapping mapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
+    const CWriteMapping mapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
     if (!mapping.IsOpen())
+    {
+        CStoreRegister::SetChangeLost(true);
+        return;
+    }
+    CStoreRegister reg(*mapping.As<tag_ContactReg>());
+    if (reg.Mark() != 0)
     {
         return;
     }
-    CStoreMark mark(*mapping.As<tag_ContactReg>());
-    SetContacted(pRecords[iSlot], llTime);
-    MoveToFront(pRecords, iSlot);
-    mark.Finish();
+    SetContacted(store.Records()[iSlot], llTime);
+    MoveToFront(store.Records(), iSlot);
+    if (store.Flush())
+    {
+        reg.Lift(store.Reg().iTotalNum, reg.Capacity(), STORE_ORDER_TIME);
+    }
 }
 
 // The listed contacts, their names converted; 0 or the failing step's code.
@@ -211,12 +133,7 @@ PATCH_RESULT ApplyChanges(CDBOperator& reader, CStorePatch& patch, int iRecordNu
             "QV_Contacts: OnContactsTablePartChanged1 find matchedNum=%d, stRecord.RecordNum=%d",
             iRemoved, changed.RecordNum);
     patch.Remove(removed.get(), iRemoved);
-    const PATCH_RESULT eResult = patch.Insert(changed);
-    if (iRemoved > 0 || changed.RecordNum > 0)
-    {
-        patch.Renumber();
-    }
-    return eResult;
+    return patch.Insert(changed);
 }
 
 } // namespace
@@ -226,9 +143,7 @@ void CLocalizerLogic::OnContactsTableChanged()
     CRecordSet records;
     if (RebuildStore(records.Info()) != 0)
     {
-        // The change is not in the store: the next notification has to try again. Setting the
-        // sort type that is set asks for that.
-        m_pclMemManger->SetSortType(m_pclMemManger->GetSortType());
+        MarkForLostChange();
     }
 }
 
@@ -241,11 +156,12 @@ int CLocalizerLogic::RebuildStore(tag_ContactsInfo& record)
         return iRet;
     }
     ReadOnlineStatus(record);
+    int iSortType = STORE_ORDER_NAME;
     if (record.pContacts != nullptr)
     {
-        const int iSortType = m_pclMemManger->GetSortType();
+        iRet = ReadStoredOrder(iSortType);
         QV_LOGD(QV_LOG_TAG, "QV_Contacts: OnContactsTableChanged  iSortType = %d\n", iSortType);
-        iRet = SortByStoredOrder(record, iSortType);
+        iRet = iRet == 0 ? ConvertAndSort(record, iSortType) : iRet;
         if (iRet != 0)
         {
             return iRet;
@@ -253,7 +169,7 @@ int CLocalizerLogic::RebuildStore(tag_ContactsInfo& record)
     }
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: OnContactsTableChanged stRecord.num = %d \n",
             record.RecordNum);
-    return m_pclMemManger->InitContactRecord(&record);
+    return WriteSorted(record, iSortType);
 }
 
 void CLocalizerLogic::OnContactsTableChanged(int iRecordNum, long long* pIds)
@@ -281,7 +197,7 @@ bool CLocalizerLogic::HasRoomForAll(int& iDatabaseCount)
 {
     int iTotalNum = 0;
     const int iMemSize = m_pclMemManger->GetMemSize(&iTotalNum);
-    if (iTotalNum > iMemSize)
+    if (iTotalNum > iMemSize || CStoreRegister::IsChangeLost())
     {
         return false;
     }
@@ -311,23 +227,25 @@ bool CLocalizerLogic::PatchStore(int iDatabaseCount, int iRecordNum, long long* 
                                  const CStopwatch& watch)
 {
     CHeldStore store(*m_pclMemManger);
-    if (!store.Open())
+    const HOLD_RESULT eHeld = store.Open();
+    if (eHeld != HOLD_READY)
     {
-        return !CStoreCheck::IsStoreDamaged();
+        return eHeld == HOLD_NOTHING;
     }
+    CStoreRegister reg(store.Reg());
     const int iStored = store.Reg().iTotalNum;
-    CStoreMark mark(store.Reg());
-    if (iStored > mark.Capacity() || iDatabaseCount > mark.Capacity())
+    const int iCapacity = std::min(reg.Capacity(), store.MappedSlots());
+    if (iStored > iCapacity || iDatabaseCount > iCapacity || reg.Mark() != 0)
     {
-        return false; // it had room before another process changed it
+        return false; // it had room before another process changed it, or it cannot be changed
     }
-    CStorePatch patch(store.Records(), iStored, mark.Capacity(), mark.SortType());
+    CStorePatch patch(store.Records(), iStored, iCapacity, reg.SortType());
     const PATCH_RESULT eResult = ApplyChanges(*m_pDBOperator, patch, iRecordNum, pIds);
-    patch.ClearUpTo(iDatabaseCount);
+    patch.Cover(iDatabaseCount);
     store.Reg().iTotalNum = iDatabaseCount;
-    if (eResult == PATCH_DONE && patch.Count() == iDatabaseCount)
+    if (eResult == PATCH_DONE && patch.Count() == iDatabaseCount && store.Flush())
     {
-        mark.Finish();
+        reg.Lift(iDatabaseCount, iCapacity, reg.SortType());
     }
     store.Release();
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: OnContactsTablePartChanged1 EXIT takes %d", watch.Elapsed());
@@ -339,7 +257,7 @@ void CLocalizerLogic::OnStatusUpdatesTableChanged(int /*iRecordNum*/, long long*
     int iTotalNum = 0;
     const int iMemSize = m_pclMemManger->GetMemSize(&iTotalNum);
     const bool bComplete = iMemSize > 0 ? iTotalNum <= iMemSize : !HasUnbuiltContacts(iTotalNum);
-    if (!bComplete || !RefreshOnlineStatus())
+    if (!bComplete || CStoreRegister::IsChangeLost() || !RefreshOnlineStatus())
     {
         OnContactsTableChanged();
     }
@@ -359,36 +277,44 @@ bool CLocalizerLogic::HasUnbuiltContacts(int iTotalNum)
 bool CLocalizerLogic::RefreshOnlineStatus()
 {
     CHeldStore store(*m_pclMemManger);
-    if (!store.Open())
+    const HOLD_RESULT eHeld = store.Open();
+    if (eHeld != HOLD_READY)
     {
-        return !CStoreCheck::IsStoreDamaged();
+        return eHeld == HOLD_NOTHING;
     }
-    const tag_ContactReg reg = store.Reg();
-    if (reg.iTotalNum > reg.iMemSize)
+    CStoreRegister reg(store.Reg());
+    const int iStored = store.Reg().iTotalNum;
+    if (iStored > std::min(reg.Capacity(), store.MappedSlots()))
     {
         QV_LOGD(QV_LOG_TAG,
                 "QV_Contacts: OnContactsTableChanged pCR->iTotalNum > pCR->iMemSize MemSize=%d\n",
-                reg.iMemSize);
+                reg.Capacity());
         return false;
     }
-    CStoreMark mark(store.Reg());
-    tag_ContactsInfo stored = {reg.iTotalNum, store.Records()};
+    if (reg.Mark() != 0)
+    {
+        return false;
+    }
+    tag_ContactsInfo stored = {iStored, store.Records()};
     m_pDBOperator->ReadAllSmsOnlineStatus(&stored, 0, nullptr);
-    mark.Finish();
+    if (store.Flush())
+    {
+        reg.Lift(iStored, reg.Capacity(), reg.SortType());
+    }
     return true;
 }
 
 void CLocalizerLogic::OnContactTimeChanged(long iContactID, long long llTime)
 {
     CHeldRecords store("QV_Contacts: OnContactTimeChanged Lock share mem false");
-    const int iSlot = store.Open() ? store.Find(iContactID) : -1;
+    const int iSlot = store.Find(iContactID);
     if (iSlot < 0)
     {
         return;
     }
-    if (store.SortType() == STORE_ORDER_TIME && iSlot > 0)
+    if (store.Reg().iSortType == STORE_ORDER_TIME && iSlot > 0)
     {
-        SetContactedFirst(store.Records(), iSlot, llTime);
+        SetContactedFirst(store, iSlot, llTime);
     }
     else
     {
@@ -399,7 +325,7 @@ void CLocalizerLogic::OnContactTimeChanged(long iContactID, long long llTime)
 void CLocalizerLogic::OnContactStarChanged(long iContactID, long lStarred)
 {
     CHeldRecords store("QV_Contacts: OnContactStarChanged Lock share mem false");
-    const int iSlot = store.Open() ? store.Find(iContactID) : -1;
+    const int iSlot = store.Find(iContactID);
     if (iSlot < 0)
     {
         return;
@@ -411,5 +337,6 @@ void CLocalizerLogic::OnContactStarChanged(long iContactID, long lStarred)
 int CLocalizerLogic::OnGetSortType()
 {
     tag_ContactReg reg = {};
-    return CStoreCheck::MapReg(&reg) == 0 ? reg.iSortType : STORE_ORDER_NAME;
+    CStoreRegister::Read(&reg);
+    return reg.iSortType;
 }

@@ -11,8 +11,11 @@
 #include "LocalizerImpl/QVWordLocalizerManager.h"
 #include "LocalizerImpl/SearchRun.h"
 #include "MemManager/ContactSelection.h"
+#include "MemManager/LockAttempts.h"
 #include "MemManager/MemManger.h"
 #include "MemManager/ResultSet.h"
+#include "MemManager/StoreBuild.h"
+#include "MemManager/StoreRegister.h"
 
 #include <sys/stat.h>
 #include <unistd.h>
@@ -24,6 +27,7 @@ namespace
 {
 
 constexpr int MATCH_ANYWHERE = 1;
+constexpr int MAX_RESORTS = 3;
 
 // Size of a file, 0 when it is missing or empty.
 int FileSize(const char* szPath)
@@ -34,6 +38,19 @@ int FileSize(const char* szPath)
         return 0;
     }
     return static_cast<int>(info.st_size);
+}
+
+// Whether the store is complete. A change that is under way is waited for, as long as a build
+// would wait.
+bool IsStoreWhole()
+{
+    tag_ContactReg reg = {};
+    if (CStoreRegister::Inspect(&reg) == STORE_WHOLE)
+    {
+        return true;
+    }
+    CStoreLock lock;
+    return TryStoreLock(&lock, [](int) {}) && CStoreRegister::Inspect(&reg) == STORE_WHOLE;
 }
 
 // The matcher for a kind of input, null without memory.
@@ -64,19 +81,24 @@ tag_LocalizerResult* NewResult(int iNum)
 }
 
 // Finishes a search into the caller's result: the facade's own copy of the source where all of it
-// was found and its array is dense, else a new set. Null for want of memory.
-tag_LocalizerResult* HandOut(CSearchRun& run, CResultOwner& copy, const tag_LocalizerResult& source,
-                             int iFound, long* pMask, wchar_t* szWordOut)
+// was found and its array is dense, else a new set. 0, or -1 without memory or without a place
+// for the result; the keys that can follow are written all the same.
+int HandOut(CSearchRun& run, CResultOwner& copy, const tag_LocalizerResult& source, int iFound,
+            tag_LocalizerResult** ppResult, long* pMask, wchar_t* szWordOut)
 {
-    if (copy.IsDense() && iFound == source.iResultNum)
+    if (ppResult != nullptr && copy.IsDense() && iFound == source.iResultNum)
     {
-        tag_LocalizerResult* pResult = copy.Detach();
-        run.FinishInPlace(*pResult, pMask, szWordOut);
-        return pResult;
+        *ppResult = copy.Detach();
+        run.FinishInPlace(**ppResult, pMask, szWordOut);
+        return 0;
     }
-    tag_LocalizerResult* pResult = NewResult(iFound);
+    tag_LocalizerResult* pResult = ppResult != nullptr ? NewResult(iFound) : nullptr;
     run.Finish(source, pResult, pMask, szWordOut);
-    return pResult;
+    if (ppResult != nullptr)
+    {
+        *ppResult = pResult;
+    }
+    return pResult != nullptr ? 0 : -1;
 }
 
 } // namespace
@@ -115,7 +137,7 @@ CLocalizerLogic::~CLocalizerLogic()
 
 int CLocalizerLogic::MemInit(bool bForce)
 {
-    if (!bForce && IsNeedReload() == 0)
+    if (!bForce && IsNeedReload() == 0 && IsStoreWhole())
     {
         return 0;
     }
@@ -146,9 +168,11 @@ int CLocalizerLogic::BuildIndex(tag_ContactsInfo& record)
         return iRet;
     }
     const CStopwatch sortWatch;
+    int iSortType = STORE_ORDER_NAME;
     if (record.pContacts != nullptr)
     {
-        iRet = SortByStoredOrder(record, m_pclMemManger->GetSortType());
+        iRet = ReadStoredOrder(iSortType);
+        iRet = iRet == 0 ? ConvertAndSort(record, iSortType) : iRet;
         if (iRet != 0)
         {
             return iRet;
@@ -157,7 +181,7 @@ int CLocalizerLogic::BuildIndex(tag_ContactsInfo& record)
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: MemInit IFL_PtrQuickSort time = %d\n", sortWatch.Elapsed());
 
     const CStopwatch writeWatch;
-    iRet = m_pclMemManger->InitContactRecord(&record);
+    iRet = WriteSorted(record, iSortType);
     if (iRet == 0)
     {
         QV_LOGD(QV_LOG_TAG, "QV_Contacts: MemInit InitContactRecord time = %d\n",
@@ -189,21 +213,54 @@ void CLocalizerLogic::ReadOnlineStatus(tag_ContactsInfo& record)
     }
 }
 
-// Names become pinyin keys; by name first, which numbers the records, then by any other order.
-int CLocalizerLogic::SortByStoredOrder(tag_ContactsInfo& record, int iSortType)
+// The stored sort type, STORE_ORDER_NAME where there is none. 0, or -1 when it cannot be read: a
+// build must not take that for an order.
+int CLocalizerLogic::ReadStoredOrder(int& iSortType)
 {
-    int iRet = CQVLocalizerManager::TransNameToPY(record.pContacts, record.RecordNum);
-    if (iRet == 0)
+    tag_ContactReg reg = {};
+    const STORE_STATE eState = CStoreRegister::Read(&reg);
+    iSortType = reg.iSortType;
+    return eState == STORE_UNREADABLE ? -1 : 0;
+}
+
+// Names become pinyin keys, then the records are sorted.
+int CLocalizerLogic::ConvertAndSort(tag_ContactsInfo& record, int iSortType)
+{
+    const int iRet = CQVLocalizerManager::TransNameToPY(record.pContacts, record.RecordNum);
+    return iRet == 0 ? SortConverted(record, iSortType) : iRet;
+}
+
+// By name first, which numbers the records, then by any other order.
+int CLocalizerLogic::SortConverted(tag_ContactsInfo& record, int iSortType)
+{
+    const int iRet = CQVLocalizerManager::LocalizerQuickSort(record.pContacts, record.RecordNum,
+                                                             STORE_ORDER_NAME);
+    if (iRet != 0 || iSortType == STORE_ORDER_NAME)
     {
-        iRet = CQVLocalizerManager::LocalizerQuickSort(record.pContacts, record.RecordNum,
-                                                       STORE_ORDER_NAME);
+        return iRet;
     }
-    if (iRet == 0 && iSortType != STORE_ORDER_NAME)
+    return CQVLocalizerManager::LocalizerQuickSort(record.pContacts, record.RecordNum, iSortType);
+}
+
+// Writes the records, sorted by iSortType, and sorts them anew if the sort type was set meanwhile.
+// Somebody who sets it again and again is left with a marked store.
+int CLocalizerLogic::WriteSorted(tag_ContactsInfo& record, int iSortType)
+{
+    BUILD_RESULT eResult = CStoreBuild::Write(record, &iSortType);
+    for (int i = 0; i < MAX_RESORTS && eResult == BUILD_OUT_OF_ORDER; ++i)
     {
-        iRet =
-            CQVLocalizerManager::LocalizerQuickSort(record.pContacts, record.RecordNum, iSortType);
+        if (ReadStoredOrder(iSortType) != 0 || SortConverted(record, iSortType) != 0)
+        {
+            return -1;
+        }
+        eResult = CStoreBuild::Write(record, &iSortType);
     }
-    return iRet;
+    if (eResult == BUILD_FAILED)
+    {
+        return -1;
+    }
+    CStoreRegister::SetChangeLost(false);
+    return 0;
 }
 
 int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
@@ -211,7 +268,7 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
                             int /*iReserved*/, tag_LocalizerResult** ppResult, long* pMask,
                             wchar_t* szWordOut)
 {
-    if (pFilterChain == nullptr || ppResult == nullptr || m_pclMemManger == nullptr)
+    if (pFilterChain == nullptr || m_pclMemManger == nullptr)
     {
         return -1;
     }
@@ -243,8 +300,7 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
     int iRet = iBegun == 0 ? run.Find(*pSource, bTimeOrder) : iBegun;
     if (iRet >= 0)
     {
-        *ppResult = HandOut(run, copy, *pSource, iRet, pMask, szWordOut);
-        iRet = *ppResult != nullptr ? 0 : -1;
+        iRet = HandOut(run, copy, *pSource, iRet, ppResult, pMask, szWordOut);
     }
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: Search IFL_Search time = %d\n", watch.Elapsed());
     return iRet;

@@ -122,7 +122,10 @@ private:
     QV_INTERNAL int BuildIndex(tag_ContactsInfo& record);
     QV_INTERNAL int ReadContacts(tag_ContactsInfo& record);
     QV_INTERNAL void ReadOnlineStatus(tag_ContactsInfo& record);
-    QV_INTERNAL static int SortByStoredOrder(tag_ContactsInfo& record, int iSortType);
+    QV_INTERNAL static int ReadStoredOrder(int& iSortType);
+    QV_INTERNAL static int ConvertAndSort(tag_ContactsInfo& record, int iSortType);
+    QV_INTERNAL static int SortConverted(tag_ContactsInfo& record, int iSortType);
+    QV_INTERNAL static int WriteSorted(tag_ContactsInfo& record, int iSortType);
     QV_INTERNAL void CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain,
                                 CCandidateTest& test, CResultOwner& copy);
     QV_INTERNAL int RebuildStore(tag_ContactsInfo& record);

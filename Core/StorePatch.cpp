@@ -5,18 +5,10 @@
 #include "MemManager/RecordSlots.h"
 
 #include <algorithm>
-#include <atomic>
 #include <cwchar>
 
 namespace
 {
-
-// Keeps the stores before it ahead of those after it, for whoever looks at the files after this
-// process was killed in between.
-void OrderStores()
-{
-    std::atomic_thread_fence(std::memory_order_seq_cst);
-}
 
 bool IsSameName(const tag_ContactsStruct& a, const tag_ContactsStruct& b)
 {
@@ -24,22 +16,6 @@ bool IsSameName(const tag_ContactsStruct& a, const tag_ContactsStruct& b)
 }
 
 } // namespace
-
-CStoreMark::CStoreMark(tag_ContactReg& reg)
-    : m_reg(reg), m_iCapacity(reg.iMemSize), m_iSortType(reg.iSortType)
-{
-    m_reg.iMemSize = 0;
-    OrderStores();
-}
-
-void CStoreMark::Finish()
-{
-    OrderStores();
-    if (m_reg.iSortType == m_iSortType)
-    {
-        m_reg.iMemSize = m_iCapacity;
-    }
-}
 
 CChangedIds::CChangedIds(long long* pIds, int iNum) : m_pIds(pIds), m_iNum(iNum)
 {
@@ -113,10 +89,12 @@ void CStorePatch::Remove(const int* piSlots, int iNum)
 {
     m_piRemoved = piSlots;
     m_iRemoved = iNum;
+    m_bMoved = m_bMoved || iNum > 0;
 }
 
 PATCH_RESULT CStorePatch::Insert(tag_ContactsInfo& inserted)
 {
+    m_bMoved = m_bMoved || inserted.RecordNum > 0;
     int iInserted = 0;
     do
     {
@@ -143,28 +121,17 @@ int CStorePatch::InsertSome(tag_ContactsStruct* pRecords, int iNum)
     return iInserted;
 }
 
-void CStorePatch::Renumber()
+void CStorePatch::Cover(int iTotalNum)
 {
-    if (IsTimeOrder())
-    {
-        return;
-    }
-    for (int i = 0; i < m_iCount; ++i)
+    const int iEnd = std::min(iTotalNum, m_iCapacity);
+    ClearSlots(m_pRecords + m_iCount, std::max(0, iEnd - m_iCount));
+    for (int i = 0; m_bMoved && !IsTimeOrder() && i < iEnd; ++i)
     {
         // Records before the first change have their number: their pages stay clean.
         if (m_pRecords[i].iSortIndex != i)
         {
             m_pRecords[i].iSortIndex = i;
         }
-    }
-}
-
-void CStorePatch::ClearUpTo(int iTotalNum)
-{
-    const int iEnd = std::min(iTotalNum, m_iCapacity);
-    if (iEnd > m_iCount)
-    {
-        ClearSlots(m_pRecords + m_iCount, iEnd - m_iCount);
     }
 }
 

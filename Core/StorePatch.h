@@ -7,28 +7,6 @@
 
 #include <cstdint>
 
-// Keeps the registration record from looking complete while stored records change: its capacity
-// is 0 from construction on, which makes the next notification rebuild the store. Only Finish
-// puts it back, so a writer that fails, or dies, leaves the store marked.
-class CStoreMark
-{
-public:
-    explicit CStoreMark(tag_ContactReg& reg);
-    CStoreMark(const CStoreMark&) = delete;
-    CStoreMark& operator=(const CStoreMark&) = delete;
-
-    int Capacity() const { return m_iCapacity; }
-    int SortType() const { return m_iSortType; }
-    // The change is complete. A sort type that was set meanwhile keeps the mark: the records are
-    // not in its order.
-    void Finish();
-
-private:
-    tag_ContactReg& m_reg;
-    int m_iCapacity;
-    int m_iSortType;
-};
-
 // The ids of a notification that have not been found yet. The array stays the caller's and is
 // changed: an id that is taken out is replaced by the last one.
 class CChangedIds
@@ -82,10 +60,10 @@ public:
     // it belongs, one after the other, its iSortIndex being its slot at that moment. Without room
     // for all, the first ones are put in.
     PATCH_RESULT Insert(tag_ContactsInfo& inserted);
-    // Numbers the records of a store in name order by their slots; does nothing in time order.
-    void Renumber();
-    // Clears the slots behind the records up to iTotalNum, at most the capacity.
-    void ClearUpTo(int iTotalNum);
+    // Ends the patch of a store that is to count iTotalNum contacts: clears slots up to there, at
+    // most the capacity, that have no record, and in name order, if records were removed or were
+    // to be inserted, numbers all of them by their slots.
+    void Cover(int iTotalNum);
 
 private:
     bool Renew(int iSlot, tag_ContactsInfo& changed);
@@ -96,6 +74,7 @@ private:
     int m_iCount;
     int m_iCapacity;
     int m_iSortType;
+    bool m_bMoved = false;            // records were removed or were to be inserted
     const int* m_piRemoved = nullptr; // slots whose records are to leave
     int m_iRemoved = 0;
 };

@@ -38,6 +38,11 @@ void FillEntry(const tag_ContactsStruct& record, tag_LocalizerDetail* pEntry)
     pEntry->llLastTimeContacted = record.llLastTimeContacted;
 }
 
+bool IsEmptySlot(const tag_ContactsStruct& record)
+{
+    return record.iContactID == 0;
+}
+
 // Of each record a few fields are read, too far apart for the processor to see a pattern: it is
 // told ahead where they are.
 constexpr int PREFETCH_AHEAD = 12;
@@ -53,7 +58,8 @@ void Prefetch(const tag_ContactsStruct& record)
 } // namespace
 
 CCandidateEntries::Counts CCandidateEntries::Select(const tag_ContactsStruct* pRecords, int iCount,
-                                                    CFilterChain& chain, CCandidateTest* pTest,
+                                                    bool bEmptySlots, CFilterChain& chain,
+                                                    CCandidateTest* pTest,
                                                     tag_LocalizerDetail* pEntries)
 {
     const CRecordTest test(chain);
@@ -62,7 +68,7 @@ CCandidateEntries::Counts CCandidateEntries::Select(const tag_ContactsStruct* pR
     for (int i = 0; i < iCount; ++i)
     {
         Prefetch(pRecords[std::min(i + PREFETCH_AHEAD, iCount - 1)]);
-        if (!bAll && !test.Keeps(pRecords[i]))
+        if ((bEmptySlots && IsEmptySlot(pRecords[i])) || (!bAll && !test.Keeps(pRecords[i])))
         {
             continue;
         }
@@ -73,6 +79,13 @@ CCandidateEntries::Counts CCandidateEntries::Select(const tag_ContactsStruct* pR
         }
     }
     return counts;
+}
+
+void CCandidateEntries::DropEmptySlots(tag_ContactsInfo* pCopy)
+{
+    tag_ContactsStruct* pEnd =
+        std::remove_if(pCopy->pContacts, pCopy->pContacts + pCopy->RecordNum, IsEmptySlot);
+    pCopy->RecordNum = static_cast<int32_t>(pEnd - pCopy->pContacts);
 }
 
 void CCandidateEntries::NarrowCopy(tag_ContactsInfo* pCopy, CFilterChain& chain,

@@ -22,8 +22,12 @@ public:
     // Writes an entry for each of the iCount records that passes the chain, which has to be one
     // that CRecordTest::CanTest accepts, and that pTest (may be null) does not rule out. The
     // records are only read, so they may lie in a mapping; pEntries has room for iCount entries.
-    static Counts Select(const tag_ContactsStruct* pRecords, int iCount, CFilterChain& chain,
-                         CCandidateTest* pTest, tag_LocalizerDetail* pEntries);
+    // With bEmptySlots records of contact id 0 are none: a writer that died left them.
+    static Counts Select(const tag_ContactsStruct* pRecords, int iCount, bool bEmptySlots,
+                         CFilterChain& chain, CCandidateTest* pTest, tag_LocalizerDetail* pEntries);
+
+    // Takes the records of contact id 0 out of the copy.
+    static void DropEmptySlots(tag_ContactsInfo* pCopy);
 
     // Narrows the caller's copy of the records by the pipeline of filter processes and makes the
     // entries of what is left, in a new array of pResult, which comes in empty. It stays empty

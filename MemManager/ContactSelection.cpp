@@ -5,7 +5,7 @@
 #include "Filter/RecordTest.h"
 #include "MemManager/CandidateEntries.h"
 #include "MemManager/LockAttempts.h"
-#include "MemManager/StoreCheck.h"
+#include "MemManager/StoreRegister.h"
 
 #include <cstring>
 #include <memory>
@@ -30,19 +30,6 @@ bool TakeLockForSearch(CStoreLock* pLock)
     return bTaken;
 }
 
-// Maps all stored records and returns their number; 0 when there are none to be read.
-int OpenStoredRecords(CReadMapping* pRecords)
-{
-    tag_ContactReg reg = {};
-    if (CStoreCheck::MapReg(&reg) != 0 || reg.iTotalNum <= 0)
-    {
-        return 0;
-    }
-    QV_LOGD(QV_LOG_TAG, "QV_Contacts:CopyContactsResult iContactCount = %d\n", reg.iTotalNum);
-    return pRecords->Open(CDataPaths::ContactRecords(), StoreBytes(reg.iTotalNum)) ? reg.iTotalNum
-                                                                                   : 0;
-}
-
 template <typename T>
 std::unique_ptr<T[]> NewUnderLock(int iCount)
 {
@@ -60,7 +47,21 @@ struct tag_OpenStore
     CStoreLock lock;
     CReadMapping records;
     int iCount = 0;
+    bool bMarked = false; // slots without a contact are no contacts of id 0
 
+    // Maps all stored records; false when there are none to be read.
+    bool Open()
+    {
+        tag_ContactReg reg = {};
+        bMarked = CStoreRegister::Read(&reg) == STORE_MARKED;
+        iCount = reg.iTotalNum;
+        if (iCount == 0)
+        {
+            return false;
+        }
+        QV_LOGD(QV_LOG_TAG, "QV_Contacts:CopyContactsResult iContactCount = %d\n", iCount);
+        return records.Open(CDataPaths::ContactRecords(), StoreBytes(iCount));
+    }
     void Close()
     {
         records.Close();
@@ -80,8 +81,9 @@ bool SelectFromStore(tag_OpenStore* pStore, CFilterChain& chain, CCandidateTest*
     {
         return true;
     }
-    const CCandidateEntries::Counts counts = CCandidateEntries::Select(
-        pStore->records.As<tag_ContactsStruct>(), pStore->iCount, chain, pTest, pEntries.get());
+    const CCandidateEntries::Counts counts =
+        CCandidateEntries::Select(pStore->records.As<tag_ContactsStruct>(), pStore->iCount,
+                                  pStore->bMarked, chain, pTest, pEntries.get());
     pStore->Close();
     CCandidateEntries::LogFilterResult(counts.iKept);
     if (counts.iWritten > 0)
@@ -103,6 +105,10 @@ void CopyFromStore(tag_OpenStore* pStore, CFilterChain& chain, tag_LocalizerResu
     std::memcpy(pCopy.get(), pStore->records.As<void>(), StoreBytes(pStore->iCount));
     pStore->Close();
     tag_ContactsInfo copy = {pStore->iCount, pCopy.get()};
+    if (pStore->bMarked)
+    {
+        CCandidateEntries::DropEmptySlots(&copy);
+    }
     CCandidateEntries::NarrowCopy(&copy, chain, pResult);
 }
 
@@ -127,8 +133,7 @@ void CContactSelection::Copy(CFilterChain& chain, CCandidateTest* pTest,
     {
         return;
     }
-    store.iCount = OpenStoredRecords(&store.records);
-    if (store.iCount == 0)
+    if (!store.Open())
     {
         return;
     }

@@ -2,124 +2,18 @@
 #include "Common/Log.h"
 #include "MemManager/LockAttempts.h"
 #include "MemManager/MemManger.h"
-#include "MemManager/StoreCheck.h"
+#include "MemManager/StoreBuild.h"
+#include "MemManager/StoreRegister.h"
 
-#include <atomic>
+#include <algorithm>
 #include <cstring>
 #include <new>
-#include <sys/stat.h>
 
 namespace
 {
 
 constexpr unsigned int READ_LOCK_PAUSE = 100; // milliseconds
 constexpr int FLUSH_LATER = 0;
-constexpr int FLUSH_NOW = 1;
-
-bool TakeLockForBuild(CStoreLock* pLock)
-{
-    const bool bTaken = TryStoreLock(
-        pLock,
-        [](int iAttempt) {
-            QV_LOGE(QV_LOG_TAG, "QV_Contacts:InitContactRecord write share memo lock false %d",
-                    iAttempt);
-        });
-    if (!bTaken)
-    {
-        QV_LOGE(QV_LOG_TAG, "QV_Contacts:InitContactRecord write share memo lock false return");
-    }
-    return bTaken;
-}
-
-void WaitForLock(CStoreLock* pLock)
-{
-    while (!pLock->TryLock())
-    {
-        QV_LOGE(QV_LOG_TAG, "QV_Contacts: GetContactsResult Lock share mem false");
-        Sleep(READ_LOCK_PAUSE);
-    }
-}
-
-// Keeps the stores before it ahead of those after it, for whoever looks at the file after this
-// process was killed in between and for readers without the lock.
-void OrderStores()
-{
-    std::atomic_thread_fence(std::memory_order_seq_cst);
-}
-
-// Changes a mapped registration record; the capacity comes last, so that the record never looks
-// finished before it is.
-void WriteReg(tag_ContactReg* pReg, const tag_ContactReg& regNew)
-{
-    pReg->iMemSize = 0;
-    OrderStores();
-    pReg->iTotalNum = regNew.iTotalNum;
-    pReg->iSortType = regNew.iSortType;
-    OrderStores();
-    pReg->iMemSize = regNew.iMemSize;
-}
-
-bool HasReg()
-{
-    struct stat info = {};
-    return stat(CDataPaths::ContactReg(), &info) == 0 && S_ISREG(info.st_mode) &&
-           info.st_size >= static_cast<off_t>(sizeof(tag_ContactReg));
-}
-
-// Sets the capacity of an existing registration record to 0, which asks for a rebuild until a
-// complete change puts it back. 0, or -1 when the record cannot be marked.
-int MarkUnfinished()
-{
-    if (!HasReg())
-    {
-        return 0;
-    }
-    CWriteMapping mapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
-    if (!mapping.IsOpen())
-    {
-        return -1;
-    }
-    mapping.As<tag_ContactReg>()->iMemSize = 0;
-    OrderStores();
-    return 0;
-}
-
-// Writes the records of a build. A good store is marked once its file is known to be large
-// enough, so that a full disk changes nothing. A damaged one is marked before that: the larger
-// file could make its record look good.
-int WriteRecords(const tag_ContactsInfo& info, STORE_STATE eOldState)
-{
-    if (eOldState == STORE_DAMAGED && MarkUnfinished() != 0)
-    {
-        return -1;
-    }
-    CWriteMapping records(CDataPaths::ContactRecords(),
-                          StoreBytes(info.RecordNum + STORE_SPARE_RECORDS));
-    if (!records.IsOpen() || MarkUnfinished() != 0)
-    {
-        return -1;
-    }
-    std::memcpy(records.As<void>(), info.pContacts, StoreBytes(info.RecordNum));
-    return 0;
-}
-
-// Writes the registration record of a build. Only a good record has a sort type to keep: of any
-// other, GetSortType tells 0, which is the order that the build has written.
-int WriteNewReg(int iTotalNum, STORE_STATE eOldState)
-{
-    CWriteMapping mapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
-    if (!mapping.IsOpen())
-    {
-        return -1;
-    }
-    auto* pReg = mapping.As<tag_ContactReg>();
-    tag_ContactReg regNew = {};
-    regNew.iTotalNum = iTotalNum;
-    regNew.iSortType = eOldState == STORE_GOOD ? pReg->iSortType : STORE_ORDER_NAME;
-    regNew.iMemSize = iTotalNum + STORE_SPARE_RECORDS;
-    WriteReg(pReg, regNew);
-    return 0;
-}
 
 } // namespace
 
@@ -133,23 +27,11 @@ CMemManger::~CMemManger()
 
 int CMemManger::InitContactRecord(tag_ContactsInfo* pInfo)
 {
-    if (pInfo == nullptr || pInfo->RecordNum < 0 ||
-        pInfo->RecordNum > STORE_MAX_RECORDS - STORE_SPARE_RECORDS)
+    if (pInfo == nullptr)
     {
         return -1;
     }
-    CStoreLock lock;
-    if (!TakeLockForBuild(&lock))
-    {
-        return -1;
-    }
-    tag_ContactReg regOld = {};
-    const STORE_STATE eOldState = CStoreCheck::ReadReg(&regOld);
-    if (pInfo->pContacts != nullptr && WriteRecords(*pInfo, eOldState) != 0)
-    {
-        return -1;
-    }
-    return WriteNewReg(pInfo->RecordNum, eOldState);
+    return CStoreBuild::Write(*pInfo, nullptr) == BUILD_FAILED ? -1 : 0;
 }
 
 void CMemManger::GetContactsResult(tag_ContactsInfo** ppInfo)
@@ -165,9 +47,14 @@ void CMemManger::GetContactsResult(tag_ContactsInfo** ppInfo)
         return;
     }
     CStoreLock lock;
-    WaitForLock(&lock);
+    if (!WaitForStoreLock([&lock] { return lock.TryLock(); }, READ_LOCK_PAUSE,
+                          "QV_Contacts: GetContactsResult Lock share mem false"))
+    {
+        return;
+    }
     tag_ContactReg reg = {};
-    if (CStoreCheck::MapReg(&reg) != 0 || reg.iTotalNum <= 0)
+    CStoreRegister::Read(&reg);
+    if (reg.iTotalNum == 0)
     {
         return;
     }
@@ -190,7 +77,7 @@ void CMemManger::GetContactsResult(tag_ContactsInfo** ppInfo)
 int CMemManger::GetMemSize(int* piTotalNum)
 {
     tag_ContactReg reg = {};
-    if (CStoreCheck::MapReg(&reg) != 0)
+    if (!CStoreRegister::HasRecord(CStoreRegister::Read(&reg)))
     {
         return 0;
     }
@@ -208,24 +95,27 @@ int CMemManger::OpenWriteShareMem(tag_ContactsStruct** ppContacts, tag_ContactRe
     {
         return -1;
     }
-    tag_ContactReg reg = {};
-    if (CStoreCheck::ReadReg(&reg) == STORE_DAMAGED)
+    tag_ContactReg regFile = {};
+    const STORE_STATE eState = CStoreRegister::Inspect(&regFile);
+    if (eState == STORE_DAMAGED || eState == STORE_UNREADABLE)
     {
         return -1;
     }
-    CWriteMapping regMapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
-    if (!regMapping.IsOpen())
+    CWriteMapping reg(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
+    if (!reg.IsOpen())
     {
         return -1;
     }
-    const size_t uSize = StoreBytes(reg.iMemSize);
+    // The mapped capacity counts: a sort type may have been set since. It cannot have grown.
+    const int iCapacity = std::min(reg.As<tag_ContactReg>()->iMemSize, regFile.iMemSize);
+    const size_t uSize = iCapacity > 0 ? StoreBytes(iCapacity) : 0;
     CWriteMapping records;
     if (uSize > 0 && !records.Open(CDataPaths::ContactRecords(), uSize))
     {
         return -1;
     }
     m_iContactsMapSize = static_cast<int>(uSize);
-    m_pContactReg = regMapping.Detach<tag_ContactReg>();
+    m_pContactReg = reg.Detach<tag_ContactReg>();
     m_pContacts = records.Detach<tag_ContactsStruct>();
     *ppContacts = m_pContacts;
     *ppReg = m_pContactReg;
@@ -240,14 +130,17 @@ void CMemManger::CloseWriteShareMem()
     m_pContacts = nullptr;
 }
 
+LOCK_RESULT CMemManger::TryLockMemo()
+{
+    // Another attempt while the lock is held would be refused and would lose the handle that
+    // keeps it. A handle that is not the lock any more, because its descriptor was closed by
+    // somebody else, is given up.
+    return CSingleMutex::IsHeld(m_hMemLock) ? LOCK_REFUSED : CSingleMutex::TryLock(&m_hMemLock);
+}
+
 int CMemManger::LockMemo()
 {
-    if (m_hMemLock != 0)
-    {
-        // Another attempt would be refused and would lose the handle that keeps the lock.
-        return 0;
-    }
-    return CSingleMutex::Lock(&m_hMemLock);
+    return CSingleMutex::IsHeld(m_hMemLock) ? 0 : CSingleMutex::Lock(&m_hMemLock);
 }
 
 int CMemManger::UnlockMemo()
@@ -267,27 +160,13 @@ int CMemManger::UnlockMemo()
 int CMemManger::GetSortType()
 {
     tag_ContactReg reg = {};
-    return CStoreCheck::MapReg(&reg) == 0 ? reg.iSortType : STORE_ORDER_NAME;
+    CStoreRegister::Read(&reg);
+    return reg.iSortType;
 }
 
 void CMemManger::SetSortType(int iSortType)
 {
-    tag_ContactReg regOld = {};
-    if (CStoreCheck::ReadReg(&regOld) != STORE_GOOD)
-    {
-        return;
-    }
-    CWriteMapping mapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
-    if (!mapping.IsOpen())
-    {
-        return;
-    }
-    auto* pReg = mapping.As<tag_ContactReg>();
-    tag_ContactReg regNew = {};
-    regNew.iTotalNum = pReg->iTotalNum;
-    regNew.iSortType = iSortType;
-    WriteReg(pReg, regNew);
-    mapping.Close(FLUSH_NOW);
+    CStoreRegister::StoreSortType(iSortType);
 }
 
 int CMemManger::UpdateContactRecord(tag_ContactsInfo* pInfo)

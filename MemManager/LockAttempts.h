@@ -1,6 +1,7 @@
 #ifndef QV_MEMMANAGER_LOCKATTEMPTS_H
 #define QV_MEMMANAGER_LOCKATTEMPTS_H
 
+#include "Common/Log.h"
 #include "Common/SystemTime.h"
 #include "MemManager/MappingGuards.h"
 
@@ -19,7 +20,7 @@ inline bool TryDuringPause(CStoreLock* pLock)
     do
     {
         Sleep(STORE_LOCK_RETRY);
-        if (pLock->TryLockQuietly())
+        if (pLock->TryLockQuietly() == LOCK_TAKEN)
         {
             return true;
         }
@@ -35,11 +36,32 @@ bool TryStoreLock(CStoreLock* pLock, FnRefused fnRefused)
 {
     for (int i = 0; i < STORE_LOCK_ATTEMPTS; ++i)
     {
-        if (pLock->TryLock() || TryDuringPause(pLock))
+        if (pLock->TryLock() == LOCK_TAKEN || TryDuringPause(pLock))
         {
             return true;
         }
         fnRefused(i);
+    }
+    return false;
+}
+
+// Takes the store lock by fnTry, which returns a LOCK_RESULT. Waits without limit while somebody
+// else holds it, with uPause milliseconds and the error line szRefused between attempts; false
+// after STORE_LOCK_ATTEMPTS in which the lock file could not be opened, which waiting may not mend.
+template <typename FnTry>
+bool WaitForStoreLock(FnTry fnTry, unsigned int uPause, const char* szRefused)
+{
+    int iUnavailable = 0;
+    while (iUnavailable < STORE_LOCK_ATTEMPTS)
+    {
+        const LOCK_RESULT eResult = fnTry();
+        if (eResult == LOCK_TAKEN)
+        {
+            return true;
+        }
+        iUnavailable += eResult == LOCK_UNAVAILABLE ? 1 : 0;
+        QV_LOGE(QV_LOG_TAG, "%s", szRefused);
+        Sleep(uPause);
     }
     return false;
 }

@@ -66,6 +66,8 @@ public:
         m_uSize = uSize;
         return IsOpen();
     }
+    // Brings what was written to the disk; false when that failed.
+    bool Flush() const { return msync(m_pAddr, m_uSize, MS_SYNC) == 0; }
     // Flushes and unmaps; bSync other than 0 waits for the disk.
     void Close(int bSync = 0)
     {
@@ -103,11 +105,9 @@ public:
 
     // One attempt, without waiting; only called while the lock is not held. The quiet one writes
     // no log line.
-    bool TryLock() { return Note(CSingleMutex::TryLock(&m_iFd)); }
-    bool TryLockQuietly() { return Note(CSingleMutex::TryLockQuietly(&m_iFd)); }
+    LOCK_RESULT TryLock() { return CSingleMutex::TryLock(&m_iFd); }
+    LOCK_RESULT TryLockQuietly() { return CSingleMutex::TryLockQuietly(&m_iFd); }
     bool IsHeld() const { return m_iFd != 0; }
-    // Whether the last attempt failed for another reason than that somebody holds the lock.
-    bool IsUnavailable() const { return m_eLast == LOCK_UNAVAILABLE; }
     // Releases the lock if it is held.
     void Release()
     {
@@ -119,14 +119,7 @@ public:
     }
 
 private:
-    bool Note(LOCK_RESULT eResult)
-    {
-        m_eLast = eResult;
-        return eResult == LOCK_TAKEN;
-    }
-
     int m_iFd = 0;
-    LOCK_RESULT m_eLast = LOCK_REFUSED;
 };
 
 #endif

@@ -11,19 +11,20 @@
 // operations that take it themselves (InitContactRecord, GetContactsResult, CopyContactsResult)
 // cannot have it, in the same process neither.
 //
-// Registration record. Whoever changes stored records first sets its iMemSize to 0 and puts the
-// capacity back as the last step of a complete change. A writer that dies in between leaves one
-// of these states, none of which can harm a reader, because iTotalNum never exceeds the file and
-// every record that is copied out is cut to its fields:
+// Registration record. Whoever changes stored records follows the protocol of StoreRegister.h: the
+// capacity iMemSize is 0, the mark, from before the first record changes until the change is
+// complete and on the disk. A writer that dies in between leaves one of these states, none of which
+// can harm a reader, because iTotalNum never exceeds the file and every slot holds one contact,
+// whole, or, with the contact id 0, none:
 //  - a longer records file under the old record: the old index, whole;
-//  - iMemSize 0 and the old iTotalNum over old and new records: an index that may miss a contact
-//    or show it twice;
-//  - iMemSize 0 and the new iTotalNum, sort type old or new: the new index, whole.
+//  - marked, with the old iTotalNum over old and new records: an index that may miss a contact or
+//    show it twice;
+//  - marked, with the new iTotalNum: the new index, whole.
 // In the last two the next notification of changed contacts or status rebuilds the store, because
 // iTotalNum, or the database's count where iTotalNum is 0, exceeds iMemSize. Readers under the lock
 // meet these states only after a writer died; GetMemSize and GetSortType take no lock and may also
-// see iMemSize 0 while a change is under way. A damaged record (see StoreCheck.h) acts like a file
-// that cannot be mapped, with an error line.
+// see the mark while a change is under way. A damaged record acts like a file that cannot be
+// mapped, with an error line.
 //
 // Result sets. A set made here is one object from scalar new and, when it has entries, one array
 // from array new; no two sets share an array. The receiver releases a set with FreeSearchResult.
@@ -31,6 +32,7 @@
 #include "Common/Export.h"
 #include "Core/ContactRecords.h"
 #include "Core/SearchRecords.h"
+#include "MemManager/SingleMutex.h"
 
 class CFilterChain;
 
@@ -47,18 +49,20 @@ public:
     // Writes a whole new store under the store lock, with room for STORE_SPARE_RECORDS more
     // contacts: the records first, the registration record last. The sort type stays what
     // GetSortType tells (0 for a new or damaged record). With pContacts null only the
-    // registration record is written. Five attempts at the lock, 200 ms apart.
-    // 0, or -1: pInfo null, a count below 0 or above what the store can hold, no lock, a file
-    // that cannot be mapped. When the records file cannot be mapped, the old index stays as it
-    // was; when the registration file cannot, the new records may lie under the old registration
-    // record, whose capacity is then 0.
+    // registration record is written. Five attempts at the lock, 200 ms apart. The records are on
+    // the disk before the registration record tells of them.
+    // 0, or -1: pInfo null, a count below 0 or above what the store can hold, no lock, a
+    // registration record that cannot be read (its sort type would be lost), a file that cannot
+    // be mapped or flushed. When the records file cannot be mapped, the old index stays as it
+    // was; when a later step fails, the new records may lie under the old registration record,
+    // which is marked. It also ends marked, with 0, when the sort type is set meanwhile.
     int InitContactRecord(tag_ContactsInfo* pInfo);
 
     // Hands out a copy of all stored records, made under the store lock, which is waited for
-    // without limit (one error line and 100 ms per attempt). The set is empty when there is no
-    // store, it is damaged or memory ran out, and null when even the set could not be allocated.
-    // The caller releases the array with array delete and the set with scalar delete.
-    // Null ppInfo: nothing is done.
+    // without limit (one error line and 100 ms per attempt), unless its file cannot be opened. The
+    // set is empty when there is no store, it is damaged or memory ran out, and null when even the
+    // set could not be allocated. The caller releases the array with array delete and the set with
+    // scalar delete. Null ppInfo: nothing is done.
     void GetContactsResult(tag_ContactsInfo** ppInfo);
 
     // The store's capacity in records; *piTotalNum (may be null) gets the stored count. 0 with
@@ -76,9 +80,12 @@ public:
 
     // The store lock, held through this object. LockMemo does not wait: 1 when taken, 0 when
     // anybody holds it, this object included, which then goes on holding it. UnlockMemo: 1 when
-    // released, 0 when nothing was held or the release failed (the handle is kept then).
+    // released, 0 when nothing was held or the release failed (the handle is kept then; LockMemo
+    // gives it up when it is not the lock any more).
     int LockMemo();
     int UnlockMemo();
+    // As LockMemo, telling a lock that somebody holds from one that cannot be had.
+    QV_INTERNAL LOCK_RESULT TryLockMemo();
 
     // The stored sort type, 0 when there is no store or it is damaged. No lock.
     int GetSortType();

@@ -211,7 +211,6 @@ TEST_F(CSearchTest, FailsWithoutTouchingWhatItHandsOut)
     const auto eUnknown = static_cast<IME_SEARCH_TYPE>(-1);
     const auto Code = [&](auto... arguments) { return m_logic.Search(nullptr, arguments...); };
     EXPECT_EQ(Code(szInput, SPECIAL, nullptr, 0, ppResult, &lMask, szWords), -1);
-    EXPECT_EQ(Code(szInput, WORD, pChain, 0, nullptr, &lMask, szWords), -1);
     EXPECT_EQ(Code(nullptr, WORD, pChain, 0, ppResult, &lMask, szWords), LOC_ERR_PARAM);
     EXPECT_EQ(Code(szInput, WORD, pChain, 0, ppResult, nullptr, szWords), LOC_ERR_PARAM);
     EXPECT_EQ(Code(szInput, WORD, pChain, 0, ppResult, &lMask, nullptr), LOC_ERR_PARAM);
@@ -222,6 +221,12 @@ TEST_F(CSearchTest, FailsWithoutTouchingWhatItHandsOut)
     EXPECT_EQ(lMask, MASK_UNSET);
     EXPECT_EQ(szWords[0], 0);
     EXPECT_STREQ(szInput, L"zs");
+
+    // Only the result has no place: the keys that can follow are told all the same.
+    BuildNames({"张三"});
+    EXPECT_EQ(Code(szInput, WORD, pChain, 0, nullptr, &lMask, szWords), -1);
+    EXPECT_NE(lMask, MASK_UNSET);
+    EXPECT_NE(szWords[0], 0);
 }
 
 TEST_F(CSearchTest, TellsEachStepInOrder)

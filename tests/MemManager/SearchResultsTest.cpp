@@ -102,9 +102,9 @@ TEST_F(SearchResults, BothWaysToTheEntriesAgree)
         const std::unique_ptr<CFilterChain> chain(pChain);
         const int iNum = static_cast<int>(vRecords.size());
         std::vector<tag_LocalizerDetail> vEntries(vRecords.size());
-        const int iKept =
-            CCandidateEntries::Select(vRecords.data(), iNum, *pChain, nullptr, vEntries.data())
-                .iKept;
+        const int iKept = CCandidateEntries::Select(vRecords.data(), iNum, false, *pChain, nullptr,
+                                                    vEntries.data())
+                              .iKept;
         tag_ContactsInfo copy = {iNum, vRecords.data()};
         const Set set = Own(new tag_LocalizerResult());
         CCandidateEntries::NarrowCopy(&copy, *pChain, set.get());

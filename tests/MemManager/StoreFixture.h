@@ -2,7 +2,7 @@
 #define QV_TESTS_MEMMANAGER_STOREFIXTURE_H
 
 #include "MemManager/MemManger.h"
-#include "MemManager/StoreCheck.h"
+#include "MemManager/StoreRegister.h"
 #include "tests/Support/ChildProcess.h"
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/StoreFiles.h"

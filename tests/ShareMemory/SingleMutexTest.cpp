@@ -57,7 +57,7 @@ TEST_F(SingleMutex, RefusesASecondHolderUntilTheFirstDies)
     EXPECT_EQ(m_log.Texts(DEBUG_LINE),
               (Lines{"QV_Contacts:Lock TRY LOCK", "QV_Contacts:LOCK RET = 0 "}));
     holder.Kill();
-    EXPECT_TRUE(CStoreLock().TryLock());
+    EXPECT_EQ(CStoreLock().TryLock(), LOCK_TAKEN);
 }
 
 TEST_F(SingleMutex, IsTakenInThePauseInWhichItBecomesFree)
@@ -109,22 +109,18 @@ TEST_F(SingleMutex, TellsAHeldLockFromNone)
     CStoreLock lock;
     {
         const CLockHolder holder;
-        EXPECT_FALSE(lock.TryLock());
-        EXPECT_FALSE(lock.IsUnavailable());
+        EXPECT_EQ(lock.TryLock(), LOCK_REFUSED);
     }
     fs::remove(CDataPaths::LockFile());
     ASSERT_EQ(mkfifo(CDataPaths::LockFile(), 0700), 0);
-    EXPECT_FALSE(lock.TryLock());
-    EXPECT_TRUE(lock.IsUnavailable()) << "a pipe";
+    EXPECT_EQ(lock.TryLock(), LOCK_UNAVAILABLE) << "a pipe";
     fs::remove(CDataPaths::LockFile());
     fs::create_directory(CDataPaths::LockFile());
     m_log.Clear();
-    EXPECT_FALSE(lock.TryLockQuietly());
-    EXPECT_TRUE(lock.IsUnavailable()) << "a directory";
+    EXPECT_EQ(lock.TryLockQuietly(), LOCK_UNAVAILABLE) << "a directory";
     EXPECT_EQ(m_log.Texts(DEBUG_LINE), Lines{});
     fs::remove(CDataPaths::LockFile());
-    EXPECT_TRUE(lock.TryLockQuietly());
-    EXPECT_FALSE(lock.IsUnavailable());
+    EXPECT_EQ(lock.TryLockQuietly(), LOCK_TAKEN);
 }
 
 } // namespace

@@ -219,7 +219,6 @@ private:
     {
         const std::string strReg = CDataDirectory::ReadBytes(CDataPaths::ContactReg());
         CLocalizerLogic logic;
-        Require(logic.MemInit(false) == 0, "MemInit(false) failed");
         logic.OnContactTimeChanged(1, 1'700'000'000'000);
         logic.OnContactStarChanged(2, 1);
         Require(CDataDirectory::ReadBytes(CDataPaths::ContactReg()) == strReg,

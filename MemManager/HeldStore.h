@@ -1,0 +1,75 @@
+#ifndef QV_MEMMANAGER_HELDSTORE_H
+#define QV_MEMMANAGER_HELDSTORE_H
+
+// The store as the change handlers hold it: the lock, which they wait for without limit as long
+// as somebody else holds it, then the write mappings. A lock file that cannot be opened is given
+// up after five attempts. Whatever keeps a change out of the store marks the store, so that the
+// next notification of contacts or status brings the change in.
+
+#include "MemManager/MappingGuards.h"
+#include "MemManager/StoreRegister.h"
+
+class CMemManger;
+
+enum HOLD_RESULT
+{
+    HOLD_READY,
+    HOLD_NOTHING, // there is no store, or it cannot be changed now and was marked
+    HOLD_REBUILD  // the store has to be rebuilt, with the lock free
+};
+
+// Marks the store for a change that did not reach it. Without the lock, which is tried like that
+// of a build, a running writer may lift the mark: then the process remembers the change as well.
+void MarkForLostChange();
+
+// The store during a patch: the lock and the mappings are the manager's.
+class CHeldStore
+{
+public:
+    explicit CHeldStore(CMemManger& manager);
+    ~CHeldStore() { Release(); }
+    CHeldStore(const CHeldStore&) = delete;
+    CHeldStore& operator=(const CHeldStore&) = delete;
+
+    // Maps both files; a missing store is not created.
+    HOLD_RESULT Open();
+    void Release();
+
+    // What HOLD_READY gives.
+    tag_ContactsStruct* Records() const { return m_pRecords; }
+    tag_ContactReg& Reg() const { return *m_pReg; }
+    int MappedSlots() const { return m_iMappedSlots; }
+    // Brings the changed records to the disk; false when that may have failed.
+    bool Flush() const;
+
+private:
+    CMemManger& m_manager;
+    bool m_bLocked;
+    tag_ContactsStruct* m_pRecords = nullptr;
+    tag_ContactReg* m_pReg = nullptr;
+    int m_iMappedSlots = 0;
+};
+
+// The stored records during a change of one: a lock of its own and a mapping of the used slots.
+class CHeldRecords
+{
+public:
+    explicit CHeldRecords(const char* szRefused);
+
+    // The first slot of the contact; -1 when it is not stored or the store cannot be changed.
+    int Find(long iContactID);
+    // What Find found.
+    tag_ContactsStruct* Records() const { return m_records.As<tag_ContactsStruct>(); }
+    const tag_ContactReg& Reg() const { return m_reg; }
+    bool Flush() const { return m_records.Flush(); }
+
+private:
+    bool Open();
+
+    CStoreLock m_lock; // released behind the mapping
+    bool m_bLocked;
+    tag_ContactReg m_reg = {};
+    CWriteMapping m_records;
+};
+
+#endif

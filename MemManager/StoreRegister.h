@@ -1,0 +1,83 @@
+#ifndef QV_MEMMANAGER_STOREREGISTER_H
+#define QV_MEMMANAGER_STOREREGISTER_H
+
+// The registration record and its dirty flag: a capacity of 0, called the mark.
+//
+// Protocol of every change to stored records, under the store lock:
+//   1. Mark: the capacity becomes 0, on the disk too, before the first record changes;
+//   2. the records change and are flushed to the disk;
+//   3. Lift: the count, then the capacity.
+// A writer that fails or dies in between, and a machine that loses power, leave the mark, and the
+// next notification of contacts or status (or MemInit) rebuilds the index.
+
+#include "Core/ContactRecords.h"
+
+constexpr int STORE_RECORD_SIZE = static_cast<int>(sizeof(tag_ContactsStruct));
+
+// The largest count whose bytes a 32-bit signed size can hold.
+constexpr int STORE_MAX_RECORDS = INT32_MAX / STORE_RECORD_SIZE;
+
+// Bytes of iCount records; iCount is 0 to STORE_MAX_RECORDS.
+constexpr size_t StoreBytes(int iCount)
+{
+    return static_cast<size_t>(iCount) * sizeof(tag_ContactsStruct);
+}
+
+enum STORE_STATE
+{
+    STORE_MISSING,    // no ContactsReg.bin, or an empty one
+    STORE_UNREADABLE, // there may be a record, but a system call failed: nothing is known of it
+    STORE_DAMAGED,    // counts that no build wrote or that the records file cannot hold
+    STORE_MARKED,     // a change is under way or was never completed, or a rebuild was asked for
+    STORE_WHOLE
+};
+
+class CStoreRegister
+{
+public:
+    // Whether a record is damaged beside a records file of llFileSize bytes (0 when missing):
+    // iTotalNum or iMemSize negative or above STORE_MAX_RECORDS, more contacts than the file
+    // holds, or a capacity above both the file's and STORE_SPARE_RECORDS.
+    static bool IsDamaged(const tag_ContactReg& reg, int64_t llFileSize);
+
+    // Maps ContactsReg.bin, copies the record into *pReg and unmaps. *pReg is all zero unless the
+    // state is STORE_MARKED or STORE_WHOLE. An error line tells of a file that cannot be mapped, a
+    // missing one included, and of a damaged record. Without the lock the state may be that of a
+    // change under way. Inspect does the same, but a missing file is no error to it.
+    static STORE_STATE Read(tag_ContactReg* pReg);
+    static STORE_STATE Inspect(tag_ContactReg* pReg);
+    // Whether the states that have a record: marked or whole.
+    static bool HasRecord(STORE_STATE eState);
+
+    // Marks the record in the file, if there is one. 0, or -1 when that failed. Under the lock.
+    static int MarkFile();
+
+    // Sets the sort type of an existing record and marks it, on the disk too. Needs no lock: a
+    // writer that lifts its mark at the same time notices. Nothing is changed or created in any
+    // other state.
+    static void StoreSortType(int iSortType);
+
+    // A change that neither reached the store nor could be marked there; the process remembers it
+    // until a rebuild succeeds.
+    static bool IsChangeLost();
+    static void SetChangeLost(bool bLost);
+
+    // The mapped record of a writer that holds the lock; it is not owned. Sort type and capacity
+    // are those of construction: a capacity above 0 says that the records are in that order.
+    explicit CStoreRegister(tag_ContactReg& reg);
+    int SortType() const { return m_iSortType; }
+    int Capacity() const { return m_iCapacity; }
+
+    // Step 1. 0, or -1 when the mark may not have reached the disk: nothing may be changed then.
+    int Mark();
+    // Step 3, after the records have reached the disk. The mark stays, and false is returned, when
+    // the stored sort type is not, or no longer, the one that the records are sorted by.
+    bool Lift(int iTotalNum, int iCapacity, int iSortedBy);
+
+private:
+    tag_ContactReg& m_reg;
+    int m_iSortType;
+    int m_iCapacity;
+};
+
+#endif

@@ -34,6 +34,14 @@ class InstallTest(InstalledTest):
                 source.write_text(f"#include <{header}>\n#include <{header}>\n", encoding="utf-8")
                 run(COMPILER, STANDARD, *WARNINGS, "-fsyntax-only", "-I", include, source)
 
+    def test_no_header_of_the_interface_is_left_out(self):
+        include = self.prefix / "include/QV_Localize"
+        exporting = [path.relative_to(SOURCE) for path in pathlib.Path(SOURCE).glob("[A-Z]*/*.h")
+                     if "QV_EXPORT " in path.read_text(encoding="utf-8")]
+        self.assertGreater(len(exporting), 30)
+        missing = [str(header) for header in exporting if not (include / header).is_file()]
+        self.assertEqual([], missing, "to be listed in cmake/QVInstall.cmake")
+
     def test_program_built_with_cmake(self):
         program = self.build_with_cmake("cpp", CONSUMER, [])
         self.check_program(program, self.sample("data_cmake"))

@@ -45,6 +45,17 @@ class EmbeddingTest(InstalledTest):
         self.check_output(run(sys.executable, "-B", program, self.sample("data_python"),
                               env={"PYTHONPATH": str(module.parent), "LC_ALL": "C.UTF-8"}))
 
+    def test_java_program(self):
+        jars = sorted(self.prefix.glob("share/java/qvlocalize.jar"))
+        if not jars:
+            self.skipTest("built without a JDK")
+        library, = self.installed("lib*/**/libqvlocalize_jni.so")
+        source = self.root / "Program.java"
+        source.write_text(program_of_the_docs("java"), encoding="utf-8")
+        run("javac", "-Xlint:all", "-Werror", "-d", self.root, "-cp", jars[0], source)
+        self.check_output(run("java", "-Xcheck:jni", f"-Djava.library.path={library.parent}", "-cp",
+                              f"{jars[0]}:{self.root}", "Program", self.sample("data_java")))
+
 
 if __name__ == "__main__":
     unittest.main(argv=sys.argv[:1], verbosity=2)

@@ -3,6 +3,8 @@
 #   scripts/setup.sh          compiler, build tools and libraries
 #   scripts/setup.sh --lint   also the formatter, the static checker and Doxygen
 #   scripts/setup.sh --armhf  also the cross compiler and the emulator for 32-bit ARM
+#   scripts/setup.sh --peers  also what some tests meet beside the library and are skipped without:
+#                             a JDK, a library with names of ours
 # Touches neither apt nor the network when nothing is missing.
 set -euo pipefail
 
@@ -16,6 +18,9 @@ if [ "${1:-}" = --lint ]; then
 fi
 if [ "${1:-}" = --armhf ]; then
     packages+=(g++-arm-linux-gnueabihf qemu-user googletest)
+fi
+if [ "${1:-}" = --peers ]; then
+    packages+=(openjdk-17-jdk-headless libwinpr2-2)
 fi
 
 is_installed() {

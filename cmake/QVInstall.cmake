@@ -1,5 +1,5 @@
 # What `cmake --install` puts where: the library, the headers of its interface, what other builds
-# find it by, the tool with its manual page, and the pinyin table.
+# find it by, the tool with its manual page and completions, and the pinyin table.
 include(CMakePackageConfigHelpers)
 
 # The interface. Headers that are not listed here serve the library's own sources alone.
@@ -80,4 +80,8 @@ install(FILES LICENSE NOTICE DESTINATION ${CMAKE_INSTALL_DOCDIR})
 if(QV_BUILD_TOOL)
   install(TARGETS qvlocalize RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
   install(FILES tools/qvlocalize.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1)
+  install(FILES tools/completion/qvlocalize.bash RENAME qvlocalize
+          DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions)
+  install(FILES tools/completion/_qvlocalize
+          DESTINATION ${CMAKE_INSTALL_DATADIR}/zsh/site-functions)
 endif()

@@ -4,13 +4,13 @@
 #include "MemManager/MemManger.h"
 #include "tools/DataDirectory.h"
 #include "tools/LibraryLog.h"
+#include "tools/OptionChecks.h"
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
 
 #include <functional>
 #include <iostream>
-#include <limits>
 #include <memory>
 #include <string>
 #include <vector>
@@ -80,14 +80,17 @@ void AddContactId(CLI::App& event, tag_NotifyOptions& options)
 {
     event.add_option("id", options.lId, "The contact")
         ->required()
-        ->check(CLI::Range(1, std::numeric_limits<int>::max()));
+        ->type_name("N")
+        ->check(WholeNumber(1, MAX_INT));
 }
 
 void AddEvents(CLI::App& notify, const OptionsPtr& pOptions)
 {
     AddEvent(notify, pOptions, "contacts", "Contacts appeared, changed or went", TellContacts)
         ->add_option("ids", pOptions->vIds,
-                     "The contacts; all of them without one. More than 200 rebuild the index");
+                     "The contacts; all of them without one. More than 200 rebuild the index")
+        ->type_name("N")
+        ->check(WholeNumber(1, MAX_INT));
     AddEvent(notify, pOptions, "status", "Contacts went online or offline",
              [](CLocalizerLogic& logic, tag_NotifyOptions& /*options*/)
              { logic.OnStatusUpdatesTableChanged(0, nullptr); });
@@ -95,7 +98,10 @@ void AddEvents(CLI::App& notify, const OptionsPtr& pOptions)
                                [](CLocalizerLogic& logic, tag_NotifyOptions& options)
                                { logic.OnContactTimeChanged(options.lId, options.llTime); });
     AddContactId(*pTime, *pOptions);
-    pTime->add_option("ms", pOptions->llTime, "When, in milliseconds since 1970")->required();
+    pTime->add_option("ms", pOptions->llTime, "When, in milliseconds since 1970")
+        ->required()
+        ->type_name("N")
+        ->check(WholeNumber(0, MAX_TIME_MS));
     CLI::App* pStar =
         AddEvent(notify, pOptions, "star", "A contact became a favourite",
                  [](CLocalizerLogic& logic, tag_NotifyOptions& options)

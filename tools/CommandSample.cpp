@@ -3,6 +3,7 @@
 #include "Common/DataPaths.h"
 #include "tools/DataDirectory.h"
 #include "tools/LocalizerKeys.h"
+#include "tools/OptionChecks.h"
 #include "tools/PrintableText.h"
 #include "tools/SampleContacts.h"
 #include "tools/SampleDatabase.h"
@@ -25,14 +26,15 @@ constexpr int DEFAULT_CONTACTS = 600;
 constexpr int MAX_CONTACTS = 200000;
 constexpr int64_t DEFAULT_NOW_MS = 1735689600000; // the first day of 2025, UTC
 
-// The table that was installed with the program, else the one of its build.
+// The table that was installed with the program, else the one of its build, by their places beside
+// the program: an installed program knows nothing of the machine that it was built on.
 std::string DefaultPinyinTable()
 {
     std::error_code error;
-    const fs::path program = fs::read_symlink("/proc/self/exe", error);
-    const fs::path installed =
-        (program.parent_path() / QV_TOOL_INSTALLED_PYFILE).lexically_normal();
-    return fs::is_regular_file(installed, error) ? installed.string() : QV_TOOL_PYFILE;
+    const fs::path directory = fs::read_symlink("/proc/self/exe", error).parent_path();
+    const fs::path installed = (directory / QV_TOOL_INSTALLED_PYFILE).lexically_normal();
+    const fs::path built = (directory / QV_TOOL_BUILT_PYFILE).lexically_normal();
+    return fs::is_regular_file(built, error) ? built.string() : installed.string();
 }
 
 struct tag_SampleOptions
@@ -57,13 +59,9 @@ void RefuseToReplace()
 
 void InstallPinyinTable(const std::string& strSource)
 {
-    std::error_code error;
-    if (!fs::is_regular_file(strSource, error))
-    {
-        throw CToolError(TOOL_EXIT_MISSING, "there is no pinyin table " + strSource,
-                         "Build the target qv_pyfile, or name the file with --pyfile.");
-    }
+    RequirePinyinTable(strSource, "Name the file with --pyfile, or build the target qv_pyfile.");
     const char* szTarget = CDataPaths::PinyinSource();
+    std::error_code error;
     if (fs::equivalent(strSource, szTarget, error))
     {
         return;
@@ -122,13 +120,17 @@ void AddSampleCommand(CLI::App& app)
     pCommand->add_option("--pyfile", pOptions->strPinyinTable, "Pinyin table to install")
         ->type_name("FILE")
         ->capture_default_str();
-    pCommand->add_option("--count", pOptions->iCount, "Number of contacts")
-        ->check(CLI::Range(1, MAX_CONTACTS))
+    pCommand
+        ->add_option("--count", pOptions->iCount,
+                     "Number of contacts, 1 to " + std::to_string(MAX_CONTACTS))
+        ->type_name("N")
+        ->check(WholeNumber(1, MAX_CONTACTS))
         ->capture_default_str();
     pCommand
         ->add_option("--now", pOptions->llNow,
                      "Time in milliseconds since 1970 that the last contacts go back from")
         ->type_name("MS")
+        ->check(WholeNumber(0, MAX_TIME_MS))
         ->capture_default_str();
     pCommand->add_flag("--force", pOptions->bForce, "Replace a database that is there");
     pCommand->callback([pOptions] { RunSample(*pOptions); });

@@ -4,6 +4,7 @@
 #include "tools/ContactNames.h"
 #include "tools/DataDirectory.h"
 #include "tools/FilterOptions.h"
+#include "tools/OptionChecks.h"
 #include "tools/SearchReport.h"
 #include "tools/SearchSession.h"
 #include "tools/ToolError.h"
@@ -13,9 +14,12 @@
 
 #include <unistd.h>
 
+#include <algorithm>
+#include <cstdlib>
 #include <iostream>
 #include <map>
 #include <memory>
+#include <optional>
 
 namespace
 {
@@ -23,11 +27,13 @@ namespace
 constexpr int DEFAULT_LIMIT = 5;
 
 constexpr const char* JSON_HELP =
-    "JSON: {type, input, narrowing, filters: [{filter, id}], steps: [{typed, total, matches,\n"
+    "JSON: {version, type, input, narrowing, filters: [{filter, id}], steps: [{typed, total, "
+    "matches,\n"
     "  mask, next_keys, candidates, sections}]}; a match has contact_id, name, marked, "
     "name_order,\n"
     "  last_time_contacted, first_matched and last_matched (indices of characters). For an empty\n"
-    "  text it has index_character instead of these two; only then there are sections.";
+    "  text it has index_character instead of these two; only then there are sections. version is "
+    "1.";
 
 struct tag_SearchOptions
 {
@@ -35,10 +41,15 @@ struct tag_SearchOptions
     CFilterOptions filters;
     std::string strText;
     std::string strType = "word";
-    int iLimit = DEFAULT_LIMIT;
+    std::string strColor = "auto";
+    std::optional<int> iLimit;
     bool bWhole = false;
     bool bOnce = false;
     bool bJson = false;
+    bool bPlain = false;
+
+    // Other programs read the plain form, which holds all matches unless told otherwise.
+    int Limit() const { return iLimit.value_or(bPlain ? 0 : DEFAULT_LIMIT); }
 };
 
 const std::map<std::string, IME_SEARCH_TYPE>& SearchTypes()
@@ -92,9 +103,62 @@ std::vector<tag_SearchStep> TypeKeyByKey(const tag_SearchOptions& options, IME_S
     std::vector<tag_SearchStep> vSteps;
     for (size_t n = FirstLength(options, wstrText); n <= wstrText.size(); ++n)
     {
-        vSteps.push_back(session.Search(wstrText.substr(0, n), options.iLimit));
+        vSteps.push_back(session.Search(wstrText.substr(0, n), options.Limit()));
     }
     return vSteps;
+}
+
+bool IsDigit(wchar_t unit)
+{
+    return unit >= L'0' && unit <= L'9';
+}
+
+// For a text that looks as if it was meant for the other kind of search.
+void PrintHint(IME_SEARCH_TYPE eType, const std::wstring& wstrText)
+{
+    if (eType != IME_SEARCH_NUM && std::any_of(wstrText.begin(), wstrText.end(), IsDigit))
+    {
+        std::cerr << "Hint: a digit stands for itself here; for the keys of a keypad add "
+                     "--type num.\n";
+    }
+    if (eType == IME_SEARCH_NUM && !std::all_of(wstrText.begin(), wstrText.end(), IsDigit))
+    {
+        std::cerr << "Hint: a keypad search finds digits only; for letters and characters leave "
+                     "--type num out.\n";
+    }
+}
+
+std::string Variable(const char* szName)
+{
+    const char* szValue = std::getenv(szName);
+    return szValue == nullptr ? "" : szValue;
+}
+
+bool UsesColor(const std::string& strColor)
+{
+    if (strColor != "auto")
+    {
+        return strColor == "always";
+    }
+    const std::string strTerminal = Variable("TERM");
+    return isatty(STDOUT_FILENO) != 0 && Variable("NO_COLOR").empty() && !strTerminal.empty() &&
+           strTerminal != "dumb";
+}
+
+void Print(const tag_SearchOptions& options, const tag_SearchReport& report)
+{
+    if (options.bJson)
+    {
+        PrintSearchJson(std::cout, report);
+    }
+    else if (options.bPlain)
+    {
+        PrintSearchPlain(std::cout, report);
+    }
+    else
+    {
+        PrintSearchText(std::cout, report, UsesColor(options.strColor));
+    }
 }
 
 void RunSearch(const tag_SearchOptions& options)
@@ -110,12 +174,27 @@ void RunSearch(const tag_SearchOptions& options)
     report.bNarrow = !options.bWhole;
     report.vFilters = options.filters.Chosen();
     report.vSteps = TypeKeyByKey(options, eType, wstrText);
-    if (options.bJson)
+    if (!options.bJson)
     {
-        PrintSearchJson(std::cout, report);
-        return;
+        PrintHint(eType, wstrText);
     }
-    PrintSearchText(std::cout, report, isatty(STDOUT_FILENO) != 0);
+    Print(options, report);
+}
+
+void AddFormOptions(CLI::App& command, tag_SearchOptions& options)
+{
+    CLI::Option* pJson =
+        command.add_flag("--json", options.bJson, "Print one JSON document for programs");
+    command
+        .add_flag("--plain", options.bPlain,
+                  "Print the matches of the whole text for pipes: id, tab, name")
+        ->excludes(pJson);
+    command
+        .add_option("--color", options.strColor,
+                    "Show what matched in colour instead of brackets; auto: on a terminal, "
+                    "unless NO_COLOR is set")
+        ->check(CLI::IsMember({"auto", "always", "never"}))
+        ->capture_default_str();
 }
 
 void AddSearchOptions(CLI::App& command, tag_SearchOptions& options)
@@ -134,10 +213,13 @@ void AddSearchOptions(CLI::App& command, tag_SearchOptions& options)
     command.add_flag("--whole", options.bWhole,
                      "Search the whole index after each key instead of the matches before it");
     command.add_flag("--once", options.bOnce, "Search once for the whole text, not key by key");
-    command.add_option("--limit", options.iLimit, "Matches to show after each key, 0 for all")
-        ->check(CLI::NonNegativeNumber)
-        ->capture_default_str();
-    command.add_flag("--json", options.bJson, "Print one JSON document for programs");
+    command
+        .add_option("--limit", options.iLimit,
+                    "Matches to show after each key, 0 for all (default: " +
+                        std::to_string(DEFAULT_LIMIT) + ", all with --plain)")
+        ->type_name("N")
+        ->check(WholeNumber(0, MAX_INT));
+    AddFormOptions(command, options);
 }
 
 } // namespace

@@ -4,6 +4,7 @@
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "MemManager/MemManger.h"
 #include "tools/DataDirectory.h"
+#include "tools/OptionChecks.h"
 #include "tools/RecordText.h"
 #include "tools/ToolError.h"
 
@@ -162,7 +163,8 @@ void AddShowCommand(CLI::App& app)
     CLI::App* pCommand = app.add_subcommand("show", "Show what the index files hold");
     pOptions->directory.AddOption(*pCommand);
     pCommand->add_option("--limit", pOptions->iLimit, "Records to show, 0 for all")
-        ->check(CLI::NonNegativeNumber)
+        ->type_name("N")
+        ->check(WholeNumber(0, MAX_INT))
         ->capture_default_str();
     pCommand
         ->add_option("--sort-type", pOptions->strOrder,

@@ -1,6 +1,7 @@
 #include "tools/DataDirectory.h"
 
 #include "Common/DataPaths.h"
+#include "Core/LocalizerCodes.h"
 #include "Core/LocalizerLogic.h"
 #include "tools/PrintableText.h"
 #include "tools/ToolError.h"
@@ -137,13 +138,9 @@ void CDataDirectory::RequireDatabase() const
 
 void CDataDirectory::RequirePinyinSource() const
 {
-    if (!IsFile(CDataPaths::PinyinSource()))
-    {
-        throw CToolError(TOOL_EXIT_MISSING,
-                         std::string("there is no pinyin table ") + CDataPaths::PinyinSource(),
-                         "Copy pyfile.bin there, or make sample contacts, which installs it: " +
-                             CommandLine("sample"));
-    }
+    RequirePinyinTable(CDataPaths::PinyinSource(),
+                       "Copy pyfile.bin there, or make sample contacts, which installs it: " +
+                           CommandLine("sample"));
 }
 
 void CDataDirectory::RequireIndex() const
@@ -154,6 +151,23 @@ void CDataDirectory::RequireIndex() const
                          "the index is not built in " +
                              fs::path(CDataPaths::ContactReg()).parent_path().string(),
                          "Build it first: " + CommandLine("index"));
+    }
+}
+
+void RequirePinyinTable(const std::string& strPath, const std::string& strAdvice)
+{
+    if (!IsFile(strPath.c_str()))
+    {
+        throw CToolError(TOOL_EXIT_MISSING, "there is no pinyin table " + strPath, strAdvice);
+    }
+    std::error_code error;
+    const uintmax_t uSize = fs::file_size(strPath, error);
+    if (error || uSize != PY_FILE_SIZE)
+    {
+        throw CToolError(TOOL_EXIT_FAILED,
+                         strPath + " is not a pinyin table: it has " + std::to_string(uSize) +
+                             " bytes, a pinyin table has " + std::to_string(PY_FILE_SIZE),
+                         strAdvice);
     }
 }
 

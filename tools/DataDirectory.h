@@ -19,8 +19,8 @@ public:
     // Creates databases/ and files/ where they are missing.
     void Create() const;
 
-    // Each throws CToolError unless the thing is there; the advice names the subcommand that
-    // makes it.
+    // Each throws CToolError unless the thing is there, the pinyin table whole; the advice names
+    // the subcommand that makes it.
     void RequireDatabase() const;
     void RequirePinyinSource() const;
     void RequireIndex() const;
@@ -31,5 +31,9 @@ public:
 private:
     std::string m_strRoot;
 };
+
+// Throws CToolError with the advice unless strPath is a file of the pinyin table's size: the
+// library would take any file, and find no contact by a broken one.
+void RequirePinyinTable(const std::string& strPath, const std::string& strAdvice);
 
 #endif

@@ -2,9 +2,12 @@
 
 #include "Core/LocalizerLogic.h"
 #include "Filter/Filter.h"
+#include "tools/OptionChecks.h"
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
+
+#include <limits>
 
 namespace
 {
@@ -58,6 +61,7 @@ void CFilterOptions::AddOptions(CLI::App& command)
                 },
                 option.szHelp)
             ->type_name("ID")
+            ->check(WholeNumber(std::numeric_limits<int>::min(), MAX_INT))
             ->allow_extra_args(false)
             ->group(OPTION_GROUP);
     }

@@ -25,12 +25,26 @@ struct tag_FlagLetter
 {
     uint32_t uFlag;
     char chLetter;
+    const char* szMeaning;
 };
 
 constexpr tag_FlagLetter FLAG_LETTERS[] = {
-    {CONTACT_FLAG_SECRET, 's'},  {CONTACT_FLAG_MAIL, 'm'},    {CONTACT_FLAG_PHONE, 'p'},
-    {CONTACT_FLAG_STARRED, '*'}, {CONTACT_FLAG_ADDRESS, 'a'}, {CONTACT_FLAG_ONLINE, 'o'},
+    {CONTACT_FLAG_SECRET, 's', "secret"},   {CONTACT_FLAG_MAIL, 'm', "mail address"},
+    {CONTACT_FLAG_PHONE, 'p', "phone"},     {CONTACT_FLAG_STARRED, '*', "favourite"},
+    {CONTACT_FLAG_ADDRESS, 'a', "address"}, {CONTACT_FLAG_ONLINE, 'o', "online"},
 };
+
+std::string FlagsLegend()
+{
+    std::string strText;
+    for (const tag_FlagLetter& flag : FLAG_LETTERS)
+    {
+        strText += strText.empty() ? "" : ", ";
+        strText += flag.chLetter;
+        strText += std::string(" ") + flag.szMeaning;
+    }
+    return strText;
+}
 
 std::string FlagsText(uint32_t uFlags)
 {
@@ -94,6 +108,12 @@ std::string CodesText(const tag_ContactsStruct& record)
 
 void PrintRecordHeading(std::ostream& stream)
 {
+    stream << "  place     in name order, from 0\n"
+              "  flags     "
+           << FlagsLegend()
+           << "\n"
+              "  spelling  what the records are sorted by: each reading with its character\n"
+              "  codes     what searches look at, one for each character of the name\n";
     stream << std::right << std::setw(PLACE_WIDTH) << "place" << std::setw(ID_WIDTH) << "contact"
            << "  " << std::left << std::setw(FLAGS_WIDTH) << "flags" << std::setw(TIME_WIDTH)
            << "last contact" << std::setw(LIST_WIDTH) << "groups" << std::setw(LIST_WIDTH)

@@ -5,7 +5,7 @@
 
 #include <iosfwd>
 
-// A stored record as one line of a table, and the table's heading.
+// A stored record as one line of a table, and the table's heading with its legend.
 void PrintRecordHeading(std::ostream& stream);
 void PrintRecord(std::ostream& stream, const tag_ContactsStruct& record);
 

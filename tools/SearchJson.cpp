@@ -11,6 +11,8 @@ namespace
 using Json = nlohmann::ordered_json;
 
 constexpr int INDENT = 2;
+// Of the document's form; counts up when a member changes its meaning or goes.
+constexpr int FORM_VERSION = 1;
 
 Json FilterJson(const tag_ChosenFilter& filter)
 {
@@ -48,7 +50,7 @@ Json ContactJson(const tag_FoundContact& contact, const tag_SearchStep& step)
     return json;
 }
 
-Json StepJson(const tag_SearchStep& step)
+Json StepJson(const tag_SearchStep& step, const tag_SearchReport& report)
 {
     Json matches = Json::array();
     for (const tag_FoundContact& contact : step.vBest)
@@ -59,7 +61,7 @@ Json StepJson(const tag_SearchStep& step)
                  {"total", step.iTotal},
                  {"matches", std::move(matches)},
                  {"mask", step.uMask},
-                 {"next_keys", NextKeys(step.uMask)},
+                 {"next_keys", NextKeys(step.uMask, report.IsKeypad())},
                  {"candidates", step.vCandidates}};
     for (const tag_Section& section : step.vSections)
     {
@@ -72,18 +74,16 @@ Json StepJson(const tag_SearchStep& step)
 
 void PrintSearchJson(std::ostream& stream, const tag_SearchReport& report)
 {
-    Json json = {{"type", report.strType},
-                 {"input", report.strInput},
-                 {"narrowing", report.bNarrow},
-                 {"filters", Json::array()},
-                 {"steps", Json::array()}};
+    Json json = {{"version", FORM_VERSION},  {"type", report.strType},
+                 {"input", report.strInput}, {"narrowing", report.bNarrow},
+                 {"filters", Json::array()}, {"steps", Json::array()}};
     for (const tag_ChosenFilter& filter : report.vFilters)
     {
         json["filters"].push_back(FilterJson(filter));
     }
     for (const tag_SearchStep& step : report.vSteps)
     {
-        json["steps"].push_back(StepJson(step));
+        json["steps"].push_back(StepJson(step, report));
     }
     // A database may hold names that are no UTF-8, which JSON cannot carry.
     stream << json.dump(INDENT, ' ', false, Json::error_handler_t::replace) << '\n';

@@ -1,6 +1,6 @@
 #include "tools/SearchReport.h"
 
-#include "LocalizerImpl/QVLocalizerManager.h"
+#include "LocalizerImpl/QVNumLocalizerManager.h"
 #include "tools/PrintableText.h"
 #include "tools/Utf8Text.h"
 
@@ -40,14 +40,18 @@ std::string MarkedName(const tag_FoundContact& contact, const tag_SearchStep& st
     return strMarked;
 }
 
-std::vector<std::string> NextKeys(uint32_t uMask)
+std::vector<std::string> NextKeys(uint32_t uMask, bool bKeypad)
 {
+    CQVNumLocalizerManager keypad(1);
     std::vector<std::string> vKeys;
     for (uint32_t i = 0; i < LOC_ALPHA_COUNT; ++i)
     {
-        if ((uMask >> i & 1U) != 0)
+        const wchar_t letter = static_cast<wchar_t>(L'a' + static_cast<wchar_t>(i));
+        const std::string strKey = Utf8Text({bKeypad ? keypad.GetPYNum(letter) : letter});
+        // The letters of a key follow each other.
+        if ((uMask >> i & 1U) != 0 && (vKeys.empty() || vKeys.back() != strKey))
         {
-            vKeys.emplace_back(1, static_cast<char>('a' + i));
+            vKeys.push_back(strKey);
         }
     }
     if ((uMask & MASK_OTHER) != 0)

@@ -16,10 +16,15 @@ struct tag_SearchReport
     bool bNarrow = false;
     std::vector<tag_ChosenFilter> vFilters;
     std::vector<tag_SearchStep> vSteps;
+
+    bool IsKeypad() const { return strType == "num"; }
 };
 
-// For people. bBold also prints the matched characters in bold.
-void PrintSearchText(std::ostream& stream, const tag_SearchReport& report, bool bBold);
+// For people: the matched characters in colour, or in brackets.
+void PrintSearchText(std::ostream& stream, const tag_SearchReport& report, bool bColor);
+
+// For pipes: the last step's matches, a line each, of the contact's id, a tab and its name.
+void PrintSearchPlain(std::ostream& stream, const tag_SearchReport& report);
 
 // One JSON document for programs; `qvlocalize search --help` describes it.
 void PrintSearchJson(std::ostream& stream, const tag_SearchReport& report);
@@ -39,7 +44,7 @@ std::string MarkedName(const tag_FoundContact& contact, const tag_SearchStep& st
 // Index of the first and the last matched character.
 int FirstMatched(const tag_LocalizerDetail& detail);
 int LastMatched(const tag_LocalizerDetail& detail);
-// The keys of a mask: letters, and "#" for digits and other characters.
-std::vector<std::string> NextKeys(uint32_t uMask);
+// The keys of a mask: letters, or the digits of a keypad, and "#" for digits and other characters.
+std::vector<std::string> NextKeys(uint32_t uMask, bool bKeypad);
 
 #endif

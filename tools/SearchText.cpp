@@ -8,7 +8,7 @@ namespace
 {
 
 constexpr tag_Marking PLAIN_MARKING = {"[", "]", true};
-constexpr tag_Marking BOLD_MARKING = {"[\033[1m", "\033[0m]", true};
+constexpr tag_Marking COLOR_MARKING = {"\033[1;31m", "\033[0m", true};
 constexpr int NUMBER_WIDTH = 5;
 constexpr int ID_WIDTH = 6;
 
@@ -36,7 +36,7 @@ void PrintHeading(std::ostream& stream, const tag_SearchReport& report)
 }
 
 void PrintContact(std::ostream& stream, const tag_SearchStep& step, const tag_FoundContact& contact,
-                  int iRank, bool bBold)
+                  int iRank, bool bColor)
 {
     stream << std::setw(NUMBER_WIDTH) << iRank << ".  contact " << std::left << std::setw(ID_WIDTH)
            << contact.detail.iContactID << std::right << ' ';
@@ -49,15 +49,15 @@ void PrintContact(std::ostream& stream, const tag_SearchStep& step, const tag_Fo
         stream << "(no name)\n";
         return;
     }
-    stream << MarkedName(contact, step, bBold ? BOLD_MARKING : PLAIN_MARKING) << '\n';
+    stream << MarkedName(contact, step, bColor ? COLOR_MARKING : PLAIN_MARKING) << '\n';
 }
 
-void PrintContacts(std::ostream& stream, const tag_SearchStep& step, bool bBold)
+void PrintContacts(std::ostream& stream, const tag_SearchStep& step, bool bColor)
 {
     int iRank = 0;
     for (const tag_FoundContact& contact : step.vBest)
     {
-        PrintContact(stream, step, contact, ++iRank, bBold);
+        PrintContact(stream, step, contact, ++iRank, bColor);
     }
     if (step.iTotal > iRank)
     {
@@ -91,13 +91,21 @@ void PrintWords(std::ostream& stream, const char* szLabel, const std::vector<std
     stream << (vWords.empty() ? " none\n" : "\n");
 }
 
-void PrintStep(std::ostream& stream, const tag_SearchStep& step, bool bBold)
+// A digit search reports how the next character may begin, not how the last one may go on.
+void PrintNextKeys(std::ostream& stream, const tag_SearchStep& step, bool bKeypad)
+{
+    PrintWords(stream,
+               bKeypad ? "   keys that may begin the next character:" : "   keys that may follow:",
+               NextKeys(step.uMask, bKeypad));
+}
+
+void PrintStep(std::ostream& stream, const tag_SearchStep& step, bool bKeypad, bool bColor)
 {
     stream << "\n> " << PrintableText(step.strTyped) << "_   " << step.iTotal
            << (step.iTotal == 1 ? " match\n" : " matches\n");
-    PrintContacts(stream, step, bBold);
+    PrintContacts(stream, step, bColor);
     PrintSections(stream, step);
-    PrintWords(stream, "   keys that may follow:", NextKeys(step.uMask));
+    PrintNextKeys(stream, step, bKeypad);
     if (!step.vCandidates.empty())
     {
         PrintWords(stream, "   characters to pick: ", step.vCandidates);
@@ -106,11 +114,19 @@ void PrintStep(std::ostream& stream, const tag_SearchStep& step, bool bBold)
 
 } // namespace
 
-void PrintSearchText(std::ostream& stream, const tag_SearchReport& report, bool bBold)
+void PrintSearchText(std::ostream& stream, const tag_SearchReport& report, bool bColor)
 {
     PrintHeading(stream, report);
     for (const tag_SearchStep& step : report.vSteps)
     {
-        PrintStep(stream, step, bBold);
+        PrintStep(stream, step, report.IsKeypad(), bColor);
+    }
+}
+
+void PrintSearchPlain(std::ostream& stream, const tag_SearchReport& report)
+{
+    for (const tag_FoundContact& contact : report.vSteps.back().vBest)
+    {
+        stream << contact.detail.iContactID << '\t' << PrintableText(contact.strName) << '\n';
     }
 }

@@ -2,6 +2,7 @@
 #include "tools/LibraryLog.h"
 #include "tools/PrintableText.h"
 #include "tools/ToolError.h"
+#include "tools/UsageError.h"
 
 #include <CLI/CLI.hpp>
 
@@ -16,12 +17,6 @@ constexpr const char* EXIT_CODES = "Exit codes: 0 done (also a search without ma
                                    "1 the library or the system failed,\n"
                                    "2 wrong use of the command line, 3 no database, pinyin table "
                                    "or index there.";
-
-std::string UsageError(const CLI::App* /*pApp*/, const CLI::Error& error)
-{
-    return std::string("qvlocalize: ") + PrintableText(error.what()) +
-           "\nRun with --help for more information.\n";
-}
 
 void AddCommands(CLI::App& app)
 {

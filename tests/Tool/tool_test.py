@@ -5,6 +5,7 @@ tool_test.py TOOL PYFILE [TestClass...]
 import contextlib
 import fcntl
 import json
+import os
 import pathlib
 import re
 import shutil
@@ -14,7 +15,7 @@ import sys
 import tempfile
 import unittest
 
-TOOL, PYFILE = sys.argv[1:3]
+TOOL, PYFILE = map(os.path.abspath, sys.argv[1:3])
 DONE, FAILED, USAGE, MISSING = 0, 1, 2, 3
 PY_RECORD_SIZE = 46
 HANZI_BASE = 0x1000
@@ -129,6 +130,7 @@ class SearchTest(ToolTest):
         self.assertIn("g", last["next_keys"])
         self.assertNotIn("n", last["next_keys"])
         self.assertEqual(last["total"], len(last["matches"]))
+        self.assertEqual(1, document["version"])
         once = self.search("zhan", "--once")["steps"]
         self.assertEqual(["zhan"], [step["typed"] for step in once])
 
@@ -170,8 +172,61 @@ class SearchTest(ToolTest):
         self.assertIn(f"> zs_   {total} matches\n", output)
         self.assertRegex(output, r" 1\.  contact \d+ +\S*\[\S+\]\S*\n")
         self.assertIn(f"and {total - 1} more\n", output)
-        self.assertNotIn("\033", output)
         self.assertIn("> qqq_   0 matches\n", self.check("search", "qqq").stdout)
+
+    def test_plain_form_has_the_matches_of_the_whole_text(self):
+        for text, arguments in (("zs", []), ("zs", ["--limit", "2"]), ("", []), ("qqq", [])):
+            matches = self.last_step(text, "--once")["matches"]
+            if arguments:
+                del matches[2:]
+            self.assertEqual("".join(f"{match['contact_id']}\t{match['name']}\n"
+                                     for match in matches),
+                             self.check("search", text, "--plain", *arguments).stdout)
+
+    def test_keypad_search_names_keys(self):
+        keys = {letter: key for key, letters in
+                zip("23456789", "abc def ghi jkl mno pqrs tuv wxyz".split()) for letter in letters}
+        for text in ("", "94", "926454"):
+            step = self.last_step(text, "--type", "num", "--once")
+            letters = [chr(ord("a") + bit) for bit in range(26) if step["mask"] >> bit & 1]
+            other = ["#"] if step["mask"] >> 26 else []
+            self.assertEqual(sorted({keys[letter] for letter in letters}) + other,
+                             step["next_keys"])
+            self.assertIn("next character: " + (" ".join(step["next_keys"]) or "none") + "\n",
+                          self.check("search", text, "--type", "num", "--once").stdout)
+
+    def test_hints_at_the_other_kind_of_search(self):
+        for text, arguments, hint in (("94264", [], "add --type num"), ("t2", ["--plain"], "add"),
+                                      ("zs", ["--type", "num"], "leave --type num out"),
+                                      ("94264", ["--type", "num"], ""), ("t#", [], ""),
+                                      ("94264", ["--json"], "")):
+            error = self.check("search", text, *arguments).stderr
+            self.assertEqual(bool(hint), error.startswith("Hint: "), (text, arguments, error))
+            self.assertIn(hint, error)
+
+    def test_colours_on_a_terminal_or_when_told_so(self):
+        terminal = {"TERM": "xterm"}
+        for color, variables, pipe, expected in (
+                ("auto", terminal, False, True), ("auto", terminal, True, False),
+                ("auto", {"TERM": "dumb"}, False, False), ("auto", {}, False, False),
+                ("auto", {**terminal, "NO_COLOR": "1"}, False, False),
+                ("auto", {**terminal, "NO_COLOR": ""}, False, True),
+                ("always", {"NO_COLOR": "1"}, True, True), ("never", terminal, False, False)):
+            output = self.output_to(pipe, variables, "search", "hj", "--type", "special",
+                                    "--color", color)
+            self.assertIn("\033[1;31m火警\033[0m" if expected else "[火警]", output,
+                          (color, variables, pipe))
+            self.assertEqual(expected, "\033" in output)
+
+    def output_to(self, pipe, variables, *call):
+        """What a call prints into a pipe or on a terminal."""
+        reader, writer = os.pipe() if pipe else os.openpty()
+        with open(reader, "rb") as source:
+            with open(writer, "wb") as target:
+                subprocess.run([TOOL, *call, "--data-dir", str(self.data)], stdout=target,
+                               env={**os.environ, "TERM": "", "NO_COLOR": "", **variables},
+                               check=True)
+                return os.read(source.fileno(), 65536).decode()
 
 
 class ShowTest(ToolTest):
@@ -182,6 +237,10 @@ class ShowTest(ToolTest):
         self.assertRegex(output, r"iSortType +0 \(name order\)")
         self.assertRegex(output, rf"iMemSize +{visible + 1000} ")
         self.assertEqual(["0", "1", "2"], re.findall(r"(?m)^ +(\d+) +\d+  \S{6} ", output))
+        letters = set("".join(re.findall(r"(?m)^ +\d+ +\d+  (\S{6}) ",
+                                         self.check("show", "--limit", "0").stdout)))
+        legend = re.search(r"(?m)^ +flags +(.*)$", output).group(1)
+        self.assertEqual(letters - {"-"}, {entry[0] for entry in legend.split(", ")})
 
     def test_time_order_begins_with_the_latest(self):
         self.addCleanup(self.check, "index")
@@ -259,9 +318,13 @@ class NotifyTest(ToolTest):
         self.assertIn("builds it anew", process.stderr)
 
     def test_wrong_use(self):
-        for arguments in ([], ["nothing"], ["star"], ["star", "0"], ["time", "5"],
-                          ["contacts", "x"], ["status", "5"]):
-            self.check("notify", *arguments, code=USAGE)
+        for arguments, text in (([], "required"), (["nothing"], 'unknown subcommand "nothing"'),
+                                (["star"], "required"), (["star", "0"], "from 1 to 2147483647"),
+                                (["time", "5"], "required"), (["contacts", "1", "x"], '"x" is not'),
+                                (["time", "5", "-9"], "from 0 to 253402300799999"),
+                                (["status", "5"], "not expected: 5"),
+                                (["status", "--on"], "--on is not an option of notify")):
+            self.assertIn(text, self.check("notify", *arguments, code=USAGE).stderr)
         (self.data / "files/ContactsReg.bin").unlink()
         self.check("notify", "status", code=MISSING)
         (self.data / "databases/contacts2.db").unlink()
@@ -330,6 +393,49 @@ class EscapesTest(ToolTest):
                                                    check=True).stdout)
 
 
+class CompletionTest(unittest.TestCase):
+    """The completions of bash and zsh, run without a terminal."""
+
+    FILES = pathlib.Path(__file__).resolve().parents[2] / "tools/completion"
+    RUN = {
+        "bash": """. "$0"/qvlocalize.bash; COMP_WORDS=("$@"); COMP_CWORD=$(($# - 1))
+            _qvlocalize "$1" "${COMP_WORDS[COMP_CWORD]}" "${COMP_WORDS[COMP_CWORD - 1]}"
+            printf '%s\\n' "${COMPREPLY[@]}" """,
+        "zsh": """compset() {}; compadd() { print -rl -- ${(M)@[2,-1]:#$words[CURRENT]*} }
+            _files() { [[ $1 == -/ ]] && print -rl -- *(/) || print -rl -- * }
+            directory=$0; words=("$@"); CURRENT=$#; . $directory/_qvlocalize""",
+    }
+
+    def complete(self, shell, *words):
+        with tempfile.TemporaryDirectory(prefix="qvtool_") as place:
+            pathlib.Path(place, "a-file").touch()
+            pathlib.Path(place, "a-place").mkdir()
+            flags = ["-f"] if shell == "zsh" else ["--norc"]
+            process = subprocess.run([shell, *flags, "-c", self.RUN[shell], str(self.FILES), TOOL,
+                                      *words], cwd=place, capture_output=True, encoding="utf-8",
+                                     check=False)
+        self.assertEqual("", process.stderr)
+        return set(process.stdout.split())
+
+    def test_offers_what_the_help_tells(self):
+        cases = [
+            (["s"], {"sample", "search", "show"}),
+            (["notify", "s"], {"star", "status"}),
+            (["search", "zs", "--p"], {"--phone", "--plain", "--postal"}),
+            (["notify", "star", "--"], {"--data-dir", "--help", "--off"}),
+            (["search", "--color", "a"], {"auto", "always"}),
+            (["show", "--sort-type", ""], {"name", "time"}),
+            (["sample", "--pyfile", ""], {"a-file", "a-place"}),
+            (["sample", "--data-dir", ""], {"a-place"}),
+            (["show", "--limit", ""], set()),
+            (["search", ""], set()),
+        ]
+        for shell in ("bash", "zsh"):
+            if shutil.which(shell):
+                for words, expected in cases:
+                    self.assertEqual(expected, self.complete(shell, *words), (shell, words))
+
+
 class ErrorsTest(ToolTest):
     def fails(self, directory, code, text, command, *arguments):
         process = run(directory, command, *arguments)
@@ -351,14 +457,43 @@ class ErrorsTest(ToolTest):
         self.fails(unindexed, MISSING, "there is no pinyin table", "index")
         self.fails(empty, MISSING, "--pyfile", "sample", "--pyfile", str(self.root / "none"))
 
+    def test_refuses_a_pinyin_table_of_another_size(self):
+        data = self.root / "table"
+        shutil.copytree(self.data, data)
+        table = data / "files/pyfile.bin"
+        for content in (table.read_bytes()[:-1], table.read_bytes() + b"0", b""):
+            table.write_bytes(content)
+            text = f"it has {len(content)} bytes, a pinyin table has 709412"
+            before = [path.read_bytes() for path in sorted(data.rglob("*.bin"))]
+            self.fails(data, FAILED, text, "index")
+            self.fails(data, FAILED, text, "sample", "--force", "--pyfile", str(table))
+            self.assertEqual(before, [path.read_bytes() for path in sorted(data.rglob("*.bin"))])
+
     def test_refuses_what_cannot_be_searched(self):
         self.fails(self.data, USAGE, "11 characters; a search takes at most 10", "search",
                    "abcdefghijk")
         self.fails(self.data, USAGE, "beyond U+FFFF", "search", "\U0001F600")
-        self.fails(self.data, USAGE, "--type", "search", "a", "--type", "letters")
-        self.fails(self.data, USAGE, "--limit", "search", "a", "--limit", "-1")
         self.fails("x" * 4001, USAGE, "too long", "search", "a")
-        self.assertEqual(USAGE, subprocess.run([TOOL], capture_output=True, check=False).returncode)
+
+    def test_refuses_a_wrong_command_line_by_name(self):
+        for call, text in (
+                (["serch", "a"], 'unknown subcommand "serch"; there are sample, index, search'),
+                (["--data-dir", "x", "search", "a"], "--data-dir is not an option of qvlocalize;"),
+                (["search", "a", "--count", "1"], "--count is not an option of search"),
+                (["search", "a", "b"], "not expected: b"),
+                (["search", "a", "--type", "letters"], "--type: letters not in {word,num,special}"),
+                (["search", "a", "--limit", "-1"], '"-1" is not a whole number from 0 to 21'),
+                (["search", "a", "--group", "4294967297"], '--group: "4294967297" is not a whole'),
+                (["search", "a", "--plain", "--json"], "--json excludes --plain"),
+                (["sample", "--count", "200001"], "--count: \"200001\" is not a whole number from 1"
+                                                  " to 200000"),
+                (["sample", "--now", "1e3"], '"1e3" is not a whole number from 0 to'),
+                ([], "required")):
+            process = subprocess.run([TOOL, *call], capture_output=True, encoding="utf-8",
+                                     check=False)
+            self.assertEqual((USAGE, ""), (process.returncode, process.stdout), call)
+            self.assertRegex(process.stderr, r"\Aqvlocalize: .*\nRun with --help .*\n\Z")
+            self.assertIn(text, process.stderr)
 
     def test_a_database_of_something_else(self):
         other = self.root / "other"

@@ -3,12 +3,13 @@ alone, and the C++ program of docs/embedding.md built with CMake and with pkg-co
 
 install_test.py ARGUMENT..., as installed.py tells
 """
+import os
 import pathlib
 import re
 import sys
 import unittest
 
-from installed import COMPILER, SOURCE, WARNINGS, InstalledTest, run, run_built
+from installed import BUILD, COMPILER, SOURCE, WARNINGS, InstalledTest, run, run_built
 
 STANDARD = "-std=c++17"
 CONSUMER = """\
@@ -61,6 +62,18 @@ class InstallTest(InstalledTest):
             self.assertRegex(manual, rf"(?m)^\.SS {command}\b")
             for option in re.findall(r"--[a-z-]+", run_built(tool, command, "--help")):
                 self.assertRegex(manual, rf"{option}(?![a-z-])", f"{command} {option}")
+
+    def test_completions_come_along(self):
+        for name in ("bash-completion/completions/qvlocalize", "zsh/site-functions/_qvlocalize"):
+            completion, = self.installed(f"share/{name}")
+            self.assertIn("_qvlocalize()", completion.read_text(encoding="utf-8"))
+
+    def test_no_installed_file_tells_where_it_was_built(self):
+        places = [os.path.realpath(place).encode() for place in (BUILD, SOURCE)]
+        for path in self.installed("**/*"):
+            if path.is_file():
+                content = path.read_bytes()
+                self.assertFalse([place for place in places if place in content], path)
 
     def test_licence_and_notices_come_along(self):
         for name in ("LICENSE", "NOTICE"):

@@ -1,0 +1,15 @@
+#ifndef QV_TOOLS_USAGEERROR_H
+#define QV_TOOLS_USAGEERROR_H
+
+#include <string>
+
+namespace CLI
+{
+class App;
+class Error;
+} // namespace CLI
+
+// What to print when the command line cannot be taken, for CLI::App::failure_message.
+std::string UsageError(const CLI::App* pApp, const CLI::Error& error);
+
+#endif

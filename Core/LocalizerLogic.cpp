@@ -44,6 +44,10 @@ int FileSize(const char* szPath)
 // would wait.
 bool IsStoreWhole()
 {
+    if (CStoreRegister::IsChangeLost())
+    {
+        return false;
+    }
     tag_ContactReg reg = {};
     if (CStoreRegister::Inspect(&reg) == STORE_WHOLE)
     {

@@ -39,11 +39,12 @@ public:
     CLocalizerLogic(const CLocalizerLogic&) = delete;
     CLocalizerLogic& operator=(const CLocalizerLogic&) = delete;
 
-    // Builds the whole index from the provider's database, unless bForce is false and an index is
-    // there. The database is read without the store lock; the lock is held while the files are
-    // written, after at most five attempts 200 ms apart. The stored sort type is kept. The online
-    // state may fail to be read: that is logged and ignored. LOC_ERR_MAP without a pinyin table.
-    // After a failure the old index stays.
+    // Builds the whole index from the provider's database, unless bForce is false and a whole index
+    // is there: one that is marked, damaged or unreadable is built anew. The database is read
+    // without the store lock; the lock is held while the files are written, after at most five
+    // attempts 200 ms apart. The stored sort type is kept. The online state may fail to be read:
+    // that is logged and ignored. LOC_ERR_MAP without a pinyin table. After a failure the old index
+    // stays.
     int MemInit(bool bForce);
 
     // One search, within pLastResult (read only, stays the caller's) or, when it is null, within
@@ -53,7 +54,7 @@ public:
     //              their codes, in place, also in a search that fails afterwards
     //   ppResult   gets a set of its own, released with FreeSearchResult: the matches, best
     //              first; null when only its memory could not be had; untouched after any earlier
-    //              failure
+    //              failure. When it is null, pMask and szWordOut are written and the result is -1
     //   pMask      gets the keys that can follow: bits 0..25 letters, 0x4000000 anything else
     //   szWordOut  at least 20 wide characters, zeroed: gets the Chinese characters that the last
     //              letters may stand for, without terminator
@@ -82,12 +83,15 @@ public:
     int GetSortType();
 
     // Change notifications of the provider, after its change is in the database. They wait for
-    // the store lock without limit (one error line per refused attempt), except for a rebuild,
-    // which gives up like MemInit. The changes of the database, their notifications, SetSortType
-    // and MemInit are the business of one process at a time; any process may search meanwhile.
+    // the store lock without limit while somebody holds it (one error line per refused attempt),
+    // except for a rebuild, which gives up like MemInit; a lock file that cannot be opened is
+    // given up after five attempts. A store that is missing is not created, only built. The changes
+    // of the database, their notifications, SetSortType and MemInit are the business of one process
+    // at a time; any process may search meanwhile.
     //
     // A change that fails leaves the store marked (capacity 0), and the next notification of
-    // contacts or status then rebuilds it. So it does with a store that a killed process left
+    // contacts or status then rebuilds it; where the mark cannot be written, this process
+    // remembers to. So it does with a store that a killed process left
     // unfinished and with a damaged one; the notifications of times and stars repair nothing.
 
     // Rebuilds the store from the database in the stored order. The pinyin table stays as it is.

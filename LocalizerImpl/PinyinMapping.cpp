@@ -92,6 +92,11 @@ int CQVLocalizerManager::InitMapFile()
         return LOC_ERR_MAP;
     }
     std::memcpy(mapping.As<char>(), buffer.get(), PY_FILE_SIZE);
+    // On the disk before a registration record says that there is an index.
+    if (!mapping.Flush())
+    {
+        return LOC_ERR_MAP;
+    }
     // Writing through a mapping shows in the file's times at the first byte of a page only;
     // searches that keep what they read go by these times.
     static_cast<void>(utimes(CDataPaths::PinyinMapping(), nullptr));

@@ -1,6 +1,7 @@
 // The change handlers on real files. What a notification has to leave is mostly told by a second
 // build from the same database.
 
+#include "MemManager/MemManger.h"
 #include "Platform/LogSink.h"
 #include "tests/Core/FacadeFixture.h"
 #include "tests/Support/ChildProcess.h"
@@ -360,6 +361,52 @@ TEST_F(CContactChangesTest, WaitForTheLock)
         ExpectLockFree();
     }
     ExpectFresh();
+}
+
+// Another caller sets the sort type while a change is under way: at the line that tells of the
+// step before the last. A build sorts anew; a patch leaves the mark.
+TEST_F(CContactChangesTest, NoticesASortTypeThatIsSetMeanwhile)
+{
+    struct tag_Setter
+    {
+        const char* szLine;
+        int iSortType;
+    };
+    const struct
+    {
+        const char* szLine;
+        std::function<void()> fnCall;
+        bool bMarked;
+    } cases[] = {
+        {"IFL_PtrQuickSort", [this] { m_logic.MemInit(true); }, false},
+        {"stRecord.num", [this] { m_logic.OnContactsTableChanged(); }, false},
+        {"find matchedNum", [this] { Notify({3}); }, true},
+    };
+    for (const int iSortType : {STORE_ORDER_NAME, STORE_ORDER_TIME})
+    {
+        for (const auto& row : cases)
+        {
+            BuildStore(iSortType);
+            m_provider.Put(Contact(3, "Zoe"));
+            tag_Setter setter = {row.szLine, 1 - iSortType};
+            CLogSink::Set(
+                [](void* pContext, int /*iPriority*/, const char* /*szTag*/, const char* szText)
+                {
+                    const auto* pSetter = static_cast<const tag_Setter*>(pContext);
+                    if (std::strstr(szText, pSetter->szLine) != nullptr)
+                    {
+                        CMemManger().SetSortType(pSetter->iSortType);
+                    }
+                },
+                &setter);
+            row.fnCall();
+            CLogSink::Set(nullptr, nullptr);
+            EXPECT_EQ(ReadStore().reg.iSortType, setter.iSortType) << row.szLine;
+            EXPECT_EQ(ReadStore().reg.iMemSize == 0, row.bMarked) << row.szLine;
+            Notify({3});
+            ExpectFresh();
+        }
+    }
 }
 
 } // namespace

@@ -32,15 +32,9 @@ const std::pair WHOLE = {1, 1};
 TEST(Matchers, FitTheBeginningOfAnyReading)
 {
     const tag_Fit ROWS[] = {
-        {true, CHANG_ZHANG, L"9", BEGINS},      {true, CHANG_ZHANG, L"94264", WHOLE},
-        {true, CHANG_ZHANG, L"942641", NONE},   {true, CHANG_ZHANG, L"92", NONE},
-        {true, CHANG_ZHANG, L"\x139", NONE},    {true, CHANG_ZHANG, {CODE}, NONE},
-        {true, NO_READING, L"", NONE},          {false, CHANG_ZHANG, L"zh", BEGINS},
-        {false, CHANG_ZHANG, L"", BEGINS},      {false, CHANG_ZHANG, L"zhang", WHOLE},
-        {false, CHANG_ZHANG, L"zhangx", NONE},  {false, CHANG_ZHANG, L"Z", NONE},
-        {false, CHANG_ZHANG, L"\x17A", NONE},   {false, CHANG_ZHANG, {CODE}, WHOLE},
-        {false, CHANG_ZHANG, {CODE, 1}, NONE},  {false, NO_READING, {CODE}, WHOLE},
-        {false, CHANG_ZHANG, {CODE + 1}, NONE}, {false, NO_READING, L"a", NONE}};
+        {true, CHANG_ZHANG, L"94264", WHOLE}, {true, CHANG_ZHANG, L"92", NONE},
+        {true, NO_READING, L"", NONE},        {false, CHANG_ZHANG, L"zh", BEGINS},
+        {false, NO_READING, {CODE}, WHOLE},   {false, CHANG_ZHANG, {CODE, 1}, NONE}};
     CQVNumLocalizerManager digits(1);
     CQVWordLocalizerManager letters(1);
     for (const tag_Fit& row : ROWS)

@@ -23,6 +23,18 @@ namespace
     _exit(bFailed ? 1 : 0);
 }
 
+std::string TextOf(const std::function<std::string()>& fnBody)
+{
+    try
+    {
+        return fnBody();
+    }
+    catch (const std::exception& error)
+    {
+        return std::string("threw ") + error.what();
+    }
+}
+
 int WaitFor(pid_t iPid)
 {
     int iStatus = 0;
@@ -59,6 +71,53 @@ int StatusOfChild(const std::function<void()>& fnBody)
         RunAndLeave(fnBody);
     }
     return WaitFor(iPid);
+}
+
+CChild::CChild(const std::function<std::string()>& fnBody, unsigned int uSeconds)
+{
+    int piPipe[2];
+    if (pipe(piPipe) != 0)
+    {
+        throw std::runtime_error("no pipe");
+    }
+    m_iPid = fork();
+    if (m_iPid == 0)
+    {
+        alarm(uSeconds);
+        const std::string strText = TextOf(fnBody);
+        (void)!write(piPipe[1], strText.data(), strText.size());
+        _exit(0);
+    }
+    close(piPipe[1]);
+    m_iPipe = piPipe[0];
+}
+
+CChild::~CChild()
+{
+    close(m_iPipe);
+    if (m_iPid > 0)
+    {
+        kill(m_iPid, SIGKILL);
+        waitpid(m_iPid, nullptr, 0);
+    }
+}
+
+std::string CChild::Text()
+{
+    std::string strText;
+    char szBuffer[256];
+    for (ssize_t iRead = 1; iRead > 0;)
+    {
+        iRead = read(m_iPipe, szBuffer, sizeof(szBuffer));
+        strText.append(szBuffer, static_cast<size_t>(iRead > 0 ? iRead : 0));
+    }
+    const int iStatus = WaitFor(m_iPid);
+    m_iPid = -1;
+    if (WIFSIGNALED(iStatus))
+    {
+        return "ended by signal " + std::to_string(WTERMSIG(iStatus));
+    }
+    return iStatus == 0 ? strText : "ended with status " + std::to_string(WEXITSTATUS(iStatus));
 }
 
 CLockHolder::CLockHolder()

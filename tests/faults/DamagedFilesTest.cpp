@@ -1,0 +1,120 @@
+// Stores, pinyin tables and registration records damaged at random under every call: each comes
+// back with a result code, nothing is read or written out of bounds, and a build puts all in order.
+
+#include "Common/DataPaths.h"
+#include "tests/Support/StoreFiles.h"
+#include "tests/faults/Options.h"
+#include "tests/faults/Readings.h"
+#include "tests/faults/StoreCase.h"
+
+#include <algorithm>
+#include <filesystem>
+#include <gtest/gtest.h>
+#include <random>
+#include <set>
+#include <unistd.h>
+
+namespace
+{
+
+constexpr int ROUNDS = 2000;
+constexpr int CALLS = 3;           // of a round
+constexpr unsigned int HANGS = 60; // seconds
+
+class CDamage
+{
+public:
+    explicit CDamage(unsigned int uSeed) : m_random(uSeed) {}
+
+    size_t Pick(size_t uNum) { return m_random() % uNum; }
+
+    // What the file becomes.
+    std::string Of(std::string strFile)
+    {
+        const size_t uSize = strFile.size();
+        // Most damage hits what is in use, at the start.
+        const size_t uAt = Pick(Pick(2) == 0 ? uSize : std::min<size_t>(uSize, 5000));
+        const size_t uLength = std::min<size_t>(1 + Pick(Pick(2) == 0 ? 8 : 3000), uSize - uAt);
+        switch (Pick(6))
+        {
+        case 0:
+            strFile.resize(uAt);
+            break;
+        case 1:
+            strFile.erase(uAt, uLength);
+            break;
+        case 2:
+            strFile.insert(uAt, uLength, static_cast<char>(m_random()));
+            break;
+        case 3:
+            strFile.replace(uAt, uLength, uLength, "\x00\x7f\xff\x80"[Pick(4)]);
+            break;
+        default:
+            std::generate_n(strFile.begin() + static_cast<long>(uAt), uLength,
+                            [this] { return static_cast<char>(m_random()); });
+            break;
+        }
+        return strFile;
+    }
+
+    tag_ContactReg AnyReg()
+    {
+        constexpr int32_t COUNTS[] = {0,       1,         4,    5,    6,        999,
+                                      1000,    1001,      1005, 1006, 3050402,  3050403,
+                                      6101805, INT32_MAX, -1,   -5,   INT32_MIN};
+        const auto Any = [&] { return COUNTS[Pick(std::size(COUNTS))]; };
+        return {Any(), Any(), Any()};
+    }
+
+private:
+    std::mt19937 m_random;
+};
+
+TEST(Faults, DamagedFilesHarmNobody)
+{
+    const CStoreCase store(AllChanges()[1], STORE_ORDER_NAME);
+    const char* const PATHS[] = {CDataPaths::ContactReg(), CDataPaths::ContactRecords(),
+                                 CDataPaths::PinyinMapping(), CDataPaths::PinyinSource()};
+    store.Restore();
+    std::vector<std::string> vWhole;
+    std::transform(std::begin(PATHS), std::end(PATHS), std::back_inserter(vWhole),
+                   &CDataDirectory::ReadBytes);
+    CDamage damage(g_options.uSeed);
+    CLocalizerLogic logic;
+    for (int iRound = 0; iRound < ROUNDS; ++iRound)
+    {
+        SCOPED_TRACE(iRound);
+        alarm(HANGS);
+        const size_t uFile = damage.Pick(8) == 0 ? 2 + damage.Pick(2) : damage.Pick(2);
+        CDataDirectory::WriteBytes(PATHS[uFile], damage.Of(vWhole[uFile]));
+        if (damage.Pick(4) == 0)
+        {
+            SetReg(damage.AnyReg());
+        }
+        for (int i = 0; i < CALLS; ++i)
+        {
+            const tag_Reading& reading = AllReadings()[damage.Pick(AllReadings().size())];
+            tag_Answer answer;
+            reading.pfnRead(logic, answer);
+            EXPECT_TRUE(IsResult(answer.iRet)) << reading.szName << answer.iRet;
+            EXPECT_TRUE(answer.iRet == 0 || answer.pResult == nullptr);
+            TextOf(logic, answer);
+            const tag_Change& change = AllChanges()[damage.Pick(AllChanges().size())];
+            const int iRet = change.fnTell(logic);
+            EXPECT_TRUE(IsResult(iRet)) << change.szName << iRet;
+        }
+        if (uFile > 1)
+        {
+            CDataDirectory::WriteBytes(PATHS[2], vWhole[2]);
+            CDataDirectory::WriteBytes(PATHS[3], vWhole[3]);
+        }
+        logic.SetSortType(STORE_ORDER_NAME);
+        ASSERT_EQ(logic.MemInit(true), 0);
+        std::filesystem::resize_file(PATHS[0], sizeof(tag_ContactReg)); // it may be longer
+        ASSERT_EQ(store.RepairFault(), "");
+        store.Restore();
+    }
+    alarm(0);
+}
+
+} // namespace

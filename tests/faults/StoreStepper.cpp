@@ -1,0 +1,168 @@
+#include "tests/faults/StoreStepper.h"
+
+#include "Common/DataPaths.h"
+#include "tests/Support/DataDirectory.h"
+
+#include <algorithm>
+#include <csignal>
+#include <cstring>
+#include <fcntl.h>
+#include <sys/file.h>
+#include <sys/mman.h>
+#include <ucontext.h>
+#include <unistd.h>
+
+namespace
+{
+
+constexpr size_t PAGE = 4096;
+constexpr size_t WINDOW = 2 * PAGE; // a store may cross a page's end
+constexpr char REG_FILE[] = "ContactsReg.bin";
+constexpr char RECORDS_FILE[] = "ContactsLocalizer.bin";
+
+struct tag_Region
+{
+    char* pAddr;
+    size_t uSize; // whole pages; 0 while nothing is mapped
+};
+
+tag_Region g_aRegions[2]; // of the records and of the registration record
+tag_Steps* g_pSteps;
+tag_Region g_window; // that is writable for one instruction
+bool g_bWindowOfReg;
+char g_acBefore[WINDOW];
+
+#if defined(__x86_64__) && !defined(__SANITIZE_ADDRESS__)
+constexpr bool CAN_STEP = true;
+constexpr greg_t TRAP_FLAG = 0x100;
+
+void SetTrap(void* pContext, bool bOn)
+{
+    greg_t& flags = static_cast<ucontext_t*>(pContext)->uc_mcontext.gregs[REG_EFL];
+    flags = bOn ? flags | TRAP_FLAG : flags & ~TRAP_FLAG;
+}
+#else
+constexpr bool CAN_STEP = false;
+
+void SetTrap(void* /*pContext*/, bool /*bOn*/) {}
+#endif
+
+// A store to a read-only page: lets it through.
+void OnRefusedStore(int iSignal, siginfo_t* pInfo, void* pContext)
+{
+    char* pStore = static_cast<char*>(pInfo->si_addr);
+    for (const tag_Region& region : g_aRegions)
+    {
+        if (pStore >= region.pAddr && pStore < region.pAddr + region.uSize)
+        {
+            const auto uAt = static_cast<size_t>(pStore - region.pAddr) / PAGE * PAGE;
+            g_window = {region.pAddr + uAt, std::min(WINDOW, region.uSize - uAt)};
+            g_bWindowOfReg = &region == &g_aRegions[1];
+            std::memcpy(g_acBefore, g_window.pAddr, g_window.uSize);
+            mprotect(g_window.pAddr, g_window.uSize, PROT_READ | PROT_WRITE);
+            SetTrap(pContext, true);
+            return;
+        }
+    }
+    std::signal(iSignal, SIG_DFL);
+}
+
+// The instruction is done: notes what it changed.
+void OnStep(int /*iSignal*/, siginfo_t* /*pInfo*/, void* pContext)
+{
+    SetTrap(pContext, false);
+    mprotect(g_window.pAddr, g_window.uSize, PROT_READ);
+    const char* pEnd = g_window.pAddr + g_window.uSize;
+    const char* pFirst = std::mismatch<const char*>(g_window.pAddr, pEnd, g_acBefore).first;
+    if (pFirst == pEnd)
+    {
+        return;
+    }
+    const char* pLast = pEnd;
+    while (*(pLast - 1) == g_acBefore[pLast - 1 - g_window.pAddr])
+    {
+        --pLast;
+    }
+    tag_Step& step = g_pSteps->aSteps[g_pSteps->uSteps++ % tag_Steps::MAX_STEPS];
+    step.bReg = g_bWindowOfReg;
+    step.uBytes = static_cast<uint8_t>(pLast - pFirst);
+    step.uOffset = static_cast<uint32_t>(pFirst - g_aRegions[g_bWindowOfReg ? 1 : 0].pAddr);
+    std::memcpy(step.acBytes, pFirst, std::min<size_t>(step.uBytes, tag_Step::MAX_BYTES));
+}
+
+void SetHandler(int iSignal, void (*pfnHandler)(int, siginfo_t*, void*))
+{
+    struct sigaction action = {};
+    action.sa_flags = SA_SIGINFO;
+    action.sa_sigaction = pfnHandler;
+    sigaction(iSignal, &action, nullptr);
+}
+
+} // namespace
+
+bool CStoreStepper::IsPossible()
+{
+    return CAN_STEP;
+}
+
+CStoreStepper::CStoreStepper(tag_Steps& steps)
+{
+    g_pSteps = &steps;
+    steps.uSteps = 0;
+    if (CAN_STEP)
+    {
+        SetHandler(SIGSEGV, &OnRefusedStore);
+        SetHandler(SIGTRAP, &OnStep);
+    }
+    Set(this);
+}
+
+CStoreStepper::~CStoreStepper()
+{
+    Set(nullptr);
+    std::signal(SIGSEGV, SIG_DFL);
+    std::signal(SIGTRAP, SIG_DFL);
+}
+
+void CStoreStepper::Mapped(void* pAddr, size_t uSize, int iProt, int iFlags, const char* szFile)
+{
+    const bool bReg = std::strcmp(szFile, REG_FILE) == 0;
+    const bool bWritten = iFlags == MAP_SHARED && (iProt & PROT_WRITE) != 0;
+    if ((!bReg && std::strcmp(szFile, RECORDS_FILE) != 0) || (bReg && !bWritten))
+    {
+        return;
+    }
+    RequireLock(szFile);
+    if (!bWritten || !CAN_STEP)
+    {
+        return;
+    }
+    const std::string strBytes =
+        CDataDirectory::ReadBytes(bReg ? CDataPaths::ContactReg() : CDataPaths::ContactRecords());
+    tag_Step& step = g_pSteps->aSteps[g_pSteps->uSteps++];
+    step = {bReg, 0, static_cast<uint32_t>(strBytes.size()), {}};
+    g_aRegions[bReg ? 1 : 0] = {static_cast<char*>(pAddr), (uSize + PAGE - 1) / PAGE * PAGE};
+    mprotect(pAddr, uSize, PROT_READ);
+}
+
+void CStoreStepper::Unmapping(void* pAddr, const char* szFile)
+{
+    if (std::strcmp(szFile, RECORDS_FILE) == 0)
+    {
+        RequireLock("the end of records");
+    }
+    for (tag_Region& region : g_aRegions)
+    {
+        region.uSize = region.pAddr == pAddr ? 0 : region.uSize;
+    }
+}
+
+void CStoreStepper::RequireLock(const char* szWhat)
+{
+    const int iFd = open(CDataPaths::LockFile(), O_RDWR | O_CREAT, 0777);
+    if (flock(iFd, LOCK_EX | LOCK_NB) == 0)
+    {
+        m_strFault = std::string("no lock around ") + szWhat;
+    }
+    close(iFd);
+}

@@ -1,0 +1,53 @@
+#ifndef QV_TESTS_FAULTS_STORESTEPPER_H
+#define QV_TESTS_FAULTS_STORESTEPPER_H
+
+#include "tests/faults/CallFaults.h"
+
+#include <cstdint>
+#include <string>
+
+// What one instruction changed in a mapped file, or that a file was mapped with this length.
+struct tag_Step
+{
+    static constexpr size_t MAX_BYTES = 64; // the widest store
+
+    bool bReg;      // of the registration record, else of the records
+    uint8_t uBytes; // 0: uOffset is the file's length
+    uint32_t uOffset;
+    char acBytes[MAX_BYTES];
+};
+
+struct tag_Steps
+{
+    static constexpr uint32_t MAX_STEPS = 100'000;
+
+    uint32_t uSteps;
+    tag_Step aSteps[MAX_STEPS];
+};
+
+// Steps over each store to the store files' shared mappings while it is watching: they are
+// read-only, and the instruction that is refused runs alone with its pages writable. And sees
+// that records are only mapped under the lock, and the registration record only written.
+class CStoreStepper : public CMapWatch
+{
+public:
+    // Where steps cannot be taken, only the mappings are looked at.
+    static bool IsPossible();
+
+    explicit CStoreStepper(tag_Steps& steps);
+    ~CStoreStepper();
+    CStoreStepper(const CStoreStepper&) = delete;
+    CStoreStepper& operator=(const CStoreStepper&) = delete;
+
+    const std::string& Fault() const { return m_strFault; }
+
+    void Mapped(void* pAddr, size_t uSize, int iProt, int iFlags, const char* szFile) override;
+    void Unmapping(void* pAddr, const char* szFile) override;
+
+private:
+    void RequireLock(const char* szWhat);
+
+    std::string m_strFault;
+};
+
+#endif

@@ -5,7 +5,7 @@ set -euo pipefail
 cd "$(dirname "$0")/.."
 
 scripts/setup.sh
-cmake --preset release
+scripts/configure.sh
 cmake --build --preset release
 bench/report.py build/release/bench/qv_bench
 bench/languages.py build/release

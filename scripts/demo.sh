@@ -13,7 +13,7 @@ tool=build/release/tools/qvlocalize
 
 build_tool() {
     scripts/setup.sh
-    cmake --preset release >/dev/null
+    scripts/configure.sh >/dev/null
     cmake --build --preset release --target qvlocalize
 }
 

@@ -1,10 +1,11 @@
 #!/usr/bin/env bash
 # Installs what building and testing need and this machine lacks, from Debian's packages:
-#   scripts/setup.sh          compiler, build tools and libraries
-#   scripts/setup.sh --lint   also the formatter, the static checker and Doxygen
+#   scripts/setup.sh          compiler (clang where CXX names it), build tools and libraries
+#   scripts/setup.sh --lint   also what .ci/run checks with: clang and its tools, libabigail, Doxygen
 #   scripts/setup.sh --armhf  also the cross compiler and the emulator for 32-bit ARM
 #   scripts/setup.sh --peers  also what some tests meet beside the library and are skipped without:
 #                             a JDK, a library with names of ours
+#   scripts/setup.sh --bare   only what makes a bare Debian to try the two commands in
 # Touches neither apt nor the network when nothing is missing.
 set -euo pipefail
 
@@ -13,15 +14,15 @@ packages=(
     libsqlite3-dev libcli11-dev nlohmann-json3-dev
     libgtest-dev libbenchmark-dev unicode-data pkg-config
 )
-if [ "${1:-}" = --lint ]; then
-    packages+=(clang-format-14 clang-tidy-14 doxygen)
-fi
-if [ "${1:-}" = --armhf ]; then
-    packages+=(g++-arm-linux-gnueabihf qemu-user googletest)
-fi
-if [ "${1:-}" = --peers ]; then
-    packages+=(openjdk-17-jdk-headless libwinpr2-2)
-fi
+case "${CXX:-}" in
+    clang++*) packages+=("clang${CXX#clang++}") ;;
+esac
+case "${1:-}" in
+    --lint) packages+=(clang clang-format-14 clang-tidy-14 abigail-tools doxygen) ;;
+    --armhf) packages+=(g++-arm-linux-gnueabihf qemu-user googletest) ;;
+    --peers) packages+=(openjdk-17-jdk-headless libwinpr2-2) ;;
+    --bare) packages=(debootstrap debian-archive-keyring git) ;;
+esac
 
 is_installed() {
     [ "$(dpkg-query -W -f='${db:Status-Status}' "$1" 2>/dev/null || true)" = installed ]

@@ -83,7 +83,7 @@ if [ ! -d "$root" ]; then
 fi
 
 # The files of both builds are compared.
-cmake --preset release
+scripts/configure.sh
 cmake --build --preset release --target qvlocalize
 cmake --preset armhf
 cmake --build --preset armhf

@@ -6,6 +6,6 @@ set -euo pipefail
 cd "$(dirname "$0")/.."
 
 scripts/setup.sh
-cmake --preset release
+scripts/configure.sh
 cmake --build --preset release
 ctest --preset release --parallel "$(nproc)" "$@"

@@ -9,6 +9,6 @@ find_package(Python3 REQUIRED COMPONENTS Interpreter)
 set(QV_DOXYGEN_INPUT ${QV_PUBLIC_HEADERS} bindings/c/qvlocalize.h)
 list(TRANSFORM QV_DOXYGEN_INPUT PREPEND "${CMAKE_CURRENT_SOURCE_DIR}/")
 list(JOIN QV_DOXYGEN_INPUT " " QV_DOXYGEN_INPUT)
-configure_file(docs/Doxyfile.in ${CMAKE_BINARY_DIR}/Doxyfile @ONLY)
-add_custom_target(docs COMMAND ${DOXYGEN_EXECUTABLE} ${CMAKE_BINARY_DIR}/Doxyfile
+configure_file(docs/Doxyfile.in ${PROJECT_BINARY_DIR}/Doxyfile @ONLY)
+add_custom_target(docs COMMAND ${DOXYGEN_EXECUTABLE} ${PROJECT_BINARY_DIR}/Doxyfile
                   COMMENT "Making the reference of the public headers" VERBATIM)

@@ -1,9 +1,14 @@
 # How the folders of the tree become targets.
 
-# Compiler settings that every target of the project shares.
+# Compiler settings that every target of the project shares. Below a parent project its flags stay
+# as they are, except that no warning here fails its build.
 function(qv_set_compile_options target)
-  target_compile_options(${target} PRIVATE -Wall -Wextra -Wpedantic -Wshadow -Wconversion
-                         -Wsign-conversion)
+  if(PROJECT_IS_TOP_LEVEL OR QV_WARNINGS_AS_ERRORS)
+    target_compile_options(${target} PRIVATE -Wall -Wextra -Wpedantic -Wshadow -Wconversion
+                           -Wsign-conversion)
+  else()
+    target_compile_options(${target} PRIVATE -Wno-error)
+  endif()
   if(QV_WARNINGS_AS_ERRORS)
     target_compile_options(${target} PRIVATE -Werror)
   endif()

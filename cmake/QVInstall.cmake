@@ -61,21 +61,21 @@ endforeach()
 
 install(EXPORT QV_LocalizeTargets NAMESPACE QV_Localize:: DESTINATION ${QV_INSTALL_PACKAGE})
 configure_package_config_file(cmake/QV_LocalizeConfig.cmake.in
-                              ${CMAKE_BINARY_DIR}/QV_LocalizeConfig.cmake
+                              ${PROJECT_BINARY_DIR}/QV_LocalizeConfig.cmake
                               INSTALL_DESTINATION ${QV_INSTALL_PACKAGE}
                               PATH_VARS CMAKE_INSTALL_DATADIR)
-write_basic_package_version_file(${CMAKE_BINARY_DIR}/QV_LocalizeConfigVersion.cmake
+write_basic_package_version_file(${PROJECT_BINARY_DIR}/QV_LocalizeConfigVersion.cmake
                                  COMPATIBILITY SameMajorVersion)
-install(FILES ${CMAKE_BINARY_DIR}/QV_LocalizeConfig.cmake
-              ${CMAKE_BINARY_DIR}/QV_LocalizeConfigVersion.cmake
+install(FILES ${PROJECT_BINARY_DIR}/QV_LocalizeConfig.cmake
+              ${PROJECT_BINARY_DIR}/QV_LocalizeConfigVersion.cmake
         DESTINATION ${QV_INSTALL_PACKAGE})
 
 # The .pc file names its folders relative to its own place, so that the installed tree can move.
 file(RELATIVE_PATH QV_PC_PREFIX /${CMAKE_INSTALL_LIBDIR}/pkgconfig /)
-configure_file(cmake/QV_Localize.pc.in ${CMAKE_BINARY_DIR}/QV_Localize.pc @ONLY)
-install(FILES ${CMAKE_BINARY_DIR}/QV_Localize.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
+configure_file(cmake/QV_Localize.pc.in ${PROJECT_BINARY_DIR}/QV_Localize.pc @ONLY)
+install(FILES ${PROJECT_BINARY_DIR}/QV_Localize.pc DESTINATION ${CMAKE_INSTALL_LIBDIR}/pkgconfig)
 
-install(FILES ${CMAKE_BINARY_DIR}/data/pyfile.bin DESTINATION ${CMAKE_INSTALL_DATADIR}/QV_Localize)
+install(FILES ${PROJECT_BINARY_DIR}/data/pyfile.bin DESTINATION ${CMAKE_INSTALL_DATADIR}/QV_Localize)
 install(FILES LICENSE NOTICE DESTINATION ${CMAKE_INSTALL_DOCDIR})
 if(QV_BUILD_TOOL)
   install(TARGETS qvlocalize RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})

@@ -71,6 +71,7 @@ int main(int argc, char** argv)
         CLI::App app("Builds, shows and searches the contact index of a provider's data "
                      "directory.",
                      "qvlocalize");
+        app.set_version_flag("--version", "qvlocalize " QV_TOOL_VERSION, "Tells the version");
         app.failure_message(&UsageError); // inherited by the subcommands
         AddCommands(app);
         return RunCommandLine(app, argc, argv);

@@ -9,7 +9,8 @@ import re
 import sys
 import unittest
 
-from installed import BUILD, COMPILER, SOURCE, WARNINGS, InstalledTest, run, run_built
+from installed import (BUILD, COMPILER, EMULATOR, SOURCE, WARNINGS, InstalledTest, run,
+                       run_built)
 
 STANDARD = "-std=c++17"
 CONSUMER = """\
@@ -74,6 +75,17 @@ class InstallTest(InstalledTest):
             if path.is_file():
                 content = path.read_bytes()
                 self.assertFalse([place for place in places if place in content], path)
+
+    def test_one_version_and_the_plain_name_of_the_library(self):
+        changes = pathlib.Path(SOURCE, "CHANGELOG.md").read_text(encoding="utf-8")
+        version = re.search(r"^## (\d+\.\d+\.\d+)", changes, re.MULTILINE).group(1)
+        tool, = self.installed("bin/qvlocalize")
+        self.assertEqual(f"qvlocalize {version}\n", run_built(tool, "--version"))
+        library, = self.installed("lib*/**/libQV_Localize.so")
+        self.assertEqual(f"libQV_Localize.so.{version}", library.resolve().name)
+        if not EMULATOR:
+            load = "import ctypes; ctypes.CDLL('libQV_Localize.so')"
+            run(sys.executable, "-c", load, env={"LD_LIBRARY_PATH": str(library.parent)})
 
     def test_licence_and_notices_come_along(self):
         for name in ("LICENSE", "NOTICE"):

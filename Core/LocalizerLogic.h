@@ -26,6 +26,11 @@ extern "C"
 // a time. The index belongs to no object: it outlives the process, and every process that loads
 // the library reads the same one.
 //
+// Side effects: MemInit that builds, Search without pLastResult (special numbers apart),
+// SetSortType and the change notifications leave the process's file-creation mask at 0. The files
+// have the permission bits 0777; the directory's mode, 0700 as a rule, is what protects them. A
+// build opens the pinyin table for writing too, though it changes nothing in it.
+//
 // Results: 0, or -1 for a null argument, a refused lock, a file that cannot be mapped, a database
 // that cannot be read or a lack of memory; LOC_ERR_MAP and LOC_ERR_PARAM of
 // Core/LocalizerCodes.h from the pinyin operations and the search itself.

@@ -8,8 +8,11 @@
 
 #include <CLI/CLI.hpp>
 
+#include <sys/stat.h>
+
 #include <algorithm>
 #include <cctype>
+#include <cerrno>
 #include <cstring>
 #include <filesystem>
 #include <iomanip>
@@ -27,11 +30,17 @@ bool IsFile(const char* szPath)
     return fs::is_regular_file(szPath, error);
 }
 
+// For the owner alone: the library gives its files all permission bits. A directory that is there
+// stays as it is.
 void CreateParent(const char* szPath)
 {
     const fs::path directory = fs::path(szPath).parent_path();
     std::error_code error;
-    fs::create_directories(directory, error);
+    fs::create_directories(directory.parent_path(), error);
+    if (!error && mkdir(directory.c_str(), S_IRWXU) != 0 && errno != EEXIST)
+    {
+        error.assign(errno, std::generic_category());
+    }
     if (error)
     {
         throw CToolError(TOOL_EXIT_FAILED,

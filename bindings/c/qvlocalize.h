@@ -8,7 +8,8 @@
 // every result; qv_close. The index lies in files below the data directory, outlives the process
 // and is the same for every process that opens that directory:
 //   databases/contacts2.db  the contacts, read only
-//   files/pyfile.bin        the pinyin table that comes with the library, read only
+//   files/pyfile.bin        the pinyin table that comes with the library; it is not changed, but
+//                           must be writable for the process that builds
 //   files/                  what the library writes; the directory must be there
 //
 // Text is UTF-8, zero-terminated, of any Unicode characters; sizes count bytes, positions in names
@@ -25,8 +26,8 @@
 // that waits for it says how long.
 //
 // Whenever the library opens a file for writing, or the lock, it sets the file-creation mask of the
-// process to 0 and leaves it so; its files have the permission bits 0777. A process with a need for
-// its own mask sets it again after a call.
+// process to 0 and leaves it so; its files have the permission bits 0777, and the mode of files/,
+// 0700 as a rule, protects them. A process with a need for its own mask sets it again after a call.
 
 #include <stddef.h>
 #include <stdint.h>

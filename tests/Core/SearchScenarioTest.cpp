@@ -197,6 +197,46 @@ TEST_F(CSearchTest, ListsUnderIndexCharacters)
     EXPECT_EQ(Search("z").Contacts(), (Ids{3, 2, 4})) << "matches rank by name in any order";
 }
 
+// The limits that the README states, each on a name of its own.
+TEST_F(CSearchTest, StaysWithinItsLimits)
+{
+    const struct
+    {
+        const char* szName;
+        IME_SEARCH_TYPE eType;
+        std::vector<const char*> vFound;
+        std::vector<const char*> vNotFound;
+    } CASES[] = {
+        {"José Álvarez", WORD, {"lvar", "jos#", "jos###"}, {"lvare", "jose", "josé", "ja"}},
+        {"John Smith", WORD, {"smith", "john#s", "john#smith"}, {"js", "johns", "johnsmith"}},
+        {"John Smith", NUM, {"5646", "76484"}, {"56467", "5646#7"}},
+        {"张小三", WORD, {"zx", "xs", "zhangxiaos"}, {"zs", "zhangsan"}},
+        {"吕布", WORD, {"lv", "lvb"}, {"lu"}},
+        {"吕布", NUM, {"58", "582"}, {}},
+        {"重庆", WORD, {"chong", "zhong", "cq", "zq"}, {"chong4"}},
+        {"㐂久", WORD, {"#j", "j"}, {"㐂", "㐂久", "xj"}},
+        {"李四會長", WORD, {"会", "會", "hui"}, {}},
+        {"李四张学友會長", WORD, {"hui", "xy"}, {"会", "會"}},
+    };
+    for (const auto& expected : CASES)
+    {
+        BuildNames({expected.szName});
+        for (const char* szText : expected.vFound)
+        {
+            EXPECT_EQ(Search(szText, expected.eType).Contacts(), Ids{1})
+                << szText << " in " << expected.szName;
+        }
+        for (const char* szText : expected.vNotFound)
+        {
+            const tag_Found found = Search(szText, expected.eType);
+            EXPECT_EQ(found.iRet, 0) << szText;
+            EXPECT_EQ(found.Contacts(), Ids{}) << szText << " in " << expected.szName;
+        }
+    }
+    EXPECT_EQ(Search("zhangsan12").lMask, 0);
+    EXPECT_EQ(Search("zhangsan123").iRet, LOC_ERR_PARAM);
+}
+
 // The code of each failing search, which leaves the caller's arguments as they were.
 TEST_F(CSearchTest, FailsWithoutTouchingWhatItHandsOut)
 {

@@ -84,6 +84,10 @@ class SampleTest(ToolTest):
         files = {path.name for path in (self.data / "databases").iterdir()}
         self.assertEqual({"contacts2.db"}, files)
 
+    def test_keeps_what_is_readable_for_all_in_directories_of_its_owner(self):
+        for name in ("databases", "files"):
+            self.assertEqual(0o40700, (self.data / name).stat().st_mode, name)
+
 
 class IndexTest(ToolTest):
     def test_shows_phases_and_files(self):

@@ -497,24 +497,6 @@ TEST_F(CInterfaceTest, SaysWhatIsMissing)
     EXPECT_EQ(qv_strerror(1), qv_strerror(-1000));
 }
 
-TEST_F(CInterfaceTest, HandsTheLogToTheCaller)
-{
-    ASSERT_EQ(qv_build(m_index.get(), 1), QV_OK);
-    std::vector<std::string> vLines;
-    const auto collect = [](void* pLines, int iPriority, const char* szTag, const char* szText)
-    {
-        static_cast<std::vector<std::string>*>(pLines)->push_back(std::to_string(iPriority) + " " +
-                                                                  szTag + " " + szText);
-    };
-    EXPECT_EQ(qv_set_log(collect, &vLines), QV_OK);
-    Search({}, "");
-    EXPECT_EQ(vLines.at(0), "3 QV_Localize QV_Contacts: Search Start\n");
-    const size_t uLines = vLines.size();
-    EXPECT_EQ(qv_set_log(nullptr, nullptr), QV_OK);
-    Search({}, "");
-    EXPECT_EQ(vLines.size(), uLines);
-}
-
 } // namespace
 
 int main(int argc, char** argv)

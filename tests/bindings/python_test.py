@@ -13,7 +13,6 @@ import subprocess
 import sys
 import tempfile
 import threading
-import tomllib
 import unittest
 
 TOOL, PYFILE, HEADER, MODULE_FOLDER = sys.argv[1:5]
@@ -185,11 +184,6 @@ class PythonTest(unittest.TestCase):
         self.index.search("z")
         self.assertEqual((3, "QV_Localize", "QV_Contacts: Search Start"), lines[0])
         self.assertEqual(1, lines.count(lines[0]))
-
-    def test_project_file_names_the_module(self):
-        with open(pathlib.Path(MODULE_FOLDER, "pyproject.toml"), "rb") as project:
-            modules = tomllib.load(project)["tool"]["setuptools"]["py-modules"]
-        self.assertEqual(["qvlocalize"], modules)
 
 
 if __name__ == "__main__":

@@ -105,7 +105,7 @@ bool CStoreStepper::IsPossible()
     return CAN_STEP;
 }
 
-CStoreStepper::CStoreStepper(tag_Steps& steps)
+CStoreStepper::CStoreStepper(tag_Steps& steps, bool bSetsSortType) : m_bSetsSortType(bSetsSortType)
 {
     g_pSteps = &steps;
     steps.uSteps = 0;
@@ -132,7 +132,10 @@ void CStoreStepper::Mapped(void* pAddr, size_t uSize, int iProt, int iFlags, con
     {
         return;
     }
-    RequireLock(szFile);
+    if (!bReg || !m_bSetsSortType)
+    {
+        RequireLock(szFile);
+    }
     if (!bWritten || !CAN_STEP)
     {
         return;

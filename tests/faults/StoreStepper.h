@@ -26,15 +26,16 @@ struct tag_Steps
 };
 
 // Steps over each store to the store files' shared mappings while it is watching: they are
-// read-only, and the instruction that is refused runs alone with its pages writable. And sees
-// that records are only mapped under the lock, and the registration record only written.
+// read-only, and the instruction that is refused runs alone with its pages writable. And sees that
+// the lock is held around each mapping of records and each write mapping of the registration
+// record, but for the sort type, which is set without it.
 class CStoreStepper : public CMapWatch
 {
 public:
     // Where steps cannot be taken, only the mappings are looked at.
     static bool IsPossible();
 
-    explicit CStoreStepper(tag_Steps& steps);
+    CStoreStepper(tag_Steps& steps, bool bSetsSortType);
     ~CStoreStepper();
     CStoreStepper(const CStoreStepper&) = delete;
     CStoreStepper& operator=(const CStoreStepper&) = delete;
@@ -47,7 +48,8 @@ public:
 private:
     void RequireLock(const char* szWhat);
 
-    std::string m_strFault;
+    bool m_bSetsSortType;
+    std::string m_strFault{};
 };
 
 #endif

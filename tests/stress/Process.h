@@ -3,7 +3,6 @@
 
 #include <functional>
 #include <string>
-#include <sys/mman.h>
 #include <sys/types.h>
 #include <vector>
 
@@ -24,24 +23,6 @@ public:
 
 private:
     pid_t m_iPid;
-};
-
-// Memory, zero at first, that this process has in common with those that it starts later.
-template <typename T>
-class CShared
-{
-public:
-    CShared() : m_pMemory(mmap(nullptr, sizeof(T), PROT_READ | PROT_WRITE, FLAGS, -1, 0)) {}
-    ~CShared() { munmap(m_pMemory, sizeof(T)); }
-    CShared(const CShared&) = delete;
-    CShared& operator=(const CShared&) = delete;
-
-    T* operator->() const { return static_cast<T*>(m_pMemory); }
-    T& operator*() const { return *static_cast<T*>(m_pMemory); }
-
-private:
-    static constexpr int FLAGS = MAP_SHARED | MAP_ANONYMOUS;
-    void* m_pMemory;
 };
 
 // Throws std::runtime_error with the text unless bTrue.

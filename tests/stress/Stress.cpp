@@ -10,6 +10,7 @@
 #include "Core/LocalizerLogic.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "MemManager/SingleMutex.h"
+#include "tests/Support/ChildProcess.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/StoreFiles.h"

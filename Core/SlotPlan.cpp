@@ -109,12 +109,32 @@ int CSlotPlan::ListRuns(tag_Run* pRuns) const
     return iRuns;
 }
 
+// Whole stretches that move.
+void CSlotPlan::Prepare(const tag_Run* pRuns, int iRuns) const
+{
+    int iEnd = 0;
+    for (int i = 0; i < iRuns; i = iEnd + 1)
+    {
+        iEnd = i;
+        while (iEnd < iRuns && pRuns[iEnd].iFrom != pRuns[iEnd].iTo)
+        {
+            ++iEnd;
+        }
+        if (iEnd > i)
+        {
+            const tag_Run& last = pRuns[iEnd - 1];
+            PrepareSlots(m_pRecords, pRuns[i].iTo, last.iTo + last.iCount);
+        }
+    }
+}
+
 // A record only moves into the slot of one that leaves or moves the same way. So those that move
 // down go first to last and those that move up last to first, and none is lost.
 void CSlotPlan::Apply() const
 {
     tag_Run aRuns[MAX_RUNS];
     const int iRuns = ListRuns(aRuns);
+    Prepare(aRuns, iRuns);
     for (int i = 0; i < iRuns; ++i)
     {
         if (aRuns[i].iTo < aRuns[i].iFrom)

@@ -13,8 +13,8 @@ public:
     // How many records can leave, and how many can join: as many as one notification lists.
     static constexpr int MAX_CHANGES = 200;
 
-    // For iCount records in the order eOrder, of which those of iRemoved slots, listed in
-    // increasing order, leave. Both arrays have to stay as they are until Apply.
+    // For iCount records in a shared mapping of the store, in the order eOrder, of which those of
+    // iRemoved slots, listed in increasing order, leave. Both have to stay as they are until Apply.
     CSlotPlan(tag_ContactsStruct* pRecords, int iCount, const int* piRemoved, int iRemoved,
               Common_Sort_enum eOrder);
 
@@ -46,6 +46,7 @@ private:
 
     int CountBefore(int iSlot) const;
     int ListRuns(tag_Run* pRuns) const;
+    void Prepare(const tag_Run* pRuns, int iRuns) const;
 
     tag_ContactsStruct* m_pRecords;
     int m_iCount;

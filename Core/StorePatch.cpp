@@ -138,6 +138,7 @@ void CStorePatch::Cover(int iTotalNum)
 void MoveToFront(tag_ContactsStruct* pRecords, int iSlot)
 {
     const tag_ContactsStruct moved = pRecords[iSlot];
+    PrepareSlots(pRecords, 0, iSlot + 1);
     MoveSlots(pRecords, 0, 1, iSlot);
     WriteSlot(pRecords, &moved);
 }

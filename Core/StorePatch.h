@@ -41,8 +41,8 @@ enum PATCH_RESULT
 class CStorePatch
 {
 public:
-    // iCount records of iCapacity slots in the order of iSortType. pRecords is null only without
-    // capacity.
+    // iCount records of iCapacity slots in the order of iSortType. pRecords is a shared mapping of
+    // the store, null only without capacity.
     CStorePatch(tag_ContactsStruct* pRecords, int iCount, int iCapacity, int iSortType);
 
     int Count() const { return m_iCount; }
@@ -79,7 +79,8 @@ private:
     int m_iRemoved = 0;
 };
 
-// Moves the record of iSlot to slot 0 and the records before it one slot up.
+// Moves the record of iSlot to slot 0 and the records before it one slot up. pRecords is a shared
+// mapping of the store.
 void MoveToFront(tag_ContactsStruct* pRecords, int iSlot);
 
 #endif

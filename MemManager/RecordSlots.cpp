@@ -1,9 +1,15 @@
 #include "MemManager/RecordSlots.h"
 
+#include <algorithm>
+#include <cstdint>
 #include <cstring>
+#include <sys/mman.h>
+#include <unistd.h>
 
 namespace
 {
+
+constexpr size_t MIN_PREPARED = 65536; // bytes; below, a few faults are cheaper
 
 constexpr size_t BODY_OFFSET = offsetof(tag_ContactsStruct, lGroupID);
 constexpr size_t BODY_SIZE = sizeof(tag_ContactsStruct) - BODY_OFFSET;
@@ -33,6 +39,15 @@ void EndSlot(tag_ContactsStruct* pSlot, int32_t iContactID)
     __atomic_store_n(&pSlot->iContactID, iContactID, __ATOMIC_RELEASE);
 }
 
+// First to last.
+void MoveUpward(tag_ContactsStruct* pSlots, int iFrom, int iTo, int iCount)
+{
+    for (int i = 0; i < iCount; ++i)
+    {
+        WriteSlot(pSlots + iTo + i, pSlots + iFrom + i);
+    }
+}
+
 } // namespace
 
 void WriteSlot(tag_ContactsStruct* pSlot, const tag_ContactsStruct* pRecord)
@@ -45,16 +60,40 @@ void WriteSlot(tag_ContactsStruct* pSlot, const tag_ContactsStruct* pRecord)
 
 void MoveSlots(tag_ContactsStruct* pSlots, int iFrom, int iTo, int iCount)
 {
-    if (iTo == iFrom)
+    if (iTo <= iFrom)
     {
+        MoveUpward(pSlots, iFrom, iTo, iTo < iFrom ? iCount : 0);
         return;
     }
-    for (int i = 0; i < iCount; ++i)
+    // Each record is read before its slot is written: the last ones go first. As many as the
+    // distance do not touch each other and go upward, in which memory is faster.
+    const int iBlock = iTo - iFrom;
+    for (int iLeft = iCount; iLeft > 0; iLeft -= iBlock)
     {
-        // Each record is read before its slot is written.
-        const int iRecord = iTo < iFrom ? i : iCount - 1 - i;
-        WriteSlot(pSlots + iTo + iRecord, pSlots + iFrom + iRecord);
+        const int iStart = std::max(iLeft - iBlock, 0);
+        MoveUpward(pSlots, iFrom + iStart, iTo + iStart, iLeft - iStart);
     }
+}
+
+// A page that was only read is made writable more slowly than one that is not mapped yet. The
+// first page shows whether the system does it at all.
+void PrepareSlots(tag_ContactsStruct* pSlots, int iFirst, int iEnd)
+{
+#ifdef MADV_POPULATE_WRITE
+    const auto uPage = static_cast<uintptr_t>(sysconf(_SC_PAGESIZE));
+    const uintptr_t uStart = reinterpret_cast<uintptr_t>(pSlots + iFirst) / uPage * uPage;
+    const size_t uSize = reinterpret_cast<uintptr_t>(pSlots + iEnd) - uStart;
+    void* pStart = reinterpret_cast<void*>(uStart);
+    if (uSize >= MIN_PREPARED && madvise(pStart, uPage, MADV_POPULATE_WRITE) == 0 &&
+        madvise(pStart, uSize, MADV_DONTNEED) == 0)
+    {
+        madvise(pStart, uSize, MADV_POPULATE_WRITE);
+    }
+#else
+    (void)pSlots;
+    (void)iFirst;
+    (void)iEnd;
+#endif
 }
 
 void ClearSlots(tag_ContactsStruct* pSlots, int iCount)

@@ -12,6 +12,7 @@
 #include "MemManager/ContactSelection.h"
 #include "MemManager/MemManger.h"
 #include "bench/Floors.h"
+#include "bench/LockWatch.h"
 #include "bench/PeakMemory.h"
 #include "bench/Queries.h"
 #include "bench/Workload.h"
@@ -19,11 +20,17 @@
 #include "tests/Support/WideText.h"
 
 #include <benchmark/benchmark.h>
+#include <pthread.h>
+#include <sys/mman.h>
+#include <sys/wait.h>
+#include <unistd.h>
 
 #include <algorithm>
+#include <map>
 #include <memory>
 #include <random>
 #include <string>
+#include <utility>
 #include <vector>
 
 namespace
@@ -366,6 +373,115 @@ void Changes(benchmark::State& state)
     }
 }
 
+// As many contacts as one notification lists, spread over the store, changed in the database and
+// then in the store. Allowed: to hold the lock for 4 copies.
+void ManyChanges(benchmark::State& state)
+{
+    constexpr int CHANGES = 200;
+    const int iContacts = static_cast<int>(state.range(0));
+    WorkloadOf(iContacts);
+    const int iDistance = iContacts / CHANGES;
+    const std::string strEvery = "%" + std::to_string(iDistance) + "=1";
+    // Names all over the store that differ from round to round.
+    const auto rename = [&](int iRound)
+    {
+        return "update localizer set display_name=char(97+(contact_id/" +
+               std::to_string(iDistance) + "*7+" + std::to_string(iRound) +
+               ")%26)||contact_id where contact_id" + strEvery;
+    };
+    const std::pair<std::string, std::string> changes[] = {
+        {"renewed", "update contacts set starred=1-starred where _id" + strEvery},
+        {"removed", "delete from visible_contacts where _id" + strEvery},
+        {"inserted", "insert into visible_contacts select _id from contacts where _id" + strEvery},
+        {"renamed", rename(0)},
+        {"renamed", rename(11)}};
+    for (auto _ : state)
+    {
+        CLocalizerLogic logic;
+        CProviderDatabase database;
+        std::map<std::string, std::vector<double>> held;
+        for (int iRun = 0; iRun < MEASURE_RUNS; ++iRun)
+        {
+            for (const auto& [strKind, strSql] : changes)
+            {
+                database.Execute(strSql);
+                std::vector<long long> vIds;
+                for (int i = 0; i < CHANGES; ++i)
+                {
+                    vIds.push_back(1 + i * iDistance);
+                }
+                const CLockWatch watch;
+                logic.OnContactsTableChanged(CHANGES, vIds.data());
+                held[strKind].push_back(watch.Held());
+            }
+        }
+        const double dCopy = CopyFloor(iContacts);
+        for (const auto& [strKind, vHeld] : held)
+        {
+            state.counters[strKind + "_us"] = Percentile(vHeld, 50) * MICROSECONDS;
+            state.counters[strKind + "_share"] = Percentile(vHeld, 50) / (4 * dCopy);
+        }
+        state.counters["copy_us"] = dCopy * MICROSECONDS;
+    }
+}
+
+// What two processes that type at once share: each key is pressed by both at the same moment.
+struct tag_TypingTogether
+{
+    pthread_barrier_t nextKey;
+    double dLongestHeld; // by the second process
+};
+
+// Types all texts that search the store, key by key, with the other process.
+void TypeTogether(tag_TypingTogether* pTogether)
+{
+    CLocalizerLogic logic;
+    for (const tag_Query& query : QUERIES)
+    {
+        const std::wstring strText = query.szText;
+        for (size_t uTyped = 1; query.eType != IME_SEARCH_SPECIAL && uTyped <= strText.size();
+             ++uTyped)
+        {
+            pthread_barrier_wait(&pTogether->nextKey);
+            tag_LocalizerResult* pResult =
+                SearchAll(logic, query.eType, strText.substr(0, uTyped), nullptr);
+            logic.FreeSearchResult(pResult);
+        }
+    }
+}
+
+// Two processes that always meet at the lock. Allowed: to wait for 3 times the longest that the
+// other one holds it.
+void TwoTypists(benchmark::State& state)
+{
+    const int iContacts = static_cast<int>(state.range(0));
+    WorkloadOf(iContacts);
+    auto* pTogether = static_cast<tag_TypingTogether*>(mmap(nullptr, sizeof(tag_TypingTogether),
+                                                            PROT_READ | PROT_WRITE,
+                                                            MAP_SHARED | MAP_ANONYMOUS, -1, 0));
+    pthread_barrierattr_t attributes;
+    pthread_barrierattr_init(&attributes);
+    pthread_barrierattr_setpshared(&attributes, PTHREAD_PROCESS_SHARED);
+    pthread_barrier_init(&pTogether->nextKey, &attributes, 2);
+    for (auto _ : state)
+    {
+        const pid_t iOther = fork();
+        const CLockWatch watch;
+        TypeTogether(pTogether);
+        if (iOther == 0)
+        {
+            pTogether->dLongestHeld = watch.LongestHeld();
+            _exit(0);
+        }
+        waitpid(iOther, nullptr, 0);
+        state.counters["wait_us"] = watch.LongestWait() * MICROSECONDS;
+        state.counters["held_us"] = pTogether->dLongestHeld * MICROSECONDS;
+        state.counters["wait_share"] = watch.LongestWait() / (3 * pTogether->dLongestHeld);
+    }
+    pthread_barrier_destroy(&pTogether->nextKey);
+    munmap(pTogether, sizeof(*pTogether));
+}
+
 void Floors(benchmark::State& state)
 {
     const int iContacts = static_cast<int>(state.range(0));
@@ -398,6 +514,8 @@ void RegisterAll()
         add(iSize, "narrowed", Narrowed);
         add(iSize, "build", Build);
         add(iSize, "changes", Changes);
+        add(iSize, "many_changes", ManyChanges);
+        add(iSize, "two_typists", TwoTypists);
     }
     for (const int iSize : SIZES)
     {

@@ -114,6 +114,15 @@ def main() -> int:
         rows["changes"], {f"{kind}_us": f"{kind} us" for kind in CHANGES},
         {f"{kind}_share": f"{kind} share" for kind in CHANGES},
         [f"{kind}_share" for kind in CHANGES])
+    text += ("\n## 200 changed contacts in one notification\n\nHow long the store lock is held. Allowed "
+             "at 100,000 contacts: 4 copy, whatever changes.\n\n") + by_size(
+        rows["many_changes"], {"copy_us": "copy", **{f"{kind}_us": f"{kind} us" for kind in CHANGES}},
+        {f"{kind}_share": f"{kind} share" for kind in CHANGES},
+        [f"{kind}_share" for kind in CHANGES])
+    text += ("\n## Two processes that type at once\n\nBoth press each key at the same moment. Allowed: "
+             "to wait 3 times as long as the other one holds the lock at most.\n\n") + by_size(
+        rows["two_typists"], {"wait_us": "longest wait us", "held_us": "longest held us"},
+        {"wait_share": "share"})
     text += ("\n## Contacts of one surname, typed by its initial\n\nAll match and are ranked: in the "
              "whole store, and among candidates in no order. `sort` sorts as many matches by one "
              "number.\n\n") + by_size(

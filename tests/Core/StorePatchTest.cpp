@@ -5,12 +5,16 @@
 #include "Common/CommonQsort.h"
 #include "Core/LocalizerCodes.h"
 #include "Core/SlotPlan.h"
+#include "MemManager/MappingGuards.h"
+#include "MemManager/StoreRegister.h"
+#include "tests/Support/DataDirectory.h"
 
 #include <gtest/gtest.h>
 
 #include <algorithm>
 #include <cstring>
 #include <random>
+#include <string>
 #include <vector>
 
 namespace
@@ -68,6 +72,8 @@ protected:
     }
 
     std::mt19937 m_rng{5};
+    CDataDirectory m_directory;
+    std::string m_strFile = m_directory.File("records.bin");
 };
 
 TEST_P(CManyChanges, LeaveTheBytesOfOneAfterTheOther)
@@ -81,16 +87,17 @@ TEST_P(CManyChanges, LeaveTheBytesOfOneAfterTheOther)
                                  static_cast<int>(vModel.size()), GetParam());
         Records vInserted = MakeRecords(m_rng() % uMost);
         const std::vector<int> vRemoved = PickSlots(vModel.size());
-        Records vStore = vModel;
-        vStore.resize(vModel.size() + SPARE);
+        const int iCapacity = static_cast<int>(vModel.size()) + SPARE;
+        const CWriteMapping store(m_strFile.c_str(), StoreBytes(iCapacity));
+        auto* pStore = store.As<tag_ContactsStruct>();
+        std::copy(vModel.begin(), vModel.end(), pStore);
+        CStorePatch patch(pStore, iCapacity - SPARE, iCapacity,
+                          GetParam() == SORT_TIME ? STORE_ORDER_TIME : STORE_ORDER_NAME);
 
         for (size_t i = vRemoved.size(); i > 0; --i)
         {
             vModel.erase(vModel.begin() + vRemoved[i - 1]);
         }
-        const int iCapacity = static_cast<int>(vStore.size());
-        CStorePatch patch(vStore.data(), iCapacity - SPARE, iCapacity,
-                          GetParam() == SORT_TIME ? STORE_ORDER_TIME : STORE_ORDER_NAME);
         patch.Remove(vRemoved.data(), static_cast<int>(vRemoved.size()));
         tag_ContactsInfo inserted = {static_cast<int>(vInserted.size()), vInserted.data()};
         const size_t uRoom = static_cast<size_t>(iCapacity) - vModel.size();
@@ -101,7 +108,7 @@ TEST_P(CManyChanges, LeaveTheBytesOfOneAfterTheOther)
             InsertOne(vModel, record, GetParam());
         }
         ASSERT_EQ(static_cast<size_t>(patch.Count()), vModel.size());
-        ASSERT_EQ(std::memcmp(vStore.data(), vModel.data(), vModel.size() * sizeof(vModel[0])), 0);
+        ASSERT_EQ(std::memcmp(pStore, vModel.data(), vModel.size() * sizeof(vModel[0])), 0);
     }
 }
 

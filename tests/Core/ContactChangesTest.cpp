@@ -5,7 +5,6 @@
 #include "Platform/LogSink.h"
 #include "tests/Core/FacadeFixture.h"
 #include "tests/Support/ChildProcess.h"
-#include "tests/Support/MemoryFailure.h"
 
 #include <algorithm>
 #include <fcntl.h>
@@ -301,26 +300,6 @@ TEST_F(CContactChangesTest, MarksAStoreWhoseChangeFailed)
         ExpectLockFree();
         NotifyStatus();
         ExpectFresh();
-    }
-}
-
-TEST_F(CContactChangesTest, SurvivesWhateverAllocationFails)
-{
-    BuildStore();
-    int iFailures = 1;
-    for (int iGranted = 0; iFailures > 0; ++iGranted)
-    {
-        const std::string strName = iGranted % 2 == 0 ? "A" : "张";
-        m_provider.SetName(2, strName, LocalizerKeyOf(strName));
-        {
-            CMemoryFailure failure(iGranted);
-            Notify({2});
-            iFailures = failure.Failures();
-        }
-        ExpectLockFree();
-        EXPECT_TRUE(IsMarked(Reg()) || iFailures == 0 || SlotOf(2) >= 0);
-        m_logic.OnContactsTableChanged();
-        ExpectFresh("allocation " + std::to_string(iGranted));
     }
 }
 

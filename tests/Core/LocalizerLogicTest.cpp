@@ -3,9 +3,9 @@
 
 #include "tests/Core/FacadeFixture.h"
 #include "tests/Support/ChildProcess.h"
-#include "tests/Support/MemoryFailure.h"
 
 #include <filesystem>
+#include <sys/resource.h>
 
 namespace
 {
@@ -118,31 +118,34 @@ TEST_F(CMemInitTest, ReloadsWhenAFileIsMissingOrEmpty)
     EXPECT_TRUE(m_log.Has(DEBUG_LINE, "QV_Contacts: ReadAllSmsOnlineStatus  error = -1\n"));
 }
 
-// The old index or the new one, of which only the online state may be missing.
-TEST_F(CMemInitTest, LeavesAWholeIndexWheneverMemoryRunsOut)
+// The store has to grow and cannot: the old index answers on, and the change is not forgotten.
+TEST_F(CMemInitTest, AFileSizeLimitKeepsTheOldIndex)
 {
-    StoreTwo();
-    ASSERT_EQ(m_logic.MemInit(true), 0);
-    const std::string strOld = RecordsFile();
-    m_provider.SetName(6, "Zoe", LocalizerKeyOf("Zoe"));
-    ASSERT_EQ(m_logic.MemInit(true), 0);
-    const Records vNew = ReadStore().vRecords;
-    int iFailures = 1;
-    for (int iGranted = 0; iFailures > 0; ++iGranted)
+    constexpr int CONTACTS = 40;
+    BuildNames(std::vector<std::string>(CONTACTS, "Tom"));
+    const std::string strBefore = RecordsFile();
+    std::vector<tag_ProviderContact> vContacts(STORE_SPARE_RECORDS + 1);
+    for (size_t i = 0; i < vContacts.size(); ++i)
     {
-        SCOPED_TRACE(iGranted);
-        CDataDirectory::WriteBytes(CDataPaths::ContactRecords(), strOld);
-        int iRet = 0;
-        {
-            const CMemoryFailure failure(iGranted);
-            iRet = m_logic.MemInit(true);
-            iFailures = failure.Failures();
-        }
-        Records vRecords = ReadStore().vRecords;
-        vRecords[1].iFlags |= iFailures > 0 ? CONTACT_FLAG_ONLINE : 0U;
-        EXPECT_TRUE(iRet == 0 ? BytesOf(vRecords) == BytesOf(vNew) : RecordsFile() == strOld);
-        EXPECT_TRUE(iRet == 0 || iRet == -1 || iRet == LOC_ERR_MAP) << iRet;
+        vContacts[i].iId = 1000 + static_cast<int>(i);
+        vContacts[i].strName = "Tom";
     }
+    m_provider.PutAll(vContacts);
+    EXPECT_TRUE(RunInChild(
+        [&]
+        {
+            const rlimit limit = {strBefore.size(), strBefore.size()};
+            ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &limit), 0);
+            long long llId = 1000;
+            m_logic.OnContactsTableChanged(1, &llId);
+            EXPECT_EQ(m_logic.MemInit(true), -1);
+            EXPECT_EQ(Search("").Contacts().size(), static_cast<size_t>(CONTACTS));
+        }));
+    EXPECT_EQ(RecordsFile(), strBefore);
+    EXPECT_EQ(Reg(), (tag_ContactReg{CONTACTS, 0, 0})) << "asks for a rebuild";
+    m_logic.OnStatusUpdatesTableChanged(0, nullptr);
+    EXPECT_EQ(Reg().iTotalNum, CONTACTS + STORE_SPARE_RECORDS + 1);
+    ExpectFresh();
 }
 
 } // namespace

@@ -3,7 +3,6 @@
 
 #include "tests/Core/FacadeFixture.h"
 #include "tests/Support/ChildProcess.h"
-#include "tests/Support/MemoryFailure.h"
 
 #include <algorithm>
 #include <ctime>
@@ -324,41 +323,6 @@ TEST_F(CSearchTest, FindsNothingButTheSpecialNumbersWithoutIndexOrLock)
         EXPECT_EQ(Search("警", SPECIAL).Contacts(), (Ids{0, 3, 6}));
     }
     EXPECT_EQ(Search("z").Contacts(), Ids{1});
-}
-
-// Memory ends at each allocation in turn: the code, the pointer handed out, nothing kept.
-TEST_F(CSearchTest, SurvivesWithoutMemory)
-{
-    BuildNames({"张三", "李四", "张五", "Zoe"});
-    const tag_Found all = Search("");
-    const struct
-    {
-        const char* szInput;
-        IME_SEARCH_TYPE eType;
-        const Set& last;
-        Ids vIds;
-    } CASES[] = {{"zhangsan", WORD, nullptr, {1}},
-                 {"", NUM, nullptr, {2, 4, 1, 3}},
-                 {"9", NUM, all.set, {4, 1, 3}},
-                 {"j", SPECIAL, nullptr, {4, 0, 3, 6}}};
-    for (const auto& row : CASES)
-    {
-        int iFailures = 1;
-        for (int iGranted = 0; iFailures > 0; ++iGranted)
-        {
-            SCOPED_TRACE(std::string(row.szInput) + " " + std::to_string(iGranted));
-            tag_Found found;
-            {
-                const CMemoryFailure failure(iGranted);
-                found = Search(row.szInput, row.eType, row.last);
-                iFailures = failure.Failures();
-            }
-            EXPECT_EQ(found.set != nullptr, found.iRet == 0);
-            const bool bRefused = found.iRet == -1 || found.iRet == LOC_ERR_MAP;
-            EXPECT_TRUE(found.iRet == 0 || (bRefused && iFailures > 0)) << found.iRet;
-            EXPECT_TRUE(iFailures > 0 || found.Contacts() == row.vIds);
-        }
-    }
 }
 
 } // namespace

@@ -8,7 +8,7 @@
 
 #include <functional>
 #include <map>
-#include <memory>
+#include <ostream>
 #include <string>
 #include <vector>
 
@@ -20,6 +20,10 @@ struct tag_Change
     std::function<int(CLocalizerLogic&)> fnTell; // 0 where it reports nothing
 };
 const std::vector<tag_Change>& AllChanges();
+inline std::ostream& operator<<(std::ostream& stream, const tag_Change& change)
+{
+    return stream << change.szName;
+}
 
 // What the two files of a store are.
 enum STORE_KIND

@@ -59,7 +59,7 @@ void BuildIndex(const CDataDirectory& directory, const CLibraryLog& log)
     const int iResult = logic.MemInit(true);
     if (iResult != 0)
     {
-        throw CToolError(TOOL_EXIT_FAILED, FailureText(iResult),
+        throw CToolError(TOOL_EXIT_FAILED, log.WithReason(FailureText(iResult)),
                          "Check that the database is a contacts database, that the files can be "
                          "written and that no other process holds the store.",
                          log.Errors());
@@ -108,10 +108,17 @@ void PrintHeading(bool bBuilt)
               << " contacts, room for " << iCapacity << "\n";
 }
 
+// Without a capacity the index is damaged, or waits for a build.
+bool IsIndexUsable()
+{
+    int iTotal = 0;
+    return IsNeedReload() == 0 && CMemManger().GetMemSize(&iTotal) != 0;
+}
+
 void RunIndex(const tag_IndexOptions& options)
 {
     options.directory.Use();
-    const bool bBuild = !options.bIfNeeded || IsNeedReload() != 0;
+    const bool bBuild = !options.bIfNeeded || !IsIndexUsable();
     const CLibraryLog log;
     if (bBuild)
     {
@@ -133,6 +140,6 @@ void AddIndexCommand(CLI::App& app)
     CLI::App* pCommand = app.add_subcommand("index", "Build the contact index of the database");
     pOptions->directory.AddOption(*pCommand);
     pCommand->add_flag("--if-needed", pOptions->bIfNeeded,
-                       "Leave an index that an earlier build made as it is");
+                       "Leave an index that can be used as it is");
     pCommand->callback([pOptions] { RunIndex(*pOptions); });
 }

@@ -49,9 +49,9 @@ void RequireComplete(const CLibraryLog& log)
     const int iCapacity = CMemManger().GetMemSize(&iTotal);
     if (iTotal > iCapacity || iCapacity == 0)
     {
-        throw CToolError(TOOL_EXIT_FAILED, "the index does not hold what the database holds",
-                         "The next notification of contacts or status builds it anew.",
-                         log.Errors());
+        throw CToolError(
+            TOOL_EXIT_FAILED, log.WithReason("the index does not hold what the database holds"),
+            "The next notification of contacts or status builds it anew.", log.Errors());
     }
     std::cout << "The index holds " << iTotal << " contacts, with room for " << iCapacity << '\n';
 }

@@ -67,6 +67,12 @@ void InstallPinyinTable(const std::string& strSource)
         return;
     }
     fs::copy_file(strSource, szTarget, fs::copy_options::overwrite_existing, error);
+    if (!error)
+    {
+        // The library opens its table for writing too, and the copy of a read-only file is one.
+        fs::permissions(szTarget, fs::perms::owner_read | fs::perms::owner_write,
+                        fs::perm_options::add, error);
+    }
     if (error)
     {
         throw CToolError(TOOL_EXIT_FAILED, std::string("cannot copy ") + strSource + " to " +

@@ -4,6 +4,7 @@
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "MemManager/MemManger.h"
 #include "tools/DataDirectory.h"
+#include "tools/LibraryLog.h"
 #include "tools/OptionChecks.h"
 #include "tools/RecordText.h"
 #include "tools/ToolError.h"
@@ -64,8 +65,16 @@ void RequireUnlocked()
         }
         std::this_thread::sleep_for(LOCK_PAUSE);
     }
-    throw CToolError(TOOL_EXIT_FAILED, "another process holds the store",
-                     "Try again when it is done.");
+    throw CToolError(TOOL_EXIT_FAILED, CLibraryLog::LockReason(), "Try again when it is free.");
+}
+
+void RequireRead(const CLibraryLog& log)
+{
+    if (!log.Errors().empty())
+    {
+        throw CToolError(TOOL_EXIT_FAILED, log.WithReason("the index could not be read"),
+                         BUILD_ANEW, log.Errors());
+    }
 }
 
 // A private copy of the stored records.
@@ -74,11 +83,13 @@ class CStoredRecords
 public:
     CStoredRecords()
     {
+        const CLibraryLog log;
         CMemManger().GetContactsResult(&m_pInfo);
         if (m_pInfo == nullptr)
         {
             throw CToolError(TOOL_EXIT_FAILED, "no memory for the records");
         }
+        RequireRead(log);
     }
     ~CStoredRecords()
     {
@@ -101,10 +112,12 @@ private:
 
 void PrintRegistration()
 {
+    const CLibraryLog log;
     CMemManger store;
     int iTotal = 0;
     const int iCapacity = store.GetMemSize(&iTotal);
     const int iSortType = store.GetSortType();
+    RequireRead(log);
     std::cout << "Registration record\n"
               << "  iTotalNum  " << iTotal << " contacts\n"
               << "  iSortType  " << iSortType << " (" << OrderText(iSortType) << ")\n"
@@ -150,8 +163,8 @@ void RunShow(const tag_ShowOptions& options)
     {
         SetOrder(options);
     }
-    PrintRegistration();
     RequireUnlocked();
+    PrintRegistration();
     PrintRecords(options);
 }
 

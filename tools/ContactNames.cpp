@@ -39,7 +39,8 @@ public:
     {
         if (CQVLocalizerManager::MemInit(&m_pMap) != 0)
         {
-            throw CToolError(TOOL_EXIT_FAILED, "the library could not open its pinyin table");
+            throw CToolError(TOOL_EXIT_FAILED, "the search could not use the index's pinyin table",
+                             BUILD_ANEW);
         }
     }
     ~CPinyinTable() { CQVLocalizerManager::MemRelease(m_pMap); }

@@ -9,6 +9,7 @@
 #include <CLI/CLI.hpp>
 
 #include <sys/stat.h>
+#include <unistd.h>
 
 #include <algorithm>
 #include <cctype>
@@ -24,10 +25,16 @@ namespace fs = std::filesystem;
 namespace
 {
 
-bool IsFile(const char* szPath)
+// Throws CToolError where the system does not let us look, which is no missing file.
+bool IsFile(const std::string& strPath)
 {
     std::error_code error;
-    return fs::is_regular_file(szPath, error);
+    const fs::file_status status = fs::status(strPath, error);
+    if (status.type() == fs::file_type::none)
+    {
+        throw CToolError(TOOL_EXIT_FAILED, "cannot look at " + strPath + ": " + error.message());
+    }
+    return fs::is_regular_file(status);
 }
 
 // For the owner alone: the library gives its files all permission bits. A directory that is there
@@ -150,11 +157,19 @@ void CDataDirectory::RequirePinyinSource() const
     RequirePinyinTable(CDataPaths::PinyinSource(),
                        "Copy pyfile.bin there, or make sample contacts, which installs it: " +
                            CommandLine("sample"));
+    if (access(CDataPaths::PinyinSource(), R_OK | W_OK) != 0)
+    {
+        throw CToolError(
+            TOOL_EXIT_FAILED,
+            std::string("the pinyin table cannot be opened for reading and writing, as "
+                        "the build of an index does: ") +
+                CDataPaths::PinyinSource());
+    }
 }
 
 void CDataDirectory::RequireIndex() const
 {
-    if (IsNeedReload() != 0)
+    if (!IsFile(CDataPaths::ContactReg()) || IsNeedReload() != 0)
     {
         throw CToolError(TOOL_EXIT_MISSING,
                          "the index is not built in " +
@@ -165,7 +180,7 @@ void CDataDirectory::RequireIndex() const
 
 void RequirePinyinTable(const std::string& strPath, const std::string& strAdvice)
 {
-    if (!IsFile(strPath.c_str()))
+    if (!IsFile(strPath))
     {
         throw CToolError(TOOL_EXIT_MISSING, "there is no pinyin table " + strPath, strAdvice);
     }

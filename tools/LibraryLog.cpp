@@ -1,15 +1,24 @@
 #include "tools/LibraryLog.h"
 
+#include "Common/DataPaths.h"
 #include "Common/Log.h"
 #include "Platform/LogSink.h"
 
+#include <unistd.h>
+
+#include <algorithm>
 #include <cstdlib>
+#include <filesystem>
+#include <system_error>
+
+namespace fs = std::filesystem;
 
 namespace
 {
 
 constexpr const char* PHASE_BEGIN = "QV_Contacts: ";
 constexpr const char* PHASE_TIME = " time = ";
+constexpr const char* BLANKS = " \n";
 
 void Drop(void* /*pContext*/, int /*iPriority*/, const char* /*szTag*/, const char* /*szText*/) {}
 
@@ -18,14 +27,36 @@ bool IsPhaseLine(const std::string& strLine)
     return strLine.find(PHASE_TIME) != std::string::npos;
 }
 
-std::string WithoutLineEnd(std::string strLine)
+std::string Trimmed(const std::string& strLine)
 {
-    while (!strLine.empty() && (strLine.back() == '\n' || strLine.back() == ' '))
-    {
-        strLine.pop_back();
-    }
-    return strLine;
+    const size_t uFirst = strLine.find_first_not_of(BLANKS);
+    return uFirst == std::string::npos
+               ? ""
+               : strLine.substr(uFirst, strLine.find_last_not_of(BLANKS) + 1 - uFirst);
 }
+
+// Whether the lock is refused for another reason than that somebody holds it.
+bool IsLockBroken()
+{
+    const char* szPath = CDataPaths::LockFile();
+    std::error_code error;
+    return fs::exists(szPath, error) &&
+           (!fs::is_regular_file(szPath, error) || access(szPath, R_OK | W_OK) != 0);
+}
+
+// What a part of a line tells.
+struct tag_Reason
+{
+    const char* szPart;
+    const char* szReason; // null: the lock's
+};
+
+constexpr tag_Reason REASONS[] = {
+    {"lock false", nullptr},
+    {"Lock share mem false", nullptr},
+    {"SQLITE_BUSY", "another process holds the database"},
+    {"damaged registration record", "the index is damaged"},
+};
 
 } // namespace
 
@@ -58,13 +89,39 @@ int CLibraryLog::PhaseTime(const char* szPhase) const
     return iTime;
 }
 
+std::string CLibraryLog::LockReason()
+{
+    return IsLockBroken() ? std::string("the lock file cannot be opened: ") + CDataPaths::LockFile()
+                          : "another process holds the store";
+}
+
+std::string CLibraryLog::WithReason(const std::string& strWhat) const
+{
+    for (const std::string& strLine : m_vErrors)
+    {
+        for (const tag_Reason& reason : REASONS)
+        {
+            if (strLine.find(reason.szPart) != std::string::npos)
+            {
+                return strWhat + ": " +
+                       (reason.szReason == nullptr ? LockReason() : reason.szReason);
+            }
+        }
+    }
+    return strWhat;
+}
+
 void CLibraryLog::Collect(void* pContext, int iPriority, const char* /*szTag*/, const char* szText)
 {
     CLibraryLog& log = *static_cast<CLibraryLog*>(pContext);
-    const std::string strLine = WithoutLineEnd(szText);
+    const std::string strLine = Trimmed(szText);
     if (iPriority >= QV_LOG_ERROR)
     {
-        log.m_vErrors.push_back(strLine);
+        std::vector<std::string>& vErrors = log.m_vErrors;
+        if (std::find(vErrors.begin(), vErrors.end(), strLine) == vErrors.end())
+        {
+            vErrors.push_back(strLine);
+        }
     }
     else if (IsPhaseLine(strLine))
     {

@@ -19,8 +19,12 @@ public:
 
     // The milliseconds of the last line "QV_Contacts: <szPhase> time = <n>", -1 without one.
     int PhaseTime(const char* szPhase) const;
-    // The lines of error priority.
+    // The lines of error priority, each once.
     const std::vector<std::string>& Errors() const { return m_vErrors; }
+    // Why the store's lock was refused.
+    static std::string LockReason();
+    // strWhat with the reason that the errors tell, as far as it is a usual one.
+    std::string WithReason(const std::string& strWhat) const;
 
 private:
     static void Collect(void* pContext, int iPriority, const char* szTag, const char* szText);

@@ -21,6 +21,11 @@ constexpr int TIME_SECTIONS = 6;
 
 [[noreturn]] void Fail(int iResult, const CLibraryLog& log)
 {
+    if (iResult == LOC_ERR_MAP)
+    {
+        throw CToolError(TOOL_EXIT_FAILED, "the search could not use the index's pinyin table",
+                         BUILD_ANEW, log.Errors());
+    }
     throw CToolError(TOOL_EXIT_FAILED, "the search failed (result " + std::to_string(iResult) + ")",
                      "", log.Errors());
 }
@@ -30,7 +35,7 @@ void RequireStoreRead(const tag_LocalizerResult& result, const CLibraryLog& log)
 {
     if (result.iResultNum == 0 && !log.Errors().empty())
     {
-        throw CToolError(TOOL_EXIT_FAILED, "the index could not be read",
+        throw CToolError(TOOL_EXIT_FAILED, log.WithReason("the index could not be read"),
                          "Try again when no other process holds it, or build it anew.",
                          log.Errors());
     }

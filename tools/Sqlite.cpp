@@ -54,7 +54,11 @@ CSqliteStatement::CSqliteStatement(const CSqliteDatabase& database, const char* 
 {
     if (sqlite3_prepare_v2(database.Handle(), szSql, -1, &m_pStatement, nullptr) != SQLITE_OK)
     {
-        Fail(database.Handle(), "the database is not a contacts database");
+        // A query that cannot be prepared names what is not there, unless the file is the problem.
+        const int iError = sqlite3_errcode(database.Handle());
+        const bool bOther = iError == SQLITE_ERROR || iError == SQLITE_NOTADB;
+        Fail(database.Handle(),
+             bOther ? "the database is not a contacts database" : "the database cannot be read");
     }
 }
 

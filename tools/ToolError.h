@@ -15,6 +15,9 @@ enum TOOL_EXIT : int
     TOOL_EXIT_MISSING = 3, // a file that another subcommand makes is not there
 };
 
+// Advice where the files of the index are damaged.
+constexpr const char* BUILD_ANEW = "Build the index anew with the subcommand index.";
+
 // Ends a subcommand: what is wrong, what to do about it (may be empty), and the log lines that tell
 // more. Control characters in them are escaped when the error is shown.
 class CToolError : public std::runtime_error

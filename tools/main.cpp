@@ -6,6 +6,10 @@
 
 #include <CLI/CLI.hpp>
 
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <cstdlib>
 #include <exception>
 #include <iostream>
 #include <string>
@@ -43,7 +47,7 @@ int Report(const CToolError& error)
     return error.Exit();
 }
 
-int RunCommandLine(CLI::App& app, int argc, char** argv)
+TOOL_EXIT Parse(CLI::App& app, int argc, char** argv)
 {
     try
     {
@@ -53,12 +57,32 @@ int RunCommandLine(CLI::App& app, int argc, char** argv)
     {
         return app.exit(error) == 0 ? TOOL_EXIT_DONE : TOOL_EXIT_USAGE;
     }
+    return TOOL_EXIT_DONE;
+}
+
+int RunCommandLine(CLI::App& app, int argc, char** argv)
+{
+    const TOOL_EXIT eExit = Parse(app, argc, argv);
     std::cout.flush();
     if (!std::cout)
     {
         throw CToolError(TOOL_EXIT_FAILED, "the output could not be written");
     }
-    return TOOL_EXIT_DONE;
+    return eExit;
+}
+
+// Of a stream that the caller closed, the descriptor would go to the next file that is opened, and
+// the output into that file. It is taken in a way that reading and writing fail.
+void TakeClosedStreams()
+{
+    for (const int iFd : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO})
+    {
+        if (fcntl(iFd, F_GETFD) == -1 &&
+            open("/dev/null", iFd == STDIN_FILENO ? O_WRONLY : O_RDONLY) != iFd)
+        {
+            std::_Exit(TOOL_EXIT_FAILED);
+        }
+    }
 }
 
 } // namespace
@@ -67,6 +91,7 @@ int main(int argc, char** argv)
 {
     try
     {
+        TakeClosedStreams();
         SilenceLibraryLog();
         CLI::App app("Builds, shows and searches the contact index of a provider's data "
                      "directory.",

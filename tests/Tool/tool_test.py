@@ -499,22 +499,63 @@ class ErrorsTest(ToolTest):
             self.assertRegex(process.stderr, r"\Aqvlocalize: .*\nRun with --help .*\n\Z")
             self.assertIn(text, process.stderr)
 
-    def test_a_database_of_something_else(self):
-        other = self.root / "other"
-        shutil.copytree(self.data, other)
-        (other / "databases/contacts2.db").write_text("no database")
-        self.fails(other, FAILED, "ReadAllLocalizer select contacts count sqlite3_prepare ERROR",
-                   "index")
-        self.fails(other, FAILED, "not a contacts database", "search", "a")
+    def test_tells_what_is_damaged(self):
+        special = ("search", "hj", "--type", "special")
+        reg, records, database = "ContactsReg.bin", "ContactsLocalizer.bin", "contacts2.db"
+        cases = [  # a file, what becomes of it, and what each call says of it
+            (reg, b"abc", {("show",): "could not be read", ("search", "a"): "could not be read"}),
+            (reg, b"\xff" * 12, {("show",): "the index is damaged"}),
+            (records, None, {("show",): "is damaged", ("search", "a"): "is damaged",
+                             ("notify", "star", "5"): "is damaged"}),
+            ("PyFileMappint.bin", b"abc", {special: "index's pinyin table",
+                                           ("search", "a"): "index's pinyin table"}),
+            (database, b"no database", {
+                ("index",): "ReadAllLocalizer select contacts count sqlite3_prepare ERROR",
+                ("search", "a"): "not a contacts database: file is not a database"}),
+            (database, b"", {("search", "a"): "not a contacts database: no such table"}),
+        ]
+        for name, content, calls in cases:
+            data = self.root / "damaged"
+            shutil.copytree(self.data, data)
+            path, = data.glob(f"*/{name}")
+            path.unlink()
+            if content is not None:
+                path.write_bytes(content)
+            for call, text in calls.items():
+                self.fails(data, FAILED, text, *call)
+            if name in (reg, records):
+                self.assertIn("Index built", run(data, "index", "--if-needed").stdout)
+                self.assertEqual(DONE, run(data, "show").returncode)
+            shutil.rmtree(data)
+
+    def test_a_lock_file_that_is_none_and_a_busy_database(self):
+        data = self.root / "locks"
+        shutil.copytree(self.data, data)
+        with contextlib.closing(sqlite3.connect(data / "databases/contacts2.db")) as database:
+            database.execute("BEGIN EXCLUSIVE")
+            self.fails(data, FAILED, "the database cannot be read: database is locked", "search", "")
+        (data / "files/memlock.ini").unlink()
+        (data / "files/memlock.ini").mkdir()
+        self.fails(data, FAILED, "the lock file cannot be opened", "search", "")
+
+    def test_output_that_cannot_be_written(self):
+        for call in (["search", "zs"], ["search", "zs", "--json"], ["--help"], ["index"]):
+            data = [] if call == ["--help"] else ["--data-dir", str(self.data)]
+            for close, target in (("", "/dev/full"), (">&-", "/dev/null")):
+                with open(target, "wb") as output:
+                    process = subprocess.run(
+                        ["bash", "-c", f'"$0" "$@" {close}', TOOL, *call, *data], stdout=output,
+                        stderr=subprocess.PIPE, encoding="utf-8", check=False)
+                self.assertEqual((FAILED, "qvlocalize: the output could not be written\n"),
+                                 (process.returncode, process.stderr), (call, target))
 
     def test_a_store_that_another_process_holds(self):
         with open(self.data / "files/memlock.ini", "ab") as lock:
             fcntl.flock(lock, fcntl.LOCK_EX)
-            self.fails(self.data, FAILED, "InitContactRecord write share memo lock", "index")
+            self.fails(self.data, FAILED, "(result -1): another process holds the store\n"
+                       "  QV_Contacts:InitContactRecord write share memo lock", "index")
             self.fails(self.data, FAILED, "the index could not be read", "search", "a", "--json")
-            process = run(self.data, "show")
-            self.assertEqual(FAILED, process.returncode)
-            self.assertIn("another process holds the store", process.stderr)
+            self.fails(self.data, FAILED, "another process holds the store", "show")
         self.check("search", "a")
 
 

@@ -425,6 +425,7 @@ class CompletionTest(unittest.TestCase):
         cases = [
             (["s"], {"sample", "search", "show"}),
             (["notify", "s"], {"star", "status"}),
+            (["--"], {"--help", "--version"}),
             (["search", "zs", "--p"], {"--phone", "--plain", "--postal"}),
             (["notify", "star", "--"], {"--data-dir", "--help", "--off"}),
             (["search", "--color", "a"], {"auto", "always"}),

@@ -14,10 +14,9 @@ _qvlocalize_value() {
 }
 
 _qvlocalize() {
-    local program=$1 current=$2 previous=$3 path=() help options value="" word
+    local program=$1 current=$2 previous=$3 path=() help options="" value="" word
     COMPREPLY=()
     help=$("$program" --help 2>/dev/null) || return
-    options=$help
     for word in "${COMP_WORDS[@]:1:COMP_CWORD-1}"; do
         if _qvlocalize_subcommands <<<"$help" | grep -qxF -e "$word"; then
             path+=("$word")
@@ -25,6 +24,7 @@ _qvlocalize() {
             options+=$'\n'$help
         fi
     done
+    options=${options:-$help} # the program's own options stand before a subcommand
 
     # "--type=w" is three words here.
     [[ $previous == = ]] && previous=${COMP_WORDS[COMP_CWORD-2]}

@@ -92,6 +92,14 @@ void SetContactedFirst(const CHeldRecords& store, int iSlot, int64_t llTime)
     }
 }
 
+// Without a store the build that writes the pinyin table never ended: names must not be kept by
+// whatever it left. With one, the table is complete and stays as it is.
+int CompletePinyinTable()
+{
+    tag_ContactReg reg = {};
+    return CStoreRegister::Inspect(&reg) == STORE_MISSING ? CQVLocalizerManager::InitMapFile() : 0;
+}
+
 // The listed contacts, their names converted; 0 or the failing step's code.
 int ReadChanged(CDBOperator& reader, int iRecordNum, long long* pIds, tag_ContactsInfo& changed)
 {
@@ -150,7 +158,11 @@ void CLocalizerLogic::OnContactsTableChanged()
 // Reads, converts, sorts and writes the contacts; what it leaves in record the caller releases.
 int CLocalizerLogic::RebuildStore(tag_ContactsInfo& record)
 {
-    int iRet = m_pDBOperator->ReadAllLocalizer(&record, 0, nullptr);
+    int iRet = CompletePinyinTable();
+    if (iRet == 0)
+    {
+        iRet = m_pDBOperator->ReadAllLocalizer(&record, 0, nullptr);
+    }
     if (iRet != 0)
     {
         return iRet;

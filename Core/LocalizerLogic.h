@@ -99,7 +99,8 @@ public:
     // remembers to. So it does with a store that a killed process left
     // unfinished and with a damaged one; the notifications of times and stars repair nothing.
 
-    // Rebuilds the store from the database in the stored order. The pinyin table stays as it is.
+    // Rebuilds the store from the database in the stored order. The pinyin table stays as it is,
+    // unless there is no store yet.
     void OnContactsTableChanged();
     // The iRecordNum contacts of pIds appeared, changed or went. Contacts that appear or go
     // together are named in one call: the stored count becomes the database's. The array is used

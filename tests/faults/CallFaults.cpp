@@ -109,6 +109,17 @@ void NoteMapping(void* pAddr, size_t uSize, int iProt, int iFlags, int iFd)
     }
 }
 
+void NoteFlush(const void* pAddr)
+{
+    for (const tag_Mapping& mapping : g_aMappings)
+    {
+        if (mapping.pAddr == pAddr)
+        {
+            Tell([&](CMapWatch& watch) { watch.Flushed(mapping.szFile); });
+        }
+    }
+}
+
 void ForgetMapping(void* pAddr)
 {
     for (tag_Mapping& mapping : g_aMappings)
@@ -204,9 +215,17 @@ extern "C"
         return IsOurs(iFd) && Fails({CALLS_FILES}, "fdatasync") ? -1 : 0;
     }
 
-    int msync(void* /*pAddr*/, size_t /*uSize*/, int /*iFlags*/)
+    int msync(void* pAddr, size_t /*uSize*/, int iFlags)
     {
-        return Fails({CALLS_FILES}, "msync") ? -1 : 0;
+        if (Fails({CALLS_FILES}, "msync"))
+        {
+            return -1;
+        }
+        if ((iFlags & MS_SYNC) != 0)
+        {
+            NoteFlush(pAddr);
+        }
+        return 0;
     }
 
     int flock(int iFd, int iOperation) noexcept

@@ -29,12 +29,14 @@ public:
     static const char* Failed();
 };
 
-// Is told of each mapping of a file below the data root after it was made and before it goes.
+// Is told of each mapping of a file below the data root after it was made, after it was flushed to
+// the disk and before it goes.
 // What it calls itself is neither counted nor told.
 class CMapWatch
 {
 public:
     virtual void Mapped(void* pAddr, size_t uSize, int iProt, int iFlags, const char* szFile) = 0;
+    virtual void Flushed(const char* szFile) = 0;
     virtual void Unmapping(void* pAddr, const char* szFile) = 0;
     // Null ends the watch.
     static void Set(CMapWatch* pWatch);

@@ -1,6 +1,6 @@
-// A process that dies between any two stores to the store files: each state of the files is marked
-// or right, shows nobody under another's name, and ends like a fresh build after the next
-// notification.
+// A process that dies between any two stores to the store files, and a machine that loses power
+// there: each state of the files is marked or right, shows nobody under another's name, and ends
+// like a fresh build after the next notification.
 
 #include "Common/DataPaths.h"
 #include "Filter/FilterChain.h"
@@ -13,6 +13,7 @@
 
 #include <gtest/gtest.h>
 #include <iostream>
+#include <map>
 #include <set>
 
 namespace
@@ -26,14 +27,15 @@ struct tag_Files
     std::string strReg;
     std::string strRecords;
 
+    std::string& Of(const tag_Step& step) { return step.bReg ? strReg : strRecords; }
     void Apply(const tag_Step& step)
     {
-        std::string& strFile = step.bReg ? strReg : strRecords;
-        if (step.uBytes == 0)
+        std::string& strFile = Of(step);
+        if (step.eKind == STEP_LENGTH)
         {
             strFile.resize(step.uOffset);
         }
-        else
+        else if (step.eKind == STEP_STORE)
         {
             strFile.replace(step.uOffset, step.uBytes, step.acBytes, step.uBytes);
         }
@@ -64,6 +66,90 @@ struct tag_Files
         }
         return strKind;
     }
+};
+
+// What a disk may hold of the files when the power goes: of each page what it held at the last
+// flush, or anything that it was since.
+class CDisk
+{
+public:
+    explicit CDisk(const tag_Files& files) : m_flushed(files) {}
+
+    void Note(const tag_Step& step, tag_Files& files)
+    {
+        if (step.eKind == STEP_FLUSH)
+        {
+            m_flushed.Of(step) = files.Of(step);
+            m_aPages[step.bReg ? 1 : 0].clear();
+        }
+        else if (step.eKind == STEP_LENGTH)
+        {
+            m_flushed.Apply(step);
+        }
+        else
+        {
+            for (size_t i = step.uOffset / PAGE; i * PAGE < step.uOffset + step.uBytes; ++i)
+            {
+                m_aPages[step.bReg ? 1 : 0][i].push_back(files.Of(step).substr(i * PAGE, PAGE));
+            }
+        }
+    }
+
+    // Calls fnLook with each state in which the registration record asks for no rebuild; false
+    // when there are too many, since records have changed under such a record.
+    template <typename FnLook>
+    bool EachWhole(FnLook fnLook) const
+    {
+        std::vector<std::string> vRegs = {m_flushed.strReg};
+        for (const auto& [uPage, vVersions] : m_aPages[1])
+        {
+            vRegs.insert(vRegs.end(), vVersions.begin(), vVersions.end());
+        }
+        size_t uStates = 1;
+        for (const auto& [uPage, vVersions] : m_aPages[0])
+        {
+            uStates = std::min(MAX_STATES, uStates * (vVersions.size() + 1));
+        }
+        for (const std::string& strReg : vRegs)
+        {
+            const tag_Files files = {strReg, m_flushed.strRecords};
+            if (files.Image().reg == tag_ContactReg{} || IsMarked(files.Image().reg))
+            {
+                continue;
+            }
+            if (uStates == MAX_STATES)
+            {
+                return false;
+            }
+            for (size_t i = 0; i < uStates; ++i)
+            {
+                fnLook(Mixed(files, i));
+            }
+        }
+        return true;
+    }
+
+private:
+    static constexpr size_t PAGE = 4096;
+    static constexpr size_t MAX_STATES = 1000;
+
+    // The uState-th choice of what is on each page of the records.
+    tag_Files Mixed(tag_Files files, size_t uState) const
+    {
+        for (const auto& [uPage, vVersions] : m_aPages[0])
+        {
+            const size_t uVersion = uState % (vVersions.size() + 1);
+            uState /= vVersions.size() + 1;
+            if (uVersion > 0)
+            {
+                files.strRecords.replace(uPage * PAGE, PAGE, vVersions[uVersion - 1]);
+            }
+        }
+        return files;
+    }
+
+    tag_Files m_flushed;
+    std::map<size_t, std::vector<std::string>> m_aPages[2]; // since then; records, then reg
 };
 
 // What a search of everybody shows in a marked store.
@@ -188,9 +274,18 @@ TEST_P(CStoreByStore, IsMarkedOrRight)
     const std::string strLastRecords = RecordsFile();
     std::set<std::string> setKinds;
     STORE_KIND eKind = KIND_NONE;
+    CDisk disk(files);
     for (uint32_t i = 0; i < steps->uSteps; ++i)
     {
         files.Apply(steps->aSteps[i]);
+        disk.Note(steps->aSteps[i], files);
+        const auto fnLook = [&](const tag_Files& left)
+        {
+            std::string strLeft;
+            Expect(KindOf(store, left.Image(), &strLeft) == KIND_WRONG ? "on disk: " + strLeft : "",
+                   i);
+        };
+        Expect(disk.EachWhole(fnLook) ? "" : "on disk: changes without a mark", i);
         std::string strWhy;
         eKind = KindOf(store, files.Image(), &strWhy);
         if (!Expect(eKind == KIND_WRONG ? strWhy : "", i) || !setKinds.insert(files.Kind()).second)

@@ -84,6 +84,7 @@ void OnStep(int /*iSignal*/, siginfo_t* /*pInfo*/, void* pContext)
         --pLast;
     }
     tag_Step& step = g_pSteps->aSteps[g_pSteps->uSteps++ % tag_Steps::MAX_STEPS];
+    step.eKind = STEP_STORE;
     step.bReg = g_bWindowOfReg;
     step.uBytes = static_cast<uint8_t>(pLast - pFirst);
     step.uOffset = static_cast<uint32_t>(pFirst - g_aRegions[g_bWindowOfReg ? 1 : 0].pAddr);
@@ -143,9 +144,18 @@ void CStoreStepper::Mapped(void* pAddr, size_t uSize, int iProt, int iFlags, con
     const std::string strBytes =
         CDataDirectory::ReadBytes(bReg ? CDataPaths::ContactReg() : CDataPaths::ContactRecords());
     tag_Step& step = g_pSteps->aSteps[g_pSteps->uSteps++];
-    step = {bReg, 0, static_cast<uint32_t>(strBytes.size()), {}};
+    step = {STEP_LENGTH, bReg, 0, static_cast<uint32_t>(strBytes.size()), {}};
     g_aRegions[bReg ? 1 : 0] = {static_cast<char*>(pAddr), (uSize + PAGE - 1) / PAGE * PAGE};
     mprotect(pAddr, uSize, PROT_READ);
+}
+
+void CStoreStepper::Flushed(const char* szFile)
+{
+    const bool bReg = std::strcmp(szFile, REG_FILE) == 0;
+    if (CAN_STEP && (bReg || std::strcmp(szFile, RECORDS_FILE) == 0))
+    {
+        g_pSteps->aSteps[g_pSteps->uSteps++] = {STEP_FLUSH, bReg, 0, 0, {}};
+    }
 }
 
 void CStoreStepper::Unmapping(void* pAddr, const char* szFile)

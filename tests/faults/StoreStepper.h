@@ -6,13 +6,21 @@
 #include <cstdint>
 #include <string>
 
-// What one instruction changed in a mapped file, or that a file was mapped with this length.
+enum STEP_KIND : uint8_t
+{
+    STEP_STORE,  // one instruction changed uBytes of a mapped file
+    STEP_LENGTH, // a file was mapped; uOffset is its length
+    STEP_FLUSH   // a file was flushed to the disk
+};
+
+// What happened to a mapped file.
 struct tag_Step
 {
     static constexpr size_t MAX_BYTES = 64; // the widest store
 
-    bool bReg;      // of the registration record, else of the records
-    uint8_t uBytes; // 0: uOffset is the file's length
+    STEP_KIND eKind;
+    bool bReg; // of the registration record, else of the records
+    uint8_t uBytes;
     uint32_t uOffset;
     char acBytes[MAX_BYTES];
 };
@@ -43,6 +51,7 @@ public:
     const std::string& Fault() const { return m_strFault; }
 
     void Mapped(void* pAddr, size_t uSize, int iProt, int iFlags, const char* szFile) override;
+    void Flushed(const char* szFile) override;
     void Unmapping(void* pAddr, const char* szFile) override;
 
 private:

@@ -10,12 +10,14 @@
 #include "LocalizerImpl/Syllables.h"
 #include "MemManager/MappingGuards.h"
 #include "MemManager/ShareMemory.h"
+#include "MemManager/StoreFile.h"
 
+#include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/time.h>
+#include <unistd.h>
 
 #include <algorithm>
-#include <cstdio>
 #include <cstring>
 #include <iterator>
 #include <memory>
@@ -35,23 +37,18 @@ uint32_t WordNumber(const char (&szWord)[sizeof(PYOFWORDS::szWord)])
     return uNumber;
 }
 
-struct CFileCloser
-{
-    void operator()(std::FILE* pFile) const { std::fclose(pFile); }
-};
-
 // Fills the buffer, PY_FILE_SIZE zeroed bytes, from the shipped table.
 bool ReadShippedTable(char* pBuffer)
 {
-    const std::unique_ptr<std::FILE, CFileCloser> file(
-        std::fopen(CDataPaths::PinyinSource(), "r+b"));
-    if (file == nullptr)
+    const int iFd = OpenStoreFile(CDataPaths::PinyinSource(), O_RDWR);
+    if (iFd < 0)
     {
         return false;
     }
     // A short file is no failure: the characters that it lacks have no readings.
-    static_cast<void>(std::fread(pBuffer, 1, PY_FILE_SIZE, file.get()));
-    return true;
+    const ssize_t iRead = read(iFd, pBuffer, PY_FILE_SIZE);
+    close(iFd);
+    return iRead >= 0;
 }
 
 } // namespace

@@ -260,6 +260,8 @@ extern "C"
         return g_bFaultsOn ? 0 : pfnNext(iClock, iFlags, pTime, pRest);
     }
 
+    // The sanitizers keep allocation to themselves.
+#ifndef __SANITIZE_ADDRESS__
     void* malloc(size_t uSize) noexcept
     {
         QV_NEXT(malloc);
@@ -277,6 +279,7 @@ extern "C"
         QV_NEXT(realloc);
         return Fails({CALLS_MEMORY}, "realloc") ? nullptr : pfnNext(pMemory, uSize);
     }
+#endif
 }
 
 CCallFault::CCallFault(CALL_GROUP eGroup, int iGranted, int iError, bool bOnce)

@@ -1,16 +1,16 @@
 # Completion for bash. It reads the program's own --help, and so knows what the program knows.
 
 _qvlocalize_subcommands() {
-    sed -n '/^Subcommands:/,/^$/s/^  \([a-z-]*\) .*/\1/p'
+    sed -n '/^S[Uu][Bb]/,$s/^  \([a-z-]\{1,\}\)  .*/\1/p'
 }
 
 _qvlocalize_options() {
-    sed -n 's/^  \(-[a-z],\)\{0,1\}\(--[a-z-]*\).*/\2/p'
+    sed -n 's/^  *\(-[a-z], *\)\{0,1\}\(--[a-z-]*\).*/\2/p'
 }
 
 # What the option $1 takes, such as DIR, FILE or TEXT:{a,b}; nothing for a flag.
 _qvlocalize_value() {
-    sed -n "s/^  $1 \([A-Z]\{1,\}\(:{[^}]*}\)\{0,1\}\)\([= ].*\)\{0,1\}$/\1/p"
+    sed -n "s/^  *$1 \([A-Z]\{1,\}\(:{[^}]*}\)\{0,1\}\)\([= ].*\)\{0,1\}$/\1/p"
 }
 
 _qvlocalize() {

@@ -44,7 +44,7 @@ class SubprojectTest(unittest.TestCase):
         shutil.copy(pathlib.Path(__file__).with_name("main.cpp"), cls.parent)
 
     def configure(self, *options):
-        run(CMAKE, "-G", GENERATOR, "-S", self.parent, "-B", self.build, "-UQV_*", "-UBUILD_TESTING",
+        run(CMAKE, "--fresh", "-G", GENERATOR, "-S", self.parent, "-B", self.build,
             f"-DCMAKE_CXX_COMPILER={COMPILER}", f"-DCMAKE_CXX_FLAGS={FLAGS}",
             "-DCMAKE_BUILD_TYPE=Release", *options)
 

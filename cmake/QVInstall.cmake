@@ -79,6 +79,7 @@ install(FILES ${PROJECT_BINARY_DIR}/data/pyfile.bin DESTINATION ${CMAKE_INSTALL_
 install(FILES LICENSE NOTICE DESTINATION ${CMAKE_INSTALL_DOCDIR})
 if(QV_BUILD_TOOL)
   install(TARGETS qvlocalize RUNTIME DESTINATION ${CMAKE_INSTALL_BINDIR})
+  install(PROGRAMS tools/import_contacts.py DESTINATION ${CMAKE_INSTALL_DATADIR}/QV_Localize)
   install(FILES tools/qvlocalize.1 DESTINATION ${CMAKE_INSTALL_MANDIR}/man1)
   install(FILES tools/completion/qvlocalize.bash RENAME qvlocalize
           DESTINATION ${CMAKE_INSTALL_DATADIR}/bash-completion/completions)

@@ -4,13 +4,13 @@
 #   scripts/setup.sh --lint   also what .ci/run checks with: clang and its tools, libabigail, Doxygen
 #   scripts/setup.sh --armhf  also the cross compiler and the emulator for 32-bit ARM
 #   scripts/setup.sh --peers  also what some tests meet beside the library and are skipped without:
-#                             a JDK, a library with names of ours
+#                             a JDK, a library with names of ours, another reader of vCards
 #   scripts/setup.sh --bare   only what makes a bare Debian to try the two commands in
 # Touches neither apt nor the network when nothing is missing.
 set -euo pipefail
 
 packages=(
-    g++ cmake ninja-build python3
+    g++ cmake ninja-build python3 python3-vobject
     libsqlite3-dev libcli11-dev nlohmann-json3-dev
     libgtest-dev libbenchmark-dev unicode-data pkg-config
 )
@@ -20,7 +20,7 @@ esac
 case "${1:-}" in
     --lint) packages+=(clang clang-format-14 clang-tidy-14 abigail-tools doxygen) ;;
     --armhf) packages+=(g++-arm-linux-gnueabihf qemu-user googletest) ;;
-    --peers) packages+=(openjdk-17-jdk-headless libwinpr2-2) ;;
+    --peers) packages+=(openjdk-17-jdk-headless libwinpr2-2 python3-gi gir1.2-ebookcontacts-1.2) ;;
     --bare) packages=(debootstrap debian-archive-keyring git) ;;
 esac
 

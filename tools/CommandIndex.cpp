@@ -1,13 +1,11 @@
 #include "tools/Commands.h"
 
 #include "Common/DataPaths.h"
-#include "Core/LocalizerCodes.h"
 #include "Core/LocalizerLogic.h"
 #include "MemManager/MemManger.h"
 #include "tools/DataDirectory.h"
-#include "tools/LibraryLog.h"
+#include "tools/IndexUpdate.h"
 #include "tools/PrintableText.h"
-#include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
 
@@ -16,6 +14,7 @@
 #include <iostream>
 #include <memory>
 #include <system_error>
+#include <vector>
 
 namespace fs = std::filesystem;
 
@@ -28,50 +27,12 @@ struct tag_IndexOptions
     bool bIfNeeded = false;
 };
 
-// A phase of the build by the name that its time is logged under.
-struct tag_Phase
+void PrintPhases(const std::vector<tag_IndexPhase>& vPhases)
 {
-    const char* szLogName;
-    const char* szMeaning;
-};
-
-constexpr tag_Phase PHASES[] = {
-    {"MemInit IFL_InitalMap", "copy the pinyin table"},
-    {"MemInit ReadAllLocalizer", "read the database"},
-    {"MemInit IFL_PtrQuickSort", "spell and sort the names"},
-    {"MemInit InitContactRecord", "write the store"},
-};
-
-std::string FailureText(int iResult)
-{
-    if (iResult == LOC_ERR_MAP)
+    for (const tag_IndexPhase& phase : vPhases)
     {
-        return "the library could not use its pinyin table";
-    }
-    return "the library could not build the index (result " + std::to_string(iResult) + ")";
-}
-
-void BuildIndex(const CDataDirectory& directory, const CLibraryLog& log)
-{
-    directory.RequireDatabase();
-    directory.RequirePinyinSource();
-    CLocalizerLogic logic;
-    const int iResult = logic.MemInit(true);
-    if (iResult != 0)
-    {
-        throw CToolError(TOOL_EXIT_FAILED, log.WithReason(FailureText(iResult)),
-                         "Check that the database is a contacts database, that the files can be "
-                         "written and that no other process holds the store.",
-                         log.Errors());
-    }
-}
-
-void PrintPhases(const CLibraryLog& log)
-{
-    for (const tag_Phase& phase : PHASES)
-    {
-        std::cout << "  " << std::left << std::setw(26) << phase.szMeaning << std::right
-                  << std::setw(6) << log.PhaseTime(phase.szLogName) << " ms\n";
+        std::cout << "  " << std::left << std::setw(26) << phase.strMeaning << std::right
+                  << std::setw(6) << phase.iMilliseconds << " ms\n";
     }
 }
 
@@ -119,16 +80,10 @@ void RunIndex(const tag_IndexOptions& options)
 {
     options.directory.Use();
     const bool bBuild = !options.bIfNeeded || !IsIndexUsable();
-    const CLibraryLog log;
-    if (bBuild)
-    {
-        BuildIndex(options.directory, log);
-    }
+    const std::vector<tag_IndexPhase> vPhases =
+        bBuild ? BuildIndex(options.directory) : std::vector<tag_IndexPhase>();
     PrintHeading(bBuild);
-    if (bBuild)
-    {
-        PrintPhases(log);
-    }
+    PrintPhases(vPhases);
     PrintFiles();
 }
 

@@ -1,16 +1,14 @@
 #include "tools/Commands.h"
 
 #include "Core/LocalizerLogic.h"
-#include "MemManager/MemManger.h"
 #include "tools/DataDirectory.h"
+#include "tools/IndexUpdate.h"
 #include "tools/LibraryLog.h"
 #include "tools/OptionChecks.h"
-#include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
 
 #include <functional>
-#include <iostream>
 #include <memory>
 #include <string>
 #include <vector>
@@ -42,20 +40,6 @@ void TellContacts(CLocalizerLogic& logic, tag_NotifyOptions& options)
     }
 }
 
-// The handlers report nothing; what they could not do shows in the registration record.
-void RequireComplete(const CLibraryLog& log)
-{
-    int iTotal = 0;
-    const int iCapacity = CMemManger().GetMemSize(&iTotal);
-    if (iTotal > iCapacity || iCapacity == 0)
-    {
-        throw CToolError(
-            TOOL_EXIT_FAILED, log.WithReason("the index does not hold what the database holds"),
-            "The next notification of contacts or status builds it anew.", log.Errors());
-    }
-    std::cout << "The index holds " << iTotal << " contacts, with room for " << iCapacity << '\n';
-}
-
 void RunNotify(tag_NotifyOptions& options, const Handler& fnHandler)
 {
     options.directory.Use();
@@ -64,7 +48,7 @@ void RunNotify(tag_NotifyOptions& options, const Handler& fnHandler)
     const CLibraryLog log;
     CLocalizerLogic logic;
     fnHandler(logic, options);
-    RequireComplete(log);
+    PrintCompleteIndex(log);
 }
 
 CLI::App* AddEvent(CLI::App& notify, const OptionsPtr& pOptions, const char* szName,

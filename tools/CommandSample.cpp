@@ -1,12 +1,14 @@
 #include "tools/Commands.h"
 
 #include "Common/DataPaths.h"
+#include "tools/ContactDatabase.h"
 #include "tools/DataDirectory.h"
+#include "tools/InstalledFiles.h"
 #include "tools/LocalizerKeys.h"
 #include "tools/OptionChecks.h"
 #include "tools/PrintableText.h"
+#include "tools/Progress.h"
 #include "tools/SampleContacts.h"
-#include "tools/SampleDatabase.h"
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
@@ -25,17 +27,6 @@ namespace
 constexpr int DEFAULT_CONTACTS = 600;
 constexpr int MAX_CONTACTS = 200000;
 constexpr int64_t DEFAULT_NOW_MS = 1735689600000; // the first day of 2025, UTC
-
-// The table that was installed with the program, else the one of its build, by their places beside
-// the program: an installed program knows nothing of the machine that it was built on.
-std::string DefaultPinyinTable()
-{
-    std::error_code error;
-    const fs::path directory = fs::read_symlink("/proc/self/exe", error).parent_path();
-    const fs::path installed = (directory / QV_TOOL_INSTALLED_PYFILE).lexically_normal();
-    const fs::path built = (directory / QV_TOOL_BUILT_PYFILE).lexically_normal();
-    return fs::is_regular_file(built, error) ? built.string() : installed.string();
-}
 
 struct tag_SampleOptions
 {
@@ -57,38 +48,15 @@ void RefuseToReplace()
     }
 }
 
-void InstallPinyinTable(const std::string& strSource)
-{
-    RequirePinyinTable(strSource, "Name the file with --pyfile, or build the target qv_pyfile.");
-    const char* szTarget = CDataPaths::PinyinSource();
-    std::error_code error;
-    if (fs::equivalent(strSource, szTarget, error))
-    {
-        return;
-    }
-    fs::copy_file(strSource, szTarget, fs::copy_options::overwrite_existing, error);
-    if (!error)
-    {
-        // The library opens its table for writing too, and the copy of a read-only file is one.
-        fs::permissions(szTarget, fs::perms::owner_read | fs::perms::owner_write,
-                        fs::perm_options::add, error);
-    }
-    if (error)
-    {
-        throw CToolError(TOOL_EXIT_FAILED, std::string("cannot copy ") + strSource + " to " +
-                                               szTarget + ": " + error.message());
-    }
-}
-
 template <typename Test>
-auto CountIf(const std::vector<tag_SampleContact>& vContacts, Test test)
+auto CountIf(const std::vector<tag_DatabaseContact>& vContacts, Test test)
 {
     return std::count_if(vContacts.begin(), vContacts.end(), test);
 }
 
-void PrintSummary(const std::vector<tag_SampleContact>& vContacts)
+void PrintSummary(const std::vector<tag_DatabaseContact>& vContacts)
 {
-    using Contact = const tag_SampleContact&;
+    using Contact = const tag_DatabaseContact&;
     std::cout << "Wrote " << vContacts.size() << " contacts to "
               << PrintableText(CDataPaths::Database()) << ":\n"
               << "  " << CountIf(vContacts, [](Contact c) { return c.bVisible; }) << " visible, "
@@ -97,6 +65,21 @@ void PrintSummary(const std::vector<tag_SampleContact>& vContacts)
               << CountIf(vContacts, [](Contact c) { return c.strStatus == "online"; })
               << " online, groups 1 to " << SAMPLE_GROUPS << ", accounts 1 to " << SAMPLE_ACCOUNTS
               << "\n";
+}
+
+void WriteDatabase(std::vector<tag_DatabaseContact>& vContacts)
+{
+    CProgress progress("Writing contacts");
+    CContactDatabase database = CContactDatabase::Replace(CDataPaths::Database());
+    CLocalizerKeys keys(true);
+    uint64_t uDone = 0;
+    for (tag_DatabaseContact& contact : vContacts)
+    {
+        contact.strKey = keys.KeyOf(contact.strName);
+        database.Add(contact);
+        progress.Set(++uDone, vContacts.size());
+    }
+    database.Commit();
 }
 
 void RunSample(const tag_SampleOptions& options)
@@ -108,9 +91,8 @@ void RunSample(const tag_SampleOptions& options)
     }
     options.directory.Create();
     InstallPinyinTable(options.strPinyinTable);
-    std::vector<tag_SampleContact> vContacts = MakeSampleContacts(options.iCount, options.llNow);
-    FillLocalizerKeys(vContacts);
-    WriteSampleDatabase(CDataPaths::Database(), vContacts);
+    std::vector<tag_DatabaseContact> vContacts = MakeSampleContacts(options.iCount, options.llNow);
+    WriteDatabase(vContacts);
     PrintSummary(vContacts);
     std::cout << "Next: " << options.directory.CommandLine("index") << "\n";
 }

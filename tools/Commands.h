@@ -10,6 +10,7 @@ class App;
 }
 
 void AddSampleCommand(CLI::App& app);
+void AddImportCommand(CLI::App& app);
 void AddIndexCommand(CLI::App& app);
 void AddSearchCommand(CLI::App& app);
 void AddShowCommand(CLI::App& app);

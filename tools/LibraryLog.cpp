@@ -10,6 +10,7 @@
 #include <cstdlib>
 #include <filesystem>
 #include <system_error>
+#include <utility>
 
 namespace fs = std::filesystem;
 
@@ -65,7 +66,7 @@ void SilenceLibraryLog()
     CLogSink::Set(&Drop, nullptr);
 }
 
-CLibraryLog::CLibraryLog()
+CLibraryLog::CLibraryLog(std::function<void()> fnPhase) : m_fnPhase(std::move(fnPhase))
 {
     CLogSink::Set(&CLibraryLog::Collect, this);
 }
@@ -126,5 +127,9 @@ void CLibraryLog::Collect(void* pContext, int iPriority, const char* /*szTag*/, 
     else if (IsPhaseLine(strLine))
     {
         log.m_vPhases.push_back(strLine);
+        if (log.m_fnPhase)
+        {
+            log.m_fnPhase();
+        }
     }
 }

@@ -1,6 +1,7 @@
 #ifndef QV_TOOLS_LIBRARYLOG_H
 #define QV_TOOLS_LIBRARYLOG_H
 
+#include <functional>
 #include <string>
 #include <vector>
 
@@ -12,7 +13,8 @@ void SilenceLibraryLog();
 class CLibraryLog
 {
 public:
-    CLibraryLog();
+    // fnPhase, when given, is told of the end of each phase of a build.
+    explicit CLibraryLog(std::function<void()> fnPhase = nullptr);
     ~CLibraryLog();
     CLibraryLog(const CLibraryLog&) = delete;
     CLibraryLog& operator=(const CLibraryLog&) = delete;
@@ -29,6 +31,7 @@ public:
 private:
     static void Collect(void* pContext, int iPriority, const char* szTag, const char* szText);
 
+    std::function<void()> m_fnPhase;
     std::vector<std::string> m_vPhases;
     std::vector<std::string> m_vErrors;
 };

@@ -1,17 +1,22 @@
 #include "tools/LocalizerKeys.h"
 
-#include "Core/LocalizerLogic.h"
+#include "Common/DataPaths.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "tools/LibraryLog.h"
 #include "tools/ToolError.h"
 #include "tools/Utf8Text.h"
+
+#include <filesystem>
+#include <system_error>
+
+namespace fs = std::filesystem;
 
 namespace
 {
 
 void MakeSharedTable()
 {
-    CLibraryLog log;
+    const CLibraryLog log;
     if (CQVLocalizerManager::InitMapFile() != 0)
     {
         throw CToolError(TOOL_EXIT_FAILED, "the library could not make its pinyin table", "",
@@ -19,45 +24,34 @@ void MakeSharedTable()
     }
 }
 
-// The pinyin table, open for as long as names are converted.
-class CKeyMaker
-{
-public:
-    CKeyMaker() : m_hMapping(m_logic.CreatePinYinFileMapping())
-    {
-        if (m_hMapping == -1)
-        {
-            throw CToolError(TOOL_EXIT_FAILED, "the library could not open its pinyin table");
-        }
-    }
-    ~CKeyMaker() { m_logic.ReleasePinYinFileMapping(m_hMapping); }
-    CKeyMaker(const CKeyMaker&) = delete;
-    CKeyMaker& operator=(const CKeyMaker&) = delete;
-
-    std::string KeyOf(const std::string& strName)
-    {
-        std::wstring wstrName = WideText(strName);
-        wchar_t szCodes[CONTACT_MAX_KEY + 1] = {};
-        if (m_logic.GetLocalizerString(m_hMapping, wstrName.data(), szCodes) != 0)
-        {
-            throw CToolError(TOOL_EXIT_FAILED, "the library could not convert the name " + strName);
-        }
-        return Utf8Text(szCodes);
-    }
-
-private:
-    CLocalizerLogic m_logic;
-    long m_hMapping;
-};
-
 } // namespace
 
-void FillLocalizerKeys(std::vector<tag_SampleContact>& vContacts)
+CLocalizerKeys::CLocalizerKeys(bool bRenew)
 {
-    MakeSharedTable();
-    CKeyMaker maker;
-    for (tag_SampleContact& contact : vContacts)
+    std::error_code error;
+    if (bRenew || !fs::exists(CDataPaths::PinyinMapping(), error))
     {
-        contact.strKey = maker.KeyOf(contact.strName);
+        MakeSharedTable();
     }
+    m_hMapping = m_logic.CreatePinYinFileMapping();
+    if (m_hMapping == -1)
+    {
+        throw CToolError(TOOL_EXIT_FAILED, "the library could not open its pinyin table");
+    }
+}
+
+CLocalizerKeys::~CLocalizerKeys()
+{
+    m_logic.ReleasePinYinFileMapping(m_hMapping);
+}
+
+std::string CLocalizerKeys::KeyOf(const std::string& strName)
+{
+    std::wstring wstrName = WideText(strName);
+    wchar_t szCodes[CONTACT_MAX_KEY + 1] = {};
+    if (m_logic.GetLocalizerString(m_hMapping, wstrName.data(), szCodes) != 0)
+    {
+        throw CToolError(TOOL_EXIT_FAILED, "the library could not convert the name " + strName);
+    }
+    return Utf8Text(szCodes);
 }

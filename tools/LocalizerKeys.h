@@ -1,12 +1,27 @@
 #ifndef QV_TOOLS_LOCALIZERKEYS_H
 #define QV_TOOLS_LOCALIZERKEYS_H
 
-#include "tools/SampleContacts.h"
+#include "Core/LocalizerLogic.h"
 
-#include <vector>
+#include <string>
 
-// Fills every contact's strKey as the provider does: makes the shared pinyin table, opens it
-// once and asks the library for the codes of each name. Throws CToolError.
-void FillLocalizerKeys(std::vector<tag_SampleContact>& vContacts);
+// Computes the column `localizerkey` as the provider does: opens the shared pinyin table once and
+// asks the library for the codes of each name. Every operation throws CToolError.
+class CLocalizerKeys
+{
+public:
+    // Makes the shared table of the shipped one first where it is missing, or when bRenew.
+    explicit CLocalizerKeys(bool bRenew);
+    ~CLocalizerKeys();
+    CLocalizerKeys(const CLocalizerKeys&) = delete;
+    CLocalizerKeys& operator=(const CLocalizerKeys&) = delete;
+
+    // The codes, in UTF-8, of a name in UTF-8.
+    std::string KeyOf(const std::string& strName);
+
+private:
+    CLocalizerLogic m_logic;
+    long m_hMapping;
+};
 
 #endif

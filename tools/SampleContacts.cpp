@@ -49,7 +49,7 @@ std::string AccountsOf(int iIndex)
     }
 }
 
-void SetFlags(tag_SampleContact& contact, int iIndex)
+void SetFlags(tag_DatabaseContact& contact, int iIndex)
 {
     contact.bVisible = iIndex % 17 != 16;
     contact.bSecret = iIndex % 23 == 5;
@@ -59,7 +59,7 @@ void SetFlags(tag_SampleContact& contact, int iIndex)
     contact.bAddress = iIndex % 7 == 2;
 }
 
-void SetHistory(tag_SampleContact& contact, int iIndex, int64_t llNow)
+void SetHistory(tag_DatabaseContact& contact, int iIndex, int64_t llNow)
 {
     contact.iTimesContacted = iIndex * 7 % 40;
     if (contact.iTimesContacted > 0)
@@ -69,7 +69,7 @@ void SetHistory(tag_SampleContact& contact, int iIndex, int64_t llNow)
     }
 }
 
-void SetStatus(tag_SampleContact& contact, int iIndex)
+void SetStatus(tag_DatabaseContact& contact, int iIndex)
 {
     if (iIndex % 4 == 1)
     {
@@ -78,9 +78,9 @@ void SetStatus(tag_SampleContact& contact, int iIndex)
     }
 }
 
-tag_SampleContact MakeContact(int iIndex, int64_t llNow)
+tag_DatabaseContact MakeContact(int iIndex, int64_t llNow)
 {
-    tag_SampleContact contact;
+    tag_DatabaseContact contact;
     contact.llID = IdOf(iIndex);
     contact.strName = SampleName(iIndex);
     contact.strGroups = GroupsOf(iIndex);
@@ -93,9 +93,9 @@ tag_SampleContact MakeContact(int iIndex, int64_t llNow)
 
 } // namespace
 
-std::vector<tag_SampleContact> MakeSampleContacts(int iCount, int64_t llNow)
+std::vector<tag_DatabaseContact> MakeSampleContacts(int iCount, int64_t llNow)
 {
-    std::vector<tag_SampleContact> vContacts;
+    std::vector<tag_DatabaseContact> vContacts;
     vContacts.reserve(static_cast<size_t>(iCount));
     for (int i = 0; i < iCount; ++i)
     {

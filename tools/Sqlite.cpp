@@ -21,6 +21,11 @@ CSqliteDatabase CSqliteDatabase::OpenForReading(const std::string& strPath)
     return {strPath, SQLITE_OPEN_READONLY};
 }
 
+CSqliteDatabase CSqliteDatabase::OpenForWriting(const std::string& strPath)
+{
+    return {strPath, SQLITE_OPEN_READWRITE};
+}
+
 CSqliteDatabase CSqliteDatabase::Create(const std::string& strPath)
 {
     return {strPath, SQLITE_OPEN_READWRITE | SQLITE_OPEN_CREATE};
@@ -34,7 +39,7 @@ CSqliteDatabase::CSqliteDatabase(const std::string& strPath, int iFlags)
         sqlite3_close(m_pDatabase);
         throw CToolError(TOOL_EXIT_FAILED, "cannot open " + strPath + ": " + strReason);
     }
-    sqlite3_busy_timeout(m_pDatabase, BUSY_WAIT_MS);
+    SetBusyWait(BUSY_WAIT_MS);
 }
 
 CSqliteDatabase::~CSqliteDatabase()
@@ -48,6 +53,11 @@ void CSqliteDatabase::Execute(const char* szSql)
     {
         Fail(m_pDatabase, "the database refuses a change");
     }
+}
+
+void CSqliteDatabase::SetBusyWait(int iMilliseconds)
+{
+    sqlite3_busy_timeout(m_pDatabase, iMilliseconds);
 }
 
 CSqliteStatement::CSqliteStatement(const CSqliteDatabase& database, const char* szSql)
@@ -105,4 +115,9 @@ std::string CSqliteStatement::Text(int iColumn) const
 {
     const unsigned char* pText = sqlite3_column_text(m_pStatement, iColumn);
     return pText == nullptr ? std::string() : reinterpret_cast<const char*>(pText);
+}
+
+int64_t CSqliteStatement::Number(int iColumn) const
+{
+    return sqlite3_column_int64(m_pStatement, iColumn);
 }

@@ -7,17 +7,22 @@
 struct sqlite3;
 struct sqlite3_stmt;
 
-// An open database file. Every operation that SQLite refuses throws CToolError with its message.
+// An open database file. Every operation that SQLite refuses throws CToolError with its message;
+// one that another process keeps from the file tries again for two seconds before it is refused.
 class CSqliteDatabase
 {
 public:
     static CSqliteDatabase OpenForReading(const std::string& strPath);
-    static CSqliteDatabase Create(const std::string& strPath);
+    static CSqliteDatabase OpenForWriting(const std::string& strPath); // it must be there
+    static CSqliteDatabase Create(const std::string& strPath);         // unless it is there
     ~CSqliteDatabase();
     CSqliteDatabase(const CSqliteDatabase&) = delete;
     CSqliteDatabase& operator=(const CSqliteDatabase&) = delete;
 
+    // Runs statements without parameters whose rows nobody wants.
     void Execute(const char* szSql);
+    // How long an operation waits for another process.
+    void SetBusyWait(int iMilliseconds);
     sqlite3* Handle() const { return m_pDatabase; }
 
 private:
@@ -42,8 +47,20 @@ public:
     bool Step();
     // Makes the statement ready for its next run.
     void Reset();
+    // Runs a change with these values for its parameters, in their order.
+    template <typename... Values>
+    void Run(const Values&... values)
+    {
+        int iParameter = 0;
+        (Bind(++iParameter, values), ...);
+        Step();
+        Reset();
+    }
+
     // Text of a column of the current row, empty for null.
     std::string Text(int iColumn) const;
+    // Number in a column of the current row, 0 for null.
+    int64_t Number(int iColumn) const;
 
 private:
     sqlite3_stmt* m_pStatement = nullptr;

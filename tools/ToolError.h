@@ -12,7 +12,8 @@ enum TOOL_EXIT : int
     TOOL_EXIT_DONE = 0,    // also for a search without matches
     TOOL_EXIT_FAILED = 1,  // the library, SQLite or the system could not do it
     TOOL_EXIT_USAGE = 2,   // the command line asks for something that cannot be done
-    TOOL_EXIT_MISSING = 3, // a file that another subcommand makes is not there
+    TOOL_EXIT_MISSING = 3, // a file that another subcommand makes, or a package, is not there
+    TOOL_EXIT_PARTLY = 4,  // something in an imported file was refused, the rest taken
 };
 
 // Advice where the files of the index are damaged.

@@ -20,13 +20,16 @@ namespace
 constexpr const char* EXIT_CODES = "Exit codes: 0 done (also a search without matches), "
                                    "1 the library or the system failed,\n"
                                    "2 wrong use of the command line, 3 no database, pinyin table "
-                                   "or index there.";
+                                   "or index there,\n"
+                                   "or no file or package to import with, 4 imported except for "
+                                   "what was refused.";
 
 void AddCommands(CLI::App& app)
 {
     app.require_subcommand(1);
     app.footer(EXIT_CODES); // subcommands added later inherit it
     AddSampleCommand(app);
+    AddImportCommand(app);
     AddIndexCommand(app);
     AddSearchCommand(app);
     AddShowCommand(app);

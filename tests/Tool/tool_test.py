@@ -485,7 +485,7 @@ class ErrorsTest(ToolTest):
 
     def test_refuses_a_wrong_command_line_by_name(self):
         for call, text in (
-                (["serch", "a"], 'unknown subcommand "serch"; there are sample, index, search'),
+                (["serch", "a"], 'unknown subcommand "serch"; there are sample, import, index, search'),
                 (["--data-dir", "x", "search", "a"], "--data-dir is not an option of qvlocalize;"),
                 (["search", "a", "--count", "1"], "--count is not an option of search"),
                 (["search", "a", "b"], "not expected: b"),

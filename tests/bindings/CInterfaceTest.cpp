@@ -86,7 +86,7 @@ protected:
     void FillDatabase()
     {
         std::vector<tag_ProviderContact> vContacts;
-        for (const tag_SampleContact& sample : MakeSampleContacts(CONTACTS, NOW))
+        for (const tag_DatabaseContact& sample : MakeSampleContacts(CONTACTS, NOW))
         {
             tag_ProviderContact contact;
             contact.iId = static_cast<int>(sample.llID);

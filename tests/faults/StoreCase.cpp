@@ -126,7 +126,7 @@ const std::vector<tag_Change>& AllChanges()
         {"SortType", fnNothing,
          [](CLocalizerLogic& logic)
          {
-             logic.SetSortType(1 - logic.OnGetSortType());
+             logic.SetSortType(logic.OnGetSortType() == 0 ? 1 : 0);
              return 0;
          }},
     };

@@ -40,6 +40,8 @@ STORE_STATE Classify(const tag_ContactReg& reg)
     const int64_t llFileSize = FileSize(CDataPaths::ContactRecords());
     if (llFileSize == SIZE_UNKNOWN)
     {
+        QV_LOGE(QV_LOG_TAG, "QV_Contacts: %s is no file or cannot be examined\n",
+                CDataPaths::ContactRecords());
         return STORE_UNREADABLE;
     }
     if (CStoreRegister::IsDamaged(reg, llFileSize))

@@ -287,6 +287,10 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
     const bool bKnown = IsKnownType(eSearchType);
     const bool bComplete = szInput != nullptr && pMask != nullptr && szWordOut != nullptr;
     const int iBegun = bKnown && bComplete ? run.Begin(szInput) : LOC_ERR_PARAM;
+    if (iBegun != 0)
+    {
+        return bKnown ? iBegun : 0; // nobody waits for the lock of a search that finds nothing
+    }
     CResultOwner copy(*m_pclMemManger);
     tag_LocalizerResult* pSource = pLastResult;
     int bTimeOrder = 0;
@@ -296,12 +300,12 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
         pSource = copy.Get();
         bTimeOrder = m_pclMemManger->GetSortType() == STORE_ORDER_TIME ? 1 : 0;
     }
-    if (pSource == nullptr || !bKnown)
+    if (pSource == nullptr)
     {
-        return pSource == nullptr ? -1 : 0;
+        return -1;
     }
     const CStopwatch watch;
-    int iRet = iBegun == 0 ? run.Find(*pSource, bTimeOrder) : iBegun;
+    int iRet = run.Find(*pSource, bTimeOrder);
     if (iRet >= 0)
     {
         iRet = HandOut(run, copy, *pSource, iRet, ppResult, pMask, szWordOut);

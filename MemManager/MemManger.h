@@ -125,8 +125,9 @@ public:
     // Index of the first entry with the id, 0 when no entry has it, -1 when pSrc is null.
     int GetIndexByContactsId(tag_LocalizerResult* pSrc, long iContactID);
 
-    // Adds the entries per index character to the caller's counters. In time order (stored sort
-    // type 1) 6 counters: '1' to '5', then all others; else 27: 'A' to 'Z', then all others.
+    // Adds the entries per index character to the caller's 27 counters. In time order (stored sort
+    // type 1) the first 6 count: '1' to '5', then all others; else all 27: 'A' to 'Z', then all
+    // others. The order is read without the lock at the time of the call, so there are always 27.
     // 0, or -1 when an argument is null.
     int GetFirstWordInfo(tag_LocalizerResult* pSrc, int* piCounts);
 

@@ -13,7 +13,6 @@
 #include <climits>
 #include <fcntl.h>
 #include <gtest/gtest.h>
-#include <iostream>
 #include <sys/file.h>
 #include <unistd.h>
 

@@ -15,6 +15,9 @@ set(CMAKE_CXX_FLAGS_INIT -Wno-psabi)
 set(QV_ARMHF_ROOT "" CACHE PATH "Folder with the unpacked armhf packages")
 list(APPEND CMAKE_TRY_COMPILE_PLATFORM_VARIABLES QV_ARMHF_ROOT)
 
+# Some libraries are named by others, which are linker scripts.
+set(CMAKE_EXE_LINKER_FLAGS_INIT -L${QV_ARMHF_ROOT}/usr/lib/arm-linux-gnueabihf)
+
 set(CMAKE_FIND_ROOT_PATH ${QV_ARMHF_ROOT} /usr/arm-linux-gnueabihf)
 set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)
 set(CMAKE_FIND_ROOT_PATH_MODE_LIBRARY ONLY)

@@ -3,8 +3,14 @@
 # database of sample contacts, indexes it and types some searches key by key:
 #   scripts/demo.sh           works in build/demo-data, which it makes anew
 #   scripts/demo.sh DIR       works in DIR, which must not hold a database yet
+#   scripts/demo.sh --type    ends with the keypad in this terminal; DIR may follow
 set -euo pipefail
 export LC_ALL=C.UTF-8 # Chinese characters are shown, whatever the machine's language
+type=
+if [ "${1:-}" = --type ]; then
+    type=yes
+    shift
+fi
 given=${1:+$(realpath -m "$1")}
 cd "$(dirname "$0")/.."
 
@@ -71,3 +77,9 @@ run search "" --limit 3
 
 heading "For programs"
 run search zgl --limit 1 --json --once
+
+heading "With your own keys: the matches follow each key"
+printf '%s type --data-dir %q\n' "$tool" "$data"
+if [ -n "$type" ]; then
+    exec "$tool" type --data-dir "$data"
+fi

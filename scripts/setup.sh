@@ -11,8 +11,8 @@ set -euo pipefail
 
 packages=(
     g++ cmake ninja-build python3 python3-vobject
-    libsqlite3-dev libcli11-dev nlohmann-json3-dev
-    libgtest-dev libbenchmark-dev unicode-data pkg-config
+    libsqlite3-dev libcli11-dev nlohmann-json3-dev libncurses-dev
+    libgtest-dev libbenchmark-dev unicode-data pkg-config tmux
 )
 case "${CXX:-}" in
     clang++*) packages+=("clang${CXX#clang++}") ;;

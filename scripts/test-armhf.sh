@@ -13,7 +13,8 @@ toolchain=$PWD/cmake/toolchain-armhf.cmake
 
 # Header-only libraries are the same for every processor: their files are copied from here.
 header_packages=(libcli11-dev nlohmann-json3-dev)
-armhf_packages=(libsqlite3-0:armhf libsqlite3-dev:armhf)
+armhf_packages=(libsqlite3-0:armhf libsqlite3-dev:armhf libncurses-dev:armhf
+                libncurses6:armhf libncursesw6:armhf libtinfo6:armhf)
 
 skip() {
     echo "test-armhf: not run: $1 (details in build/armhf-setup.log)"
@@ -65,12 +66,17 @@ make_root() {
     rm -rf "$work"
     mkdir -p "$work/packages"
     download_packages "$work/packages" >>"$log" 2>&1 ||
-        skip "Debian's armhf packages of SQLite cannot be had here"
+        skip "Debian's armhf packages of SQLite or ncurses cannot be had here"
     for package in "$work"/packages/*.deb; do
         dpkg -x "$package" "$work"
     done
+    # One folder for all libraries, and a link that does not leave it.
+    cp -a "$work"/lib/. "$work/usr/lib/"
+    ln -sf libtinfo.so.6 "$work/usr/lib/arm-linux-gnueabihf/libtinfo.so"
     copy_headers "$work"
     build_googletest "$work/googletest" "$work" >>"$log" 2>&1
+    echo "${armhf_packages[*]}" >"$work/contents"
+    rm -rf "$root"
     mv "$work" "$root"
 }
 
@@ -78,7 +84,7 @@ mkdir -p build
 trap forget_architecture EXIT
 scripts/setup.sh --armhf >"$log" 2>&1 ||
     skip "Debian's cross compiler, qemu-user or googletest cannot be installed here"
-if [ ! -d "$root" ]; then
+if [ "$(cat "$root/contents" 2>/dev/null)" != "${armhf_packages[*]}" ]; then
     make_root
 fi
 

@@ -13,6 +13,7 @@ void AddSampleCommand(CLI::App& app);
 void AddImportCommand(CLI::App& app);
 void AddIndexCommand(CLI::App& app);
 void AddSearchCommand(CLI::App& app);
+void AddTypeCommand(CLI::App& app);
 void AddShowCommand(CLI::App& app);
 void AddNotifyCommand(CLI::App& app);
 

@@ -78,18 +78,19 @@ void CFilterOptions::AddOptions(CLI::App& command)
     }
 }
 
-std::unique_ptr<CFilterChain> CFilterOptions::MakeChain(CLocalizerLogic& logic) const
+std::unique_ptr<CFilterChain> MakeFilterChain(CLocalizerLogic& logic,
+                                              const std::vector<tag_ChosenFilter>& vFilters)
 {
     std::vector<int> vKinds(1); // never empty, since the library wants arrays even for no filter
     std::vector<QVLong32> vIDs(1);
-    for (const tag_ChosenFilter& filter : m_vChosen)
+    for (const tag_ChosenFilter& filter : vFilters)
     {
         vKinds.push_back(filter.iKind);
         vIDs.push_back(filter.iID);
     }
     CFilterChain* pChain = nullptr;
     const int iResult = logic.CreateFilterChain(vKinds.data() + 1, vIDs.data() + 1,
-                                                static_cast<int>(m_vChosen.size()), &pChain);
+                                                static_cast<int>(vFilters.size()), &pChain);
     std::unique_ptr<CFilterChain> chain(pChain);
     if (iResult != 0 || chain == nullptr)
     {

@@ -22,6 +22,10 @@ struct tag_ChosenFilter
     int iID; // of a group, account or contact; 0 where the filter takes none
 };
 
+// The library's chain of filters. Throws CToolError.
+std::unique_ptr<CFilterChain> MakeFilterChain(CLocalizerLogic& logic,
+                                              const std::vector<tag_ChosenFilter>& vFilters);
+
 // The filters of a search's command line.
 class CFilterOptions
 {
@@ -31,8 +35,10 @@ public:
 
     // In the order of the table of options, each as often as it was given.
     const std::vector<tag_ChosenFilter>& Chosen() const { return m_vChosen; }
-    // The library's chain of them.
-    std::unique_ptr<CFilterChain> MakeChain(CLocalizerLogic& logic) const;
+    std::unique_ptr<CFilterChain> MakeChain(CLocalizerLogic& logic) const
+    {
+        return MakeFilterChain(logic, m_vChosen);
+    }
 
 private:
     std::vector<tag_ChosenFilter> m_vChosen;

@@ -1,12 +1,10 @@
 #ifndef QV_TOOLS_SEARCHSESSION_H
 #define QV_TOOLS_SEARCHSESSION_H
 
-#include "Core/LocalizerLogic.h"
 #include "Core/SearchRecords.h"
 #include "tools/ContactNames.h"
+#include "tools/ContactSearch.h"
 
-#include <functional>
-#include <memory>
 #include <string>
 #include <vector>
 
@@ -51,19 +49,13 @@ public:
     tag_SearchStep Search(const std::wstring& wstrTyped, int iLimit);
 
 private:
-    using ResultPtr =
-        std::unique_ptr<tag_LocalizerResult, std::function<void(tag_LocalizerResult*)>>;
-
-    ResultPtr Ask(const std::wstring& wstrTyped, tag_SearchStep& step);
     std::vector<tag_FoundContact> FirstPage(tag_LocalizerResult& result, int iLimit);
     std::vector<tag_Section> Sections(tag_LocalizerResult& result);
 
-    CLocalizerLogic m_logic;
-    IME_SEARCH_TYPE m_eType;
-    CFilterChain& m_chain;
+    CContactSearch m_search;
     bool m_bNarrow;
     ContactNameLookup m_fnNames;
-    ResultPtr m_pLast;
+    SearchResultPtr m_pLast;
 };
 
 #endif

@@ -32,6 +32,7 @@ void AddCommands(CLI::App& app)
     AddImportCommand(app);
     AddIndexCommand(app);
     AddSearchCommand(app);
+    AddTypeCommand(app);
     AddShowCommand(app);
     AddNotifyCommand(app);
 }

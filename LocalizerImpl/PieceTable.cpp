@@ -113,7 +113,7 @@ unsigned CPieceTable::AskEnds(int iKey, int iOffset)
         {
             break; // no longer piece fits either
         }
-        const bool bTried = iEnd < m_iInputLen || ((m_uValidLast >> iOffset) & 1U) != 0;
+        const bool bTried = iEnd < m_iInputLen || ((unsigned{m_uValidLast} >> iOffset) & 1U) != 0;
         uEnds |= static_cast<unsigned>(bTried) << iEnd;
         uFull |= static_cast<unsigned>(bTried && bFull) << iEnd;
     }

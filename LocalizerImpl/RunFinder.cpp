@@ -51,7 +51,8 @@ void CRunFinder::Extend(int iPiece, int iOffset, uint32_t uSplit, bool bAllFull)
     for (unsigned uEnds = m_table.Ends(iKey, iOffset); uEnds != 0; uEnds &= uEnds - 1)
     {
         const int iEnd = LowestBit(uEnds);
-        const bool bFull = bAllFull && ((m_table.RowOf(iKey).auFull[iOffset] >> iEnd) & 1U) != 0;
+        const bool bFull =
+            bAllFull && ((unsigned{m_table.RowOf(iKey).auFull[iOffset]} >> iEnd) & 1U) != 0;
         if (iEnd == iInputLen)
         {
             Record(iPiece + 1, iOffset, uExtended, bFull);

@@ -27,7 +27,9 @@ SCREENS = pathlib.Path(__file__).parent / "screens"
 SIZES = [(40, 12), (80, 24), (132, 43)]
 PROMPT = "shell>"
 PATIENCE = 60  # seconds until a screen that does not come is a failure
-ENVIRONMENT = {**os.environ, "LC_ALL": "C.UTF-8"}
+ENVIRONMENT = {**os.environ, "LC_ALL": "C.UTF-8",
+               "LSAN_OPTIONS": f"suppressions={SCREENS.with_name('ncurses.supp')}:"
+                               "print_suppressions=0"}
 ENVIRONMENT.pop("TMUX", None)
 
 # What a scenario presses, and the name of the screen that has to follow.

@@ -216,11 +216,11 @@ void CReadingSets::FillOtherKeys()
         int iPlace = uCode == LOC_OTHER ? PLACE_OTHER : PLACE_UNKNOWN;
         if (IsAlphaCode(uBits))
         {
-            iPlace = PLACE_ALPHA + (uBits - LOC_ALPHA_BASE);
+            iPlace = PLACE_ALPHA + static_cast<int>(uBits - LOC_ALPHA_BASE);
         }
         else if (IsDigitCode(uBits))
         {
-            iPlace = PLACE_DIGIT + (uBits - LOC_DIGIT_BASE);
+            iPlace = PLACE_DIGIT + static_cast<int>(uBits - LOC_DIGIT_BASE);
         }
         if (!IsHanZiCode(uBits))
         {
@@ -240,21 +240,29 @@ int CReadingSets::KeyOfWide(wchar_t code) const
     return uCode != LOC_NO_CODE && uCode < CODE_COUNT ? m_pKeyOf[uCode] : m_iCount + PLACE_UNKNOWN;
 }
 
+namespace
+{
+wchar_t CodeAt(wchar_t base, int iPlace)
+{
+    return static_cast<wchar_t>(static_cast<int>(base) + iPlace);
+}
+} // namespace
+
 wchar_t CReadingSets::CompactCodeOf(int iKey) const
 {
     constexpr wchar_t UPPER_BIT = 0x10000;
     const int iPlace = iKey - m_iCount;
     if (iPlace < PLACE_ALPHA)
     {
-        return LOC_HANZI_BASE + iKey;
+        return CodeAt(LOC_HANZI_BASE, iKey);
     }
     if (iPlace < PLACE_DIGIT)
     {
-        return LOC_ALPHA_BASE + iPlace;
+        return CodeAt(LOC_ALPHA_BASE, iPlace);
     }
     if (iPlace < PLACE_OTHER)
     {
-        return LOC_DIGIT_BASE + (iPlace - PLACE_DIGIT);
+        return CodeAt(LOC_DIGIT_BASE, iPlace - PLACE_DIGIT);
     }
     if (iPlace == PLACE_UNKNOWN || iPlace == PLACE_END)
     {

@@ -15,8 +15,10 @@ set(CMAKE_CXX_FLAGS_INIT -Wno-psabi)
 set(QV_ARMHF_ROOT "" CACHE PATH "Folder with the unpacked armhf packages")
 list(APPEND CMAKE_TRY_COMPILE_PLATFORM_VARIABLES QV_ARMHF_ROOT)
 
-# Some libraries are named by others, which are linker scripts.
+# Some libraries are named by others, which are linker scripts. CMake leaves a folder of these flags
+# out of the run path, so that has to be said too.
 set(CMAKE_EXE_LINKER_FLAGS_INIT -L${QV_ARMHF_ROOT}/usr/lib/arm-linux-gnueabihf)
+set(CMAKE_BUILD_RPATH ${QV_ARMHF_ROOT}/usr/lib/arm-linux-gnueabihf)
 
 set(CMAKE_FIND_ROOT_PATH ${QV_ARMHF_ROOT} /usr/arm-linux-gnueabihf)
 set(CMAKE_FIND_ROOT_PATH_MODE_PROGRAM NEVER)

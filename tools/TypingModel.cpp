@@ -138,7 +138,7 @@ void CTypingModel::Type(wchar_t chKey)
     FollowIndex();
     if (m_eKeys == TYPING_LETTERS && IsDigit(chKey))
     {
-        Try([&] { Pick(chKey - L'1'); });
+        Try([&] { Pick(static_cast<int>(chKey - L'1')); });
         return;
     }
     const wchar_t chTyped = TypedKey(chKey, m_eKeys);

@@ -165,7 +165,7 @@ public:
         FillList(record.lGroupID, CONTACT_MAX_GROUPS);
         FillList(record.lAccountID, CONTACT_MAX_ACCOUNTS);
         record.iSortIndex = iNo;
-        record.szReserved[5] = iNo;
+        record.szReserved[5] = static_cast<wchar_t>(iNo);
         return record;
     }
 

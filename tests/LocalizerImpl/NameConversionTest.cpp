@@ -152,9 +152,9 @@ TEST_F(NameConversion, FindsTheIndexCharacterOfATime)
     for (int i = 0; i < 5; ++i)
     {
         atZero.GetFirstWord(-FIRST_AGES[i], szOut);
-        EXPECT_EQ(szOut[0], L'1' + i);
+        EXPECT_EQ(szOut[0] - L'1', static_cast<wchar_t>(i));
         atZero.GetFirstWord(i == 4 ? -INT64_MAX : 1 - FIRST_AGES[i + 1], szOut);
-        EXPECT_EQ(szOut[0], L'1' + i);
+        EXPECT_EQ(szOut[0] - L'1', static_cast<wchar_t>(i));
     }
 }
 

@@ -55,7 +55,7 @@ TEST_F(ReadingSets, HoldEveryRecordOnce)
     std::map<std::string, int> setOfReadings;
     for (int i = 0; i < PY_WORD_COUNT; ++i)
     {
-        const wchar_t code = LOC_HANZI_BASE + i;
+        const wchar_t code = LOC_HANZI_BASE + static_cast<wchar_t>(i);
         const PYOFWORDS record = sets->RecordOf(code);
         ASSERT_EQ(std::memcmp(&record, m_pMap + i, sizeof(record)), 0) << i;
         const std::string strReadings(m_pMap[i].szPinyin[0],

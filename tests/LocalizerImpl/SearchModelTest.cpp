@@ -116,7 +116,7 @@ bool CSearchModel::Fits(wchar_t code, const std::wstring& strPiece, bool& bFull)
     }
     if (IsAlphaCode(CodeBits(code)))
     {
-        const int k = code - LOC_ALPHA_BASE;
+        const wchar_t k = code - LOC_ALPHA_BASE;
         return strPiece[0] == (m_bDigits ? KEYS[static_cast<size_t>(k)] : L'a' + k);
     }
     const bool bAny = !m_bDigits && strPiece[0] == L'#';

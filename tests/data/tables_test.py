@@ -1,28 +1,31 @@
-#!/usr/bin/env python3
-"""Checks data/pinyin.tsv, the pyfile.bin built from it, data/folding.tsv and the syllable lists.
+"""The tables of data/, the pyfile.bin made of them and the syllables, read without the programs that
+build them; and what those programs derive and refuse.
 
-    tables_test.py PYFILE
-
-It reads the tables by itself, without the program that builds from them.
+tables_test.py PYFILE TestClass...
 """
-
+import bz2
+import contextlib
+import io
 import pathlib
 import re
 import sys
-from typing import Dict, List, Tuple
+import tempfile
+import unittest
 
 ROOT = pathlib.Path(__file__).resolve().parents[2]
 sys.path.insert(0, str(ROOT / "tools" / "data"))
+# pylint: disable=wrong-import-position
+import derive_folding
+import derive_pinyin
+import make_tables
+import unihan
+from syllables import SYLLABLES
 
-from syllables import SYLLABLES  # noqa: E402
-
-WORD_COUNT = 15422
+PYFILE = pathlib.Path(sys.argv[1])
+UNIHAN = pathlib.Path("/usr/share/unicode")
+SKIPPED = 77
 RECORD_SIZE = 46
-READING_SLOTS = (4, 11, 18)
-DIGIT_SLOTS = (25, 32, 39)
-SLOT_SIZE = 7
 KEYPAD = dict(zip("abcdefghijklmnopqrstuvwxyz", "22233344455566677778889999"))
-
 # The fixed codes of the special numbers pin the records of 27 characters.
 CODE_BASE = 0x1000
 SPECIAL_NUMBERS = {
@@ -34,165 +37,149 @@ SPECIAL_NUMBERS = {
     "天气预报": (0x17D6, 0x25A8, 0x4741, 0x1EB9),
     "道路交通事故报警": (0x4115, 0x3F3D, 0x1066, 0x40EE, 0x1054, 0x20C3, 0x1EB9, 0x3D2B),
 }
-
-FOLDING_ROWS = 3755
+# Forms of simplified characters with several readings: those of another form's word are not
+# theirs, those that are alive are, though the Unihan files may lack them.
+READINGS = {"纖": "xian", "縴": "qian", "噓": "xu", "說": "shuo shui", "賈": "jia gu",
+            "員": "yuan yun", "綠": "lv lu", "調": "diao tiao", "鯽": "ji", "錒": "a"}
+STATED_ROWS = {0: "啊啊", 7: "皚皑", 13: "愛爱", 75: "辦办", 350: "衝冲", 351: "衝冲", 918: "矽硅",
+               2348: "三三", 2349: "三叁", 2908: "矽矽", 3659: "著著", 3702: "著着"}
 CHANGED_ROWS = 1295
-STATED_ROWS = {
-    0: "啊啊", 7: "皚皑", 13: "愛爱", 75: "辦办", 350: "衝冲", 351: "衝冲", 918: "矽硅", 2348: "三三",
-    2349: "三叁", 2908: "矽矽", 3659: "著著", 3702: "著着",
-}
 MOVED = "桔杰捷睫竭洁结解姐戒藉芥界借介疥诫届巾筋斤金今津襟紧锦仅谨进靳晋禁近烬浸尽劲荆兢"
 MOVED_TO = 1361
-
 # GB 2312 holds 後 though its standard has 后; 矽 is the element that the mainland calls 硅.
 FOLDED_ON_PURPOSE = {"後": "后", "矽": "硅"}
+FOLDED_NAMES = dict(("張张", "陳陈", "劉刘", "鍾钟", "葉叶", "蕭萧", "關关", "淨净"))
 # Traditional forms that Big5 does not hold, of characters that it does not hold either.
 OUTSIDE_BIG5 = {"釺", "鍁"}
-FOLDED_NAMES = {"張": "张", "陳": "陈", "劉": "刘", "鍾": "钟", "葉": "叶", "蕭": "萧", "關": "关", "淨": "净"}
-
-# Forms of simplified characters with several readings: those of another form's word are not theirs, those that
-# are alive are, though the Unihan files may lack them.
-TRADITIONAL_READINGS = {
-    "纖": "xian", "縴": "qian", "噓": "xu", "說": "shuo shui", "賈": "jia gu", "員": "yuan yun", "綠": "lv lu",
-    "調": "diao tiao", "鯽": "ji", "錒": "a",
-}
-
-Rows = List[Tuple[str, str]]
-failures: List[str] = []
 
 
-def check(condition: bool, message: str) -> None:
-    if not condition:
-        failures.append(message)
-        print(message)
+def rows(text):
+    return [line.split("\t") for line in text.splitlines() if not line.startswith("#")]
 
 
-def read_rows(name: str) -> Rows:
-    lines = (ROOT / "data" / name).read_text(encoding="utf-8").splitlines()
-    rows = [line.split("\t") for line in lines if not line.startswith("#")]
-    return [(first, second) for first, second in rows]
-
-
-def gb2312_cells(first_row: int, last_row: int) -> List[str]:
+def gb2312(first_row, last_row):
     """The characters of those rows of GB 2312 in code order."""
-    cells = []
-    for row in range(first_row, last_row + 1):
-        for cell in range(1, 95):
-            cells.append(bytes((row + 0xA0, cell + 0xA0)).decode("gb2312", "ignore"))
+    cells = (bytes((row + 0xA0, cell + 0xA0)).decode("gb2312", "ignore")
+             for row in range(first_row, last_row + 1) for cell in range(1, 95))
     return [char for char in cells if char]
 
 
-def check_syllables() -> None:
-    check(len(SYLLABLES) == 416, f"{len(SYLLABLES)} syllables, expected 416")
-    check(list(SYLLABLES) == sorted(set(SYLLABLES)), "the syllables are not ascending")
-    source = (ROOT / "LocalizerImpl" / "Syllables.cpp").read_text(encoding="utf-8")
-    library = re.findall(r'L"([a-z]+)"', source)
-    check(library == list(SYLLABLES), "Syllables.cpp and syllables.py hold different lists")
-
-
-def check_pinyin_table(rows: Rows) -> None:
-    chars = [char for char, _ in rows]
-    check(len(rows) == WORD_COUNT, f"pinyin.tsv has {len(rows)} characters, expected {WORD_COUNT}")
-    check(chars == sorted(set(chars)), "pinyin.tsv is not in ascending code point order")
-    for char, text in rows:
-        readings = text.split(" ")
-        check(1 <= len(readings) <= 3, f"{char} has {len(readings)} readings")
-        check(len(set(readings)) == len(readings), f"{char} has a reading twice: {text}")
-        check(all(reading in SYLLABLES for reading in readings), f"{char} has no syllable: {text}")
-
-
-def check_traditional_readings(rows: Rows) -> None:
-    readings = dict(rows)
-    for char, expected in TRADITIONAL_READINGS.items():
-        check(readings[char] == expected, f"{char} reads {readings[char]}, expected {expected}")
-
-
-def check_special_numbers(records: List[bytes]) -> None:
-    for name, codes in SPECIAL_NUMBERS.items():
-        words = (records[code - CODE_BASE][:3] for code in codes)
-        decoded = b"".join(words).decode("utf-8", "replace")
-        check(decoded == name, f"a special number reads {decoded}, expected {name}")
-
-
-def expected_record(char: str, text: str) -> bytes:
-    record = bytearray(RECORD_SIZE)
-    record[0:3] = char.encode("utf-8")
-    for reading, letters_at, digits_at in zip(text.split(" "), READING_SLOTS, DIGIT_SLOTS):
-        digits = "".join(KEYPAD[letter] for letter in reading)
-        record[letters_at : letters_at + len(reading)] = reading.encode("ascii")
-        record[digits_at : digits_at + len(reading)] = digits.encode("ascii")
-    return bytes(record)
-
-
-def check_pyfile(path: pathlib.Path, rows: Rows) -> None:
-    content = path.read_bytes()
-    check(len(content) == WORD_COUNT * RECORD_SIZE, f"{path} has {len(content)} bytes")
-    records = [content[at : at + RECORD_SIZE] for at in range(0, len(content), RECORD_SIZE)]
-    for index, (record, (char, text)) in enumerate(zip(records, rows)):
-        check(record == expected_record(char, text), f"record {index} is not {char} {text}: {record!r}")
-    if len(records) == WORD_COUNT:
-        check_special_numbers(records)
-
-
-def check_folding_columns(rows: Rows) -> None:
-    changed = sum(traditional != simplified for traditional, simplified in rows)
-    check(len(rows) == FOLDING_ROWS, f"folding.tsv has {len(rows)} rows, expected {FOLDING_ROWS}")
-    check(changed == CHANGED_ROWS, f"{changed} rows change, expected {CHANGED_ROWS}")
-    for index, row in STATED_ROWS.items():
-        check("".join(rows[index]) == row, f"row {index} is {''.join(rows[index])}, expected {row}")
-
-
-def check_simplified_order(rows: Rows) -> None:
-    """Undoes the three differences and compares with the standard's code order."""
-    column = "".join(simplified for _, simplified in rows)
-    check(column.find(MOVED) == MOVED_TO, f"the moved characters stand at row {column.find(MOVED)}")
-    column = column.replace(MOVED, "").replace("冲冲", "冲").replace("掐洽", "掐恰洽")
-    column = column.replace("节茎", "节" + MOVED + "茎")
-    check(column == "".join(gb2312_cells(16, 55)), "the simplified column is not in GB 2312's order")
-
-
-def folding(rows: Rows) -> Dict[str, str]:
+def folding(table):
     """What each traditional character folds to: its first row decides."""
-    folded: Dict[str, str] = {}
-    for traditional, simplified in rows:
-        folded.setdefault(traditional, simplified)
-    return folded
+    return dict(reversed(table))
 
 
-def check_kept_characters(folded: Dict[str, str]) -> None:
-    for char in gb2312_cells(16, 87):
-        expected = FOLDED_ON_PURPOSE.get(char, char)
-        found = folded.get(char, char)
-        check(found == expected, f"the simplified character {char} folds to {found}")
+class TablesTest(unittest.TestCase):
+    PINYIN = rows((ROOT / "data/pinyin.tsv").read_text(encoding="utf-8"))
+    FOLDING = rows((ROOT / "data/folding.tsv").read_text(encoding="utf-8"))
+
+    def test_syllables(self):
+        self.assertEqual(416, len(SYLLABLES))
+        self.assertEqual(sorted(set(SYLLABLES)), list(SYLLABLES))
+        source = (ROOT / "LocalizerImpl/Syllables.cpp").read_text(encoding="utf-8")
+        self.assertEqual(list(SYLLABLES), re.findall(r'L"([a-z]+)"', source))
+
+    def test_pyfile(self):
+        content = PYFILE.read_bytes()
+        self.assertEqual(15422 * RECORD_SIZE, len(content))
+        self.assertEqual(15422, len(self.PINYIN))
+        records = [content[at:at + RECORD_SIZE] for at in range(0, len(content), RECORD_SIZE)]
+        for record, (char, text) in zip(records, self.PINYIN):
+            slots = text.split(" ") + [""] * (3 - text.count(" ") - 1)
+            digits = ["".join(KEYPAD[letter] for letter in slot) for slot in slots]
+            fields = [slot.encode().ljust(7, b"\0") for slot in slots + digits]
+            self.assertEqual(char.encode() + b"\0" + b"".join(fields), record)
+        for name, codes in SPECIAL_NUMBERS.items():
+            words = b"".join(records[code - CODE_BASE][:3] for code in codes)
+            self.assertEqual(name, words.decode())
+        self.assertLessEqual(READINGS.items(), dict(self.PINYIN).items())
+
+    def test_folding_rows_are_in_the_order_of_gb_2312(self):
+        self.assertEqual(CHANGED_ROWS, sum(char != folded for char, folded in self.FOLDING))
+        self.assertEqual(STATED_ROWS, {row: "".join(self.FOLDING[row]) for row in STATED_ROWS})
+        column = "".join(folded for _, folded in self.FOLDING)
+        self.assertEqual(MOVED_TO, column.find(MOVED))
+        for found, standard in ((MOVED, ""), ("冲冲", "冲"), ("掐洽", "掐恰洽"),
+                                ("节茎", f"节{MOVED}茎")):
+            column = column.replace(found, standard)
+        self.assertEqual("".join(gb2312(16, 55)), column)
+
+    def test_folding_changes_traditional_characters_alone(self):
+        folded = folding(self.FOLDING)
+        self.assertLessEqual(FOLDED_NAMES.items(), folded.items())
+        changed = {char: folded[char] for char in gb2312(16, 87) if folded.get(char, char) != char}
+        self.assertEqual(FOLDED_ON_PURPOSE, changed)
+        for char, simplified in folded.items():
+            if char != simplified:
+                self.assertEqual(simplified, folded.get(simplified, simplified))
+                self.assertTrue(char.encode("big5", "ignore") or char in OUTSIDE_BIG5, char)
 
 
-def check_changed_characters(folded: Dict[str, str]) -> None:
-    for traditional, simplified in FOLDED_NAMES.items():
-        check(folded.get(traditional) == simplified, f"{traditional} does not fold to {simplified}")
-    for traditional, simplified in folded.items():
-        if traditional == simplified:
-            continue
-        check(folded.get(simplified, simplified) == simplified, f"{simplified} folds once more")
-        in_big5 = bool(traditional.encode("big5", "ignore"))
-        check(in_big5 or traditional in OUTSIDE_BIG5, f"{traditional} is no form of Big5 text")
+class DerivationTest(unittest.TestCase):
+    """Runs where the Unihan files are those that the tables were derived from."""
+
+    def test_pinyin(self):
+        derived = derive_pinyin.derive()
+        self.assertEqual(derive_pinyin.PINYIN.read_text(encoding="utf-8"), derived)
+        chars = {char for char, _ in rows(derived)}
+        fields = unihan.load("OtherMappings")
+        big5_level_one = [char for char, code in fields["kBigFive"].items()
+                          if "A440" <= code <= "C67E"]
+        for required, allowed in ((fields["kTGH"], 0), (big5_level_one, 0), (fields["kGB0"], 5)):
+            lacking = {char for char in required if "\u4e00" <= char <= "\u9fff"} - chars
+            self.assertLessEqual(len(lacking), allowed, lacking)
+        self.assertNotIn("甴", chars)
+
+    def test_folding(self):
+        derived = derive_folding.derive()
+        self.assertEqual(derive_folding.FOLDING.read_text(encoding="utf-8"), derived)
+        standard = unihan.load("OtherMappings")["kTGH"]
+        self.assertEqual([], [char for char, simplified in folding(rows(derived)).items()
+                              if char != simplified and char in standard])
 
 
-def main(arguments: List[str]) -> int:
-    if len(arguments) != 1:
-        print("usage: tables_test.py PYFILE", file=sys.stderr)
-        return 1
-    check_syllables()
-    pinyin = read_rows("pinyin.tsv")
-    check_pinyin_table(pinyin)
-    check_traditional_readings(pinyin)
-    check_pyfile(pathlib.Path(arguments[0]), pinyin)
-    rows = read_rows("folding.tsv")
-    check_folding_columns(rows)
-    check_simplified_order(rows)
-    check_kept_characters(folding(rows))
-    check_changed_characters(folding(rows))
-    return 1 if failures else 0
+class MakeTablesTest(unittest.TestCase):
+    """make_tables.py names what is wrong with a table, writes nothing and ends with 1."""
+
+    FAULTS = [  # a kind of table, what becomes what in one that is right, and what is said of it
+        ("pyfile", "", "", ""),
+        ("folding", "", "", ""),
+        ("pyfile", "丁\ta\n", "", "expected 15422 characters, found 15421"),
+        ("pyfile", "丁\ta\n", "丂\ta\n", "丂 does not follow 丂"),
+        ("pyfile", "丁\ta\n", "丁\tv\n", ":2: 'v' is no syllable"),
+        ("pyfile", "丁\ta\n", "丁\ta a\n", "a reading stands twice"),
+        ("pyfile", "丁\ta\n", "\n", "expected two columns, found 1"),
+        ("pyfile", "丁\ta\n", "é\ta\n", "is not one character of U+4E00"),
+        ("pyfile", "LAST\ta\n", "LAST\ta", "the last line has no line end"),
+        ("folding", "丁\t丁\n", "", "expected 3755 rows, found 3754"),
+        ("folding", "丁\t丁\n", "丁丁\t丁\n", ":2: '丁丁' is not one character"),
+    ]
+
+    def test_faults(self):
+        for kind, right, wrong, message in self.FAULTS:
+            count = {"pyfile": 15422, "folding": 3755}[kind]
+            chars = [chr(0x4E00 + index) for index in range(count)]
+            text = "".join(f"{char}\t{'a' if kind == 'pyfile' else char}\n" for char in chars)
+            text = text.replace(right.replace("LAST", chars[-1]), wrong.replace("LAST", chars[-1]))
+            with tempfile.TemporaryDirectory() as directory:
+                table, output = pathlib.Path(directory, "table"), pathlib.Path(directory, "output")
+                table.write_text(text, encoding="utf-8")
+                with contextlib.redirect_stderr(io.StringIO()) as errors:
+                    result = make_tables.main([kind, str(table), str(output)])
+                self.assertEqual((1, False) if message else (0, True), (result, output.exists()))
+            self.assertIn(message, errors.getvalue())
+            self.assertEqual(message == "", errors.getvalue() == "")
+
+
+def unihan_versions():
+    for path in UNIHAN.glob("Unihan_*.txt.bz2"):
+        with bz2.open(path, "rt", encoding="utf-8") as source:
+            yield re.search(r"# Unicode version: (\S*)|\Z", source.read(1000)).group(1)
 
 
 if __name__ == "__main__":
-    sys.exit(main(sys.argv[1:]))
+    recorded = (ROOT / "data/unicode-data.version").read_text(encoding="utf-8").strip()
+    if "DerivationTest" in sys.argv and set(unihan_versions()) != {recorded}:
+        print(f"skipped: {UNIHAN} has no Unihan {recorded}, from which the tables were derived")
+        sys.exit(SKIPPED)
+    unittest.main(argv=[sys.argv[0], *sys.argv[2:]], verbosity=2)

@@ -5,138 +5,117 @@ tool_test.py TOOL PYFILE [TestClass...]
 import contextlib
 import fcntl
 import json
+import math
 import os
 import pathlib
 import re
 import shutil
 import sqlite3
+import struct
 import subprocess
 import sys
 import tempfile
 import unittest
 
-TOOL, PYFILE = map(os.path.abspath, sys.argv[1:3])
-DONE, FAILED, USAGE, MISSING = 0, 1, 2, 3
-PY_RECORD_SIZE = 46
-HANZI_BASE = 0x1000
+sys.path.insert(0, str(pathlib.Path(__file__).parents[1] / "Support"))
+# pylint: disable=wrong-import-position
+from tool_case import DONE, FAILED, MISSING, PYFILE, TOOL, USAGE, ToolCase
+
+TOP = pathlib.Path(__file__).resolve().parents[2]
+EVERYTHING = "SELECT * FROM contacts JOIN localizer ON contact_id = _id"
 
 
-def run(directory, command, *arguments):
-    """The finished process of one call of the tool on a data directory."""
-    call = [TOOL, command, "--data-dir", str(directory), *arguments]
-    return subprocess.run(call, capture_output=True, encoding="utf-8", check=False)
-
-
-def make_sample(directory):
-    for call in (["sample", "--pyfile", PYFILE], ["index"]):
-        process = run(directory, *call)
-        assert process.returncode == DONE, process.stderr
-
-
-class ToolTest(unittest.TestCase):
-    """A directory with the sample and its index, made once for a class."""
-
-    @classmethod
-    def setUpClass(cls):
-        cls.root = pathlib.Path(tempfile.mkdtemp(prefix="qvtool_"))
-        cls.addClassCleanup(shutil.rmtree, cls.root)
-        cls.data = cls.root / "data"
-        make_sample(cls.data)
-
-    def check(self, command, *arguments, code=DONE):
-        process = run(self.data, command, *arguments)
-        self.assertEqual(code, process.returncode, process.stderr)
-        return process
-
-    def search(self, text, *arguments):
-        """The JSON document of a search with all matches."""
-        process = self.check("search", text, "--json", "--limit", "0", *arguments)
-        self.assertEqual("", process.stderr)
-        return json.loads(process.stdout)
-
-    def last_step(self, text, *arguments):
-        return self.search(text, *arguments)["steps"][-1]
-
-    def sql(self, statement):
-        with contextlib.closing(sqlite3.connect(self.data / "databases/contacts2.db")) as database:
-            return database.execute(statement).fetchall()
-
-
-class SampleTest(ToolTest):
-    def test_keys_are_the_codes_of_the_folded_names(self):
-        table = pathlib.Path(PYFILE).read_bytes()
-        words = [table[i:i + 3].decode() for i in range(0, len(table), PY_RECORD_SIZE)]
-        zhang, san, feng = (chr(HANZI_BASE + words.index(word)) for word in "张三丰")
-        expected = {"张三": zhang + san, "張三豐": zhang + san + feng, "": "",
-                    "Tom 2": "\u4f13\u4f0e\u4f0c\u5000\u5a02", "Zoë": "\u4f19\u4f0e\u5000"}
-        for name, key in expected.items():
-            found = self.sql(f"SELECT DISTINCT localizerkey FROM localizer"
-                             f" WHERE display_name = '{name}'")
-            self.assertEqual([(key,)], found, name)
-
-    def test_is_the_same_every_time_and_replaced_only_by_force(self):
-        before = self.sql("SELECT * FROM contacts JOIN localizer ON contact_id = _id")
-        process = self.check("sample", "--pyfile", PYFILE, code=USAGE)
-        self.assertIn("--force", process.stderr)
-        self.check("sample", "--pyfile", PYFILE, "--force")
-        self.assertEqual(before, self.sql("SELECT * FROM contacts JOIN localizer"
-                                          " ON contact_id = _id"))
-        files = {path.name for path in (self.data / "databases").iterdir()}
-        self.assertEqual({"contacts2.db"}, files)
-
-    def test_keeps_what_is_readable_for_all_in_directories_of_its_owner(self):
-        for name in ("databases", "files"):
+class FilesTest(ToolCase):
+    def test_sample_is_the_same_every_time_and_replaced_only_by_force(self):
+        before = self.sql(EVERYTHING)
+        self.refused(USAGE, "--force", "sample", "--pyfile", PYFILE)
+        self.run_tool("sample", "--pyfile", PYFILE, "--force")
+        self.assertEqual(before, self.sql(EVERYTHING))
+        self.assertEqual([self.database], list(self.database.parent.iterdir()))
+        for name in ("databases", "files"):  # for their owner alone
             self.assertEqual(0o40700, (self.data / name).stat().st_mode, name)
 
-
-class IndexTest(ToolTest):
-    def test_shows_phases_and_files(self):
-        output = self.check("index").stdout
+    def test_index_shows_phases_and_files_and_builds_what_is_needed(self):
+        output = self.run_tool("index").stdout
         for phase in ("copy the pinyin table", "read the database", "spell and sort the names",
                       "write the store"):
             self.assertRegex(output, rf"{phase} +\d+ ms\n")
-        visible = self.sql("SELECT count(*) FROM visible_contacts")[0][0]
-        self.assertIn(f"{visible} contacts, room for {visible + 1000}\n", output)
-        for name in ("PyFileMappint.bin", "ContactsLocalizer.bin", "ContactsReg.bin",
-                     "memlock.ini"):
-            size = (self.data / "files" / name).stat().st_size
-            self.assertRegex(output, rf"{re.escape(name)} +{size} bytes\n")
+        self.assertIn("565 contacts, room for 1565\n", output)
+        for path in (self.data / "files").iterdir():
+            if path.name != "pyfile.bin":
+                self.assertRegex(output, rf"{re.escape(path.name)} +{path.stat().st_size} bytes\n")
+        before = (self.data / "files/ContactsLocalizer.bin").stat().st_mtime_ns
+        self.assertIn("there already", self.run_tool("index", "--if-needed").stdout)
+        self.assertEqual(before, (self.data / "files/ContactsLocalizer.bin").stat().st_mtime_ns)
 
-    def test_leaves_an_index_that_is_there_if_told_so(self):
-        records = self.data / "files/ContactsLocalizer.bin"
-        before = records.stat().st_mtime_ns
-        self.assertIn("there already", self.check("index", "--if-needed").stdout)
-        self.assertEqual(before, records.stat().st_mtime_ns)
+    def test_show(self):
+        output = self.run_tool("show", "--limit", "3").stdout
+        self.assertRegex(output, r"iTotalNum +565 (.*\n)+.*iSortType +0 \(name order\)(.*\n)+"
+                                 r".*iMemSize +1565 ")
+        row = r"(?m)^ +(\d+) +\d+  (\S{6}) "
+        self.assertEqual(["0", "1", "2"], [place for place, _ in re.findall(row, output)])
+        everybody = re.findall(row, self.run_tool("show", "--limit", "0").stdout)
+        legend = re.search(r"(?m)^ +flags +(.*)$", output).group(1)
+        self.assertEqual({entry[0] for entry in legend.split(", ")},
+                         set("".join(flags for _, flags in everybody)) - {"-"})
+        output = self.run_tool("show", "--set-sort-type", "time", "--limit", "1").stdout
+        self.assertRegex(output, r"iSortType +1 .*\n +iMemSize +0 ")
+        self.run_tool("index")
+        step = self.search("")
+        times = [match["last_time_contacted"] for match in step["matches"]]
+        self.assertEqual(sorted(times, reverse=True), times)
+        self.assertLessEqual(set(step["sections"]), set("12345-"))
+        by_name = self.run_tool("show", "--sort-type", "name", "--limit", "2").stdout
+        self.assertEqual(["0", "1"], [place for place, _ in re.findall(row, by_name)])
+
+    def test_files_are_as_the_document_tells(self):
+        document = (TOP / "docs/file-formats.md").read_text(encoding="utf-8")
+        contact = struct.pack("<i", self.sql("SELECT contact_id FROM localizer WHERE "
+                                             "display_name = '张三'")[0][0])
+        counts = {"ContactsReg": 1, "ContactsLocalizer": 1565, "pyfile": 15422}
+        for name, section in re.findall(r"(?ms)^## (Contacts\w+|pyfile)(.*?)(?=^## )", document):
+            end = 0
+            for offset, size in re.findall(r"(?m)^\| (\d+) \| ([\d ×]+) \|", section):
+                self.assertEqual(end, int(offset), name)
+                end += math.prod(map(int, size.split(" × ")))
+            content = (self.data / f"files/{name}.bin").read_bytes()
+            self.assertEqual(counts.pop(name) * end, len(content))
+            # The examples: lines of bytes, behind their offset in the record where it is not 0.
+            if name == "ContactsReg":
+                example = re.search(r"```\n((?:[\da-f]{2} *)+)", section).group(1)
+                self.assertEqual(content, bytes.fromhex(example))
+            if name == "ContactsLocalizer":
+                at, = [at for at in range(0, len(content), end) if content[at:at + 4] == contact]
+                for offset, line in re.findall(r"(?m)^([\da-f]{3})((?:  ?[\da-f]{2}){16})", section):
+                    start = at + int(offset, 16)
+                    self.assertEqual(bytes.fromhex(line), content[start:start + 16], offset)
+        self.assertEqual({}, counts)
 
 
-class SearchTest(ToolTest):
+class SearchTest(ToolCase):
     def marked(self, text, *arguments):
-        return [match["marked"] for match in self.last_step(text, *arguments)["matches"]]
+        return [match["marked"] for match in self.search(text, *arguments)["matches"]]
 
     def test_marks_what_matched(self):
-        cases = [
-            (["zhangsan"], ["[张三]", "[張三]豐", "李[张三]", "[章三]"]),
-            (["tom#2"], ["[Tom 2]"]),
-            (["wangli"], ["[王Li]"]),
-            (["926454", "--type", "num"], ["[王Li]"]),
-            (["chan"], ["[单]田芳", "[长]孙无忌"]),
-        ]
-        for arguments, expected in cases:
-            found = self.marked(*arguments)
-            for name in expected:
-                self.assertIn(name, found, arguments)
+        for call, names in ((["zhangsan"], ["[张三]", "[張三]豐", "李[张三]", "[章三]"]),
+                            (["tom#2"], ["[Tom 2]"]), (["wangli"], ["[王Li]"]),
+                            (["926454", "--type", "num"], ["[王Li]"]),
+                            (["chan"], ["[单]田芳", "[长]孙无忌"]),
+                            (["hj", "--type", "special"], ["[火警]"])):
+            self.assertLessEqual(set(names), set(self.marked(*call)), call)
+        numbers = self.search("", "--type", "special", "--starred")["matches"]  # takes no filters
+        self.assertEqual(list(range(7)), [number["contact_id"] for number in numbers])
 
     def test_searches_key_by_key(self):
-        document = self.search("zhan")
-        self.assertEqual(["z", "zh", "zha", "zhan"], [step["typed"] for step in document["steps"]])
-        last = document["steps"][-1]
-        self.assertIn("张", last["candidates"])
-        self.assertIn("g", last["next_keys"])
-        self.assertNotIn("n", last["next_keys"])
-        self.assertEqual(last["total"], len(last["matches"]))
-        self.assertEqual(1, document["version"])
-        once = self.search("zhan", "--once")["steps"]
-        self.assertEqual(["zhan"], [step["typed"] for step in once])
+        for options, typed in (([], ["z", "zh", "zha", "zhan"]), (["--once"], ["zhan"])):
+            document = json.loads(self.run_tool("search", "zhan", "--json", "--limit", "0",
+                                                *options).stdout)
+            self.assertEqual(typed, [step["typed"] for step in document["steps"]])
+            last = document["steps"][-1]
+            self.assertIn("张", last["candidates"])
+            self.assertIn("g", last["next_keys"])
+            self.assertNotIn("n", last["next_keys"])
+            self.assertEqual((last["total"], 1), (len(last["matches"]), document["version"]))
 
     def test_filters_keep_what_the_database_says(self):
         member = "'.' || group_id || '.' LIKE '%.2.%'"
@@ -160,185 +139,90 @@ class SearchTest(ToolTest):
             rows = self.sql(f"""SELECT _id FROM contacts JOIN localizer ON contact_id = _id
                 LEFT JOIN status_updates ON status_update_data_id = status_update_id
                 WHERE _id IN (SELECT _id FROM visible_contacts) AND {condition}""")
-            found = {match["contact_id"] for match in self.last_step("", *arguments)["matches"]}
-            self.assertEqual({row[0] for row in rows}, found, arguments)
-            self.assertTrue(found, arguments)
+            self.assertEqual({row[0] for row in rows}, self.found("", *arguments), arguments)
+            self.assertTrue(rows, arguments)
 
-    def test_special_numbers_need_no_contacts_and_take_no_filters(self):
-        everything = self.last_step("", "--type", "special", "--starred")
-        self.assertEqual(list(range(7)), [match["contact_id"] for match in everything["matches"]])
-        self.assertEqual("火警", everything["matches"][3]["name"])
-        self.assertEqual(["[火警]"], self.marked("hj", "--type", "special")[:1])
-
-    def test_text_for_people(self):
-        output = self.check("search", "zs", "--limit", "1").stdout
-        total = self.last_step("zs")["total"]
-        self.assertIn(f"> zs_   {total} matches\n", output)
-        self.assertRegex(output, r" 1\.  contact \d+ +\S*\[\S+\]\S*\n")
-        self.assertIn(f"and {total - 1} more\n", output)
-        self.assertIn("> qqq_   0 matches\n", self.check("search", "qqq").stdout)
-
-    def test_plain_form_has_the_matches_of_the_whole_text(self):
-        for text, arguments in (("zs", []), ("zs", ["--limit", "2"]), ("", []), ("qqq", [])):
-            matches = self.last_step(text, "--once")["matches"]
-            if arguments:
-                del matches[2:]
-            self.assertEqual("".join(f"{match['contact_id']}\t{match['name']}\n"
-                                     for match in matches),
-                             self.check("search", text, "--plain", *arguments).stdout)
+    def test_text_for_people_and_plain_lines(self):
+        total = self.search("zs")["total"]
+        output = self.run_tool("search", "zs", "--limit", "1").stdout
+        self.assertRegex(output, rf"> zs_   {total} matches\n +1\.  contact \d+ +\S*\[\S+\]"
+                                 rf"\S*\n +... +and {total - 1} more\n")
+        self.assertIn("> qqq_   0 matches\n", self.run_tool("search", "qqq").stdout)
+        for text, limit in (("zs", 0), ("zs", 2), ("", 0), ("qqq", 0)):
+            lines = [f"{match['contact_id']}\t{match['name']}\n"
+                     for match in self.search(text)["matches"]]
+            self.assertEqual("".join(lines[:limit or None]),
+                             self.run_tool("search", text, "--plain", "--limit", limit).stdout)
 
     def test_keypad_search_names_keys(self):
         keys = {letter: key for key, letters in
                 zip("23456789", "abc def ghi jkl mno pqrs tuv wxyz".split()) for letter in letters}
         for text in ("", "94", "926454"):
-            step = self.last_step(text, "--type", "num", "--once")
+            step = self.search(text, "--type", "num", "--once")
             letters = [chr(ord("a") + bit) for bit in range(26) if step["mask"] >> bit & 1]
-            other = ["#"] if step["mask"] >> 26 else []
-            self.assertEqual(sorted({keys[letter] for letter in letters}) + other,
-                             step["next_keys"])
-            self.assertIn("next character: " + (" ".join(step["next_keys"]) or "none") + "\n",
-                          self.check("search", text, "--type", "num", "--once").stdout)
+            expected = sorted({keys[letter] for letter in letters}) + ["#"] * (step["mask"] >> 26)
+            self.assertEqual(expected, step["next_keys"])
+            self.assertIn("next character: " + (" ".join(expected) or "none") + "\n",
+                          self.run_tool("search", text, "--type", "num", "--once").stdout)
 
     def test_hints_at_the_other_kind_of_search(self):
-        for text, arguments, hint in (("94264", [], "add --type num"), ("t2", ["--plain"], "add"),
-                                      ("zs", ["--type", "num"], "leave --type num out"),
-                                      ("94264", ["--type", "num"], ""), ("t#", [], ""),
-                                      ("94264", ["--json"], "")):
-            error = self.check("search", text, *arguments).stderr
-            self.assertEqual(bool(hint), error.startswith("Hint: "), (text, arguments, error))
-            self.assertIn(hint, error)
+        for call, hint in (("94264", "add --type num"), ("t2 --plain", "add"),
+                           ("zs --type num", "leave --type num out"), ("94264 --type num", ""),
+                           ("t#", ""), ("94264 --json", "")):
+            error = self.run_tool("search", *call.split()).stderr
+            self.assertRegex(error, f"\\AHint: .*{hint}" if hint else r"\A\Z", call)
 
     def test_colours_on_a_terminal_or_when_told_so(self):
-        terminal = {"TERM": "xterm"}
         for color, variables, pipe, expected in (
-                ("auto", terminal, False, True), ("auto", terminal, True, False),
-                ("auto", {"TERM": "dumb"}, False, False), ("auto", {}, False, False),
-                ("auto", {**terminal, "NO_COLOR": "1"}, False, False),
-                ("auto", {**terminal, "NO_COLOR": ""}, False, True),
-                ("always", {"NO_COLOR": "1"}, True, True), ("never", terminal, False, False)):
-            output = self.output_to(pipe, variables, "search", "hj", "--type", "special",
-                                    "--color", color)
+                ("auto", {}, False, True), ("auto", {}, True, False),
+                ("auto", {"TERM": "dumb"}, False, False), ("auto", {"TERM": ""}, False, False),
+                ("auto", {"NO_COLOR": "1"}, False, False), ("always", {"NO_COLOR": "1"}, True, True),
+                ("never", {}, False, False)):
+            reader, writer = os.pipe() if pipe else os.openpty()
+            with open(reader, "rb") as source, open(writer, "wb") as target:
+                subprocess.run(self.call("search", "hj", "--type", "special", "--color", color),
+                               stdout=target, check=True,
+                               env={**os.environ, "TERM": "xterm", "NO_COLOR": "", **variables})
+                output = os.read(source.fileno(), 65536).decode()
             self.assertIn("\033[1;31m火警\033[0m" if expected else "[火警]", output,
                           (color, variables, pipe))
             self.assertEqual(expected, "\033" in output)
 
-    def output_to(self, pipe, variables, *call):
-        """What a call prints into a pipe or on a terminal."""
-        try:
-            reader, writer = os.pipe() if pipe else os.openpty()
-        except OSError as error:
-            self.skipTest(f"no terminal to be had: {error}")
-        with open(reader, "rb") as source:
-            with open(writer, "wb") as target:
-                subprocess.run([TOOL, *call, "--data-dir", str(self.data)], stdout=target,
-                               env={**os.environ, "TERM": "", "NO_COLOR": "", **variables},
-                               check=True)
-                return os.read(source.fileno(), 65536).decode()
 
-
-class ShowTest(ToolTest):
-    def test_shows_the_registration_record_and_the_records(self):
-        output = self.check("show", "--limit", "3").stdout
-        visible = self.sql("SELECT count(*) FROM visible_contacts")[0][0]
-        self.assertRegex(output, rf"iTotalNum +{visible} ")
-        self.assertRegex(output, r"iSortType +0 \(name order\)")
-        self.assertRegex(output, rf"iMemSize +{visible + 1000} ")
-        self.assertEqual(["0", "1", "2"], re.findall(r"(?m)^ +(\d+) +\d+  \S{6} ", output))
-        letters = set("".join(re.findall(r"(?m)^ +\d+ +\d+  (\S{6}) ",
-                                         self.check("show", "--limit", "0").stdout)))
-        legend = re.search(r"(?m)^ +flags +(.*)$", output).group(1)
-        self.assertEqual(letters - {"-"}, {entry[0] for entry in legend.split(", ")})
-
-    def test_time_order_begins_with_the_latest(self):
-        self.addCleanup(self.check, "index")
-        self.addCleanup(self.check, "show", "--set-sort-type", "name", "--limit", "1")
-        output = self.check("show", "--set-sort-type", "time", "--limit", "1").stdout
-        self.assertRegex(output, r"iSortType +1 .*\n +iMemSize +0 ")
-        self.check("index")
-        step = self.last_step("")
-        times = [match["last_time_contacted"] for match in step["matches"]]
-        self.assertEqual(sorted(times, reverse=True), times)
-        self.assertLessEqual(set(step["sections"]), set("12345-"))
-        by_name = self.check("show", "--sort-type", "name", "--limit", "2").stdout
-        self.assertEqual(["0", "1"], re.findall(r"(?m)^ +(\d+) +\d+  \S{6} ", by_name))
-
-
-class NotifyTest(ToolTest):
-    """A sample for every test: each changes it."""
-
-    def setUp(self):
-        super().setUp()
-        self.data = pathlib.Path(tempfile.mkdtemp(dir=self.root))
-        make_sample(self.data)
-
-    def change(self, statement):
-        with contextlib.closing(sqlite3.connect(self.data / "databases/contacts2.db")) as database:
-            database.execute(statement)
-            database.commit()
-
-    def notify(self, *arguments):
-        return self.check("notify", *arguments).stdout
-
-    def found(self, text, *arguments):
-        return {match["contact_id"]
-                for match in self.last_step(text, "--once", *arguments)["matches"]}
-
+class NotifyTest(ToolCase):
     def test_the_next_search_shows_the_change(self):
-        self.change("UPDATE localizer SET (display_name, localizerkey) = (SELECT display_name, "
-                    "localizerkey FROM localizer WHERE contact_id = 1) WHERE contact_id = 54")
-        self.assertNotIn(54, self.found("zhangsan"))
-        self.assertEqual("The index holds 565 contacts, with room for 1565\n",
-                         self.notify("contacts", "54"))
-        self.assertIn(54, self.found("zhangsan"))
-        self.assertNotIn(54, self.found("tom"))
-
-        self.assertNotIn(6, self.found("zs", "--starred"))
-        self.notify("star", "6")
-        self.assertIn(6, self.found("zs", "--starred"))
-        self.notify("star", "6", "--off")
-        self.assertNotIn(6, self.found("zs", "--starred"))
-
-        self.change("UPDATE status_updates SET status = 'online' "
-                    "WHERE status_update_data_id = 1005")
-        self.notify("status")
-        self.assertIn(6, self.found("zs", "--online"))
-
-    def test_contacts_come_and_go(self):
         everybody = self.found("")
-        self.change("DELETE FROM visible_contacts WHERE _id IN (1, 6)")
-        self.assertIn("holds 563 contacts, with room for 1565", self.notify("contacts", "1", "6"))
-        self.assertEqual(everybody - {1, 6}, self.found(""))
-        self.change("INSERT INTO visible_contacts(_id) VALUES(1), (6)")
-        self.assertIn("holds 565 contacts, with room for 1565", self.notify("contacts"))
+        show, hide = "INSERT INTO visible_contacts(_id)", "DELETE FROM visible_contacts WHERE _id"
+        for change, call, search, contacts, present in (
+                ("UPDATE localizer SET (display_name, localizerkey) = (SELECT display_name, "
+                 "localizerkey FROM localizer WHERE contact_id = 1) WHERE contact_id = 54",
+                 "contacts 54", ["zhangsan"], {54}, True),
+                ("", "star 6", ["zs", "--starred"], {6}, True),
+                ("", "star 6 --off", ["zs", "--starred"], {6}, False),
+                ("UPDATE status_updates SET status = 'online' WHERE status_update_data_id = 1005",
+                 "status", ["zs", "--online"], {6}, True),
+                (f"{hide} IN (1, 6)", "contacts 1 6", [""], {1, 6}, False),
+                (f"{show} VALUES(1), (6)", "contacts", [""], {1, 6}, True)):
+            self.assertEqual(set() if present else contacts, self.found(*search) & contacts, call)
+            self.sql(change)
+            output = self.run_tool("notify", *call.split()).stdout
+            self.assertEqual(contacts if present else set(), self.found(*search) & contacts, call)
+            total = len(self.found(""))
+            self.assertEqual(f"The index holds {total} contacts, with room for 1565\n", output)
         self.assertEqual(everybody, self.found(""))
-
-    def test_the_last_contacted_comes_first(self):
-        self.check("show", "--set-sort-type", "time")
-        self.notify("contacts")
-        self.notify("time", "54", "1900000000000")
-        self.assertEqual(54, self.last_step("", "--once")["matches"][0]["contact_id"])
+        self.assertNotIn(54, self.found("tom"))
+        self.run_tool("show", "--set-sort-type", "time")
+        self.run_tool("notify", "contacts")
+        self.run_tool("notify", "time", "54", "1900000000000")
+        self.assertEqual(54, self.search("")["matches"][0]["contact_id"])
 
     def test_tells_when_the_index_does_not_follow(self):
-        self.change("DELETE FROM localizer WHERE contact_id = 54")
-        process = self.check("notify", "contacts", "54", code=FAILED)
-        self.assertIn("ReadAllLocalizer", process.stderr)
-        self.assertIn("builds it anew", process.stderr)
-
-    def test_wrong_use(self):
-        for arguments, text in (([], "required"), (["nothing"], 'unknown subcommand "nothing"'),
-                                (["star"], "required"), (["star", "0"], "from 1 to 2147483647"),
-                                (["time", "5"], "required"), (["contacts", "1", "x"], '"x" is not'),
-                                (["time", "5", "-9"], "from 0 to 253402300799999"),
-                                (["status", "5"], "not expected: 5"),
-                                (["status", "--on"], "--on is not an option of notify")):
-            self.assertIn(text, self.check("notify", *arguments, code=USAGE).stderr)
-        (self.data / "files/ContactsReg.bin").unlink()
-        self.check("notify", "status", code=MISSING)
-        (self.data / "databases/contacts2.db").unlink()
-        self.check("notify", "status", code=MISSING)
+        self.sql("DELETE FROM localizer WHERE contact_id = 54")
+        process = self.run_tool("notify", "contacts", "54", code=FAILED)
+        self.assertRegex(process.stderr, r"ReadAllLocalizer(.*\n)*.*builds it anew")
 
 
-class EscapesTest(ToolTest):
+class EscapesTest(ToolCase):
     """Texts of others reach the terminal with their control characters escaped."""
 
     ESCAPED = [  # of a name, and what people see of it
@@ -352,26 +236,19 @@ class EscapesTest(ToolTest):
         (b"E\xf0\x9f\x98\x80\xf4\x90\x80\x80\xf8", "E\U0001f600" + r"\xf4\x90\x80\x80\xf8"),
     ]
 
-    @classmethod
-    def setUpClass(cls):
-        super().setUpClass()
-        with contextlib.closing(sqlite3.connect(cls.data / "databases/contacts2.db")) as database:
-            for contact, (name, _) in enumerate(cls.ESCAPED, 1):
-                database.execute("UPDATE localizer SET localizerkey = ?, display_name = "
-                                 "CAST(? AS TEXT) WHERE contact_id = ?",
-                                 ("\u4f04", name, contact))
-            database.commit()
-        assert run(cls.data, "index").returncode == DONE
-
     def printed(self, *call, code=DONE):
         """What a call prints for people, as long as nothing in it is more than text."""
-        process = self.check(*call, code=code)
+        process = self.run_tool(*call, code=code)
         text = process.stdout + process.stderr
         self.assertNotRegex(text, "[\0-\x09\x0b-\x1f\x7f-\x9f\u061c\u200e\u200f\u2028-\u202e"
                                   "\u2066-\u206f]", call)
         return text
 
     def test_names(self):
+        for contact, (name, _) in enumerate(self.ESCAPED, 1):
+            self.sql("UPDATE localizer SET localizerkey = ?, display_name = CAST(? AS TEXT) WHERE "
+                     "contact_id = ?", "\u4f04", name, contact)
+        self.run_tool("index")
         found = re.findall(r"contact [1-8] +(.*)\n",
                            self.printed("search", "e", "--once", "--limit", "0"))
         self.assertEqual(sorted(shown for _, shown in self.ESCAPED),
@@ -381,29 +258,27 @@ class EscapesTest(ToolTest):
     def test_arguments_and_paths(self):
         typed = "\x1b\x7f\x9b\u202e"
         shown = r"\x1b\x7f\u009b\u202e"
-        self.assertIn(f'Search "{shown}"', self.printed("search", typed))
-        self.assertIn(f"> {shown}_", self.printed("search", typed))
-        self.assertIn(shown, self.printed("search", "a", "--" + typed, code=USAGE))
-        self.assertIn(shown, self.printed("search", "a", "--type", typed, code=USAGE))
-        data = self.root / f"line\n{typed}'"
-        shutil.copytree(self.data, data)
-        self.addCleanup(setattr, self, "data", self.data)
-        self.data = data
-        self.assertIn(rf"line\x0a{shown}'/files:", self.printed("index"))
-        self.assertIn(rf"line\x0a{shown}'/databases", self.printed("sample", code=USAGE))
-        (data / "databases/contacts2.db").unlink()
+        self.data = self.data.rename(self.root / f"line\n{typed}'")
+        place = rf"line\x0a{shown}'"
+        for call, code, text in ((["search", typed], DONE, f'Search "{shown}"'),
+                                 (["search", typed], DONE, f"> {shown}_"),
+                                 (["search", "a", "--" + typed], USAGE, shown),
+                                 (["search", "a", "--type", typed], USAGE, shown),
+                                 (["index"], DONE, f"{place}/files:"),
+                                 (["sample"], USAGE, f"{place}/databases")):
+            self.assertIn(text, self.printed(*call, code=code))
+        (self.data / "databases/contacts2.db").unlink()
         error = self.printed("index", code=MISSING)
-        self.assertIn(rf"line\x0a{shown}'/databases", error)
+        self.assertIn(f"{place}/databases", error)
         advised = re.search(r"--data-dir (.*)", error).group(1)
-        self.assertEqual(str(data), subprocess.run(["bash", "-c", "printf %s " + advised],
-                                                   capture_output=True, encoding="utf-8",
-                                                   check=True).stdout)
+        self.assertEqual(str(self.data), subprocess.run(
+            ["bash", "-c", "printf %s " + advised], capture_output=True, encoding="utf-8",
+            check=True).stdout)
 
 
 class CompletionTest(unittest.TestCase):
-    """The completions of bash and zsh, run without a terminal."""
+    """The completions of bash and zsh, run without a terminal, offer what the help tells."""
 
-    FILES = pathlib.Path(__file__).resolve().parents[2] / "tools/completion"
     RUN = {
         "bash": """. "$0"/qvlocalize.bash; COMP_WORDS=("$@"); COMP_CWORD=$(($# - 1))
             _qvlocalize "$1" "${COMP_WORDS[COMP_CWORD]}" "${COMP_WORDS[COMP_CWORD - 1]}"
@@ -412,76 +287,59 @@ class CompletionTest(unittest.TestCase):
             _files() { [[ $1 == -/ ]] && print -rl -- *(/) || print -rl -- * }
             directory=$0; words=("$@"); CURRENT=$#; . $directory/_qvlocalize""",
     }
+    OFFERED = [
+        (["s"], {"sample", "search", "show"}),
+        (["notify", "s"], {"star", "status"}),
+        (["--"], {"--help", "--version"}),
+        (["search", "zs", "--p"], {"--phone", "--plain", "--postal"}),
+        (["notify", "star", "--"], {"--data-dir", "--help", "--off"}),
+        (["search", "--color", "a"], {"auto", "always"}),
+        (["show", "--sort-type", ""], {"name", "time"}),
+        (["sample", "--pyfile", ""], {"a-file", "a-place"}),
+        (["sample", "--data-dir", ""], {"a-place"}),
+        (["show", "--limit", ""], set()),
+        (["search", ""], set()),
+    ]
 
-    def complete(self, shell, *words):
-        with tempfile.TemporaryDirectory(prefix="qvtool_") as place:
-            pathlib.Path(place, "a-file").touch()
-            pathlib.Path(place, "a-place").mkdir()
-            flags = ["-f"] if shell == "zsh" else ["--norc"]
-            process = subprocess.run([shell, *flags, "-c", self.RUN[shell], str(self.FILES), TOOL,
-                                      *words], cwd=place, capture_output=True, encoding="utf-8",
-                                     check=False)
-        self.assertEqual("", process.stderr)
-        return set(process.stdout.split())
-
-    def test_offers_what_the_help_tells(self):
-        cases = [
-            (["s"], {"sample", "search", "show"}),
-            (["notify", "s"], {"star", "status"}),
-            (["--"], {"--help", "--version"}),
-            (["search", "zs", "--p"], {"--phone", "--plain", "--postal"}),
-            (["notify", "star", "--"], {"--data-dir", "--help", "--off"}),
-            (["search", "--color", "a"], {"auto", "always"}),
-            (["show", "--sort-type", ""], {"name", "time"}),
-            (["sample", "--pyfile", ""], {"a-file", "a-place"}),
-            (["sample", "--data-dir", ""], {"a-place"}),
-            (["show", "--limit", ""], set()),
-            (["search", ""], set()),
-        ]
-        for shell in ("bash", "zsh"):
-            if shutil.which(shell):
-                for words, expected in cases:
-                    self.assertEqual(expected, self.complete(shell, *words), (shell, words))
+    def test_shells(self):
+        place = tempfile.TemporaryDirectory(prefix="qvtool_")
+        self.addCleanup(place.cleanup)
+        pathlib.Path(place.name, "a-file").touch()
+        pathlib.Path(place.name, "a-place").mkdir()
+        for shell, flag in (("bash", "--norc"), ("zsh", "-f")):
+            for words, expected in self.OFFERED if shutil.which(shell) else []:
+                process = subprocess.run(
+                    [shell, flag, "-c", self.RUN[shell], TOP / "tools/completion", TOOL, *words],
+                    cwd=place.name, capture_output=True, encoding="utf-8", check=False)
+                self.assertEqual((expected, ""), (set(process.stdout.split()), process.stderr),
+                                 (shell, words))
 
 
-class ErrorsTest(ToolTest):
-    def fails(self, directory, code, text, command, *arguments):
-        process = run(directory, command, *arguments)
-        self.assertEqual(code, process.returncode, (command, arguments, process.stderr))
-        self.assertIn(text, process.stderr)
-        self.assertEqual("", process.stdout)
-
+class ErrorsTest(ToolCase):
     def test_says_what_is_missing_and_what_makes_it(self):
-        empty = self.root / "it's empty"
+        indexed, self.data = self.data, self.root / "it's empty"
         advice = f"qvlocalize sample --data-dir '{self.root}/it'\\''s empty'"
-        self.fails(empty, MISSING, advice, "index")
-        self.fails(empty, MISSING, advice, "search", "a")
-        self.fails(empty, MISSING, "qvlocalize index --data-dir", "show")
-        unindexed = self.root / "unindexed"
-        shutil.copytree(self.data, unindexed)
-        (unindexed / "files/ContactsReg.bin").unlink()
-        self.fails(unindexed, MISSING, f"qvlocalize index --data-dir {unindexed}\n", "search", "a")
-        (unindexed / "files/pyfile.bin").unlink()
-        self.fails(unindexed, MISSING, "there is no pinyin table", "index")
-        self.fails(empty, MISSING, "--pyfile", "sample", "--pyfile", str(self.root / "none"))
+        self.refused(MISSING, advice, "index")
+        self.refused(MISSING, advice, "search", "a")
+        self.refused(MISSING, "qvlocalize index --data-dir", "show")
+        self.refused(MISSING, "--pyfile", "sample", "--pyfile", self.root / "none")
+        self.data = indexed
+        (indexed / "files/ContactsReg.bin").unlink()
+        self.refused(MISSING, f"qvlocalize index --data-dir {indexed}\n", "search", "a")
+        self.run_tool("notify", "status", code=MISSING)
+        (indexed / "files/pyfile.bin").unlink()
+        self.refused(MISSING, "there is no pinyin table", "index")
 
     def test_refuses_a_pinyin_table_of_another_size(self):
-        data = self.root / "table"
-        shutil.copytree(self.data, data)
-        table = data / "files/pyfile.bin"
+        table = self.data / "files/pyfile.bin"
         for content in (table.read_bytes()[:-1], table.read_bytes() + b"0", b""):
             table.write_bytes(content)
             text = f"it has {len(content)} bytes, a pinyin table has 709412"
-            before = [path.read_bytes() for path in sorted(data.rglob("*.bin"))]
-            self.fails(data, FAILED, text, "index")
-            self.fails(data, FAILED, text, "sample", "--force", "--pyfile", str(table))
-            self.assertEqual(before, [path.read_bytes() for path in sorted(data.rglob("*.bin"))])
-
-    def test_refuses_what_cannot_be_searched(self):
-        self.fails(self.data, USAGE, "11 characters; a search takes at most 10", "search",
-                   "abcdefghijk")
-        self.fails(self.data, USAGE, "beyond U+FFFF", "search", "\U0001F600")
-        self.fails("x" * 4001, USAGE, "too long", "search", "a")
+            before = [path.read_bytes() for path in sorted(self.data.rglob("*.bin"))]
+            self.refused(FAILED, text, "index")
+            self.refused(FAILED, text, "sample", "--force", "--pyfile", table)
+            self.assertEqual(before,
+                             [path.read_bytes() for path in sorted(self.data.rglob("*.bin"))])
 
     def test_refuses_a_wrong_command_line_by_name(self):
         for call, text in (
@@ -493,74 +351,75 @@ class ErrorsTest(ToolTest):
                 (["search", "a", "--limit", "-1"], '"-1" is not a whole number from 0 to 21'),
                 (["search", "a", "--group", "4294967297"], '--group: "4294967297" is not a whole'),
                 (["search", "a", "--plain", "--json"], "--json excludes --plain"),
-                (["sample", "--count", "200001"], "--count: \"200001\" is not a whole number from 1"
-                                                  " to 200000"),
+                (["sample", "--count", "200001"], '"200001" is not a whole number from 1 to 200000'),
                 (["sample", "--now", "1e3"], '"1e3" is not a whole number from 0 to'),
+                (["notify"], "required"), (["notify", "nothing"], 'unknown subcommand "nothing"'),
+                (["notify", "star"], "required"), (["notify", "time", "5"], "required"),
+                (["notify", "star", "0"], "from 1 to 2147483647"),
+                (["notify", "contacts", "1", "x"], '"x" is not'),
+                (["notify", "time", "5", "-9"], "from 0 to 253402300799999"),
+                (["notify", "status", "5"], "not expected: 5"),
+                (["notify", "status", "--on"], "--on is not an option of notify"),
                 ([], "required")):
             process = subprocess.run([TOOL, *call], capture_output=True, encoding="utf-8",
                                      check=False)
             self.assertEqual((USAGE, ""), (process.returncode, process.stdout), call)
             self.assertRegex(process.stderr, r"\Aqvlocalize: .*\nRun with --help .*\n\Z")
             self.assertIn(text, process.stderr)
+        self.refused(USAGE, "11 characters; a search takes at most 10", "search", "abcdefghijk")
+        self.refused(USAGE, "beyond U+FFFF", "search", "\U0001F600")
+        self.data = "x" * 4001
+        self.refused(USAGE, "too long", "search", "a")
 
     def test_tells_what_is_damaged(self):
-        special = ("search", "hj", "--type", "special")
         reg, records, database = "ContactsReg.bin", "ContactsLocalizer.bin", "contacts2.db"
-        cases = [  # a file, what becomes of it, and what each call says of it
-            (reg, b"abc", {("show",): "could not be read", ("search", "a"): "could not be read"}),
-            (reg, b"\xff" * 12, {("show",): "the index is damaged"}),
-            (records, None, {("show",): "is damaged", ("search", "a"): "is damaged",
-                             ("notify", "star", "5"): "is damaged"}),
-            ("PyFileMappint.bin", b"abc", {special: "index's pinyin table",
-                                           ("search", "a"): "index's pinyin table"}),
-            (database, b"no database", {
-                ("index",): "ReadAllLocalizer select contacts count sqlite3_prepare ERROR",
-                ("search", "a"): "not a contacts database: file is not a database"}),
-            (database, b"", {("search", "a"): "not a contacts database: no such table"}),
-        ]
-        for name, content, calls in cases:
-            data = self.root / "damaged"
-            shutil.copytree(self.data, data)
-            path, = data.glob(f"*/{name}")
+        for name, content, calls in (  # a file, what becomes of it, and what each call says of it
+                (reg, b"abc", {"show": "could not be read", "search a": "could not be read"}),
+                (reg, b"\xff" * 12, {"show": "the index is damaged"}),
+                (records, None, {"show": "is damaged", "search a": "is damaged",
+                                 "notify star 5": "is damaged"}),
+                ("PyFileMappint.bin", b"abc", {"search hj --type special": "index's pinyin table",
+                                               "search a": "index's pinyin table"}),
+                (database, b"no database", {
+                    "index": "ReadAllLocalizer select contacts count sqlite3_prepare ERROR",
+                    "search a": "not a contacts database: file is not a database"}),
+                (database, b"", {"search a": "not a contacts database: no such table"})):
+            path, = self.data.glob(f"*/{name}")
+            whole = path.read_bytes()
             path.unlink()
             if content is not None:
                 path.write_bytes(content)
             for call, text in calls.items():
-                self.fails(data, FAILED, text, *call)
+                self.refused(FAILED, text, *call.split())
             if name in (reg, records):
-                self.assertIn("Index built", run(data, "index", "--if-needed").stdout)
-                self.assertEqual(DONE, run(data, "show").returncode)
-            shutil.rmtree(data)
+                self.assertIn("Index built", self.run_tool("index", "--if-needed").stdout)
+                self.run_tool("show")
+            path.write_bytes(whole)
 
-    def test_a_lock_file_that_is_none_and_a_busy_database(self):
-        data = self.root / "locks"
-        shutil.copytree(self.data, data)
-        with contextlib.closing(sqlite3.connect(data / "databases/contacts2.db")) as database:
-            database.execute("BEGIN EXCLUSIVE")
-            self.fails(data, FAILED, "the database cannot be read: database is locked", "search", "")
-        (data / "files/memlock.ini").unlink()
-        (data / "files/memlock.ini").mkdir()
-        self.fails(data, FAILED, "the lock file cannot be opened", "search", "")
-
-    def test_output_that_cannot_be_written(self):
-        for call in (["search", "zs"], ["search", "zs", "--json"], ["--help"], ["index"]):
-            data = [] if call == ["--help"] else ["--data-dir", str(self.data)]
-            for close, target in (("", "/dev/full"), (">&-", "/dev/null")):
-                with open(target, "wb") as output:
-                    process = subprocess.run(
-                        ["bash", "-c", f'"$0" "$@" {close}', TOOL, *call, *data], stdout=output,
-                        stderr=subprocess.PIPE, encoding="utf-8", check=False)
-                self.assertEqual((FAILED, "qvlocalize: the output could not be written\n"),
-                                 (process.returncode, process.stderr), (call, target))
-
-    def test_a_store_that_another_process_holds(self):
+    def test_a_store_or_database_that_another_process_holds(self):
         with open(self.data / "files/memlock.ini", "ab") as lock:
             fcntl.flock(lock, fcntl.LOCK_EX)
-            self.fails(self.data, FAILED, "(result -1): another process holds the store\n"
-                       "  QV_Contacts:InitContactRecord write share memo lock", "index")
-            self.fails(self.data, FAILED, "the index could not be read", "search", "a", "--json")
-            self.fails(self.data, FAILED, "another process holds the store", "show")
-        self.check("search", "a")
+            self.refused(FAILED, "(result -1): another process holds the store\n"
+                                 "  QV_Contacts:InitContactRecord write share memo lock", "index")
+            self.refused(FAILED, "the index could not be read", "search", "a", "--json")
+            self.refused(FAILED, "another process holds the store", "show")
+        with contextlib.closing(sqlite3.connect(self.database)) as database:
+            database.execute("BEGIN EXCLUSIVE")
+            self.refused(FAILED, "the database cannot be read: database is locked", "search", "")
+        self.run_tool("search", "a")
+        (self.data / "files/memlock.ini").unlink()
+        (self.data / "files/memlock.ini").mkdir()
+        self.refused(FAILED, "the lock file cannot be opened", "search", "")
+
+    def test_output_that_cannot_be_written(self):
+        for call in (self.call("search", "zs"), self.call("search", "zs", "--json"),
+                     self.call("index"), [TOOL, "--help"]):
+            for close, target in (("", "/dev/full"), (">&-", "/dev/null")):
+                with open(target, "wb") as output:
+                    process = subprocess.run(["bash", "-c", f'"$0" "$@" {close}', *call],
+                                             stdout=output, stderr=subprocess.PIPE, check=False)
+                self.assertEqual((FAILED, b"qvlocalize: the output could not be written\n"),
+                                 (process.returncode, process.stderr), (call, target))
 
 
 if __name__ == "__main__":

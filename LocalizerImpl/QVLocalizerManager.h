@@ -54,11 +54,12 @@ public:
     // or the piece is null. CmpChineseWord gets a table, the character's code and record, none of
     // them to be written, the mask of the search, whether the piece is the last of the text, and
     // sets bFull to whether the piece is a whole reading; the codes of the other three are cut to
-    // 16 bits. A search asks once for all characters with the same readings, without a code, then
-    // for those that it reports, with their record. What a matcher answers depends on nothing but
-    // the code and the piece; where a piece fits, each of its beginnings fits too; and a letter or
-    // digit fits a Chinese character only if one of its spellings begins with it. The search
-    // relies on all three.
+    // 16 bits. A search asks once for all characters with the same readings, with a code only
+    // where the text itself has a Chinese character, then for those that it reports, with their
+    // own record. What a matcher answers depends on nothing but the code, the record's readings
+    // and the piece; where a piece fits, each of its beginnings fits too; and a letter or digit
+    // fits a Chinese character only if one of its spellings begins with it. The search relies on
+    // all three.
     virtual int CmpChineseWord(PYOFWORDS* pMap, wchar_t code, PYOFWORDS& record, wchar_t* szPiece,
                                _mask_type* pMask, int bLastPiece, int& bFull) = 0;
     virtual int CmpEnglishWords(unsigned short code, wchar_t* szPiece) = 0;

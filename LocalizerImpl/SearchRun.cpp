@@ -1,11 +1,13 @@
 // One search: the typed text against every candidate, the ranked result, the next keys and the
 // candidate characters.
 //
-// Every way to cut the text into pieces is tried on every name, but not one by one: PieceTable
-// knows which pieces fit which characters, RunFinder follows them through a name. What a
-// successful comparison of a last piece adds to the mask and to the candidate characters is the
-// same for every name with that character, so it is collected per character and added at the end,
-// in the order in which trying split by split and contact by contact would have met it.
+// A text passes five classes: CReadingSets maps each character code to a key shared by all
+// characters with the same readings; CPieceTable caches which pieces of the text fit which key;
+// CReachStates, a lazily built DFA over sets of reachable offsets, rejects the names that do not
+// match; CRunFinder works out split, kind and position of those that do; RankMatches sorts them.
+// What the last piece adds to the key mask depends on the key alone, so it is marked per key and
+// added once at the end, in any order. Candidate characters have an order, that of the first
+// split and contact that meets them: CFirstFound keeps it.
 
 #include "LocalizerImpl/SearchRun.h"
 

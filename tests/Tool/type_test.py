@@ -4,25 +4,22 @@ type_test.py TOOL PYFILE [--record] [TestClass...]
 
 --record writes the screens anew, for people to look through; without it they are compared.
 """
-import contextlib
-import json
 import os
 import pathlib
 import re
 import shlex
 import shutil
 import signal
-import sqlite3
 import subprocess
 import sys
-import tempfile
 import time
 import unittest
 
-TOOL, PYFILE = sys.argv[1:3]
+sys.path.insert(0, str(pathlib.Path(__file__).parents[1] / "Support"))
+# pylint: disable=wrong-import-position
+from tool_case import PYFILE, SKIPPED, TOOL, USAGE, ToolCase
+
 RECORD = "--record" in sys.argv
-SKIPPED = 77
-USAGE = 2
 SCREENS = pathlib.Path(__file__).parent / "screens"
 SIZES = [(40, 12), (80, 24), (132, 43)]
 PROMPT = "shell>"
@@ -50,11 +47,6 @@ SCENARIO = [
 ]
 
 
-def run(*arguments, **options):
-    return subprocess.run([TOOL, *arguments], capture_output=True, encoding="utf-8", check=False,
-                          **options)
-
-
 def without_styles(text):
     """The text of a screen with underlined characters in braces: those that matched."""
     plain, underlined = "", False
@@ -73,7 +65,8 @@ class Terminal:
     """A shell in a terminal of tmux."""
 
     def __init__(self, directory, columns, rows):
-        self.call = ["tmux", "-u", "-f", "/dev/null", "-S", str(directory / "tmux")]
+        self.call = ["tmux", "-u", "-f", "/dev/null", "-S",
+                     str(directory / f"tmux{columns}")]
         self.tmux("new-session", "-d", "-x", str(columns), "-y", str(rows), "sh")
 
     def tmux(self, *arguments):
@@ -102,60 +95,41 @@ class Terminal:
             time.sleep(0.02)
         return screen
 
+    def wait_to_be(self, wanted):
+        return self.wait(lambda screen: screen == wanted, wanted)
+
     def wait_for(self, pattern):
         return self.wait(lambda screen: re.search(pattern, screen, re.MULTILINE), pattern)
 
     def close(self):
-        self.tmux("kill-server")
+        subprocess.run([*self.call, "kill-server"], capture_output=True, check=False)
 
 
-class TypeTest(unittest.TestCase):
-    """A directory with the sample and its index, and a terminal where it is typed."""
-
-    def setUp(self):
-        self.root = pathlib.Path(tempfile.mkdtemp(prefix="qvtype_"))
-        self.addCleanup(shutil.rmtree, self.root)
-        self.data = self.root / "data"
-        for call in (["sample", "--pyfile", PYFILE], ["index"]):
-            process = run(*call, "--data-dir", str(self.data))
-            self.assertEqual(0, process.returncode, process.stderr)
-        self.before, self.after = self.root / "before", self.root / "after"
+class TypeTest(ToolCase):
+    """A terminal where the sample is typed at."""
 
     def open(self, columns=80, rows=24, *arguments):
         """A terminal where the tool runs, in a shell that noted the state of the terminal."""
-        terminal = Terminal(self.root, columns, rows)
-        self.addCleanup(terminal.close)
-        terminal.enter(f"PS1='{PROMPT} '; cd {shlex.quote(str(self.root))}; stty -g >before; clear")
-        terminal.wait(lambda screen: screen == PROMPT)
-        self.start(terminal, *arguments)
-        return terminal
+        self.terminal = Terminal(self.root, columns, rows)
+        self.addCleanup(self.terminal.close)
+        self.terminal.enter(f"PS1='{PROMPT} '; cd {shlex.quote(str(self.root))}; stty -g >before;"
+                            " clear")
+        self.terminal.wait(lambda screen: screen == PROMPT)
+        self.start(*arguments)
+        return self.terminal
 
-    def start(self, terminal, *arguments):
-        call = shlex.join([TOOL, "type", "--data-dir", str(self.data), *arguments])
+    def start(self, *arguments):
+        call = shlex.join(self.call("type", *arguments))
         (self.root / "run").write_text(f"echo $$ >pid; exec {call}\n")
-        terminal.enter("sh run")
-        terminal.wait_for("^(abc|123)> ")
+        self.terminal.enter("sh run")
+        self.terminal.wait_for("^(abc|123)> ")
 
-    def assert_left_as_it_was(self, terminal, status):
+    def assert_left_as_it_was(self, status):
         """The shell is back with the screen and the state of before, and the exit status."""
-        terminal.wait_for(rf"^{PROMPT} sh run\n(.*\n)*{PROMPT}$")
-        terminal.enter("echo status $?; stty -g >after")
-        terminal.wait_for(rf"^status {status}\n{PROMPT}$")
-        self.assertEqual(self.before.read_text(), self.after.read_text())
-
-    def search(self, text, *arguments):
-        process = run("search", text, "--data-dir", str(self.data), "--json", "--once",
-                      *arguments)
-        return json.loads(process.stdout)["steps"][-1]
-
-    def change(self, statement, *values):
-        with contextlib.closing(sqlite3.connect(self.data / "databases/contacts2.db")) as database:
-            database.execute(statement, values)
-            database.commit()
-
-    def notify(self, *arguments):
-        process = run("notify", *arguments, "--data-dir", str(self.data))
-        self.assertEqual(0, process.returncode, process.stderr)
+        self.terminal.wait_for(rf"^{PROMPT} sh run\n(.*\n)*{PROMPT}$")
+        self.terminal.enter("echo status $?; stty -g >after")
+        self.terminal.wait_for(rf"^status {status}\n{PROMPT}$")
+        self.assertEqual(*((self.root / name).read_text() for name in ("before", "after")))
 
 
 def recorded(columns, rows):
@@ -166,36 +140,29 @@ def recorded(columns, rows):
 
 
 class ScreenTest(TypeTest):
-    def record(self, terminal, columns, rows):
-        screens = {}
-        for keys, name in SCENARIO:
-            terminal.press(*keys)
-            while terminal.screen() != screens.get(name):
-                screens[name] = terminal.screen()
-                time.sleep(1)
-        (SCREENS / f"{columns}x{rows}.txt").write_text(
-            "".join(f"===== {name}\n{screen}\n" for name, screen in screens.items()),
-            encoding="utf-8")
+    @unittest.skipUnless(RECORD, "the screens are compared")
+    def test_record(self):
+        for columns, rows in SIZES:
+            terminal, screens = self.open(columns, rows), {}
+            for keys, name in SCENARIO:
+                terminal.press(*keys)
+                while terminal.screen() != screens.get(name):
+                    screens[name] = terminal.screen()
+                    time.sleep(1)
+            terminal.press("Escape")
+            (SCREENS / f"{columns}x{rows}.txt").write_text(
+                "".join(f"===== {name}\n{screen}\n" for name, screen in screens.items()),
+                encoding="utf-8")
 
-    def check_size(self, columns, rows):
-        terminal = self.open(columns, rows)
-        if RECORD:
-            self.record(terminal, columns, rows)
-        screens = recorded(columns, rows)
-        for keys, name in [] if RECORD else SCENARIO:
-            terminal.press(*keys)
-            terminal.wait(lambda screen, wanted=screens[name]: screen == wanted, screens[name])
-        terminal.press("Escape")
-        self.assert_left_as_it_was(terminal, 0)
-
-    def test_40x12(self):
-        self.check_size(*SIZES[0])
-
-    def test_80x24(self):
-        self.check_size(*SIZES[1])
-
-    def test_132x43(self):
-        self.check_size(*SIZES[2])
+    def test_every_size(self):
+        for columns, rows in SIZES:
+            terminal, screens = self.open(columns, rows), recorded(columns, rows)
+            for keys, name in SCENARIO:
+                terminal.press(*keys)
+                terminal.wait_to_be(screens[name])
+            terminal.press("Escape")
+            self.assert_left_as_it_was(0)
+            terminal.close()
 
     def test_the_picture_in_the_readme(self):
         readme = (SCREENS.parents[2] / "README.md").read_text(encoding="utf-8")
@@ -207,39 +174,37 @@ class ScreenTest(TypeTest):
         terminal.press(*"zhangs")
         for columns, rows in [SIZES[2], SIZES[0], SIZES[1]]:
             terminal.tmux("resize-window", "-x", str(columns), "-y", str(rows))
-            wanted = recorded(columns, rows)["zhangs"]
-            terminal.wait(lambda screen, wanted=wanted: screen == wanted, wanted)
+            terminal.wait_to_be(recorded(columns, rows)["zhangs"])
         terminal.tmux("resize-window", "-x", "39", "-y", "12")
-        terminal.wait(lambda screen: screen == "needs 40 x 12")
+        terminal.wait_to_be("needs 40 x 12")
 
 
 class KeysTest(TypeTest):
     def test_exactly_the_keys_that_lead_on_are_lit(self):
-        terminal = self.open(80, 24)
-        for text in ("", "z", "zha", "tom"):
-            terminal.press(*["BSpace"] * 10, *text)
-            expected = {key for key in "abcdefghijklmnopqrstuvwxyz#"
-                        if self.search(text + key)["total"] > 0}
-            row = " ".join(key if key in expected else "·"
-                           for key in "abcdefghijklmnopqrstuvwxyz#")
-            terminal.wait(lambda screen, text=text, row=row:
-                          screen.startswith(f"abc> {text} ") and row in screen, row)
-        terminal.press("Tab")
-        for text in ("", "9", "942", "866"):
-            terminal.press(*["BSpace"] * 10, *text)
-            expected = {key for key in "0123456789"
-                        if self.search(text + key, "--type", "num")["total"] > 0}
-            terminal.wait(lambda screen, text=text, expected=expected:
-                          screen.startswith(f"123> {text} ") and
-                          set(re.findall(r"\[(.) .{4}\]", screen)) == expected, expected)
+        terminal = self.open()
+        for kind, options, keys, texts in (
+                ("abc", [], "abcdefghijklmnopqrstuvwxyz#", ("", "z", "zha", "tom")),
+                ("123", ["--type", "num"], "0123456789", ("", "9", "942", "866"))):
+            for text in texts:
+                terminal.press(*["BSpace"] * 10, *text)
+                lit = {key for key in keys if self.found(text + key, *options)}
+                terminal.wait(lambda screen, start=f"{kind}> {text} ", lit=lit:
+                              screen.startswith(start) and self.lit(screen) == lit, lit)
+            terminal.press("Tab")
+
+    @staticmethod
+    def lit(screen):
+        """The keys of a keypad that lead on, or those of the row of letters."""
+        keys = re.findall(r"\[(.) .{4}\]|((?:[a-z·] ){26}[#·])", screen)
+        return set("".join(map("".join, keys))) - set(" ·")
 
     def test_picking_replaces_all_letters_of_the_character(self):
         table = pathlib.Path(PYFILE).read_bytes()
         words = [table[i:i + 3].decode() for i in range(0, len(table), 46)]
-        self.change("UPDATE localizer SET display_name = '南王', localizerkey = ? WHERE "
-                    "contact_id = 54", "".join(chr(0x1000 + words.index(word)) for word in "南王"))
-        self.notify("contacts", "54")
-        terminal = self.open(80, 24)
+        self.sql("UPDATE localizer SET display_name = '南王', localizerkey = ? WHERE "
+                 "contact_id = 54", "".join(chr(0x1000 + words.index(word)) for word in "南王"))
+        self.run_tool("notify", "contacts", "54")
+        terminal = self.open()
         terminal.press(*"nan")
         terminal.wait_for(r"^abc> nan (.*\n)*1南$")
         terminal.press("1")
@@ -256,11 +221,10 @@ class KeysTest(TypeTest):
         terminal.wait_for(rf"^abc> zs (.*\n)*> .* {chosen['contact_id']}\n(.*\n)*F2\[ \]")
         terminal.press("Enter")
         terminal.wait_for(rf"^{chosen['contact_id']} +{chosen['name']}$")
-        self.assert_left_as_it_was(terminal, 0)
+        self.assert_left_as_it_was(0)
         # The result goes where the standard output goes, while the typing stays visible.
         (self.root / "run").write_text(
-            f"echo \"id $({shlex.join([TOOL, 'type', '--data-dir', str(self.data)])} | "
-            "cut -f 1)\"\n")
+            f"echo \"id $({shlex.join(self.call('type'))} | cut -f 1)\"\n")
         terminal.enter("clear; sh run")
         terminal.wait_for("^abc> ")
         terminal.press(*"qqq", "Enter")
@@ -272,28 +236,27 @@ class KeysTest(TypeTest):
 class SignalTest(TypeTest):
     def test_signals_leave_the_terminal_as_it_was(self):
         terminal = self.open()
-        for ending in (signal.SIGTERM, signal.SIGHUP, signal.SIGINT):
+        for ending in (signal.SIGTERM, signal.SIGHUP, signal.SIGINT, "C-c"):
             terminal.press(*"zhan")
             terminal.wait_for("^abc> zhan ")
-            os.kill(int((self.root / "pid").read_text()), ending)
-            self.assert_left_as_it_was(terminal, 128 + ending)
+            if ending == "C-c":
+                terminal.press("C-c")
+                ending = signal.SIGINT
+            else:
+                os.kill(int((self.root / "pid").read_text()), ending)
+            self.assert_left_as_it_was(128 + ending)
             terminal.enter("clear")
-            terminal.wait(lambda screen: screen == PROMPT)
-            self.start(terminal)
-        terminal.press("C-c")
-        self.assert_left_as_it_was(terminal, 128 + signal.SIGINT)
+            terminal.wait_to_be(PROMPT)
+            self.start()
 
     def test_stops_and_goes_on(self):
         terminal = self.open()
         terminal.press(*"zhan")
         typed = terminal.wait_for("^abc> zhan ")
         terminal.press("C-z")
-        terminal.wait_for(rf"^{PROMPT} sh run\n(.*\n)*{PROMPT}$")
-        terminal.enter("stty -g >after; clear; echo stopped")
-        terminal.wait_for("^stopped")
-        self.assertEqual(self.before.read_text(), self.after.read_text())
+        self.assert_left_as_it_was(128 + signal.SIGTSTP)
         terminal.enter("fg")
-        terminal.wait(lambda screen: screen == typed, typed)
+        terminal.wait_to_be(typed)
         terminal.press("g")
         terminal.wait_for("^abc> zhang ")
 
@@ -305,10 +268,10 @@ class IndexTest(TypeTest):
         terminal.wait_for("^abc> zhangsan .* 4 contacts$")
         # Twice in a row: the second change is seen too, however close it is to the first.
         for contact, count in ((54, 5), (55, 6)):
-            self.change("UPDATE localizer SET (display_name, localizerkey) = (SELECT '张' || "
-                        "char(27) || '[31m三' || char(128512), localizerkey FROM localizer WHERE "
-                        "contact_id = 1) WHERE contact_id = ?", contact)
-            self.notify("contacts", str(contact))
+            self.sql("UPDATE localizer SET (display_name, localizerkey) = (SELECT '张' || "
+                     "char(27) || '[31m三' || char(128512), localizerkey FROM localizer WHERE "
+                     "contact_id = 1) WHERE contact_id = ?", contact)
+            self.run_tool("notify", "contacts", contact)
             terminal.wait_for(rf"^abc> zhangsan .* {count} contacts$")
         self.assertIn("{张\\x1b}[31m三\U0001f600", terminal.screen())
         terminal.press("BSpace")  # every text before it is searched anew, too
@@ -316,21 +279,18 @@ class IndexTest(TypeTest):
         terminal.press("F2")
         before = self.search("zhangsa", "--starred")["total"]
         terminal.wait_for(rf"^abc> zhangsa .* {before} contacts?$")
-        self.notify("star", "6")
+        self.run_tool("notify", "star", "6")
         terminal.wait_for(rf"^abc> zhangsa .* {before + 1} contacts?$")
 
 
 class RefusalTest(TypeTest):
     def test_where_it_cannot_run(self):
-        call = ["type", "--data-dir", str(self.data)]
-        process = run(*call, stdin=subprocess.DEVNULL)
-        self.assertEqual(USAGE, process.returncode)
-        self.assertIn("no terminal", process.stderr)
+        self.refused(USAGE, "no terminal", "type", stdin=subprocess.DEVNULL)
         terminal = self.open()
         terminal.press("Escape")
         for setting, text in (("LC_ALL=C", "UTF-8"), ("TERM=dumb", "dumb"), ("TERM=", "TERM"),
                               ("TERM=none", "none")):
-            terminal.enter(f"clear; {setting} {shlex.join([TOOL, *call])}; echo status $?")
+            terminal.enter(f"clear; {setting} {shlex.join(self.call('type'))}; echo status $?")
             self.assertIn(text, terminal.wait_for(rf"^status {USAGE}$"), setting)
 
 

@@ -29,8 +29,8 @@ using Chain = std::unique_ptr<CFilterChain>;
 using Ids = std::vector<int>;
 using Records = std::vector<tag_ContactsStruct>;
 
-// Contacts 1 to 6 have one flag each and neither groups nor accounts; the others have lists: 7 short
-// ones, 8 such as fill all places, 9 with ids behind the end.
+// Contacts 1 to 6 have one flag each and neither groups nor accounts; the others have lists: 7
+// short ones, 8 such as fill all places, 9 with ids behind the end.
 Records MakeRecords()
 {
     constexpr uint32_t FLAGS[] = {CONTACT_FLAG_PHONE,   CONTACT_FLAG_MAIL,   CONTACT_FLAG_STARRED,
@@ -140,8 +140,9 @@ TEST(Filters, KeepTheirContacts)
     {
         SCOPED_TRACE(testing::PrintToString(row.vKinds) + testing::PrintToString(row.vIds));
         const Chain chain = Build(row);
-        const bool bLogs = std::any_of(row.vKinds.begin(), row.vKinds.end(), [](int iKind)
-                                       { return iKind == 9 || iKind == FILTER_ONLINE; });
+        const bool bLogs =
+            std::any_of(row.vKinds.begin(), row.vKinds.end(),
+                        [](int iKind) { return iKind == 9 || iKind == FILTER_ONLINE; });
         EXPECT_EQ(CRecordTest::CanTest(*chain), !bLogs);
         chain->SetFilter(nullptr);
         Ids vKept;

@@ -1,0 +1,521 @@
+// The search against its own operations, called split by split and name by name: every short text
+// over a small alphabet, long texts over many names, narrowed and not. The operations themselves
+// are held by tables.
+
+#include "Common/DataPaths.h"
+#include "LocalizerImpl/QVNumLocalizerManager.h"
+#include "LocalizerImpl/QVWordLocalizerManager.h"
+#include "tests/LocalizerImpl/LocalizerFixture.h"
+#include "tests/Support/WideText.h"
+
+#include <pthread.h>
+
+#include <algorithm>
+#include <functional>
+#include <random>
+#include <tuple>
+
+namespace
+{
+
+using Manager = CQVLocalizerManager;
+using Details = std::vector<tag_LocalizerDetail>;
+using Pieces = std::vector<std::wstring>;
+
+// What one comparison answers: whether it matched, iKeyLen and bAllFull.
+using Compared = std::tuple<int, int, int>;
+
+constexpr wchar_t DAMAGED_CODE = 0x6FFF;
+
+// What a search answers.
+struct tag_Answer
+{
+    Details vEntries;
+    uint32_t uMask;
+    std::wstring strWords;
+};
+
+tag_LocalizerDetail MakeDetail(int iId, int iPlace, const std::wstring& strCodes)
+{
+    tag_LocalizerDetail detail = {};
+    detail.iContactID = iId;
+    detail.iSortIndex = iPlace;
+    std::copy_n(strCodes.begin(), std::min<size_t>(strCodes.size(), 10), detail.szLocalizerKey);
+    return detail;
+}
+
+void FillLastFirst(Pieces& vPieces, android::Vector<wchar_t*>& vLastFirst)
+{
+    std::for_each(vPieces.rbegin(), vPieces.rend(),
+                  [&](std::wstring& strPiece) { vLastFirst.push(strPiece.data()); });
+}
+
+// One search made of the operations of its matcher.
+template <class TMatcher>
+class CStepwise : public TMatcher
+{
+public:
+    using TMatcher::TMatcher;
+
+    tag_Answer Search(PYOFWORDS* pMap, Details vNames, const std::wstring& strInput)
+    {
+        const size_t n = strInput.size();
+        for (unsigned s = 1U << (n - 1); s < 1U << n; ++s)
+        {
+            Pieces vPieces;
+            for (size_t i = 0; i < n; ++i)
+            {
+                vPieces.resize(vPieces.size() + ((s >> (n - 1 - i)) & 1U));
+                vPieces.back() += strInput[i];
+            }
+            TrySplit(pMap, vPieces, vPieces.size() == n, vNames);
+        }
+        // The mask is shown to comparisons with Chinese characters alone.
+        wchar_t szNothing[] = L"$";
+        int bFull = 0;
+        tag_LocalizerDetail probe = MakeDetail(0, 0, {LOC_HANZI_BASE});
+        android::Vector<wchar_t*> vProbe;
+        vProbe.push(szNothing);
+        this->DoCompare(pMap, &probe, vProbe, bFull, bFull);
+        const int iCount = static_cast<int>(m_vMatches.size());
+        Manager::LocalResultQuickSort(m_vMatches, 0, iCount - 1, vNames.data());
+        tag_Answer answer = {{}, n == LOC_MAX_INPUT ? 0 : m_uMask, m_strWords};
+        for (size_t i = 0; i < m_vMatches.size(); ++i)
+        {
+            answer.vEntries.push_back(vNames[static_cast<size_t>(m_vMatches[i].iIndex)]);
+            answer.vEntries.back().iMatchPos = m_vMatches[i].iMatchPos;
+        }
+        return answer;
+    }
+
+private:
+    void TrySplit(PYOFWORDS* pMap, Pieces& vPieces, bool bInitials, Details& vNames)
+    {
+        android::Vector<wchar_t*> vLastFirst;
+        FillLastFirst(vPieces, vLastFirst);
+        const int iPieces = static_cast<int>(vPieces.size());
+        for (size_t i = 0; this->IsValid(vLastFirst) != 0 && i < vNames.size(); ++i)
+        {
+            int iKeyLen = 0;
+            int bAllFull = 0;
+            if (this->DoCompare(pMap, &vNames[i], vLastFirst, iKeyLen, bAllFull) != 0)
+            {
+                const int iType = bInitials        ? MATCH_INITIALS
+                                  : bAllFull != 0 ? MATCH_FULL
+                                                  : MATCH_PARTIAL;
+                const std::wstring strCodes(vNames[i].szLocalizerKey, 10);
+                const int iLength = static_cast<int>(std::wcslen(strCodes.c_str()));
+                const int iStart = iLength - iKeyLen;
+                Manager::AddToVector(m_vMatches, {static_cast<int>(i), iType,
+                                                  MatchPosition(iStart, iStart + iPieces - 1), 0});
+            }
+        }
+    }
+
+    int CmpChineseWord(PYOFWORDS* pMap, wchar_t code, PYOFWORDS& record, wchar_t* szPiece,
+                       _mask_type* pMask, int bLastPiece, int& bFull) override
+    {
+        const int iFits =
+            TMatcher::CmpChineseWord(pMap, code, record, szPiece, pMask, bLastPiece, bFull);
+        m_uMask = pMask->lMask;
+        const std::wstring strWord = Wide(record.szWord);
+        if (iFits != 0 && bLastPiece != 0 && szPiece[0] >= L'a' && szPiece[0] <= L'z' &&
+            m_strWords.find(strWord) == std::wstring::npos && m_strWords.size() < CN_WORD_MAX)
+        {
+            m_strWords += strWord;
+        }
+        return iFits;
+    }
+
+    android::Vector<_MatchResult> m_vMatches;
+    uint32_t m_uMask = 0;
+    std::wstring m_strWords;
+};
+
+class Search : public LocalizerFixture
+{
+protected:
+    size_t Below(size_t uLimit) { return m_random() % uLimit; }
+
+    // iCount names of codes from strCodes; iSharing of them have one place in name order.
+    Details RandomNames(int iCount, int iSharing, const std::wstring& strCodes)
+    {
+        Details vNames;
+        for (int i = 0; i < iCount; ++i)
+        {
+            std::wstring strName(Below(6) == 0 ? Below(11) : 2 + Below(3), L'\0');
+            std::generate(strName.begin(), strName.end(),
+                          [&] { return strCodes[Below(strCodes.size())]; });
+            const int iPlace = i * 7919 % iCount / iSharing;
+            vNames.push_back(MakeDetail(i, iPlace * 1'234'567 - 99'999'999, strName));
+        }
+        return vNames;
+    }
+
+    // Searches both ways; returns the entries for a narrower search.
+    template <class TMatcher>
+    Details Compare(Details vNames, std::wstring strInput, bool bAnywhere)
+    {
+        SCOPED_TRACE("typed " + Narrow(strInput));
+        Details vEntries(vNames.size() + 1);
+        tag_LocalizerResult names = {static_cast<int>(vNames.size()), vNames.data()};
+        tag_LocalizerResult result = {names.iResultNum, vEntries.data()};
+        long lMask = -1;
+        wchar_t szWords[64] = {};
+        TMatcher matcher(bAnywhere ? 1 : 0);
+        EXPECT_EQ(0, matcher.DoSearch(&names, strInput.data(), IME_SEARCH_WORD, 0, &result, &lMask,
+                                      szWords));
+        vEntries.resize(static_cast<size_t>(result.iResultNum));
+        CStepwise<TMatcher> stepwise(bAnywhere ? 1 : 0);
+        const tag_Answer expected = stepwise.Search(m_pMap, vNames, strInput);
+        EXPECT_EQ(static_cast<uint32_t>(lMask), expected.uMask);
+        EXPECT_EQ(Narrow(szWords), Narrow(expected.strWords));
+        EXPECT_TRUE(std::equal(vEntries.begin(), vEntries.end(), expected.vEntries.begin(),
+                               expected.vEntries.end(), [](const auto& a, const auto& b)
+                               { return std::memcmp(&a, &b, sizeof(a)) == 0; }))
+            << "entries differ";
+        return vEntries;
+    }
+    Details Check(const Details& vNames, const std::wstring& strInput, bool bAnywhere = true)
+    {
+        const bool bDigits = strInput[0] >= L'0' && strInput[0] <= L'9';
+        return bDigits ? Compare<CQVNumLocalizerManager>(vNames, strInput, bAnywhere)
+                       : Compare<CQVWordLocalizerManager>(vNames, strInput, bAnywhere);
+    }
+    void CheckKeyByKey(const Details& vNames, const std::wstring& strInput)
+    {
+        Details vNarrowed = vNames;
+        for (size_t uTyped = 1; uTyped <= strInput.size() && !HasFailure(); ++uTyped)
+        {
+            vNarrowed = Check(vNarrowed, strInput.substr(0, uTyped));
+        }
+        Check(vNames, strInput);
+        Check(vNames, strInput, false);
+    }
+
+    // One comparison of pieces with a name, as Codes takes it.
+    Compared Do(bool bDigits, const wchar_t* szName, Pieces vPieces, int iKeyLen = 0,
+                int bAllFull = 0) const
+    {
+        CQVNumLocalizerManager digits(1);
+        CQVWordLocalizerManager letters(1);
+        Manager& matcher = bDigits ? static_cast<Manager&>(digits) : letters;
+        for (std::wstring& strPiece : vPieces)
+        {
+            matcher.ProcessInputCNWord(m_pMap, strPiece.data());
+        }
+        android::Vector<wchar_t*> vLastFirst;
+        FillLastFirst(vPieces, vLastFirst);
+        tag_LocalizerDetail detail = MakeDetail(0, 0, Codes(szName));
+        const int iMatch = matcher.DoCompare(m_pMap, &detail, vLastFirst, iKeyLen, bAllFull);
+        return {iMatch, iKeyLen, bAllFull};
+    }
+
+    std::mt19937 m_random{20240229};
+};
+
+void* RunBody(void* pBody)
+{
+    (*static_cast<std::function<void()>*>(pBody))();
+    return nullptr;
+}
+
+} // namespace
+
+TEST_F(Search, EveryShortTextOverCraftedNames)
+{
+    const wchar_t* const NAMES[] = {
+        L"张三",      L"李张三", L"长孙无忌", L"曾长",   L"重庆",   L"乐乐",   L"单田芳",
+        L"解解",      L"安安安安", L"王Li",   L"王?安",  L"2安3",   L"Zhang?San", L"zaz",
+        L"a",         L"安",     L"嗯n",      L"西安",   L"先",     L"?安",    L"",
+        L"中?国",     L"朝阳区", L"行行行",   L"阿啊a啊", L"张2三", L"曾曾曾曾曾曾曾曾曾曾曾"};
+    Details vNames;
+    for (const wchar_t* szName : NAMES)
+    {
+        const int i = static_cast<int>(vNames.size());
+        vNames.push_back(MakeDetail(100 + i, i / 2, Codes(szName))); // places in pairs
+        if (i % 2 == 0 && std::wcslen(szName) < 3)
+        {
+            vNames.back().szLocalizerKey[3] = HanZi(L'张'); // behind the end
+        }
+    }
+    for (const std::wstring strAlphabet : {L"zhansi#张", L"246972"})
+    {
+        std::vector<std::wstring> vTexts = {L""};
+        for (size_t i = 0; i < vTexts.size() && !HasFailure(); ++i)
+        {
+            for (size_t k = 0; vTexts[i].size() < 4 && k < strAlphabet.size(); ++k)
+            {
+                vTexts.push_back(vTexts[i] + strAlphabet[k]);
+            }
+            if (!vTexts[i].empty())
+            {
+                Check(vNames, vTexts[i]);
+                Check(vNames, vTexts[i], false);
+            }
+        }
+    }
+}
+
+TEST_F(Search, LongTextsOverRandomNamesTypedKeyByKey)
+{
+    const std::wstring strCodes =
+        Codes(L"张章长常江姜蒋庄双安恩啊西乐解单曾重行嗯aghnz2?") + DAMAGED_CODE;
+    std::wstring strMany;
+    for (int i = 0; i < PY_WORD_COUNT; i += 17)
+    {
+        strMany += static_cast<wchar_t>(LOC_HANZI_BASE + i);
+    }
+    const Details BOOKS[] = {RandomNames(200, 7, strCodes), RandomNames(1500, 1, strMany),
+                             RandomNames(1200, 1, strCodes.substr(3, 6))};
+    for (const Details& vNames : BOOKS)
+    {
+        for (const wchar_t* szText :
+             {L"zhuangchan", L"changzhang", L"jiangan", L"anan#shuan", L"xianganzha", L"zcjx",
+              L"943", L"9426454264", L"242642954", L"2626242642", L"74826494"})
+        {
+            CheckKeyByKey(vNames, szText);
+        }
+    }
+}
+
+// Spellings of two letters and two keys that no person has: nearly every character has readings
+// of its own, and texts are cut in ways that leave many different offsets reached.
+TEST_F(Search, ATableOfRandomReadings)
+{
+    std::string strTable = CDataDirectory::ReadBytes(m_data.File("pyfile.bin"));
+    std::wstring strCodes;
+    for (size_t i = 0; i < PY_WORD_COUNT; ++i)
+    {
+        strCodes += static_cast<wchar_t>(LOC_HANZI_BASE + i);
+        char* pSpelling = &strTable[i * sizeof(PYOFWORDS) + offsetof(PYOFWORDS, szPinyin)];
+        for (const char* szUnits : {"an", "an", "an", "26", "26", "26"})
+        {
+            const size_t uLength = Below(PY_MAX_LETTERS + 1);
+            for (size_t k = 0; k <= PY_MAX_LETTERS; ++k)
+            {
+                *pSpelling++ = k < uLength ? szUnits[Below(2)] : '\0';
+            }
+        }
+    }
+    CDataDirectory::WriteBytes(CDataPaths::PinyinMapping(), strTable);
+    const Details vNames = RandomNames(120, 1, strCodes);
+    for (int t = 0; t < 24; ++t)
+    {
+        std::wstring strText(10, L'\0');
+        std::generate(strText.begin(), strText.end(),
+                      [&] { return (t % 2 == 0 ? L"26" : L"an")[Below(2)]; });
+        CheckKeyByKey(vNames, strText);
+    }
+}
+
+TEST_F(Search, FitsPiecesToCharacters)
+{
+    const struct
+    {
+        bool bDigits;
+        const wchar_t* szName;
+        Pieces vPieces;
+        Compared expected;
+    } ROWS[] = {
+        {false, L"李张三", {L"zhang", L"s"}, {1, 2, 0}},
+        {false, L"张三", {L"z", L"san"}, {1, 2, 0}},
+        {false, L"李张三", {L"zhang", L"san"}, {1, 2, 1}},
+        {false, L"张三", {L"zhang", L"sa"}, {1, 2, 0}},
+        {false, L"张三", {L"张", L"s"}, {1, 2, 0}},
+        {false, L"张三", {L"張", L"三"}, {1, 2, 1}},
+        {false, L"张三", {L"s", L"z"}, {0, 0, 0}},
+        {false, L"张三", {L"z", L"s", L"s"}, {0, 0, 0}},
+        {false, L"张三", {L"zhangs"}, {0, 0, 0}},
+        {false, L"长三", {L"zhang"}, {1, 2, 1}},
+        {false, L"a三b?7?", {L"a", L"san", L"b", L"#", L"7", L"#"}, {1, 6, 1}},
+        {false, L"a7?", {L"#"}, {1, 2, 1}},
+        {false, L"a三7?", {L"8"}, {0, 0, 0}},
+        {false, L"a三7?", {L"77"}, {0, 0, 0}},
+        {false, L"a三7?", {L"##"}, {0, 0, 0}},
+        {true, L"长三", {L"94264", L"7"}, {1, 2, 0}},
+        {true, L"长三", {L"24264", L"726"}, {1, 2, 1}},
+        {true, L"长三", {L"92"}, {0, 0, 0}},
+        {true, L"?7", {L"7"}, {1, 1, 1}},
+        {true, L"?7", {L"#"}, {0, 0, 0}},
+        {true, L"?7", {L"77"}, {0, 0, 0}},
+        {true, L"adgjmptw", {L"2", L"3", L"4", L"5", L"6", L"7", L"8", L"9"}, {1, 8, 1}},
+        {true, L"cfilosvz", {L"2", L"3", L"4", L"5", L"6", L"7", L"8", L"9"}, {1, 8, 1}}};
+    for (const auto& row : ROWS)
+    {
+        EXPECT_EQ(Do(row.bDigits, row.szName, row.vPieces), row.expected)
+            << Narrow(row.szName) << ' ' << testing::PrintToString(row.vPieces);
+    }
+    // Lengths that are handed in stay unless all is whole.
+    EXPECT_EQ(Do(false, L"三", {L"s"}, 7, 0), (Compared{1, 7, 0}));
+    EXPECT_EQ(Do(false, L"三", {L"san"}, 7, 0), (Compared{1, 1, 1}));
+    EXPECT_EQ(Do(false, L"三", {L"san"}, 7, 1), (Compared{1, 7, 1}));
+    // An empty slot is no end of the readings, and nothing begins it.
+    PYOFWORDS reading = {"张", {"chang", "", "zhang"}, {"24264", "", "94264"}};
+    PYOFWORDS noReading = {"张", {}, {}};
+    CQVWordLocalizerManager letters(1);
+    CQVNumLocalizerManager digits(1);
+    wchar_t szPieces[][6] = {L"zhang", L"94264", L"", L"#", L"7"};
+    int bFull = 0;
+    EXPECT_EQ(letters.CmpChineseWord(nullptr, 1, reading, szPieces[0], nullptr, 0, bFull), 1);
+    EXPECT_EQ(bFull, 1);
+    EXPECT_EQ(digits.CmpChineseWord(nullptr, 1, reading, szPieces[1], nullptr, 0, bFull), 1);
+    EXPECT_EQ(digits.CmpChineseWord(nullptr, 1, noReading, szPieces[2], nullptr, 0, bFull), 0);
+    EXPECT_EQ(bFull, 0);
+    EXPECT_EQ(letters.CmpOtherWords(DAMAGED_CODE, szPieces[3]), 0);
+    const CLogCapture log;
+    EXPECT_EQ(digits.CmpDigitalWord(LOC_DIGIT_BASE + 7, szPieces[4]), 1);
+    EXPECT_EQ(log.Lines(),
+              (std::vector<tag_LogLine>{
+                  {DEBUG_LINE, "LocalizerImpl/QVNumLocalizerManager",
+                   "QV_Contacts:CQVNumLocalizerManager::CmpDigitalWord r == 1"}}));
+}
+
+TEST_F(Search, TriesOnlyWhatCanEndAText)
+{
+    const std::tuple<const wchar_t*, int, int> ROWS[] = {
+        {L"#", 1, 1},  {L"1", 1, 1},  {L"z", 1, 1},      {L"zx", 0, 0},      {L"z#", 0, 0},
+        {L"zh", 1, 0}, {L"29", 0, 1}, {L"21", 0, 0},     {L"zhuang", 1, 0},  {L"zhuangs", 0, 0},
+        {L"92", 0, 1}, {L"2:", 0, 0}, {L"948264", 0, 1}, {L"9482647", 0, 0}, {L"", 1, 1}};
+    for (const auto& [szPiece, bAsLetters, bAsDigits] : ROWS)
+    {
+        Pieces vPieces = {L"!", szPiece};
+        android::Vector<wchar_t*> vLastFirst;
+        FillLastFirst(vPieces, vLastFirst);
+        EXPECT_EQ(CQVWordLocalizerManager(1).IsValid(vLastFirst), bAsLetters) << Narrow(szPiece);
+        EXPECT_EQ(CQVNumLocalizerManager(1).IsValid(vLastFirst), bAsDigits) << Narrow(szPiece);
+    }
+}
+
+// Kind, start and span decide, then the place in name order; ties end where the exchanges of the
+// sort leave them.
+TEST_F(Search, RanksMatches)
+{
+    const int PLACES[] = {-5, 3, 3, 3, 1, 3, 3, 2, 3};
+    const std::pair<int, int> FITS[] = {
+        {MATCH_FULL, MatchPosition(0, 1)},     {MATCH_PARTIAL, MatchPosition(0, 1)},
+        {MATCH_PARTIAL, MatchPosition(0, 1)},  {MATCH_INITIALS, MatchPosition(2, 3)},
+        {MATCH_PARTIAL, MatchPosition(0, 1)},  {MATCH_PARTIAL, MatchPosition(0, 2)},
+        {MATCH_PARTIAL, MatchPosition(0, 1)},  {MATCH_PARTIAL, MatchPosition(0, 1)},
+        {MATCH_INITIALS, MatchPosition(1, 2)}};
+    Details vNames;
+    android::Vector<_MatchResult> vMatches;
+    android::Vector<_MatchResult> vSlow;
+    for (int i = 0; i < 9; ++i)
+    {
+        vNames.push_back(MakeDetail(i, PLACES[i], L""));
+        Manager::AddToVector(vMatches, {i, MATCH_INITIALS, 0, 0}); // replaced
+    }
+    for (int i = 0; i < 9; ++i)
+    {
+        Manager::AddToVector(vMatches, {i, FITS[i].first, FITS[i].second, 0});
+        vSlow.push(vMatches[static_cast<size_t>(i)]);
+    }
+    ASSERT_EQ(vMatches.size(), 9U);
+    EXPECT_EQ(Manager::LocalResultQuickSort(vMatches, 0, 8, vNames.data()), 1);
+    Manager::LocalResultQuickSort(vSlow, vNames.data());
+    std::vector<int> vOrder;
+    std::vector<int> vSlowOrder;
+    for (size_t i = 0; i < 9; ++i)
+    {
+        vOrder.push_back(vMatches[i].iIndex);
+        vSlowOrder.push_back(vSlow[i].iIndex);
+    }
+    EXPECT_EQ(vOrder, (std::vector<int>{8, 3, 0, 5, 4, 7, 6, 2, 1}));
+    EXPECT_EQ(vSlowOrder, (std::vector<int>{8, 3, 0, 5, 4, 7, 6, 2, 1}));
+}
+
+TEST_F(Search, JudgesWhetherTheMatchedCharactersAreLettersOrOthers)
+{
+    const std::tuple<const wchar_t*, int, int> ROWS[] = {
+        {L"ab?", 0x00002, 1}, {L"a三b", 0x00001, 0},       {L"a三b", 0x20002, 1},
+        {L"a7", 0x00001, 0},  {L"abcdefghij", 0x00009, 1}, {L"abcdefghij", 0x0FFFF, 0}};
+    for (const auto& [szName, iMatchPos, bExpected] : ROWS)
+    {
+        tag_LocalizerDetail detail = MakeDetail(0, 0, Codes(szName));
+        detail.iMatchPos = iMatchPos;
+        EXPECT_EQ(Manager::JudgeAllEnglish(&detail), bExpected) << iMatchPos;
+    }
+}
+
+TEST_F(Search, FindsThePlaceOfAChangedRecord)
+{
+    std::vector<tag_ContactsStruct> vStored(3, tag_ContactsStruct{});
+    std::wcscpy(vStored[0].szName, L"三");
+    std::wcscpy(vStored[1].szName, L"张三");
+    for (int i = 0; i < 3; ++i)
+    {
+        vStored[static_cast<size_t>(i)].llLastTimeContacted = 30 - 10 * i;
+    }
+    ASSERT_EQ(Manager::TransNameToPY(vStored.data(), 3), 0);
+    const struct
+    {
+        const wchar_t* szName;
+        int iCount;
+        int iSortType;
+        long long llTime;
+        int iExpected;
+        const wchar_t* szNameAfter;
+    } ROWS[] = {{L"愛", 3, 0, 0, 0, L"ai 爱"},  {L"张三", 3, 0, 0, 1, L"zhang 张san 三"},
+                {L"赵", 3, 0, 0, 2, L"zhao 赵"}, {L"赵", 0, 0, 0, 0, L"zhao 赵"},
+                {L"赵", 3, 1, 25, 1, L"赵"},     {L"赵", 3, 1, 10, 3, L"赵"}};
+    for (const auto& row : ROWS)
+    {
+        tag_ContactsStruct record = {};
+        std::wcscpy(record.szName, row.szName);
+        record.llLastTimeContacted = row.llTime;
+        EXPECT_EQ(Manager::LocalizerSearchPos(vStored.data(), row.iCount, &record, row.iSortType),
+                  row.iExpected);
+        EXPECT_EQ(std::wstring(record.szName), row.szNameAfter);
+    }
+    RemoveTable();
+    EXPECT_EQ(Manager::LocalizerSearchPos(vStored.data(), 3, &vStored[0], 0), -1);
+}
+
+// A search runs on threads of callers that have little stack, also where the matches come farthest
+// from the order they are wanted in.
+TEST_F(Search, NeedsNoMoreStackForManyNames)
+{
+    constexpr size_t SMALL_STACK = 192 * 1024; // sanitizers take most of it
+    constexpr int MANY = 100000;
+    constexpr int TIED = 3000;
+    Details vNames;
+    Details vFound(MANY);
+    android::Vector<_MatchResult> vTies;
+    for (int i = 0; i < MANY; ++i)
+    {
+        vNames.push_back(MakeDetail(i, MANY - i, {HanZi(L'张'), HanZi(L'三')}));
+    }
+    for (int i = 0; i < TIED; ++i)
+    {
+        vTies.push({MANY - 1 - i / 2, MATCH_INITIALS, 0, 0}); // in order already
+    }
+    tag_LocalizerResult result = {MANY, vFound.data()};
+    std::function<void()> fnBody = [&]
+    {
+        CQVWordLocalizerManager matcher(1);
+        tag_LocalizerResult names = {MANY, vNames.data()};
+        wchar_t szInput[] = L"z";
+        wchar_t szWords[64] = {};
+        long lMask = 0;
+        EXPECT_EQ(
+            matcher.DoSearch(&names, szInput, IME_SEARCH_WORD, 0, &result, &lMask, szWords), 0);
+        Manager::LocalResultQuickSort(vTies, 0, TIED - 1, vNames.data());
+    };
+    pthread_attr_t attributes;
+    pthread_t thread;
+    ASSERT_EQ(0, pthread_attr_init(&attributes));
+    ASSERT_EQ(0, pthread_attr_setstacksize(&attributes, SMALL_STACK));
+    ASSERT_EQ(0, pthread_create(&thread, &attributes, RunBody, &fnBody));
+    pthread_join(thread, nullptr);
+    pthread_attr_destroy(&attributes);
+    ASSERT_EQ(MANY, result.iResultNum);
+    for (int i = 0; i < MANY; ++i)
+    {
+        ASSERT_EQ(vFound[static_cast<size_t>(i)].iSortIndex, i + 1);
+    }
+    for (int i = 0; i < TIED; ++i)
+    {
+        ASSERT_EQ(vTies[static_cast<size_t>(i)].iIndex, MANY - 1 - i / 2);
+    }
+}

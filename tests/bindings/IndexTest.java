@@ -8,7 +8,7 @@ import org.qvlocalize.QvException;
 import org.qvlocalize.Result;
 
 /**
- * Run by java_test.py on a sample's index: prints what searches find, for comparison, and fails when
+ * Run by languages_test.py on a sample's index: prints what searches find, for comparison, and fails when
  * anything else is not as it should be.
  */
 final class IndexTest {
@@ -68,14 +68,16 @@ final class IndexTest {
         search(index, "张s", Kind.WORD, Filter.group(2), Filter.phone());
         search(index, "w", Kind.WORD, Filter.notGroup(1), Filter.notGroup(2), Filter.account(1));
         search(index, "l", Kind.WORD, Filter.mail(), Filter.postal(), Filter.notContact(3));
-        search(index, "l", Kind.WORD, Filter.online(), Filter.notAccount(1));
+        search(index, "l", Kind.WORD, Filter.online(), Filter.notAccount(1),
+                Filter.notAccount(2));
         search(index, "9426", Kind.DIGITS);
         search(index, "tianqi", Kind.SPECIAL);
         try (Result first = index.search("z", Kind.WORD);
                 Result second = index.searchWithin(first, "zh", Kind.WORD)) {
             print("zh", second);
-            print("z", first);
+            check(first.size() > second.size(), "the result that was searched within");
         }
+        search(index, "z", Kind.WORD, Filter.group(-1));
     }
 
     private static void checkTexts(Index index) {

@@ -1,0 +1,220 @@
+"""The interfaces for other languages against the tool, which links the C++ library, on one sample.
+
+languages_test.py TOOL PYFILE TestClass NAME=PLACE...
+"""
+import ctypes
+import gc
+import os
+import pathlib
+import re
+import subprocess
+import sys
+import threading
+import unittest
+
+sys.path.insert(0, str(pathlib.Path(__file__).parents[1] / "Support"))
+# pylint: disable=wrong-import-position
+from tool_case import ToolCase
+
+PLACES = dict(word.split("=", 1) for word in sys.argv[4:])
+HEADER = pathlib.Path(PLACES["header"]).read_text(encoding="utf-8")
+if "module" in PLACES:
+    sys.path.insert(0, PLACES["module"])
+    import qvlocalize
+    from qvlocalize import Kind, SortType, Status
+
+# Texts, what the module is asked for beside them, and what the tool is; in the order of the program
+# of Java.
+SEARCHES = [
+    ("", {}, ""),
+    ("zs", {"starred": True}, "--starred"),
+    ("张s", {"group": 2, "phone": True}, "--group 2 --phone"),
+    ("w", {"not_group": [1, 2], "account": 1}, "--not-group 1 --not-group 2 --account 1"),
+    ("l", {"mail": True, "postal": True, "not_contact": 3}, "--mail --postal --not-contact 3"),
+    ("l", {"online": True, "not_account": [1, 2]}, "--online --not-account 1 --not-account 2"),
+    ("9426", {"kind": 1}, "--type num"),
+    ("tianqi", {"kind": 2}, "--type special"),
+    ("zh", {"within": "z"}, ""),
+    ("z", {"group": -1}, "--group -1"),
+]
+
+
+class LibraryTest(ToolCase):
+    """The built libqvlocalize from outside."""
+
+    def test_exports_what_the_header_declares_and_nothing_else(self):
+        lines = subprocess.run([PLACES["nm"], "--dynamic", "--defined-only", "--format=posix",
+                                PLACES["library"]], check=True, capture_output=True,
+                               encoding="utf-8").stdout.splitlines()
+        exported = {line.split("@")[0].split()[0] for line in lines if line.split()[1] != "A"}
+        declared = set(re.findall(r"^ *QV_API .*?\b(qv_\w+)\(", HEADER, re.MULTILINE))
+        self.assertEqual(declared, exported)
+        self.assertIn("qv_search", exported)
+
+    @unittest.skipUnless(PLACES.get("collisions"), "libwinpr2-2 is not installed")
+    def test_lives_beside_a_library_with_the_same_names(self):
+        for program in PLACES["collisions"].split(","):
+            process = subprocess.run([program, self.data], capture_output=True, check=False)
+            self.assertEqual((0, b""), (process.returncode, process.stderr), process.stdout)
+
+
+class ModuleTest(ToolCase):
+    def setUp(self):
+        super().setUp()
+        self.index = qvlocalize.Index(self.data)
+        self.addCleanup(self.index.close)
+
+    def ask(self, text, asked):
+        if "within" in asked:
+            asked = {**asked, "within": self.index.search(asked["within"])}
+        return self.index.search(text, **asked)
+
+
+class PythonTest(ModuleTest):
+    def test_constants_and_layouts_are_those_of_the_header(self):
+        names = dict(re.findall(r"\bQV_([A-Z0-9_]+)(?: = | (?=\d))(-?\d+)", HEADER))
+        mine = {"KEY_SIZE": qvlocalize._KEY_SIZE, "PICK_SIZE": qvlocalize._PICK_SIZE,
+                "MAX_SECTIONS": qvlocalize._MAX_SECTIONS, "MAX_TYPED": 10}
+        for prefix, enumeration in (("", Status), ("KIND_", Kind), ("SORT_", SortType),
+                                    ("FILTER_", qvlocalize._FilterKind)):
+            mine.update({prefix + member.name: member.value for member in enumeration})
+        self.assertEqual({name: int(value) for name, value in names.items()}, mine)
+        self.assertEqual(88, ctypes.sizeof(qvlocalize._Match))
+
+    def test_finds_what_the_tool_finds(self):
+        keys = "abcdefghijklmnopqrstuvwxyz#"
+        for sort_type in SortType:
+            self.index.sort_type = sort_type
+            self.index.build(force=True)
+            for text, asked, options in SEARCHES:
+                once = [] if "within" in asked else ["--once"]
+                step = self.search(text, *once, *options.split())
+                with self.subTest(text=text, sort_type=sort_type), self.ask(text, asked) as result:
+                    self.assertEqual(
+                        [(match["contact_id"], match["name_order"], match["last_time_contacted"],
+                          match.get("first_matched", 0), match.get("last_matched", 0),
+                          match.get("index_character", "")) for match in step["matches"]],
+                        [(match.contact_id, match.name_order, match.last_contacted, match.first,
+                          match.last, match.index_character) for match in result])
+                    self.assertEqual([key for bit, key in enumerate(keys) if step["mask"] >> bit & 1],
+                                     list(result.next_keys))
+                    self.assertEqual("".join(step["candidates"]), result.candidates)
+                    self.assertEqual(step.get("sections", {}),
+                                     {section.label: section.count for section in result.sections})
+                    for section in result.sections:
+                        self.assertEqual(section.label, result[section.first].index_character)
+
+    def test_result_is_a_sequence_until_it_is_closed(self):
+        result = self.index.search("z")
+        matches = list(result)
+        self.assertEqual((matches[-1], matches[2:9:3]), (result[-1], result[2:9:3]))
+        self.assertEqual((3, None), (result.find(matches[3].contact_id), result.find(-1)))
+        self.assertRaises(IndexError, lambda: result[len(matches)])
+        nobody = self.index.search("z", group=99)
+        self.assertEqual([], list(self.index.search("z", within=nobody)), "an empty result counts")
+        result.close()
+        result.close()
+        self.assertRaises(ValueError, len, result)
+        self.assertRaises(ValueError, self.index.search, "zs", within=result)
+
+    def test_typing_narrows_takes_back_and_picks(self):
+        with self.index.typing(phone=True) as typing:
+            everybody = len(typing.result)
+            for text in ("z", "zh", "zha", "zhan", "zhang", "zhangs"):
+                typing.type(text[-1])
+                self.assertEqual(list(self.index.search(text, phone=True)), list(typing.result))
+            self.assertIn("三", typing.result.candidates)
+            picked = list(typing.pick("三"))
+            self.assertEqual("zhang三", typing.text.lower())
+            self.assertEqual(list(self.index.search("zhang三", phone=True)), picked)
+            while typing.text:
+                typing.back()
+            self.assertEqual(everybody, len(typing.back()))
+        self.assertRaises(ValueError, lambda: typing.result)
+
+    def test_converts_names_and_refuses_what_is_no_text(self):
+        names = ["张三", "Tom 2", "", "\U0001F600张", "x" * 5000]
+        known = dict(self.sql("select display_name, localizerkey from localizer"))
+        self.assertEqual([known["张三"], known["Tom 2"], "", "\u5000" + known["张三"][0],
+                          "\u4f17" * 10], self.index.localizer_keys(names))
+        self.assertEqual("ZHANG三", self.index.pick("zhangs", 6, "三"))
+        for text, error in (("z\0", ValueError), ("\ud83d", UnicodeEncodeError),
+                            ("zhangsansix", qvlocalize.Error)):
+            self.assertRaises(error, self.index.search, text)
+        with self.assertRaisesRegex(qvlocalize.Error, "another data directory") as raised:
+            qvlocalize.Index(self.data / "files")
+        self.assertEqual(Status.ERROR_OTHER_DIRECTORY, raised.exception.code)
+        self.assertRaises(OverflowError, self.index.star_changed, 2**31, True)
+
+    def test_follows_changes_of_the_database(self):
+        self.sql("update localizer set (display_name, localizerkey) = (select display_name, "
+                 "localizerkey from localizer where contact_id = 1) where contact_id = 54")
+        self.index.contacts_changed([54])
+        self.index.star_changed(54, True)
+        self.index.time_changed(54, 1_800_000_000_123)
+        match, = [match for match in self.index.search("", starred=True) if match.contact_id == 54]
+        self.assertEqual(1_800_000_000_123, match.last_contacted)
+        self.assertIsNotNone(self.index.search("zhangsan").find(54))
+        self.index.status_changed()
+        self.index.all_contacts_changed()
+        self.assertFalse(self.index.needs_build)
+
+    def test_threads_share_an_index_and_forgotten_objects_are_released(self):
+        expected = len(self.index.search("z"))
+        counts = []
+        threads = [threading.Thread(target=lambda: counts.extend(
+            len(self.index.search("z")) for _ in range(50))) for _ in range(4)]
+        for thread in threads:
+            thread.start()
+        for thread in threads:
+            thread.join()
+        self.assertEqual([expected] * 200, counts)
+        result = self.index.search("z")
+        self.index.close()
+        self.assertEqual(expected, len(list(result)), "a result outlives its index")
+        self.assertRaises(ValueError, self.index.search, "z")
+        qvlocalize.Index(self.data)  # is forgotten
+        gc.collect()
+        qvlocalize.Index(self.data / "files").close()  # nothing is open any more
+
+    def test_hands_the_log_on(self):
+        lines = []
+        qvlocalize.set_log(lambda *line: lines.append(line))
+        self.index.search("z")
+        qvlocalize.set_log(None)
+        self.index.search("z")
+        self.assertEqual((3, "QV_Localize", "QV_Contacts: Search Start"), lines[0])
+        self.assertEqual(1, lines.count(lines[0]))
+
+
+class JavaTest(ModuleTest):
+    """The Java classes under a virtual machine that checks every call of their native half."""
+
+    def line(self, text, asked):
+        result = self.ask(text, asked)
+        matches = "".join(f" {match.contact_id},{match.name_order},{match.last_contacted},"
+                          f"{match.first},{match.last},{ord(match.index_character or chr(0))}"
+                          for match in result)
+        sections = "".join(f" {section.label}{section.first}+{section.count}"
+                           for section in result.sections)
+        return f"{text}:{matches} / {result.next_keys} / {result.candidates}{sections}"
+
+    def test_finds_what_python_finds_and_keeps_the_rules_of_the_machine(self):
+        searches = [(text, asked) for text, asked, _ in SEARCHES]
+        searches += [("\U0001F600" * 10, {}), ("zh", {"not_contact": range(40)})]
+        expected = [self.line(*search) for search in searches]
+        for path in (self.data / "files").glob("Contacts*"):
+            path.unlink()
+        process = subprocess.run(
+            [PLACES["java"], "-Xcheck:jni", "-Xmx128m", "-ea", "-Dfile.encoding=UTF-8", "-cp",
+             PLACES["classes"], f"-Djava.library.path={PLACES['jni']}", "IndexTest", self.data],
+            capture_output=True, encoding="utf-8", check=False,
+            env={**os.environ, "LC_ALL": "C.UTF-8"})
+        self.assertEqual(0, process.returncode, process.stdout[-2000:] + process.stderr)
+        self.assertNotRegex(process.stdout + process.stderr, "WARNING|FATAL")
+        self.maxDiff = 2000
+        self.assertEqual(expected, process.stdout.splitlines())
+
+
+if __name__ == "__main__":
+    unittest.main(argv=[sys.argv[0], sys.argv[3]], verbosity=2)

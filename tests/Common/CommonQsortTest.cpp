@@ -1,5 +1,5 @@
-// The sorter against the orders and the steps written down plainly: exact permutations of equal
-// records, and both searches at every length at which they differ.
+// The order of records, the exact permutation that sorting leaves of equal ones, which stores
+// already written have, and which of several equal ones a search meets.
 
 #include "Common/CommonQsort.h"
 
@@ -9,225 +9,172 @@
 
 #include <algorithm>
 #include <climits>
-#include <random>
 #include <string>
-#include <tuple>
-#include <utility>
 #include <vector>
 
 namespace
 {
 
-using Contact = tag_ContactsStruct;
-using Records = std::vector<Contact>;
+using Records = std::vector<tag_ContactsStruct>;
 
-std::vector<int64_t> NameUnits(const Contact& record)
+char* Bytes(Records& vRecords)
 {
-    const wchar_t* pEnd = std::find(std::begin(record.szName), std::end(record.szName), L'\0');
-    return {std::begin(record.szName), pEnd};
+    return reinterpret_cast<char*>(vRecords.data());
 }
 
-bool NameBehind(const Contact& a, const Contact& b)
+// A record for each character, which is its name and its time; its id is its place.
+Records MakeRecords(const std::string& strValues)
 {
-    const auto isIn = [](const Contact& record, unsigned uFirst, unsigned uCount)
+    Records vRecords(strValues.size(), tag_ContactsStruct{});
+    for (size_t i = 0; i < vRecords.size(); ++i)
     {
-        const unsigned uCode = static_cast<unsigned>(record.szLocalizerKey[0]) & 0xFFFFU;
-        return uCode >= uFirst && uCode < uFirst + uCount;
-    };
-    const auto hanZi = [&](const Contact& record) { return isIn(record, 0x1000, 15422); };
-    const auto alpha = [&](const Contact& record) { return isIn(record, 0x4F00, 26); };
-    if (a.szName[0] == b.szName[0] && ((hanZi(a) && alpha(b)) || (alpha(a) && hanZi(b))))
-    {
-        return hanZi(a);
+        vRecords[i].iContactID = static_cast<int32_t>(i);
+        vRecords[i].szName[0] = static_cast<wchar_t>(strValues[i]);
+        vRecords[i].llLastTimeContacted = strValues[i];
     }
-    const auto keys = [&](const Contact& record)
-    {
-        return std::tuple(record.szName[0] == 0x7FFFFFFF, record.szLocalizerKey[0] == 0x5000,
-                          isIn(record, 0x5A00, 10), NameUnits(record));
-    };
-    return keys(a) > keys(b);
+    return vRecords;
 }
 
-// One order, on records with few different keys and a rest that tells equal ones apart.
-class Sorter : public testing::TestWithParam<Common_Sort_enum>
+// The places after a sort, as letters.
+std::string Sorted(const std::string& strValues, Common_Sort_enum eOrder)
 {
-protected:
-    static bool Behind(const Contact& a, const Contact& b)
-    {
-        return GetParam() == SORT_NAME ? NameBehind(a, b)
-                                       : a.llLastTimeContacted < b.llLastTimeContacted;
-    }
-    static bool Equal(const Contact& a, const Contact& b)
-    {
-        return GetParam() == SORT_NAME ? NameUnits(a) == NameUnits(b)
-                                       : a.llLastTimeContacted == b.llLastTimeContacted;
-    }
+    Records vRecords = MakeRecords(strValues);
+    const int iCount = static_cast<int>(vRecords.size());
+    EXPECT_EQ(Common_Qsort().QuickSort(Bytes(vRecords), iCount, eOrder), iCount);
+    std::string strPlaces(vRecords.size(), '\0');
+    std::transform(vRecords.begin(), vRecords.end(), strPlaces.begin(),
+                   [](const auto& record)
+                   {
+                       const int iPlace = record.iContactID;
+                       return static_cast<char>(iPlace < 26 ? 'a' + iPlace : 'A' + iPlace - 26);
+                   });
+    return strPlaces;
+}
 
-    // Any code with any name, among them names that fill their field without a terminator.
-    Contact Make()
-    {
-        static const wchar_t UNITS[] = {L'a', L'z', 0x4E00, 0xFFFE, 0xFFFF, 0x10000};
-        static const wchar_t CODES[] = {0x1000, 0x4C3D, 0x4F19, 0x5000, 0x15000, 0x5A09, 0, 0x4C3E};
-        static const int64_t TIMES[] = {INT64_MIN, -1, 0, 1, 1LL << 31, 1LL << 32, INT64_MAX};
-        Contact record = {};
-        std::generate_n(record.szName, m_rng() % 8 == 0 ? 31 : m_rng() % 4,
-                        [&] { return UNITS[m_rng() % 6]; });
-        record.szName[0] = m_rng() % 6 == 0 ? 0x7FFFFFFF : record.szName[0];
-        record.szLocalizerKey[0] = CODES[m_rng() % 8];
-        record.llLastTimeContacted = TIMES[m_rng() % 7];
-        record.iContactID = static_cast<int>(m_rng());
-        return record;
-    }
-    Records MakeRecords(size_t uCount)
-    {
-        Records vRecords(uCount);
-        std::generate(vRecords.begin(), vRecords.end(), [this] { return Make(); });
-        return vRecords;
-    }
-
-    // --- The steps, one by one -----------------------------------------------------------------
-
-    static void PlainQuickSort(Contact* a, int lo, int hi)
-    {
-        while (lo >= 0 && hi >= 0 && hi - lo >= 5)
-        {
-            const int mid = (lo + hi) / 2;
-            for (const auto& [i, j] : {std::pair(lo, mid), std::pair(lo, hi), std::pair(mid, hi)})
-            {
-                if (Behind(a[i], a[j]))
-                {
-                    std::swap(a[i], a[j]);
-                }
-            }
-            std::swap(a[mid], a[hi - 1]);
-            const Contact pivot = a[hi - 1];
-            int i = lo;
-            int j = hi - 1;
-            for (;; ++i)
-            {
-                while (i + 1 <= hi && Behind(pivot, a[i + 1]))
-                {
-                    ++i;
-                }
-                --j;
-                while (j >= i + 1 && Behind(a[j], pivot))
-                {
-                    --j;
-                }
-                if (j < i + 1)
-                {
-                    break;
-                }
-                std::swap(a[i + 1], a[j]);
-            }
-            std::swap(a[i + 1], a[hi - 1]);
-            PlainQuickSort(a, lo, j);
-            lo = i + 2;
-        }
-    }
-
-    static void PlainInsertionSort(Records& a)
-    {
-        for (size_t k = 1; k < a.size(); ++k)
-        {
-            for (size_t m = k; m > 0 && Behind(a[m - 1], a[m]); --m)
-            {
-                std::swap(a[m - 1], a[m]);
-            }
-        }
-    }
-
-    // An index, and whether the form that tells so met an equal record.
-    static std::pair<int, bool> PlainSearch(const Records& a, const Contact& key, bool bInsert,
-                                            bool bMarks)
-    {
-        const auto eq = [&](int i) { return Equal(key, a[static_cast<size_t>(i)]); };
-        const auto gt = [&](int i) { return Behind(key, a[static_cast<size_t>(i)]); };
-        const auto lt = [&](int i) { return Behind(a[static_cast<size_t>(i)], key); };
-        const int iCount = static_cast<int>(a.size());
-        int hi = iCount - 1;
-        if (iCount == 0)
-        {
-            return {bInsert ? 0 : -1, false};
-        }
-        if (iCount == 1 && bInsert)
-        {
-            const bool bEqual = bMarks && !lt(0) && eq(0);
-            return {lt(0) || bEqual ? 0 : 1, bEqual};
-        }
-        if (iCount == 1)
-        {
-            return {eq(0) ? 0 : -1, false};
-        }
-        if (bInsert && !gt(0))
-        {
-            return {0, bMarks && eq(0)};
-        }
-        if (bInsert && !lt(hi))
-        {
-            return bMarks && eq(hi) ? std::pair(hi, true) : std::pair(iCount, false);
-        }
-        if (!bInsert && (lt(0) || gt(hi) || eq(0) || eq(hi)))
-        {
-            return {lt(0) || gt(hi) ? -1 : eq(0) ? 0 : hi, false};
-        }
-        int lo = 0;
-        while (lo <= hi)
-        {
-            const int mid = (lo + hi) / 2;
-            if (eq(mid))
-            {
-                return {mid, bInsert && bMarks};
-            }
-            (lt(mid) ? hi : lo) = lt(mid) ? mid - 1 : mid + 1;
-        }
-        return {bInsert ? hi + 1 : -1, false};
-    }
-
-    std::mt19937 m_rng{1};
-    Common_Qsort m_sorter;
-};
-
-INSTANTIATE_TEST_SUITE_P(Orders, Sorter, testing::Values(SORT_NAME, SORT_TIME));
+tag_ContactsStruct MakeName(const std::wstring& strName, wchar_t code)
+{
+    tag_ContactsStruct record = {};
+    std::copy_n(strName.begin(), std::min<size_t>(strName.size(), 31), record.szName);
+    record.szLocalizerKey[0] = code;
+    return record;
+}
 
 } // namespace
 
-TEST_P(Sorter, LeavesThePermutationOfItsStepsWhateverIsSorted)
+TEST(CommonQsort, LeavesEqualRecordsWhereItsStepsLeaveThem)
 {
-    for (int iRound = 0; iRound < 500; ++iRound)
+    const char* const ROWS[][3] = {
+        // values, by name, by time
+        {"1", "a", "a"},
+        {"12121", "acebd", "bdace"},
+        {"121212", "aecdbf", "fbdcea"},
+        {"3141592653589793", "bdgajpceikhnlmof", "omflnheikcajpgdb"},
+        {"2718281828459045235360287471352662497757247093699959",
+         "vnRgBcHwEOqeiartTCPIzoksDYpMlGFuUQbLNKAydfjhxXWVSmJZ",
+         "ZmWVSJXxjdhfbNKyQALGuFUMsYlDpIPzokTrtCweiHaEOqgcBvnR"},
+    };
+    for (const auto& [szValues, szByName, szByTime] : ROWS)
     {
-        Records vRecords = MakeRecords(1 + m_rng() % 60);
-        Records vExpected = vRecords;
-        const int iCount = static_cast<int>(vRecords.size());
-        PlainQuickSort(vExpected.data(), 0, iCount - 1);
-        PlainInsertionSort(vExpected);
-        m_sorter.QuickSort(reinterpret_cast<char*>(vRecords.data()), iCount, GetParam());
-        for (size_t i = 0; i < vRecords.size(); ++i)
-        {
-            ASSERT_EQ(vRecords[i].iContactID, vExpected[i].iContactID) << "round " << iRound;
-        }
+        EXPECT_EQ(Sorted(szValues, SORT_NAME), szByName);
+        EXPECT_EQ(Sorted(szValues, SORT_TIME), szByTime);
     }
 }
 
-TEST_P(Sorter, SearchesAtEveryLength)
+// For the keys 0 to 9: an equal record, the place to insert at, and the same of the search that
+// prefers an equal record at an end; '-' where nothing is found, '!' where that search met one.
+TEST(CommonQsort, MeetsOneOfTheEqualRecords)
 {
-    for (int iRound = 0; iRound < 3000; ++iRound)
+    const char* const ROWS[][4] = {
+        {"", "----------", "0000000000", "0000000000"},
+        {"5", "-----0----", "1111110000", "111110!0000"},
+        {"64", "----1-0---", "2222210000", "22221!10!000"},
+        {"44", "----0-----", "2222000000", "22220!00000"},
+        {"87521", "-43--2-10-", "5533322100", "54!3!332!21!0!0"},
+        {"887777532", "--87-6-40-", "9997766400", "998!7!76!64!0!0"},
+    };
+    for (const auto& [szTimes, szFound, szPlaces, szMarked] : ROWS)
     {
-        Records a = MakeRecords(m_rng() % 10);
-        const int iCount = static_cast<int>(a.size());
-        char* pBase = reinterpret_cast<char*>(a.data());
-        m_sorter.QuickSort(pBase, iCount, GetParam());
-        Contact key = iCount > 0 && m_rng() % 2 == 0 ? a[m_rng() % a.size()] : Make();
-        char* pKey = reinterpret_cast<char*>(&key);
-        for (const int bInsert : {0, 1})
+        Records vRecords = MakeRecords(szTimes);
+        const int iCount = static_cast<int>(vRecords.size());
+        std::string strFound;
+        std::string strPlaces;
+        std::string strMarked;
+        for (const char cKey : {'0', '1', '2', '3', '4', '5', '6', '7', '8', '9'})
         {
-            int bFound = 0;
-            const int iPlain = m_sorter.Search_Bin(pBase, iCount, pKey, GetParam(), bInsert);
-            ASSERT_EQ(iPlain, PlainSearch(a, key, bInsert == 1, false).first);
-            const int iMarked =
-                m_sorter.Search_BinEx(pBase, iCount, pKey, GetParam(), bInsert, &bFound);
-            ASSERT_EQ(std::pair(iMarked, bFound == 1), PlainSearch(a, key, bInsert == 1, true));
+            Records vKey = MakeRecords({cKey});
+            int bMarked = 0;
+            Common_Qsort sorter;
+            const int iFound =
+                sorter.Search_Bin(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME, 0);
+            EXPECT_EQ(
+                sorter.Search_BinEx(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME, 0, &bMarked),
+                iFound);
+            EXPECT_EQ(bMarked, 0);
+            strFound += iFound < 0 ? "-" : std::to_string(iFound);
+            strPlaces += std::to_string(
+                sorter.Search_Bin(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME, 1));
+            strMarked += std::to_string(
+                sorter.Search_BinEx(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME, 1, &bMarked));
+            strMarked += bMarked == 1 ? "!" : "";
         }
+        EXPECT_EQ(strFound, szFound);
+        EXPECT_EQ(strPlaces, szPlaces) << szTimes;
+        EXPECT_EQ(strMarked, szMarked);
+    }
+}
+
+TEST(CommonQsort, OrdersNamesAndTimes)
+{
+    const std::wstring strEmpty(1, NAME_EMPTY_MARK);
+    const std::wstring strLong(31, L'a');
+    const struct
+    {
+        tag_ContactsStruct before;
+        tag_ContactsStruct behind;
+    } ROWS[] = {
+        {MakeName(L"a", 0x4F00), MakeName(L"ab", 0x4F00)},
+        {MakeName(strLong.substr(1), 0x4F00), MakeName(strLong, 0x4F00)},
+        // A letter goes before a Chinese character under one first letter only.
+        {MakeName(L"az", 0x4F00), MakeName(L"aa", 0x1000)},
+        {MakeName(L"az", 0x4F19), MakeName(L"aa", 0x4C3D)},
+        {MakeName(L"az", 0x1000), MakeName(L"bb", 0x4F00)},
+        {MakeName(L"aa", 0x4C3E), MakeName(L"az", 0x4F00)}, // no Chinese character's code
+        {MakeName(L"aa", 0x1000), MakeName(L"az", 0x4F1A)}, // no letter's code
+        // Nameless behind all others, then other characters, then digits.
+        {MakeName(L"z", 0x5000), MakeName(strEmpty, 0)},
+        {MakeName(L"z", 0x5A00), MakeName(L"a", 0x5000)},
+        {MakeName(L"z", 0x1000), MakeName(L"a", 0x5A00)},
+        {MakeName(L"z", 0x1000), MakeName(L"a", 0x5A09)},
+        {MakeName(L"a", 0x5A0A), MakeName(L"z", 0x5A0A)},
+        {MakeName(L"z", 0x15000), MakeName(L"a", 0x5000)},
+        {MakeName(L"z", 0x1000), MakeName(L"a", 0x15A00)},
+    };
+    Common_Qsort sorter;
+    sorter.InitInterData(SORT_NAME);
+    for (const auto& row : ROWS)
+    {
+        SCOPED_TRACE(&row - ROWS);
+        Records vRecords = {row.before, row.behind};
+        char* const pBefore = Bytes(vRecords);
+        char* const pBehind = pBefore + sizeof(tag_ContactsStruct);
+        EXPECT_EQ(sorter.QSORT_GT(pBehind, pBefore), 1);
+        EXPECT_EQ(sorter.QSORT_LT(pBefore, pBehind), 1);
+        EXPECT_EQ(sorter.QSORT_GT(pBefore, pBehind), 0);
+        EXPECT_EQ(sorter.QSORT_LT(pBehind, pBefore), 0);
+        EXPECT_EQ(sorter.QSORT_EQ(pBefore, pBehind), 0);
+        EXPECT_EQ(sorter.QSORT_EQ(pBehind, pBehind), 1);
+        EXPECT_EQ(sorter.QSORT_GT(pBehind, pBehind), 0);
+    }
+    const int64_t TIMES[] = {INT64_MAX, 1LL << 32, 1LL << 31, 1, 0, -1, INT64_MIN};
+    Records vRecords(std::size(TIMES), tag_ContactsStruct{});
+    for (size_t i = 0; i < vRecords.size(); ++i)
+    {
+        vRecords[i].llLastTimeContacted = TIMES[6 - i];
+    }
+    sorter.QuickSort(Bytes(vRecords), 7, SORT_TIME);
+    for (size_t i = 0; i < vRecords.size(); ++i)
+    {
+        EXPECT_EQ(vRecords[i].llLastTimeContacted, TIMES[i]);
     }
 }
 

@@ -2,6 +2,8 @@
 
 #include "tests/LocalizerImpl/LocalizerFixture.h"
 
+#include "Common/DataPaths.h"
+#include "LocalizerImpl/ReadingSets.h"
 #include "LocalizerImpl/Syllables.h"
 #include "tests/Support/MemoryFailure.h"
 
@@ -85,6 +87,25 @@ TEST(PinyinHandle, IsRefusedUnlessItIsPositive)
         {ERROR_LINE, "QV_Localize", strCall + "the input mapping is -1 "},
         {ERROR_LINE, "QV_Localize", strCall + "the input mapping is wrong!"}};
     EXPECT_EQ(log.Lines(), vExpected);
+}
+
+// Sets that were read from a file which could still change without a trace are not kept.
+TEST_F(LocalizerFixture, KeepsReadingSetsForASettledStampAlone)
+{
+    std::vector<PYOFWORDS> vOther(m_pMap, m_pMap + PY_WORD_COUNT);
+    std::strcpy(vOther[0].szPinyin[0], "aaa");
+    tag_FileStamp stamp = ReadFileStamp(CDataPaths::PinyinMapping());
+    const auto fnFirstReading = [&](const PYOFWORDS* pMap)
+    { return std::string(CReadingSets::Of(pMap, stamp)->RecordOf(LOC_HANZI_BASE).szPinyin[0]); };
+    stamp.bSettled = false;
+    const std::string strFirst = fnFirstReading(m_pMap);
+    EXPECT_EQ(fnFirstReading(vOther.data()), "aaa");
+    stamp.bSettled = true;
+    const CReadingSets::Ptr kept = CReadingSets::Of(vOther.data(), stamp);
+    EXPECT_EQ(CReadingSets::Of(m_pMap, stamp).get(), kept.get());
+    ++stamp.iChangedNs;
+    EXPECT_EQ(fnFirstReading(m_pMap), strFirst);
+    EXPECT_STREQ(kept->RecordOf(LOC_HANZI_BASE).szPinyin[0], "aaa") << "still in use";
 }
 
 // Every beginning of every syllable, and everything one unit away from it.

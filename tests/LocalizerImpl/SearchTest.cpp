@@ -100,7 +100,7 @@ private:
             int bAllFull = 0;
             if (this->DoCompare(pMap, &vNames[i], vLastFirst, iKeyLen, bAllFull) != 0)
             {
-                const int iType = bInitials        ? MATCH_INITIALS
+                const int iType = bInitials       ? MATCH_INITIALS
                                   : bAllFull != 0 ? MATCH_FULL
                                                   : MATCH_PARTIAL;
                 const std::wstring strCodes(vNames[i].szLocalizerKey, 10);
@@ -170,9 +170,9 @@ protected:
         const tag_Answer expected = stepwise.Search(m_pMap, vNames, strInput);
         EXPECT_EQ(static_cast<uint32_t>(lMask), expected.uMask);
         EXPECT_EQ(Narrow(szWords), Narrow(expected.strWords));
-        EXPECT_TRUE(std::equal(vEntries.begin(), vEntries.end(), expected.vEntries.begin(),
-                               expected.vEntries.end(), [](const auto& a, const auto& b)
-                               { return std::memcmp(&a, &b, sizeof(a)) == 0; }))
+        EXPECT_TRUE(std::equal(
+            vEntries.begin(), vEntries.end(), expected.vEntries.begin(), expected.vEntries.end(),
+            [](const auto& a, const auto& b) { return std::memcmp(&a, &b, sizeof(a)) == 0; }))
             << "entries differ";
         return vEntries;
     }
@@ -224,11 +224,15 @@ void* RunBody(void* pBody)
 
 TEST_F(Search, EveryShortTextOverCraftedNames)
 {
-    const wchar_t* const NAMES[] = {
-        L"张三",      L"李张三", L"长孙无忌", L"曾长",   L"重庆",   L"乐乐",   L"单田芳",
-        L"解解",      L"安安安安", L"王Li",   L"王?安",  L"2安3",   L"Zhang?San", L"zaz",
-        L"a",         L"安",     L"嗯n",      L"西安",   L"先",     L"?安",    L"",
-        L"中?国",     L"朝阳区", L"行行行",   L"阿啊a啊", L"张2三", L"曾曾曾曾曾曾曾曾曾曾曾"};
+    const wchar_t* const NAMES[] = {L"张三",      L"李张三", L"长孙无忌",
+                                    L"曾长",      L"重庆",   L"乐乐",
+                                    L"单田芳",    L"解解",   L"安安安安",
+                                    L"王Li",      L"王?安",  L"2安3",
+                                    L"Zhang?San", L"zaz",    L"a",
+                                    L"安",        L"嗯n",    L"西安",
+                                    L"先",        L"?安",    L"",
+                                    L"中?国",     L"朝阳区", L"行行行",
+                                    L"阿啊a啊",   L"张2三",  L"曾曾曾曾曾曾曾曾曾曾曾"};
     Details vNames;
     for (const wchar_t* szName : NAMES)
     {
@@ -317,30 +321,29 @@ TEST_F(Search, FitsPiecesToCharacters)
         const wchar_t* szName;
         Pieces vPieces;
         Compared expected;
-    } ROWS[] = {
-        {false, L"李张三", {L"zhang", L"s"}, {1, 2, 0}},
-        {false, L"张三", {L"z", L"san"}, {1, 2, 0}},
-        {false, L"李张三", {L"zhang", L"san"}, {1, 2, 1}},
-        {false, L"张三", {L"zhang", L"sa"}, {1, 2, 0}},
-        {false, L"张三", {L"张", L"s"}, {1, 2, 0}},
-        {false, L"张三", {L"張", L"三"}, {1, 2, 1}},
-        {false, L"张三", {L"s", L"z"}, {0, 0, 0}},
-        {false, L"张三", {L"z", L"s", L"s"}, {0, 0, 0}},
-        {false, L"张三", {L"zhangs"}, {0, 0, 0}},
-        {false, L"长三", {L"zhang"}, {1, 2, 1}},
-        {false, L"a三b?7?", {L"a", L"san", L"b", L"#", L"7", L"#"}, {1, 6, 1}},
-        {false, L"a7?", {L"#"}, {1, 2, 1}},
-        {false, L"a三7?", {L"8"}, {0, 0, 0}},
-        {false, L"a三7?", {L"77"}, {0, 0, 0}},
-        {false, L"a三7?", {L"##"}, {0, 0, 0}},
-        {true, L"长三", {L"94264", L"7"}, {1, 2, 0}},
-        {true, L"长三", {L"24264", L"726"}, {1, 2, 1}},
-        {true, L"长三", {L"92"}, {0, 0, 0}},
-        {true, L"?7", {L"7"}, {1, 1, 1}},
-        {true, L"?7", {L"#"}, {0, 0, 0}},
-        {true, L"?7", {L"77"}, {0, 0, 0}},
-        {true, L"adgjmptw", {L"2", L"3", L"4", L"5", L"6", L"7", L"8", L"9"}, {1, 8, 1}},
-        {true, L"cfilosvz", {L"2", L"3", L"4", L"5", L"6", L"7", L"8", L"9"}, {1, 8, 1}}};
+    } ROWS[] = {{false, L"李张三", {L"zhang", L"s"}, {1, 2, 0}},
+                {false, L"张三", {L"z", L"san"}, {1, 2, 0}},
+                {false, L"李张三", {L"zhang", L"san"}, {1, 2, 1}},
+                {false, L"张三", {L"zhang", L"sa"}, {1, 2, 0}},
+                {false, L"张三", {L"张", L"s"}, {1, 2, 0}},
+                {false, L"张三", {L"張", L"三"}, {1, 2, 1}},
+                {false, L"张三", {L"s", L"z"}, {0, 0, 0}},
+                {false, L"张三", {L"z", L"s", L"s"}, {0, 0, 0}},
+                {false, L"张三", {L"zhangs"}, {0, 0, 0}},
+                {false, L"长三", {L"zhang"}, {1, 2, 1}},
+                {false, L"a三b?7?", {L"a", L"san", L"b", L"#", L"7", L"#"}, {1, 6, 1}},
+                {false, L"a7?", {L"#"}, {1, 2, 1}},
+                {false, L"a三7?", {L"8"}, {0, 0, 0}},
+                {false, L"a三7?", {L"77"}, {0, 0, 0}},
+                {false, L"a三7?", {L"##"}, {0, 0, 0}},
+                {true, L"长三", {L"94264", L"7"}, {1, 2, 0}},
+                {true, L"长三", {L"24264", L"726"}, {1, 2, 1}},
+                {true, L"长三", {L"92"}, {0, 0, 0}},
+                {true, L"?7", {L"7"}, {1, 1, 1}},
+                {true, L"?7", {L"#"}, {0, 0, 0}},
+                {true, L"?7", {L"77"}, {0, 0, 0}},
+                {true, L"adgjmptw", {L"2", L"3", L"4", L"5", L"6", L"7", L"8", L"9"}, {1, 8, 1}},
+                {true, L"cfilosvz", {L"2", L"3", L"4", L"5", L"6", L"7", L"8", L"9"}, {1, 8, 1}}};
     for (const auto& row : ROWS)
     {
         EXPECT_EQ(Do(row.bDigits, row.szName, row.vPieces), row.expected)
@@ -365,10 +368,9 @@ TEST_F(Search, FitsPiecesToCharacters)
     EXPECT_EQ(letters.CmpOtherWords(DAMAGED_CODE, szPieces[3]), 0);
     const CLogCapture log;
     EXPECT_EQ(digits.CmpDigitalWord(LOC_DIGIT_BASE + 7, szPieces[4]), 1);
-    EXPECT_EQ(log.Lines(),
-              (std::vector<tag_LogLine>{
-                  {DEBUG_LINE, "LocalizerImpl/QVNumLocalizerManager",
-                   "QV_Contacts:CQVNumLocalizerManager::CmpDigitalWord r == 1"}}));
+    EXPECT_EQ(log.Lines(), (std::vector<tag_LogLine>{
+                               {DEBUG_LINE, "LocalizerImpl/QVNumLocalizerManager",
+                                "QV_Contacts:CQVNumLocalizerManager::CmpDigitalWord r == 1"}}));
 }
 
 TEST_F(Search, TriesOnlyWhatCanEndAText)
@@ -393,10 +395,10 @@ TEST_F(Search, RanksMatches)
 {
     const int PLACES[] = {-5, 3, 3, 3, 1, 3, 3, 2, 3};
     const std::pair<int, int> FITS[] = {
-        {MATCH_FULL, MatchPosition(0, 1)},     {MATCH_PARTIAL, MatchPosition(0, 1)},
-        {MATCH_PARTIAL, MatchPosition(0, 1)},  {MATCH_INITIALS, MatchPosition(2, 3)},
-        {MATCH_PARTIAL, MatchPosition(0, 1)},  {MATCH_PARTIAL, MatchPosition(0, 2)},
-        {MATCH_PARTIAL, MatchPosition(0, 1)},  {MATCH_PARTIAL, MatchPosition(0, 1)},
+        {MATCH_FULL, MatchPosition(0, 1)},    {MATCH_PARTIAL, MatchPosition(0, 1)},
+        {MATCH_PARTIAL, MatchPosition(0, 1)}, {MATCH_INITIALS, MatchPosition(2, 3)},
+        {MATCH_PARTIAL, MatchPosition(0, 1)}, {MATCH_PARTIAL, MatchPosition(0, 2)},
+        {MATCH_PARTIAL, MatchPosition(0, 1)}, {MATCH_PARTIAL, MatchPosition(0, 1)},
         {MATCH_INITIALS, MatchPosition(1, 2)}};
     Details vNames;
     android::Vector<_MatchResult> vMatches;
@@ -456,7 +458,7 @@ TEST_F(Search, FindsThePlaceOfAChangedRecord)
         long long llTime;
         int iExpected;
         const wchar_t* szNameAfter;
-    } ROWS[] = {{L"愛", 3, 0, 0, 0, L"ai 爱"},  {L"张三", 3, 0, 0, 1, L"zhang 张san 三"},
+    } ROWS[] = {{L"愛", 3, 0, 0, 0, L"ai 爱"},   {L"张三", 3, 0, 0, 1, L"zhang 张san 三"},
                 {L"赵", 3, 0, 0, 2, L"zhao 赵"}, {L"赵", 0, 0, 0, 0, L"zhao 赵"},
                 {L"赵", 3, 1, 25, 1, L"赵"},     {L"赵", 3, 1, 10, 3, L"赵"}};
     for (const auto& row : ROWS)
@@ -498,8 +500,8 @@ TEST_F(Search, NeedsNoMoreStackForManyNames)
         wchar_t szInput[] = L"z";
         wchar_t szWords[64] = {};
         long lMask = 0;
-        EXPECT_EQ(
-            matcher.DoSearch(&names, szInput, IME_SEARCH_WORD, 0, &result, &lMask, szWords), 0);
+        EXPECT_EQ(matcher.DoSearch(&names, szInput, IME_SEARCH_WORD, 0, &result, &lMask, szWords),
+                  0);
         Manager::LocalResultQuickSort(vTies, 0, TIED - 1, vNames.data());
     };
     pthread_attr_t attributes;

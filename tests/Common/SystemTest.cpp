@@ -1,0 +1,178 @@
+// Files and times of the system.
+
+#include "Common/FileHelpers.h"
+#include "Common/FileStamp.h"
+#include "Common/SystemTime.h"
+#include "tests/Support/DataDirectory.h"
+#include "tests/Support/WideText.h"
+
+#include <gtest/gtest.h>
+#include <sys/time.h>
+
+#include <chrono>
+#include <csignal>
+#include <cstring>
+#include <ctime>
+#include <filesystem>
+#include <iterator>
+#include <string>
+
+namespace fs = std::filesystem;
+
+namespace
+{
+
+// Works with relative names in a directory of its own.
+class Files : public testing::Test
+{
+protected:
+    Files() : m_pathBefore(fs::current_path()) { fs::current_path(m_directory.Root()); }
+    ~Files() override { fs::current_path(m_pathBefore); }
+
+    static void Make(const std::string& strName) { CDataDirectory::WriteBytes(strName, strName); }
+    // How many entries the directory has besides the two that every data directory has.
+    static long Entries()
+    {
+        return std::distance(fs::directory_iterator("."), fs::directory_iterator()) - 2;
+    }
+
+private:
+    CDataDirectory m_directory;
+    fs::path m_pathBefore;
+};
+
+template <typename T>
+uint32_t Milliseconds(T time)
+{
+    const auto sinceEpoch = std::chrono::duration_cast<std::chrono::milliseconds>(time);
+    return static_cast<uint32_t>(sinceEpoch.count());
+}
+
+} // namespace
+
+TEST_F(Files, HaveNamesThatAShellWouldMakeSomethingElseOf)
+{
+    fs::create_directories("bystander/deep");
+    for (const std::string strName : {" blank around ", "quote'in'it", "$(touch owned)",
+                                      "a\ntouch owned", "back\\slash\\", "~", "-rf", "张三"})
+    {
+        SCOPED_TRACE(strName);
+        Make(strName);
+        EXPECT_EQ(1, _MoveFile(strName.c_str(), "moved"));
+        EXPECT_EQ(strName, CDataDirectory::ReadBytes("moved"));
+        EXPECT_EQ(1, _wc_MoveFile(L"moved", Wide(strName).c_str()));
+        EXPECT_EQ(strName, CDataDirectory::ReadBytes(strName));
+        EXPECT_EQ(1, _wc_DeleteFile(Wide(strName).c_str()));
+        Make(strName);
+        EXPECT_EQ(1, _DeleteFile(strName.c_str()));
+        EXPECT_EQ(1, Entries());
+    }
+    EXPECT_EQ(1, _DeleteFile("bystander"));
+    EXPECT_EQ(0, Entries()) << "whole directories";
+    // What quoting adds takes nothing from the length of a path.
+    Make("file");
+    const std::string strQuotes(200, '\'');
+    const std::string strLong = "." + std::string(3800, '/') + strQuotes;
+    EXPECT_EQ(1, _MoveFile("file", strLong.c_str()));
+    EXPECT_EQ("file", CDataDirectory::ReadBytes(strQuotes));
+    EXPECT_EQ(1, _DeleteFile(strLong.c_str()));
+    EXPECT_EQ(0, Entries());
+    EXPECT_EQ(1, _MoveFile(nullptr, "file"));
+    EXPECT_EQ(1, _DeleteFile(nullptr));
+    wchar_t szPath[5000] = {};
+    EXPECT_EQ(0, GetModuleFileName(nullptr, szPath, 4096));
+    EXPECT_EQ(Wide(fs::read_symlink("/proc/self/exe").string()), szPath) << "linked into the test";
+}
+
+// A file that was written just now could change once more without a trace, whatever its own time
+// has been set to.
+TEST_F(Files, AreSettledOnceBothTheirTimesArePast)
+{
+    Make("file");
+    const auto fnSetTime = [](time_t seconds)
+    {
+        const timeval times[] = {{seconds, 0}, {seconds, 0}};
+        EXPECT_EQ(utimes("file", times), 0);
+    };
+    time_t start = 0;
+    tag_FileStamp stamp = {};
+    do // until nothing held the test up
+    {
+        start = std::time(nullptr);
+        fnSetTime(start - 1000);
+        stamp = ReadFileStamp("file");
+    } while (std::time(nullptr) - start > 1);
+    EXPECT_FALSE(stamp.bSettled);
+    EXPECT_EQ(stamp.llModified, start - 1000);
+    fnSetTime(start + 1000);
+    EXPECT_FALSE(ReadFileStamp("file").bSettled);
+    EXPECT_TRUE(ReadFileStamp("/usr/lib").bSettled);
+    EXPECT_FALSE(ReadFileStamp("no file").bSettled);
+    using FnChange = void (*)(tag_FileStamp&);
+    const FnChange OTHERS[] = {
+        [](tag_FileStamp& other) { ++other.uDevice; },
+        [](tag_FileStamp& other) { ++other.uInode; },
+        [](tag_FileStamp& other) { ++other.llSize; },
+        [](tag_FileStamp& other) { ++other.llModified; },
+        [](tag_FileStamp& other) { ++other.llChanged; },
+        [](tag_FileStamp& other) { ++other.iModifiedNs; },
+        [](tag_FileStamp& other) { ++other.iChangedNs; },
+    };
+    for (const FnChange fnChange : OTHERS)
+    {
+        tag_FileStamp other = stamp;
+        EXPECT_TRUE(IsSameStamp(stamp, other));
+        fnChange(other);
+        EXPECT_FALSE(IsSameStamp(stamp, other));
+    }
+}
+
+TEST(SystemTime, PointsInTimeHaveTheirCalendarForm)
+{
+    ASSERT_EQ(0, setenv("TZ", "CET-1CEST,M3.5.0,M10.5.0/3", 1));
+    const struct
+    {
+        tag_FileTime point;
+        tag_SystemTime calendar;
+        int iDaylightSeconds; // that the calendar form is ahead of standard time
+    } ROWS[] = {
+        {{999, 1072911599}, {2003, 12, 3, 31, 23, 59, 59, 999}, 0},
+        {{500, 1078009200}, {2004, 2, 0, 29, 0, 0, 0, 500}, 0},
+        {{0, 1091354400}, {2004, 8, 0, 1, 12, 0, 0, 0}, 3600},
+        {{0, -1}, {1970, 1, 4, 1, 0, 59, 59, 0}, 0},
+        {{0, INT32_MAX}, {2038, 1, 2, 19, 4, 14, 7, 0}, 0},
+    };
+    tag_FileTime point = {7, 7};
+    for (const auto& row : ROWS)
+    {
+        tag_SystemTime calendar = {};
+        EXPECT_EQ(1, FileTimeToSystemTime(&row.point, &calendar));
+        EXPECT_EQ(0, std::memcmp(&row.calendar, &calendar, sizeof(calendar))) << row.point.seconds;
+        EXPECT_EQ(1, SystemTimeToFileTime(&calendar, &point));
+        EXPECT_EQ(row.point.milliseconds, point.milliseconds);
+        EXPECT_EQ(row.point.seconds + row.iDaylightSeconds, point.seconds);
+    }
+    const tag_SystemTime beyond = {2200, 1, 0, 1, 0, 0, 0, 5};
+    EXPECT_EQ(1, SystemTimeToFileTime(&beyond, &point));
+    EXPECT_EQ(-1, point.seconds);
+    unsetenv("TZ");
+    tzset();
+}
+
+// Ticks are the low bits of the wall clock; signals do not shorten a pause.
+TEST(SystemTime, TellsTicksAndPauses)
+{
+    using Clock = std::chrono::system_clock;
+    const uint32_t uBefore = Milliseconds(Clock::now().time_since_epoch());
+    const uint32_t uTicks = static_cast<uint32_t>(GetTickCount());
+    EXPECT_LE(uTicks - uBefore, Milliseconds(Clock::now().time_since_epoch()) - uBefore);
+    const auto pfnPrevious = std::signal(SIGALRM, [](int /*iSignal*/) {});
+    const itimerval often = {{0, 500}, {0, 500}};
+    const itimerval never = {};
+    ASSERT_EQ(0, setitimer(ITIMER_REAL, &often, nullptr));
+    const auto start = std::chrono::steady_clock::now();
+    Sleep(60);
+    EXPECT_GE(Milliseconds(std::chrono::steady_clock::now() - start), 60U);
+    setitimer(ITIMER_REAL, &never, nullptr);
+    (void)std::signal(SIGALRM, pfnPrevious);
+}

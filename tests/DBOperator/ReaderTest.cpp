@@ -69,11 +69,10 @@ tag_ContactsStruct RecordOf(const tag_ProviderContact& contact, const std::wstri
 {
     tag_ContactsStruct record = {};
     record.iContactID = contact.iId;
-    record.iFlags = (contact.bStarred ? CONTACT_FLAG_STARRED : 0) |
-                    (contact.bPhone ? CONTACT_FLAG_PHONE : 0) |
-                    (contact.bSecret ? CONTACT_FLAG_SECRET : 0) |
-                    (contact.bMail ? CONTACT_FLAG_MAIL : 0) |
-                    (contact.bAddress ? CONTACT_FLAG_ADDRESS : 0);
+    record.iFlags =
+        (contact.bStarred ? CONTACT_FLAG_STARRED : 0) | (contact.bPhone ? CONTACT_FLAG_PHONE : 0) |
+        (contact.bSecret ? CONTACT_FLAG_SECRET : 0) | (contact.bMail ? CONTACT_FLAG_MAIL : 0) |
+        (contact.bAddress ? CONTACT_FLAG_ADDRESS : 0);
     record.llLastTimeContacted = contact.llLastTime;
     record.iTimesContacted = contact.iTimes;
     record.iStatusUpdateID = contact.iStatusId;
@@ -224,7 +223,8 @@ TEST_F(Reader, MakesRecordsOfRows)
         EXPECT_EQ(1, iFound);
         EXPECT_TRUE(IsSame(expected, record)) << i;
     }
-    EXPECT_TRUE(m_log.Has(DEBUG_LINE, READER + " CSQLiteOperator ReadContactsByID iContactID = -4\n"));
+    EXPECT_TRUE(
+        m_log.Has(DEBUG_LINE, READER + " CSQLiteOperator ReadContactsByID iContactID = -4\n"));
     // Found tells of the name row; a hidden contact is read alone.
     m_provider.Execute("delete from contacts where _id=1; delete from localizer where "
                        "contact_id=2; delete from visible_contacts");
@@ -259,12 +259,15 @@ TEST_F(Reader, ReadsTheListedVisibleContactsOnly)
         "contacts._id = visible_contacts._id ) as integer)=1";
     EXPECT_EQ(m_log.Texts(DEBUG_LINE),
               (Lines{READER + "SQLiteOperator>> ReadAllLocalizer begin",
-                     READER + "SQLiteOperator>> ReadAllLocalizer>> sqlstat_3 = select count(*) "
-                              "from " + strVisible + " and _id  in(5)\n",
+                     READER +
+                         "SQLiteOperator>> ReadAllLocalizer>> sqlstat_3 = select count(*) "
+                         "from " +
+                         strVisible + " and _id  in(5)\n",
                      SQLSTAT_4 +
                          "select _id,times_contacted,starred,has_phone_number,"
                          "last_time_contacted,single_is_secret,photo_file_id,status_update_id  "
-                         "from " + strVisible + "  and _id  in(5)\n",
+                         "from " +
+                         strVisible + "  and _id  in(5)\n",
                      SQLSTAT_5 + "select contact_id,display_name,localizerkey,group_id,account_id,"
                                  "hasMail,hasAddress from localizer where contact_id  in(5)\n"}));
 }
@@ -425,8 +428,9 @@ TEST_F(Reader, WaitsForTheRecordQueriesAsLongAsItTakes)
 {
     m_provider.PutAll({{1, "a"}, {2, "b"}});
     sqlite3_auto_extension(reinterpret_cast<void (*)()>(&CatchConnection));
-    for (const auto& [strQuery, strBusy] : {std::pair(SQLSTAT_4, READER + " SQLITE_BUSY: select from contacts"),
-                                            std::pair(SQLSTAT_5, READER + " SQLITE_BUSY: select from localizer")})
+    for (const auto& [strQuery, strBusy] :
+         {std::pair(SQLSTAT_4, READER + " SQLITE_BUSY: select from contacts"),
+          std::pair(SQLSTAT_5, READER + " SQLITE_BUSY: select from localizer")})
     {
         int iBusy = 0;
         m_log.AtEachLine(

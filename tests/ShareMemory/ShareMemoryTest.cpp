@@ -32,42 +32,18 @@ std::string ErrorText(int iError, const char* szBetween = " : ")
     return std::to_string(iError) + szBetween + std::strerror(iError);
 }
 
-// Makes a system call fail for the rest of this process, or only those of its calls whose second
-// argument is iSecond. False where that is not possible.
-bool RefuseCall(unsigned uCall, int iError, unsigned uSecond = 0)
+// Makes reserving space fail for the rest of this process. False where that is not possible.
+bool RefuseReservations()
 {
-    const auto uErrno = static_cast<unsigned>(iError);
-    const auto uAny = static_cast<unsigned char>(uSecond == 0 ? 1 : 0);
     sock_filter program[] = {
         BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, nr)),
-        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, uCall, 0, 3),
-        BPF_STMT(BPF_LD | BPF_W | BPF_ABS, offsetof(seccomp_data, args[1])),
-        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, uSecond, 0, 1),
-        BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | uErrno),
+        BPF_JUMP(BPF_JMP | BPF_JEQ | BPF_K, SYS_fallocate, 0, 1),
+        BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ERRNO | EOPNOTSUPP),
         BPF_STMT(BPF_RET | BPF_K, SECCOMP_RET_ALLOW),
     };
-    program[3].jf = static_cast<unsigned char>(1 - uAny);
     sock_fprog filter = {std::size(program), program};
     return prctl(PR_SET_NO_NEW_PRIVS, 1, 0, 0, 0) == 0 &&
            prctl(PR_SET_SECCOMP, SECCOMP_MODE_FILTER, &filter) == 0;
-}
-
-bool RefuseReservations()
-{
-    return RefuseCall(SYS_fallocate, EOPNOTSUPP);
-}
-
-#ifdef SYS_mmap2
-constexpr unsigned MMAP_CALL = SYS_mmap2;
-#else
-constexpr unsigned MMAP_CALL = SYS_mmap;
-#endif
-
-off_t BytesOnDisk(const std::string& strPath)
-{
-    struct stat info = {};
-    stat(strPath.c_str(), &info);
-    return info.st_blocks * 512;
 }
 
 class ShareMemory : public testing::Test
@@ -99,12 +75,12 @@ protected:
 
 TEST_F(ShareMemory, GivesFilesTheirSizeAndALastZero)
 {
-    const std::pair<std::string, std::string> cases[] = {
+    const std::pair<std::string, std::string> ROWS[] = {
         {"", std::string(12, '\0')},
         {"short", std::string("short") + std::string(7, '\0')},
         {std::string(100, 'x'), std::string(11, 'x') + '\0' + std::string(88, 'x')},
     };
-    for (const auto& [strBefore, strAfter] : cases)
+    for (const auto& [strBefore, strAfter] : ROWS)
     {
         CDataDirectory::WriteBytes(m_strPath, strBefore);
         void* pAddr = Open(12);
@@ -112,20 +88,17 @@ TEST_F(ShareMemory, GivesFilesTheirSizeAndALastZero)
         EXPECT_EQ(CDataDirectory::ReadBytes(m_strPath), strAfter);
         CloseWriteShareMemory(pAddr, 12, 0);
     }
-    EXPECT_TRUE(m_log.Lines().empty());
-}
-
-TEST_F(ShareMemory, CreatesForEverybodyAndLeavesTheMaskAtZero)
-{
+    std::filesystem::remove(m_strPath);
     const mode_t iOldMask = umask(077);
     void* pAddr = OpenShareMemory(m_strPath.c_str(), 12);
     EXPECT_EQ(umask(iOldMask), 0U);
     ASSERT_NE(pAddr, MAP_FAILED);
     CloseShareMemory(pAddr, 12);
     EXPECT_EQ(std::filesystem::status(m_strPath).permissions(), std::filesystem::perms::all);
+    EXPECT_TRUE(m_log.Lines().empty());
 }
 
-TEST_F(ShareMemory, TellsWhyNothingIsMapped)
+TEST_F(ShareMemory, TellsWhyNothingIsMappedOrClosed)
 {
     EXPECT_EQ(Open(0), MAP_FAILED);
     EXPECT_EQ(Errors(), MapError("OpenWriteShareMemory", EINVAL));
@@ -134,127 +107,6 @@ TEST_F(ShareMemory, TellsWhyNothingIsMapped)
     CDataDirectory::WriteBytes(m_strPath, std::string(11, 'x'));
     EXPECT_EQ(OpenReadShareMemory(m_strPath.c_str(), 12), MAP_FAILED);
     EXPECT_EQ(Errors(), MapError("OpenReadShareMemory", ENXIO));
-
-    m_strPath = m_directory.File("no/such/directory");
-    EXPECT_EQ(OpenShareMemory(m_strPath.c_str(), 12), MAP_FAILED);
-    EXPECT_EQ(Open(12), MAP_FAILED);
-    EXPECT_EQ(OpenReadShareMemory(m_strPath.c_str(), 12), MAP_FAILED);
-    EXPECT_EQ(Errors(),
-              (Lines{"QV_Contacts: OpenShareMemory error no2 = 2\n",
-                     "QV_Contacts: OpenWriteShareMemory " + m_strPath + " error no2 = 2\n",
-                     "QV_Contacts: OpenReadShareMemory:" + m_strPath + " error no2 = 2\n"}));
-}
-
-// The signal that comes with passing the limit would end the child.
-TEST_F(ShareMemory, RefusesASizeAboveTheProcessLimit)
-{
-    const std::string strOld(6000, 'x');
-    CDataDirectory::WriteBytes(m_strPath, strOld);
-    EXPECT_TRUE(RunInChild(
-        [&]
-        {
-            const rlimit limit = {4096, 4096};
-            ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &limit), 0);
-            EXPECT_EQ(Open(5000), MAP_FAILED);
-            EXPECT_EQ(Errors(), MapError("OpenWriteShareMemory", EFBIG));
-            EXPECT_EQ(CDataDirectory::ReadBytes(m_strPath), strOld);
-            EXPECT_NE(Open(4096), MAP_FAILED);
-        }));
-}
-
-// Where the system reserves space and where it does not.
-class FullDisk : public ShareMemory, public testing::WithParamInterface<bool>
-{
-protected:
-    void SetUp() override
-    {
-        if (!GetParam() && !RunInChild([] { ASSERT_TRUE(RefuseReservations()); }))
-        {
-            GTEST_SKIP() << "no calls can be refused here";
-        }
-    }
-};
-INSTANTIATE_TEST_SUITE_P(Reserving, FullDisk, testing::Bool());
-
-TEST_P(FullDisk, LeavesTheFileAlone)
-{
-    EXPECT_TRUE(RunInChild(
-        [&]
-        {
-            // A file system of 64 KiB that only the child sees.
-            if (unshare(CLONE_NEWNS) != 0 ||
-                mount("none", "/", nullptr, MS_REC | MS_PRIVATE, "") != 0 ||
-                mount("none", m_directory.File("").c_str(), "tmpfs", 0, "size=64k") != 0)
-            {
-                GTEST_SKIP() << "this user cannot mount";
-            }
-            ASSERT_TRUE(GetParam() || RefuseReservations());
-            const std::string strOld(5000, 'x');
-            CDataDirectory::WriteBytes(m_strPath, strOld);
-            EXPECT_EQ(Open(200000), MAP_FAILED);
-            EXPECT_EQ(Errors(), MapError("OpenWriteShareMemory", ENOSPC));
-            EXPECT_EQ(CDataDirectory::ReadBytes(m_strPath), strOld);
-            // A file with holes is as long as it has to be and still has no place on the disk.
-            ASSERT_EQ(truncate(m_strPath.c_str(), 300000), 0);
-            EXPECT_EQ(Open(200000), MAP_FAILED);
-            ASSERT_EQ(truncate(m_strPath.c_str(), 5000), 0);
-            // What the failed attempts took is free again.
-            EXPECT_NE(Open(40000), MAP_FAILED);
-        }));
-}
-
-TEST_P(FullDisk, HoldsWhatWasMappedInPlaceOfAHole)
-{
-    constexpr off_t SIZE = 300000;
-    std::string strSparse(SIZE, '\0');
-    CDataDirectory::WriteBytes(m_strPath, "");
-    ASSERT_EQ(truncate(m_strPath.c_str(), SIZE - 100000), 0);
-    std::fstream file(m_strPath, std::ios::in | std::ios::out | std::ios::binary);
-    for (const size_t uAt : {size_t{100}, size_t{65536}, size_t{130000}})
-    {
-        strSparse[uAt] = 'x';
-        file.seekp(static_cast<std::streamoff>(uAt)).put('x');
-    }
-    file.close();
-    EXPECT_TRUE(RunInChild(
-        [&]
-        {
-            ASSERT_TRUE(GetParam() || RefuseReservations());
-            EXPECT_NE(Open(SIZE), MAP_FAILED);
-        }));
-    EXPECT_EQ(CDataDirectory::ReadBytes(m_strPath), strSparse);
-    EXPECT_GE(BytesOnDisk(m_strPath), SIZE);
-}
-
-// Another process may have mapped the file as soon as it was long enough.
-TEST_F(ShareMemory, LeavesAFileThatHasItsLength)
-{
-    constexpr unsigned SIZE = 123456;
-    EXPECT_TRUE(RunInChild(
-        [&]
-        {
-            if (!RefuseCall(MMAP_CALL, ENOMEM, SIZE))
-            {
-                GTEST_SKIP() << "no calls can be refused here";
-            }
-            EXPECT_EQ(Open(SIZE), MAP_FAILED);
-            EXPECT_EQ(Errors(), MapError("OpenWriteShareMemory", ENOMEM));
-            EXPECT_EQ(std::filesystem::file_size(m_strPath), SIZE);
-        }));
-}
-
-TEST_F(ShareMemory, RefusesWhatIsNoFile)
-{
-    ASSERT_EQ(mkfifo(m_strPath.c_str(), 0700), 0);
-    EXPECT_EQ(Open(12), MAP_FAILED);
-    EXPECT_EQ(OpenReadShareMemory(m_strPath.c_str(), 12), MAP_FAILED) << "and does not wait";
-    EXPECT_EQ(Errors(),
-              (Lines{"QV_Contacts: OpenWriteShareMemory " + m_strPath + " error no2 = 22\n",
-                     "QV_Contacts: OpenReadShareMemory:" + m_strPath + " error no2 = 22\n"}));
-}
-
-TEST_F(ShareMemory, ClosingTellsWhatFailed)
-{
     char* pInPage = reinterpret_cast<char*>(4097); // belongs to no mapping
     CloseShareMemory(pInPage, 12);
     CloseWriteShareMemory(pInPage, 12, 0);
@@ -265,6 +117,86 @@ TEST_F(ShareMemory, ClosingTellsWhatFailed)
                                "QV_Contacts: CloseWriteShareMemory msync error:" + strError,
                                "QV_Contacts: CloseWriteShareMemory munmap error:" + strError,
                                "QV_Contacts: CloseReadShareMemory munmap error:" + strError}));
+    const std::string strPipe = m_directory.File("pipe");
+    ASSERT_EQ(mkfifo(strPipe.c_str(), 0700), 0); // is refused without waiting
+    for (const auto& [strPath, strNumber] :
+         {std::pair(m_directory.File("no/such/directory"), "2"), std::pair(strPipe, "22")})
+    {
+        const std::string strEnd = std::string(" error no2 = ") + strNumber + "\n";
+        EXPECT_EQ(OpenShareMemory(strPath.c_str(), 12), MAP_FAILED);
+        EXPECT_EQ(OpenWriteShareMemory(strPath.c_str(), 12), MAP_FAILED);
+        EXPECT_EQ(OpenReadShareMemory(strPath.c_str(), 12), MAP_FAILED);
+        EXPECT_EQ(Errors(), (Lines{"QV_Contacts: OpenShareMemory" + strEnd,
+                                   "QV_Contacts: OpenWriteShareMemory " + strPath + strEnd,
+                                   "QV_Contacts: OpenReadShareMemory:" + strPath + strEnd}));
+    }
+}
+
+// The signal that comes with passing the limit would end the child.
+TEST_F(ShareMemory, RefusesASizeAboveTheProcessLimit)
+{
+    CDataDirectory::WriteBytes(m_strPath, std::string(6000, 'x'));
+    EXPECT_TRUE(RunInChild(
+        [&]
+        {
+            const rlimit limit = {4096, 4096};
+            ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &limit), 0);
+            EXPECT_EQ(Open(5000), MAP_FAILED);
+            EXPECT_EQ(Errors(), MapError("OpenWriteShareMemory", EFBIG));
+            EXPECT_NE(Open(4096), MAP_FAILED);
+        }));
+}
+
+// Where the system reserves space and where it does not.
+TEST_F(ShareMemory, HoldsEveryByteOnTheDiskOrLeavesTheFileAlone)
+{
+    constexpr off_t SIZE = 300000;
+    const bool bCanRefuse = RunInChild([] { ASSERT_TRUE(RefuseReservations()); });
+    for (int iRefused = 0; iRefused <= (bCanRefuse ? 1 : 0); ++iRefused)
+    {
+        std::string strSparse(SIZE, '\0');
+        CDataDirectory::WriteBytes(m_strPath, "");
+        ASSERT_EQ(truncate(m_strPath.c_str(), SIZE - 100000), 0);
+        std::fstream file(m_strPath, std::ios::in | std::ios::out | std::ios::binary);
+        for (const size_t uAt : {size_t{100}, size_t{65536}, size_t{130000}})
+        {
+            strSparse[uAt] = 'x';
+            file.seekp(static_cast<std::streamoff>(uAt)).put('x');
+        }
+        file.close();
+        EXPECT_TRUE(RunInChild(
+            [&]
+            {
+                ASSERT_TRUE(iRefused == 0 || RefuseReservations());
+                EXPECT_NE(Open(SIZE), MAP_FAILED);
+            }));
+        EXPECT_EQ(CDataDirectory::ReadBytes(m_strPath), strSparse);
+        struct stat info = {};
+        EXPECT_EQ(stat(m_strPath.c_str(), &info), 0);
+        EXPECT_GE(info.st_blocks * 512, SIZE);
+        // On a file system of 64 KiB that only the child sees.
+        EXPECT_TRUE(RunInChild(
+            [&]
+            {
+                if (unshare(CLONE_NEWNS) != 0 ||
+                    mount("none", "/", nullptr, MS_REC | MS_PRIVATE, "") != 0 ||
+                    mount("none", m_directory.File("").c_str(), "tmpfs", 0, "size=64k") != 0)
+                {
+                    return; // this user cannot mount
+                }
+                ASSERT_TRUE(iRefused == 0 || RefuseReservations());
+                const std::string strOld(5000, 'x');
+                CDataDirectory::WriteBytes(m_strPath, strOld);
+                EXPECT_EQ(Open(200000), MAP_FAILED);
+                EXPECT_EQ(Errors(), MapError("OpenWriteShareMemory", ENOSPC));
+                EXPECT_EQ(CDataDirectory::ReadBytes(m_strPath), strOld);
+                // A file with holes is long enough and still has no place on the disk.
+                ASSERT_EQ(truncate(m_strPath.c_str(), SIZE), 0);
+                EXPECT_EQ(Open(200000), MAP_FAILED);
+                ASSERT_EQ(truncate(m_strPath.c_str(), 5000), 0);
+                EXPECT_NE(Open(40000), MAP_FAILED) << "what the failed attempts took is free";
+            }));
+    }
 }
 
 TEST_F(ShareMemory, WritesAndReadsWholeFiles)

@@ -2,12 +2,10 @@
 
 #include "Common/DataPaths.h"
 #include "MemManager/LockAttempts.h"
-#include "Platform/LogSink.h"
 #include "tests/Support/ChildProcess.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
 
-#include <cstring>
 #include <fcntl.h>
 #include <filesystem>
 #include <gtest/gtest.h>
@@ -46,6 +44,7 @@ TEST_F(SingleMutex, TakesAndReleases)
                      "QV_Contacts:UnLock TRY UNLOCK", "QV_Contacts:UNLOCK RET = 1 "}));
 }
 
+// The first refusal is what ends the other holder of the second attempt.
 TEST_F(SingleMutex, RefusesASecondHolderUntilTheFirstDies)
 {
     CLockHolder holder;
@@ -56,28 +55,35 @@ TEST_F(SingleMutex, RefusesASecondHolderUntilTheFirstDies)
     EXPECT_EQ(OpenDescriptors(), iOpen);
     EXPECT_EQ(m_log.Texts(DEBUG_LINE),
               (Lines{"QV_Contacts:Lock TRY LOCK", "QV_Contacts:LOCK RET = 0 "}));
-    holder.Kill();
-    EXPECT_EQ(CStoreLock().TryLock(), LOCK_TAKEN);
-}
-
-TEST_F(SingleMutex, IsTakenInThePauseInWhichItBecomesFree)
-{
-    CLockHolder holder;
-    // The first refusal is what ends the other holder.
-    const auto pfnSink =
-        [](void* pContext, int /*iPriority*/, const char* /*szTag*/, const char* szText)
-    {
-        if (std::strcmp(szText, "QV_Contacts:LOCK RET = 0 ") == 0)
+    m_log.AtEachLine(
+        [&](const std::string& strText)
         {
-            static_cast<CLockHolder*>(pContext)->Kill();
-        }
-    };
-    CLogSink::Set(pfnSink, &holder);
+            if (strText == "QV_Contacts:LOCK RET = 0 ")
+            {
+                holder.Kill();
+            }
+        });
     CStoreLock lock;
     int iRefused = 0;
     EXPECT_TRUE(TryStoreLock(&lock, [&](int /*iAttempt*/) { ++iRefused; }));
-    CLogSink::Set(nullptr, nullptr);
     EXPECT_EQ(iRefused, 0);
+}
+
+// A holder knows descriptor 0 as none.
+TEST_F(SingleMutex, TakesNoDescriptorOfTheStandardStreams)
+{
+    EXPECT_TRUE(RunInChild(
+        []
+        {
+            close(STDIN_FILENO);
+            int iFd = 0;
+            EXPECT_EQ(CSingleMutex::Lock(&iFd), 1);
+            EXPECT_GT(iFd, STDERR_FILENO);
+            EXPECT_NE(fcntl(iFd, F_GETFD) & FD_CLOEXEC, 0);
+            EXPECT_EQ(fcntl(STDIN_FILENO, F_GETFD), -1) << "the first number is free again";
+            EXPECT_EQ(CSingleMutex::UnLock(&iFd), 1);
+            EXPECT_EQ(fcntl(iFd, F_GETFD), -1);
+        }));
 }
 
 TEST_F(SingleMutex, LeavesAloneWhatWasClosedBehindItsBack)

@@ -2,16 +2,14 @@
 
 #include "Common/DataPaths.h"
 
-#include <array>
 #include <cerrno>
-#include <climits>
 #include <cstdarg>
 #include <cstdio>
 #include <cstring>
 #include <ctime>
 #include <dlfcn.h>
 #include <fcntl.h>
-#include <initializer_list>
+#include <iterator>
 #include <sys/file.h>
 #include <sys/mman.h>
 #include <unistd.h>
@@ -20,40 +18,26 @@ namespace
 {
 
 constexpr size_t MAX_FILES = 1024;
-constexpr size_t MAX_NAME = 64;
-
-struct tag_Mapping
-{
-    void* pAddr;
-    char szFile[MAX_NAME];
-};
 
 // Zero before anything runs: memory is allocated long before main.
-CALL_GROUP g_eGroup;
+tag_Failures g_failures;
 int g_iGranted;
-int g_iError;
-bool g_bOnce;
 bool g_bFaultsOn; // as long as there is a CCallFault, also after its call failed
 const char* g_szFailed = "";
 CMapWatch* g_pWatch;
-char g_aszFiles[MAX_FILES][MAX_NAME]; // by descriptor; empty for files elsewhere
-tag_Mapping g_aMappings[MAX_NAME];
+char g_aszFiles[MAX_FILES][sizeof(tag_Mapping::szFile)]; // by descriptor; empty for files elsewhere
+tag_Mapping g_aMappings[64];
 
-bool Fails(std::initializer_list<CALL_GROUP> groups, const char* szCall)
+bool Fails(unsigned int uGroups, const char* szCall)
 {
-    bool bCounts = false;
-    for (const CALL_GROUP eGroup : groups)
-    {
-        bCounts = bCounts || (g_eGroup == eGroup && eGroup != CALLS_NONE);
-    }
-    if (!bCounts || g_iGranted-- > 0)
+    if ((g_failures.eGroup & uGroups) == 0 || g_iGranted-- > 0)
     {
         return false;
     }
     g_szFailed = *g_szFailed == 0 ? szCall : g_szFailed;
-    g_eGroup = g_bOnce ? CALLS_NONE : g_eGroup;
+    g_failures.eGroup = g_failures.bOnce ? CALLS_NONE : g_failures.eGroup;
     g_iGranted = 0;
-    errno = g_iError;
+    errno = g_failures.iError;
     return true;
 }
 
@@ -76,59 +60,30 @@ Fn Next(Fn /*own*/, const char* szName)
     return reinterpret_cast<Fn>(dlsym(RTLD_NEXT, szName));
 }
 
-// Runs what a watch does without counting and telling it.
-template <typename FnTell>
-void Tell(FnTell fnTell)
+tag_Mapping* FindMapping(const void* pAddr)
 {
-    if (g_pWatch != nullptr)
+    tag_Mapping* pMapping = g_aMappings;
+    while (pMapping != std::end(g_aMappings) && pMapping->pAddr != pAddr)
+    {
+        ++pMapping;
+    }
+    return pMapping;
+}
+
+void Tell(MAP_EVENT eEvent, const void* pAddr)
+{
+    const tag_Mapping* pMapping = FindMapping(pAddr);
+    if (g_pWatch != nullptr && pMapping != std::end(g_aMappings))
     {
         CMapWatch* pWatch = g_pWatch;
-        const CALL_GROUP eGroup = g_eGroup;
+        const CALL_GROUP eGroup = g_failures.eGroup;
         const int iError = errno;
         g_pWatch = nullptr;
-        g_eGroup = CALLS_NONE;
-        fnTell(*pWatch);
+        g_failures.eGroup = CALLS_NONE;
+        pWatch->Happens(eEvent, *pMapping);
         g_pWatch = pWatch;
-        g_eGroup = eGroup;
+        g_failures.eGroup = eGroup;
         errno = iError;
-    }
-}
-
-void NoteMapping(void* pAddr, size_t uSize, int iProt, int iFlags, int iFd)
-{
-    for (tag_Mapping& mapping : g_aMappings)
-    {
-        if (mapping.pAddr == nullptr)
-        {
-            mapping.pAddr = pAddr;
-            std::memcpy(mapping.szFile, g_aszFiles[iFd], MAX_NAME);
-            Tell([&](CMapWatch& watch)
-                 { watch.Mapped(pAddr, uSize, iProt, iFlags, mapping.szFile); });
-            return;
-        }
-    }
-}
-
-void NoteFlush(const void* pAddr)
-{
-    for (const tag_Mapping& mapping : g_aMappings)
-    {
-        if (mapping.pAddr == pAddr)
-        {
-            Tell([&](CMapWatch& watch) { watch.Flushed(mapping.szFile); });
-        }
-    }
-}
-
-void ForgetMapping(void* pAddr)
-{
-    for (tag_Mapping& mapping : g_aMappings)
-    {
-        if (mapping.pAddr == pAddr)
-        {
-            Tell([&](CMapWatch& watch) { watch.Unmapping(pAddr, mapping.szFile); });
-            mapping.pAddr = nullptr;
-        }
     }
 }
 
@@ -137,13 +92,17 @@ void ForgetMapping(void* pAddr)
 // What a call hands on to; the address is looked up once.
 #define QV_NEXT(NAME) static const auto pfnNext = Next(&NAME, #NAME)
 
-// A call that takes a descriptor first and fails with -1.
-#define QV_FILE_CALL(RESULT, NAME, PARAMETERS, ARGUMENTS, EXCEPTIONS, ...)                         \
+#define QV_CALL(RESULT, NAME, PARAMETERS, ARGUMENTS, EXCEPTIONS, FAILS, FAILED)                    \
     RESULT NAME PARAMETERS EXCEPTIONS                                                              \
     {                                                                                              \
         QV_NEXT(NAME);                                                                             \
-        return IsOurs(iFd) && Fails({CALLS_FILES, __VA_ARGS__}, #NAME) ? -1 : pfnNext ARGUMENTS;   \
+        return (FAILS) ? FAILED : pfnNext ARGUMENTS;                                               \
     }
+
+// A call that takes a descriptor first and fails with -1.
+#define QV_FILE_CALL(RESULT, NAME, PARAMETERS, ARGUMENTS, EXCEPTIONS, GROUPS)                      \
+    QV_CALL(RESULT, NAME, PARAMETERS, ARGUMENTS, EXCEPTIONS, IsOurs(iFd) && Fails(GROUPS, #NAME),  \
+            -1)
 
 #define QV_OPEN_CALL(NAME)                                                                         \
     int NAME(const char* szPath, int iFlags, ...)                                                  \
@@ -154,11 +113,11 @@ void ForgetMapping(void* pAddr)
         const int iMode = (iFlags & O_CREAT) != 0 ? va_arg(arguments, int) : 0;                    \
         va_end(arguments);                                                                         \
         const char* szName = NameBelowRoot(szPath);                                                \
-        const int iFd =                                                                            \
-            *szName != 0 && Fails({CALLS_FILES}, #NAME) ? -1 : pfnNext(szPath, iFlags, iMode);     \
+        const bool bFails = *szName != 0 && Fails(CALLS_FILES, #NAME);                             \
+        const int iFd = bFails ? -1 : pfnNext(szPath, iFlags, iMode);                              \
         if (iFd >= 0 && static_cast<size_t>(iFd) < MAX_FILES)                                      \
         {                                                                                          \
-            std::snprintf(g_aszFiles[iFd], MAX_NAME, "%s", szName);                                \
+            std::snprintf(g_aszFiles[iFd], sizeof(g_aszFiles[iFd]), "%s", szName);                 \
         }                                                                                          \
         return iFd;                                                                                \
     }
@@ -167,134 +126,100 @@ void ForgetMapping(void* pAddr)
     void* NAME(void* pAddr, size_t uSize, int iProt, int iFlags, int iFd, OFFSET iOffset) noexcept \
     {                                                                                              \
         QV_NEXT(NAME);                                                                             \
-        if (IsOurs(iFd) && Fails({CALLS_FILES}, #NAME))                                            \
+        const bool bFails = IsOurs(iFd) && Fails(CALLS_FILES, #NAME);                              \
+        void* pMapped = bFails ? MAP_FAILED : pfnNext(pAddr, uSize, iProt, iFlags, iFd, iOffset);  \
+        tag_Mapping* pFree = FindMapping(nullptr);                                                 \
+        if (pMapped != MAP_FAILED && IsOurs(iFd) && pFree != std::end(g_aMappings))                \
         {                                                                                          \
-            return MAP_FAILED;                                                                     \
-        }                                                                                          \
-        void* pMapped = pfnNext(pAddr, uSize, iProt, iFlags, iFd, iOffset);                        \
-        if (pMapped != MAP_FAILED && IsOurs(iFd))                                                  \
-        {                                                                                          \
-            NoteMapping(pMapped, uSize, iProt, iFlags, iFd);                                       \
+            *pFree = {pMapped, uSize, iFlags == MAP_SHARED && (iProt & PROT_WRITE) != 0, ""};      \
+            std::strcpy(pFree->szFile, g_aszFiles[iFd]);                                           \
+            Tell(MAP_MADE, pMapped);                                                               \
         }                                                                                          \
         return pMapped;                                                                            \
     }
 
 extern "C"
 {
+    constexpr unsigned int CALLS_WRITE = CALLS_FILES | CALLS_ROOM;
+
     QV_OPEN_CALL(open)
     QV_OPEN_CALL(open64)
     QV_MAP_CALL(mmap, off_t)
     QV_MAP_CALL(mmap64, off64_t)
     QV_FILE_CALL(ssize_t, read, (int iFd, void* pBuf, size_t uSize), (iFd, pBuf, uSize), ,
-                 CALLS_NONE)
+                 CALLS_FILES)
     QV_FILE_CALL(ssize_t, pread, (int iFd, void* pBuf, size_t uSize, off_t iAt),
-                 (iFd, pBuf, uSize, iAt), , CALLS_NONE)
+                 (iFd, pBuf, uSize, iAt), , CALLS_FILES)
     QV_FILE_CALL(ssize_t, pread64, (int iFd, void* pBuf, size_t uSize, off64_t iAt),
-                 (iFd, pBuf, uSize, iAt), , CALLS_NONE)
+                 (iFd, pBuf, uSize, iAt), , CALLS_FILES)
     QV_FILE_CALL(ssize_t, write, (int iFd, const void* pBuf, size_t uSize), (iFd, pBuf, uSize), ,
-                 CALLS_ROOM)
+                 CALLS_WRITE)
     QV_FILE_CALL(ssize_t, pwrite, (int iFd, const void* pBuf, size_t uSize, off_t iAt),
-                 (iFd, pBuf, uSize, iAt), , CALLS_ROOM)
+                 (iFd, pBuf, uSize, iAt), , CALLS_WRITE)
     QV_FILE_CALL(ssize_t, pwrite64, (int iFd, const void* pBuf, size_t uSize, off64_t iAt),
-                 (iFd, pBuf, uSize, iAt), , CALLS_ROOM)
-    QV_FILE_CALL(int, ftruncate, (int iFd, off_t iSize), (iFd, iSize), noexcept, CALLS_ROOM)
-    QV_FILE_CALL(int, ftruncate64, (int iFd, off64_t iSize), (iFd, iSize), noexcept, CALLS_ROOM)
+                 (iFd, pBuf, uSize, iAt), , CALLS_WRITE)
+    QV_FILE_CALL(int, ftruncate, (int iFd, off_t iSize), (iFd, iSize), noexcept, CALLS_WRITE)
+    QV_FILE_CALL(int, ftruncate64, (int iFd, off64_t iSize), (iFd, iSize), noexcept, CALLS_WRITE)
     QV_FILE_CALL(int, fallocate, (int iFd, int iMode, off_t iAt, off_t iSize),
-                 (iFd, iMode, iAt, iSize), , CALLS_ROOM)
-    QV_FILE_CALL(int, fallocate64, (int iFd, int iMode, off64_t iAt, off64_t iSize),
-                 (iFd, iMode, iAt, iSize), , CALLS_ROOM)
+                 (iFd, iMode, iAt, iSize), , CALLS_WRITE)
+    QV_FILE_CALL(int, flock, (int iFd, int iOperation), (iFd, iOperation), noexcept,
+                 CALLS_FILES | CALLS_LOCK)
+    QV_CALL(int, usleep, (useconds_t uMicroseconds), (uMicroseconds), , g_bFaultsOn, 0)
+    QV_CALL(int, nanosleep, (const timespec* pTime, timespec* pRest), (pTime, pRest), , g_bFaultsOn,
+            0)
+
+    // The sanitizers keep allocation to themselves.
+#ifndef __SANITIZE_ADDRESS__
+    QV_CALL(void*, malloc, (size_t uSize), (uSize), noexcept, Fails(CALLS_MEMORY, "malloc"),
+            nullptr)
+    QV_CALL(void*, calloc, (size_t uCount, size_t uSize), (uCount, uSize), noexcept,
+            Fails(CALLS_MEMORY, "calloc"), nullptr)
+    QV_CALL(void*, realloc, (void* pMemory, size_t uSize), (pMemory, uSize), noexcept,
+            Fails(CALLS_MEMORY, "realloc"), nullptr)
+#endif
 
     // Nothing here outlives the machine: the disk is not waited for.
-    int fsync(int iFd)
-    {
-        return IsOurs(iFd) && Fails({CALLS_FILES}, "fsync") ? -1 : 0;
-    }
-
     int fdatasync(int iFd)
     {
-        return IsOurs(iFd) && Fails({CALLS_FILES}, "fdatasync") ? -1 : 0;
+        return IsOurs(iFd) && Fails(CALLS_FILES, "fdatasync") ? -1 : 0;
     }
 
     int msync(void* pAddr, size_t /*uSize*/, int iFlags)
     {
-        if (Fails({CALLS_FILES}, "msync"))
+        if (Fails(CALLS_FILES, "msync"))
         {
             return -1;
         }
         if ((iFlags & MS_SYNC) != 0)
         {
-            NoteFlush(pAddr);
+            Tell(MAP_FLUSHED, pAddr);
         }
         return 0;
-    }
-
-    int flock(int iFd, int iOperation) noexcept
-    {
-        QV_NEXT(flock);
-        const bool bFails = IsOurs(iFd) && Fails({CALLS_FILES, CALLS_LOCK}, "flock");
-        return bFails ? -1 : pfnNext(iFd, iOperation);
     }
 
     int munmap(void* pAddr, size_t uSize) noexcept
     {
         QV_NEXT(munmap);
-        ForgetMapping(pAddr);
+        Tell(MAP_ENDS, pAddr);
+        if (FindMapping(pAddr) != std::end(g_aMappings))
+        {
+            FindMapping(pAddr)->pAddr = nullptr;
+        }
         return pfnNext(pAddr, uSize);
     }
-
-    int usleep(useconds_t uMicroseconds)
-    {
-        QV_NEXT(usleep);
-        return g_bFaultsOn ? 0 : pfnNext(uMicroseconds);
-    }
-
-    int nanosleep(const timespec* pTime, timespec* pRest)
-    {
-        QV_NEXT(nanosleep);
-        return g_bFaultsOn ? 0 : pfnNext(pTime, pRest);
-    }
-
-    int clock_nanosleep(clockid_t iClock, int iFlags, const timespec* pTime, timespec* pRest)
-    {
-        QV_NEXT(clock_nanosleep);
-        return g_bFaultsOn ? 0 : pfnNext(iClock, iFlags, pTime, pRest);
-    }
-
-    // The sanitizers keep allocation to themselves.
-#ifndef __SANITIZE_ADDRESS__
-    void* malloc(size_t uSize) noexcept
-    {
-        QV_NEXT(malloc);
-        return Fails({CALLS_MEMORY}, "malloc") ? nullptr : pfnNext(uSize);
-    }
-
-    void* calloc(size_t uCount, size_t uSize) noexcept
-    {
-        QV_NEXT(calloc);
-        return Fails({CALLS_MEMORY}, "calloc") ? nullptr : pfnNext(uCount, uSize);
-    }
-
-    void* realloc(void* pMemory, size_t uSize) noexcept
-    {
-        QV_NEXT(realloc);
-        return Fails({CALLS_MEMORY}, "realloc") ? nullptr : pfnNext(pMemory, uSize);
-    }
-#endif
 }
 
-CCallFault::CCallFault(CALL_GROUP eGroup, int iGranted, int iError, bool bOnce)
+CCallFault::CCallFault(const tag_Failures& failures, int iGranted)
 {
     g_szFailed = "";
     g_iGranted = iGranted;
-    g_iError = iError;
-    g_bOnce = bOnce;
     g_bFaultsOn = true;
-    g_eGroup = eGroup;
+    g_failures = failures;
 }
 
 CCallFault::~CCallFault()
 {
-    g_eGroup = CALLS_NONE;
+    g_failures.eGroup = CALLS_NONE;
     g_bFaultsOn = false;
 }
 

@@ -6,21 +6,30 @@
 
 #include <cstddef>
 
-enum CALL_GROUP
+// Bits: what needs room is a call for files, too.
+enum CALL_GROUP : unsigned int
 {
-    CALLS_NONE,
-    CALLS_FILES, // opening, reading, writing, mapping, locking and flushing below the data root
-    CALLS_ROOM,  // those of them that may need room on the disk
-    CALLS_LOCK,  // flock
-    CALLS_MEMORY // malloc, calloc, realloc and with them new
+    CALLS_NONE = 0,
+    CALLS_FILES = 1, // opening, reading, writing, mapping, locking and flushing below the data root
+    CALLS_ROOM = 2,  // those of them that may need room on the disk
+    CALLS_LOCK = 4,  // flock
+    CALLS_MEMORY = 8 // malloc, calloc, realloc and with them new
 };
 
-// For as long as the object lives, the calls of a group succeed iGranted times; then one of them
-// fails with iError, or all do. Nothing sleeps meanwhile. One object at a time, in one thread.
+struct tag_Failures
+{
+    const char* szName;
+    CALL_GROUP eGroup;
+    int iError;
+    bool bOnce; // or all calls from the first that fails on
+};
+
+// For as long as the object lives, the calls of a group succeed iGranted times and then fail.
+// Nothing sleeps meanwhile. One object at a time, in one thread.
 class CCallFault
 {
 public:
-    CCallFault(CALL_GROUP eGroup, int iGranted, int iError, bool bOnce);
+    CCallFault(const tag_Failures& failures, int iGranted);
     ~CCallFault();
     CCallFault(const CCallFault&) = delete;
     CCallFault& operator=(const CCallFault&) = delete;
@@ -29,15 +38,27 @@ public:
     static const char* Failed();
 };
 
-// Is told of each mapping of a file below the data root after it was made, after it was flushed to
-// the disk and before it goes.
-// What it calls itself is neither counted nor told.
+// A mapping of a file below the data root.
+struct tag_Mapping
+{
+    void* pAddr;
+    size_t uSize;
+    bool bWritten; // it writes the file
+    char szFile[64];
+};
+
+enum MAP_EVENT
+{
+    MAP_MADE,
+    MAP_FLUSHED, // to the disk
+    MAP_ENDS
+};
+
+// Is told of mappings. What it calls itself is neither counted nor told.
 class CMapWatch
 {
 public:
-    virtual void Mapped(void* pAddr, size_t uSize, int iProt, int iFlags, const char* szFile) = 0;
-    virtual void Flushed(const char* szFile) = 0;
-    virtual void Unmapping(void* pAddr, const char* szFile) = 0;
+    virtual void Happens(MAP_EVENT eEvent, const tag_Mapping& mapping) = 0;
     // Null ends the watch.
     static void Set(CMapWatch* pWatch);
 

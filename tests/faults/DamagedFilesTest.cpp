@@ -4,14 +4,12 @@
 #include "Common/DataPaths.h"
 #include "tests/Support/StoreFiles.h"
 #include "tests/faults/Options.h"
-#include "tests/faults/Readings.h"
 #include "tests/faults/StoreCase.h"
 
 #include <algorithm>
 #include <filesystem>
 #include <gtest/gtest.h>
 #include <random>
-#include <set>
 #include <unistd.h>
 
 namespace
@@ -94,15 +92,15 @@ TEST(Faults, DamagedFilesHarmNobody)
         }
         for (int i = 0; i < CALLS; ++i)
         {
-            const tag_Reading& reading = AllReadings()[damage.Pick(AllReadings().size())];
-            tag_Answer answer;
-            reading.pfnRead(logic, answer);
-            EXPECT_TRUE(IsResult(answer.iRet)) << reading.szName << answer.iRet;
-            EXPECT_TRUE(answer.iRet == 0 || answer.pResult == nullptr);
-            TextOf(logic, answer);
-            const tag_Change& change = AllChanges()[damage.Pick(AllChanges().size())];
-            const int iRet = change.fnTell(logic);
-            EXPECT_TRUE(IsResult(iRet)) << change.szName << iRet;
+            for (const auto* pOperations : {&AllReadings(), &AllChanges()})
+            {
+                const tag_Operation& operation = (*pOperations)[damage.Pick(pOperations->size())];
+                tag_Answer answer;
+                operation.pfnRun(logic, answer);
+                EXPECT_TRUE(IsResult(answer.iRet)) << operation << answer.iRet;
+                EXPECT_TRUE(answer.iRet == 0 || answer.pResult == nullptr);
+                TextOf(logic, answer);
+            }
         }
         if (uFile > 1)
         {

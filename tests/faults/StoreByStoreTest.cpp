@@ -3,11 +3,8 @@
 // like a fresh build after the next notification.
 
 #include "Common/DataPaths.h"
-#include "Filter/FilterChain.h"
-#include "LocalizerImpl/QVLocalizerManager.h"
 #include "tests/Support/ChildProcess.h"
 #include "tests/Support/StoreFiles.h"
-#include "tests/faults/Readings.h"
 #include "tests/faults/StoreCase.h"
 #include "tests/faults/StoreStepper.h"
 
@@ -156,24 +153,16 @@ private:
 std::string SearchFault(const CStoreCase& store)
 {
     CLocalizerLogic logic;
-    CFilterChain everybody;
-    wchar_t szInput[1] = {};
-    wchar_t szWords[CN_WORD_MAX + 1] = {};
-    long lMask = 0;
-    tag_LocalizerResult* pResult = nullptr;
-    if (logic.Search(nullptr, szInput, IME_SEARCH_WORD, &everybody, 0, &pResult, &lMask, szWords) !=
-        0)
+    tag_Answer answer;
+    AllReadings()[0].pfnRun(logic, answer);
+    std::string strFault = answer.iRet == 0 ? "" : "no search";
+    for (int i = 0; answer.iRet == 0 && i < answer.pResult->iResultNum; ++i)
     {
-        return "no search";
-    }
-    std::string strFault;
-    for (int i = 0; i < pResult->iResultNum; ++i)
-    {
-        const tag_LocalizerDetail& entry = pResult->pDetail[i];
+        const tag_LocalizerDetail& entry = answer.pResult->pDetail[i];
         strFault += entry.iContactID == 0 ? "nobody found" : "";
         strFault += store.MixedContact(entry.iContactID, nullptr, entry.szLocalizerKey);
     }
-    logic.FreeSearchResult(pResult);
+    logic.FreeSearchResult(answer.pResult);
     return strFault;
 }
 
@@ -205,23 +194,6 @@ std::string NextFault(const CStoreCase& store, STORE_KIND eKind, bool bStatus)
                : strFault;
 }
 
-// In name order a time and its count change one after the other in a store that stays whole.
-STORE_KIND KindOf(const CStoreCase& store, tag_StoreImage image, std::string* pstrWhy)
-{
-    const STORE_KIND eKind = store.KindOf(image, pstrWhy);
-    if (eKind != KIND_WRONG || std::strcmp(store.Change().szName, "Time") != 0)
-    {
-        return eKind;
-    }
-    const tag_StoreImage& after = store.After(store.SortType());
-    for (size_t i = 0; i < image.vRecords.size(); ++i)
-    {
-        image.vRecords[i].llLastTimeContacted = after.vRecords.at(i).llLastTimeContacted;
-        image.vRecords[i].iTimesContacted = after.vRecords.at(i).iTimesContacted;
-    }
-    return store.KindOf(image, pstrWhy);
-}
-
 // Searches and copies read records only under the lock.
 TEST(Faults, ReadsRecordsUnderTheLock)
 {
@@ -229,84 +201,78 @@ TEST(Faults, ReadsRecordsUnderTheLock)
     store.Restore();
     const CShared<tag_Steps> steps;
     CLocalizerLogic logic;
-    for (const tag_Reading& reading : AllReadings())
+    for (const tag_Operation& reading : AllReadings())
     {
         tag_Answer answer;
         CStoreStepper stepper(*steps, false);
-        reading.pfnRead(logic, answer);
+        reading.pfnRun(logic, answer);
         EXPECT_EQ(stepper.Fault(), "") << reading.szName;
         logic.FreeSearchResult(answer.pResult);
     }
 }
 
-class CStoreByStore : public testing::TestWithParam<std::tuple<tag_Change, int>>
+class CStoreByStore : public testing::TestWithParam<std::tuple<tag_Operation, int>>
 {
 };
 
 TEST_P(CStoreByStore, IsMarkedOrRight)
 {
     const auto& [change, iSortType] = GetParam();
-    const std::string strCase = change.szName + std::to_string(iSortType);
-    const bool bSetsSortType = std::strcmp(change.szName, "SortType") == 0;
     const CStoreCase store(change, iSortType);
     const CShared<tag_Steps> steps;
     store.Restore();
     tag_Files files = {CDataDirectory::ReadBytes(CDataPaths::ContactReg()), RecordsFile()};
-    const auto Expect = [&strCase](const std::string& strFault, uint32_t uStep)
+    uint32_t uStep = 0;
+    const auto Expect = [&](const std::string& strFault)
     {
-        EXPECT_EQ(strFault, "") << strCase << ", store " << uStep;
+        EXPECT_EQ(strFault, "") << change << iSortType << ", store " << uStep;
         return strFault.empty();
     };
-    const auto fnRun = [&]
+    const auto fnRun = [&, pfnRun = change.pfnRun]
     {
         CLocalizerLogic logic;
-        CStoreStepper stepper(*steps, bSetsSortType);
-        store.Change().fnTell(logic);
+        tag_Answer answer;
+        CStoreStepper stepper(*steps, store.Is("SortType"));
+        pfnRun(logic, answer);
         return stepper.Fault();
     };
-    Expect(CChild(fnRun, HANGS).Text(), 0);
+    Expect(CChild(fnRun, HANGS).Text());
     if (!CStoreStepper::IsPossible())
     {
         GTEST_SKIP() << "no single steps here: only the lock was looked at";
     }
     ASSERT_LT(steps->uSteps, tag_Steps::MAX_STEPS);
-    const std::string strLastReg = CDataDirectory::ReadBytes(CDataPaths::ContactReg());
-    const std::string strLastRecords = RecordsFile();
+    const tag_Files last = {CDataDirectory::ReadBytes(CDataPaths::ContactReg()), RecordsFile()};
     std::set<std::string> setKinds;
     STORE_KIND eKind = KIND_NONE;
     CDisk disk(files);
-    for (uint32_t i = 0; i < steps->uSteps; ++i)
+    const auto fnLook = [&](const tag_Files& left)
     {
-        files.Apply(steps->aSteps[i]);
-        disk.Note(steps->aSteps[i], files);
-        const auto fnLook = [&](const tag_Files& left)
-        {
-            std::string strLeft;
-            Expect(KindOf(store, left.Image(), &strLeft) == KIND_WRONG ? "on disk: " + strLeft : "",
-                   i);
-        };
-        Expect(disk.EachWhole(fnLook) ? "" : "on disk: changes without a mark", i);
+        std::string strLeft;
+        Expect(store.KindOf(left.Image(), &strLeft) == KIND_WRONG ? "on disk: " + strLeft : "");
+    };
+    for (; uStep < steps->uSteps; ++uStep)
+    {
+        files.Apply(steps->aSteps[uStep]);
+        disk.Note(steps->aSteps[uStep], files);
+        Expect(disk.EachWhole(fnLook) ? "" : "on disk: changes without a mark");
         std::string strWhy;
-        eKind = KindOf(store, files.Image(), &strWhy);
-        if (!Expect(eKind == KIND_WRONG ? strWhy : "", i) || !setKinds.insert(files.Kind()).second)
+        eKind = store.KindOf(files.Image(), &strWhy);
+        if (!Expect(eKind == KIND_WRONG ? strWhy : "") || !setKinds.insert(files.Kind()).second)
         {
             continue;
         }
         CStoreCase::Write(files.strReg, files.strRecords, files.strRecords.size());
-        Expect(SearchFault(store), i);
-        Expect(NextFault(store, eKind, setKinds.size() % 2 == 0), i);
+        Expect(SearchFault(store));
+        Expect(NextFault(store, eKind, setKinds.size() % 2 == 0));
     }
-    std::cout << strCase << ": " << steps->uSteps << " stores, " << setKinds.size() << " repairs\n";
-    EXPECT_EQ(eKind, bSetsSortType ? KIND_MARKED : KIND_AFTER);
-    EXPECT_TRUE(files.strReg == strLastReg && files.strRecords == strLastRecords);
+    std::cout << change << iSortType << ": " << uStep << " stores, " << setKinds.size()
+              << " repairs\n";
+    EXPECT_EQ(eKind, store.Is("SortType") ? KIND_MARKED : KIND_AFTER);
+    EXPECT_TRUE(files.strReg == last.strReg && files.strRecords == last.strRecords);
 }
 
 INSTANTIATE_TEST_SUITE_P(Faults, CStoreByStore,
-                         testing::Combine(testing::ValuesIn(AllChanges()), testing::Values(0, 1)),
-                         [](const auto& parameters)
-                         {
-                             return std::string(std::get<0>(parameters.param).szName) +
-                                    (std::get<1>(parameters.param) == 0 ? "ByName" : "ByTime");
-                         });
+                         testing::Combine(testing::ValuesIn(AllChanges()), testing::Values(0, 1)));
 
 } // namespace

@@ -1,12 +1,15 @@
 #include "tests/faults/StoreCase.h"
 
 #include "Common/DataPaths.h"
+#include "Filter/Filter.h"
+#include "Filter/FilterChain.h"
 #include "tests/Support/StoreFiles.h"
+#include "tests/Support/WideText.h"
 
 #include <algorithm>
+#include <cwchar>
 #include <filesystem>
 #include <initializer_list>
-#include <stdexcept>
 
 namespace fs = std::filesystem;
 
@@ -29,31 +32,99 @@ tag_ProviderContact Contact(int iId, const std::string& strName)
     return contact;
 }
 
-void Rename(CProviderDatabase& provider, int iId, const std::string& strName)
+void Insert(CProviderDatabase& provider)
 {
-    provider.SetName(iId, strName, LocalizerKeyOf(strName));
+    provider.Put(Contact(6, "明7"));
 }
 
-// Allocates nothing itself.
-int TellOf(CLocalizerLogic& logic, std::initializer_list<long long> ids)
+void Rename(CProviderDatabase& provider)
+{
+    provider.SetName(3, "Anna", LocalizerKeyOf("Anna"));
+}
+
+void Remove(CProviderDatabase& provider)
+{
+    provider.Remove(2);
+}
+
+void Renew(CProviderDatabase& provider)
+{
+    provider.Execute("update contacts set has_phone_number=1 where _id=4");
+}
+
+void ChangeMuch(CProviderDatabase& provider)
+{
+    Insert(provider);
+    Rename(provider);
+    Remove(provider);
+    Renew(provider);
+}
+
+void ChangeStatus(CProviderDatabase& provider)
+{
+    provider.Execute("update status_updates set status_update_data_id=1002 where "
+                     "status_update_data_id=1001");
+}
+
+void Tell(CLocalizerLogic& logic, std::initializer_list<long long> ids)
 {
     long long allIds[8] = {};
     std::copy(ids.begin(), ids.end(), allIds);
     logic.OnContactsTableChanged(static_cast<int>(ids.size()), allIds);
-    return 0;
 }
 
-void InsertRenameAndRemove(CProviderDatabase& provider)
+void Search(CLocalizerLogic& logic, tag_Answer& answer, const wchar_t* szTyped,
+            IME_SEARCH_TYPE eType, int iFilter = 0, tag_LocalizerResult* pLast = nullptr)
 {
-    provider.Put(Contact(6, "明7"));
-    Rename(provider, 3, "Anna");
-    provider.Remove(2);
-    provider.Execute("update contacts set has_phone_number=1 where _id=4");
+    wchar_t szInput[16] = {};
+    std::wcscpy(szInput, szTyped);
+    QVLong32 lId = 3;
+    CFilterChain* pChain = nullptr;
+    answer.iRet = logic.CreateFilterChain(&iFilter, &lId, iFilter == 0 ? 0 : 1, &pChain);
+    if (answer.iRet == 0)
+    {
+        answer.iRet = logic.Search(pLast, szInput, eType, pChain, 0, &answer.pResult, &answer.lMask,
+                                   answer.szText);
+    }
+    delete pChain;
 }
 
-bool IsNone(const tag_ContactReg& reg)
+void SearchWithin(CLocalizerLogic& logic, tag_Answer& answer)
 {
-    return reg == tag_ContactReg{};
+    tag_LocalizerDetail allDetails[2] = {};
+    allDetails[0].szLocalizerKey[0] = allDetails[1].szLocalizerKey[1] = LOC_ALPHA_BASE + 3;
+    tag_LocalizerResult last = {2, allDetails};
+    Search(logic, answer, L"d", IME_SEARCH_WORD, 0, &last);
+}
+
+void Convert(CLocalizerLogic& logic, tag_Answer& answer)
+{
+    wchar_t szName[] = L"张 Tom 7";
+    answer.iRet = logic.GetLocalizer(szName, answer.szText);
+}
+
+void ConvertBatch(CLocalizerLogic& logic, tag_Answer& answer)
+{
+    tag_ContactsStruct record = {};
+    std::wcscpy(record.szName, L"李Lee");
+    tag_ContactsInfo info = {1, &record};
+    answer.iRet = logic.GetLocalizerBatch(&info);
+    std::copy_n(record.szLocalizerKey, CONTACT_MAX_KEY, answer.szText);
+}
+
+void Pick(CLocalizerLogic& logic, tag_Answer& answer)
+{
+    wchar_t szInput[16] = L"zhang";
+    wchar_t szWord[] = L"张";
+    answer.iRet = logic.GetLocalizerString(szInput, 5, szWord, answer.szText);
+}
+
+void ConvertByMapping(CLocalizerLogic& logic, tag_Answer& answer)
+{
+    const long hMap = logic.CreatePinYinFileMapping();
+    wchar_t szName[] = L"重庆";
+    answer.iRet = hMap == -1 ? -1 : logic.GetLocalizerString(hMap, szName, answer.szText);
+    logic.ReleasePinYinFileMapping(hMap);
 }
 
 // Without what a patch or a failed read of the status leaves to the next status notification.
@@ -73,69 +144,74 @@ std::string Difference(const tag_StoreImage& store, const tag_StoreImage& fresh)
 
 } // namespace
 
-const std::vector<tag_Change>& AllChanges()
+const std::vector<tag_Operation>& AllChanges()
 {
-    static const auto fnNothing = [](CProviderDatabase&) {};
-    static const std::vector<tag_Change> vChanges = {
-        {"FirstBuild", fnNothing, [](CLocalizerLogic& logic) { return logic.MemInit(false); }},
-        {"Build", InsertRenameAndRemove,
-         [](CLocalizerLogic& logic) { return logic.MemInit(true); }},
-        {"Rebuild", InsertRenameAndRemove,
-         [](CLocalizerLogic& logic)
-         {
-             logic.OnContactsTableChanged();
-             return 0;
-         }},
-        {"Insert", [](CProviderDatabase& provider) { provider.Put(Contact(6, "明7")); },
-         [](CLocalizerLogic& logic) { return TellOf(logic, {6}); }},
-        {"Rename", [](CProviderDatabase& provider) { Rename(provider, 3, "Anna"); },
-         [](CLocalizerLogic& logic) { return TellOf(logic, {3}); }},
-        {"Remove", [](CProviderDatabase& provider) { provider.Remove(2); },
-         [](CLocalizerLogic& logic) { return TellOf(logic, {2}); }},
-        {"Renew",
-         [](CProviderDatabase& provider)
-         { provider.Execute("update contacts set has_phone_number=1 where _id=4"); },
-         [](CLocalizerLogic& logic) { return TellOf(logic, {4}); }},
-        {"Many", InsertRenameAndRemove,
-         [](CLocalizerLogic& logic) {
-             return TellOf(logic, {6, 3, 2, 4, 777});
-         }},
-        {"Status",
-         [](CProviderDatabase& provider)
-         {
-             provider.Execute("update status_updates set status_update_data_id=1002 where "
-                              "status_update_data_id=1001");
+    static const std::vector<tag_Operation> vChanges = {
+        {"FirstBuild", [](auto& logic, auto& answer) { answer.iRet = logic.MemInit(false); }},
+        {"Build", [](auto& logic, auto& answer) { answer.iRet = logic.MemInit(true); }, ChangeMuch},
+        {"Rebuild", [](auto& logic, auto&) { logic.OnContactsTableChanged(); }, ChangeMuch},
+        {"Insert", [](auto& logic, auto&) { Tell(logic, {6}); }, Insert},
+        {"Rename", [](auto& logic, auto&) { Tell(logic, {3}); }, Rename},
+        {"Remove", [](auto& logic, auto&) { Tell(logic, {2}); }, Remove},
+        {"Renew", [](auto& logic, auto&) { Tell(logic, {4}); }, Renew},
+        {"Many",
+         [](auto& logic, auto&) {
+             Tell(logic, {6, 3, 2, 4, 777});
          },
-         [](CLocalizerLogic& logic)
-         {
-             logic.OnStatusUpdatesTableChanged(0, nullptr);
-             return 0;
-         }},
-        {"Time", [](CProviderDatabase& provider) { provider.SetLastTime(3, FIRST_TIME + 60'000); },
-         [](CLocalizerLogic& logic)
-         {
-             logic.OnContactTimeChanged(3, FIRST_TIME + 60'000);
-             return 0;
-         }},
-        {"Star", [](CProviderDatabase& provider) { provider.SetStarred(4, true); },
-         [](CLocalizerLogic& logic)
-         {
-             logic.OnContactStarChanged(4, 1);
-             return 0;
-         }},
-        {"SortType", fnNothing,
-         [](CLocalizerLogic& logic)
-         {
-             logic.SetSortType(logic.OnGetSortType() == 0 ? 1 : 0);
-             return 0;
-         }},
+         ChangeMuch},
+        {"Status", [](auto& logic, auto&) { logic.OnStatusUpdatesTableChanged(0, nullptr); },
+         ChangeStatus},
+        {"Time", [](auto& logic, auto&) { logic.OnContactTimeChanged(3, FIRST_TIME + 60'000); },
+         [](auto& provider) { provider.SetLastTime(3, FIRST_TIME + 60'000); }},
+        {"Star", [](auto& logic, auto&) { logic.OnContactStarChanged(4, 1); },
+         [](auto& provider) { provider.SetStarred(4, true); }},
+        {"SortType",
+         [](auto& logic, auto&) { logic.SetSortType(logic.OnGetSortType() == 0 ? 1 : 0); }},
     };
     return vChanges;
 }
 
-CStoreCase::CStoreCase(const tag_Change& change, int iSortType)
-    : m_change(change), m_bBuilt(std::string("FirstBuild") != change.szName),
-      m_iSortType(m_bBuilt ? iSortType : STORE_ORDER_NAME)
+const std::vector<tag_Operation>& AllReadings()
+{
+    static const std::vector<tag_Operation> vReadings = {
+        {"Everybody",
+         [](auto& logic, auto& answer) { Search(logic, answer, L"", IME_SEARCH_WORD); }},
+        {"Letters",
+         [](auto& logic, auto& answer) { Search(logic, answer, L"za", IME_SEARCH_WORD); }},
+        {"Digits", [](auto& logic, auto& answer)
+         { Search(logic, answer, L"9", IME_SEARCH_NUM, FILTER_GROUP_EXPAND); }},
+        {"LoggingFilter", [](auto& logic, auto& answer)
+         { Search(logic, answer, L"", IME_SEARCH_NUM, FILTER_CONTACT_ID_EXPAND); }},
+        {"Special",
+         [](auto& logic, auto& answer) { Search(logic, answer, L"z", IME_SEARCH_SPECIAL); }},
+        {"Narrowed", SearchWithin},
+        {"Keys", Convert},
+        {"KeyBatch", ConvertBatch},
+        {"Picked", Pick},
+        {"Mapping", ConvertByMapping},
+        {"Start", [](auto& logic, auto& answer) { answer.iRet = logic.MemInit(false); }},
+    };
+    return vReadings;
+}
+
+std::string TextOf(CLocalizerLogic& logic, const tag_Answer& answer)
+{
+    std::string strText = std::to_string(answer.iRet);
+    if (answer.pResult == nullptr)
+    {
+        return answer.iRet == 0 ? strText + Narrow(answer.szText) : strText;
+    }
+    for (int i = 0; i < answer.pResult->iResultNum; ++i)
+    {
+        strText += " " + std::to_string(answer.pResult->pDetail[i].iContactID);
+    }
+    const bool bNobody = answer.pResult->iResultNum == 0;
+    logic.FreeSearchResult(answer.pResult);
+    return bNobody ? "0 nobody" : strText + " keys " + std::to_string(answer.lMask);
+}
+
+CStoreCase::CStoreCase(const tag_Operation& change, int iSortType)
+    : m_strChange(change.szName), m_iSortType(Is("FirstBuild") ? STORE_ORDER_NAME : iSortType)
 {
     m_directory.InstallPinyinTable();
     CProviderDatabase provider;
@@ -147,7 +223,7 @@ CStoreCase::CStoreCase(const tag_Change& change, int iSortType)
         provider.Put(Contact(++iId, szName));
     }
     m_before = FreshBuild(m_directory.Root(), iSortType);
-    change.fnChange(provider);
+    change.pfnChange(provider);
     for (const int iType : {0, 1})
     {
         m_aAfter[iType] = FreshBuild(m_directory.Root(), iType);
@@ -159,11 +235,9 @@ CStoreCase::CStoreCase(const tag_Change& change, int iSortType)
             m_mapTexts.insert({record.iContactID, {record.szName, record.szLocalizerKey}});
         }
     }
-    if (m_bBuilt)
+    if (Is("FirstBuild"))
     {
-        m_strReg.assign(reinterpret_cast<const char*>(&m_before.reg), sizeof(m_before.reg));
-        m_strRecords = BytesOf(m_before.vRecords);
-        m_uLength = static_cast<size_t>(m_before.reg.iMemSize) * sizeof(tag_ContactsStruct);
+        m_before = {};
     }
 }
 
@@ -182,11 +256,15 @@ void CStoreCase::Write(const std::string& strReg, const std::string& strRecords,
 
 void CStoreCase::Restore() const
 {
-    Write(m_strReg, m_strRecords, m_uLength);
-    if (!m_bBuilt)
+    if (Is("FirstBuild"))
     {
+        Write("", "", 0);
         fs::remove(CDataPaths::PinyinMapping());
+        return;
     }
+    Write({reinterpret_cast<const char*>(&m_before.reg), sizeof(m_before.reg)},
+          BytesOf(m_before.vRecords),
+          static_cast<size_t>(m_before.reg.iMemSize) * sizeof(tag_ContactsStruct));
 }
 
 tag_StoreImage CStoreCase::Present()
@@ -196,14 +274,14 @@ tag_StoreImage CStoreCase::Present()
     return bBuilt ? ReadStore() : tag_StoreImage{};
 }
 
-STORE_KIND CStoreCase::KindOf(const tag_StoreImage& image, std::string* pstrWhy) const
+STORE_KIND CStoreCase::KindOf(tag_StoreImage image, std::string* pstrWhy) const
 {
-    if (IsNone(image.reg))
+    if (image.reg == tag_ContactReg{})
     {
         return KIND_NONE;
     }
-    const int iSortType = image.reg.iSortType;
-    if (iSortType != m_iSortType && std::string("SortType") != m_change.szName)
+    const tag_StoreImage& after = After(image.reg.iSortType);
+    if (image.reg.iSortType != m_iSortType && !Is("SortType"))
     {
         *pstrWhy = "sort type lost";
         return KIND_WRONG;
@@ -212,25 +290,27 @@ STORE_KIND CStoreCase::KindOf(const tag_StoreImage& image, std::string* pstrWhy)
     {
         for (const tag_ContactsStruct& record : image.vRecords)
         {
-            *pstrWhy = MixedContact(record.iContactID, record.szName, record.szLocalizerKey);
-            if (!pstrWhy->empty())
-            {
-                return KIND_WRONG;
-            }
+            *pstrWhy += MixedContact(record.iContactID, record.szName, record.szLocalizerKey);
         }
-        return KIND_MARKED;
+        return pstrWhy->empty() ? KIND_MARKED : KIND_WRONG;
     }
-    *pstrWhy = Difference(image, After(iSortType));
-    if (pstrWhy->empty())
+    if (Difference(image, after).empty())
     {
         return KIND_AFTER;
     }
-    if (m_bBuilt && Difference(image, m_before).empty())
+    if (Difference(image, m_before).empty())
     {
         return KIND_BEFORE;
     }
-    *pstrWhy = "looks whole: " + *pstrWhy;
-    return KIND_WRONG;
+    // In name order a time and its count change one after the other in a store that stays whole.
+    for (size_t i = 0; Is("Time") && i < std::min(image.vRecords.size(), after.vRecords.size());
+         ++i)
+    {
+        image.vRecords[i].llLastTimeContacted = after.vRecords[i].llLastTimeContacted;
+        image.vRecords[i].iTimesContacted = after.vRecords[i].iTimesContacted;
+    }
+    *pstrWhy = Difference(image, after);
+    return pstrWhy->empty() ? KIND_AFTER : KIND_WRONG;
 }
 
 std::string CStoreCase::MixedContact(int iContactID, const wchar_t* szName,
@@ -250,7 +330,7 @@ std::string CStoreCase::MixedContact(int iContactID, const wchar_t* szName,
 std::string CStoreCase::RepairFault() const
 {
     const tag_StoreImage store = Present();
-    if (IsMarked(store.reg) || IsNone(store.reg))
+    if (IsMarked(store.reg) || store.reg == tag_ContactReg{})
     {
         return "not repaired";
     }

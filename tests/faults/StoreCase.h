@@ -1,29 +1,48 @@
 #ifndef QV_TESTS_FAULTS_STORECASE_H
 #define QV_TESTS_FAULTS_STORECASE_H
 
+#include "Core/LocalizerCodes.h"
 #include "Core/LocalizerLogic.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/ProviderDatabase.h"
 #include "tests/Support/StoreImage.h"
 
-#include <functional>
 #include <map>
 #include <ostream>
 #include <string>
 #include <vector>
 
-// One small change of the provider's database and how the library is told of it.
-struct tag_Change
+// What an operation hands out. Nothing in here allocates.
+struct tag_Answer
+{
+    int iRet = 0; // also of one that reports nothing
+    tag_LocalizerResult* pResult = nullptr;
+    long lMask = 0;
+    wchar_t szText[64] = {};
+};
+
+// An operation of the facade and, where it tells of one, the change of the database before it.
+struct tag_Operation
 {
     const char* szName;
-    std::function<void(CProviderDatabase&)> fnChange;
-    std::function<int(CLocalizerLogic&)> fnTell; // 0 where it reports nothing
+    void (*pfnRun)(CLocalizerLogic& logic, tag_Answer& answer);
+    void (*pfnChange)(CProviderDatabase& provider) = [](CProviderDatabase&) {};
 };
-const std::vector<tag_Change>& AllChanges();
-inline std::ostream& operator<<(std::ostream& stream, const tag_Change& change)
+const std::vector<tag_Operation>& AllChanges();
+const std::vector<tag_Operation>& AllReadings(); // which leave the store alone; everybody first
+inline std::ostream& operator<<(std::ostream& stream, const tag_Operation& operation)
 {
-    return stream << change.szName;
+    return stream << operation.szName;
 }
+
+// Whether it is a result code of the facade's.
+inline bool IsResult(int iRet)
+{
+    return iRet == 0 || iRet == -1 || iRet == LOC_ERR_MAP;
+}
+
+// The whole of an answer, whose set is released; "0 nobody" for a search that finds nobody.
+std::string TextOf(CLocalizerLogic& logic, const tag_Answer& answer);
 
 // What the two files of a store are.
 enum STORE_KIND
@@ -40,11 +59,9 @@ enum STORE_KIND
 class CStoreCase
 {
 public:
-    CStoreCase(const tag_Change& change, int iSortType);
+    CStoreCase(const tag_Operation& change, int iSortType);
 
-    const tag_Change& Change() const { return m_change; }
-    int SortType() const { return m_iSortType; }
-    const tag_StoreImage& Before() const { return m_before; }
+    bool Is(const char* szChange) const { return m_strChange == szChange; }
     const tag_StoreImage& After(int iSortType) const { return m_aAfter[iSortType == 1 ? 1 : 0]; }
     // The files as they were before the library was told.
     void Restore() const;
@@ -53,21 +70,17 @@ public:
     // The store as it is now; empty when there is none.
     static tag_StoreImage Present();
     // The kind of a state. What only the next status notification brings may be missing.
-    STORE_KIND KindOf(const tag_StoreImage& image, std::string* pstrWhy) const;
+    STORE_KIND KindOf(tag_StoreImage image, std::string* pstrWhy) const;
     // What a marked store must not hold: a contact's id beside a name or key that it never had.
     std::string MixedContact(int iContactID, const wchar_t* szName, const wchar_t* szKey) const;
     // Empty when the store is now what a build from the changed database makes.
     std::string RepairFault() const;
 
 private:
-    tag_Change m_change;
-    bool m_bBuilt; // there is a store before the change
+    std::string m_strChange;
     int m_iSortType;
     CDataDirectory m_directory;
-    std::string m_strReg;
-    std::string m_strRecords; // those in use
-    size_t m_uLength = 0;     // of the records file
-    tag_StoreImage m_before;
+    tag_StoreImage m_before; // empty where there is no store before the change
     tag_StoreImage m_aAfter[2];
     std::multimap<int, std::pair<std::wstring, std::wstring>> m_mapTexts; // names and keys by id
 };

@@ -1,7 +1,7 @@
 #include "tests/faults/StoreStepper.h"
 
 #include "Common/DataPaths.h"
-#include "tests/Support/DataDirectory.h"
+#include "tests/Support/StoreFiles.h"
 
 #include <algorithm>
 #include <csignal>
@@ -125,48 +125,32 @@ CStoreStepper::~CStoreStepper()
     std::signal(SIGTRAP, SIG_DFL);
 }
 
-void CStoreStepper::Mapped(void* pAddr, size_t uSize, int iProt, int iFlags, const char* szFile)
+void CStoreStepper::Happens(MAP_EVENT eEvent, const tag_Mapping& mapping)
 {
-    const bool bReg = std::strcmp(szFile, REG_FILE) == 0;
-    const bool bWritten = iFlags == MAP_SHARED && (iProt & PROT_WRITE) != 0;
-    if ((!bReg && std::strcmp(szFile, RECORDS_FILE) != 0) || (bReg && !bWritten))
+    const bool bReg = std::strcmp(mapping.szFile, REG_FILE) == 0;
+    const bool bRecords = std::strcmp(mapping.szFile, RECORDS_FILE) == 0;
+    if (bRecords || (bReg && mapping.bWritten && eEvent == MAP_MADE && !m_bSetsSortType))
+    {
+        RequireLock(mapping.szFile);
+    }
+    if (!CAN_STEP || !mapping.bWritten || (!bReg && !bRecords))
     {
         return;
     }
-    if (!bReg || !m_bSetsSortType)
+    tag_Region& region = g_aRegions[bReg ? 1 : 0];
+    if (eEvent == MAP_ENDS)
     {
-        RequireLock(szFile);
-    }
-    if (!bWritten || !CAN_STEP)
-    {
+        region.uSize = region.pAddr == mapping.pAddr ? 0 : region.uSize;
         return;
     }
-    const std::string strBytes =
-        CDataDirectory::ReadBytes(bReg ? CDataPaths::ContactReg() : CDataPaths::ContactRecords());
     tag_Step& step = g_pSteps->aSteps[g_pSteps->uSteps++];
-    step = {STEP_LENGTH, bReg, 0, static_cast<uint32_t>(strBytes.size()), {}};
-    g_aRegions[bReg ? 1 : 0] = {static_cast<char*>(pAddr), (uSize + PAGE - 1) / PAGE * PAGE};
-    mprotect(pAddr, uSize, PROT_READ);
-}
-
-void CStoreStepper::Flushed(const char* szFile)
-{
-    const bool bReg = std::strcmp(szFile, REG_FILE) == 0;
-    if (CAN_STEP && (bReg || std::strcmp(szFile, RECORDS_FILE) == 0))
+    step = {eEvent == MAP_MADE ? STEP_LENGTH : STEP_FLUSH, bReg, 0, 0, {}};
+    if (eEvent == MAP_MADE)
     {
-        g_pSteps->aSteps[g_pSteps->uSteps++] = {STEP_FLUSH, bReg, 0, 0, {}};
-    }
-}
-
-void CStoreStepper::Unmapping(void* pAddr, const char* szFile)
-{
-    if (std::strcmp(szFile, RECORDS_FILE) == 0)
-    {
-        RequireLock("the end of records");
-    }
-    for (tag_Region& region : g_aRegions)
-    {
-        region.uSize = region.pAddr == pAddr ? 0 : region.uSize;
+        step.uOffset = static_cast<uint32_t>(
+            (bReg ? CDataDirectory::ReadBytes(CDataPaths::ContactReg()) : RecordsFile()).size());
+        region = {static_cast<char*>(mapping.pAddr), (mapping.uSize + PAGE - 1) / PAGE * PAGE};
+        mprotect(mapping.pAddr, mapping.uSize, PROT_READ);
     }
 }
 

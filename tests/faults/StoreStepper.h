@@ -50,9 +50,7 @@ public:
 
     const std::string& Fault() const { return m_strFault; }
 
-    void Mapped(void* pAddr, size_t uSize, int iProt, int iFlags, const char* szFile) override;
-    void Flushed(const char* szFile) override;
-    void Unmapping(void* pAddr, const char* szFile) override;
+    void Happens(MAP_EVENT eEvent, const tag_Mapping& mapping) override;
 
 private:
     void RequireLock(const char* szWhat);

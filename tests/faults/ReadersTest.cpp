@@ -1,17 +1,12 @@
 // Four processes search while one changes the contacts. Which names a contact can have follows
 // from its id, so every entry tells by itself whether it is right.
 
-#include "Common/DataPaths.h"
-#include "Core/LocalizerLogic.h"
 #include "Filter/FilterChain.h"
-#include "LocalizerImpl/QVLocalizerManager.h"
 #include "Platform/LogSink.h"
 #include "tests/Support/ChildProcess.h"
-#include "tests/Support/DataDirectory.h"
-#include "tests/Support/ProviderDatabase.h"
-#include "tests/Support/StoreImage.h"
 #include "tests/Support/WideText.h"
 #include "tests/faults/Options.h"
+#include "tests/faults/StoreCase.h"
 
 #include <atomic>
 #include <chrono>
@@ -19,14 +14,14 @@
 #include <gtest/gtest.h>
 #include <memory>
 #include <random>
+#include <set>
 #include <unistd.h>
 
 namespace
 {
 
-constexpr int CONTACTS = 2000; // those with even ids never change
-constexpr int FORMS = 3;       // of a contact's name, far apart in name order
-constexpr int READERS = 4;
+constexpr int CONTACTS = 2000;           // those with even ids never change
+constexpr int FORMS = 3;                 // of a contact's name, far apart in name order
 constexpr unsigned int MAX_PAUSE = 8000; // microseconds between two searches
 constexpr unsigned int GRACE = 60;       // seconds that a reader may take longer
 constexpr long long FIRST_TIME = 1'600'000'000'000;
@@ -54,50 +49,48 @@ protected:
     CReaders()
     {
         m_directory.InstallPinyinTable();
-        CQVLocalizerManager::InitMapFile();
+        CLocalizerLogic().MemInit(true);
         std::vector<tag_ProviderContact> vContacts;
         for (int iId = 1; iId <= CONTACTS; ++iId)
         {
             for (int iForm = 0; iForm < FORMS; ++iForm)
             {
                 m_vKeys.push_back(LocalizerKeyOf(NameOf(iId, iForm)));
-                m_vWideKeys.push_back(Wide(m_vKeys.back()));
             }
             tag_ProviderContact contact;
             contact.iId = contact.iStatusId = iId;
             contact.strName = NameOf(iId, iId % FORMS);
-            contact.strKey = KeyOf(iId, iId % FORMS);
+            contact.strKey = *(Keys(iId) + iId % FORMS);
             contact.llLastTime = FIRST_TIME + iId * 7919LL % CONTACTS;
             vContacts.push_back(contact);
         }
         CProviderDatabase().PutAll(vContacts);
     }
 
-    const std::string& KeyOf(int iId, int iForm) const
+    // The keys of the forms of a contact's name.
+    const std::string* Keys(int iId) const
     {
-        return m_vKeys[static_cast<size_t>((iId - 1) * FORMS + iForm)];
+        return m_vKeys.data() + static_cast<ptrdiff_t>(iId - 1) * FORMS;
     }
 
     // What is wrong with a search's result; nothing in most cases.
     std::string FaultOf(const tag_LocalizerResult& result, bool bEverybody) const
     {
-        std::vector<bool> vSeen(CONTACTS + 1);
+        std::set<int> setSeen;
         int iUnchanged = 0;
         for (int i = 0; i < result.iResultNum; ++i)
         {
-            const tag_LocalizerDetail& entry = result.pDetail[i];
-            const int iId = entry.iContactID;
-            if (iId < 1 || iId > CONTACTS || vSeen[static_cast<size_t>(iId)])
+            const int iId = result.pDetail[i].iContactID;
+            if (iId < 1 || iId > CONTACTS || !setSeen.insert(iId).second)
             {
                 return "contact " + std::to_string(iId) + " unknown or twice";
             }
-            vSeen[static_cast<size_t>(iId)] = true;
-            iUnchanged += iId % 2 == 0 ? 1 : 0;
-            const auto itKeys = m_vWideKeys.begin() + (iId - 1) * FORMS;
-            if (std::find(itKeys, itKeys + FORMS, entry.szLocalizerKey) == itKeys + FORMS)
+            const std::string* pEnd = Keys(iId) + FORMS;
+            if (std::find(Keys(iId), pEnd, Narrow(result.pDetail[i].szLocalizerKey)) == pEnd)
             {
                 return "contact " + std::to_string(iId) + " with another's key";
             }
+            iUnchanged += iId % 2 == 0 ? 1 : 0;
         }
         return bEverybody && iUnchanged != CONTACTS / 2 ? "contacts missing" : "";
     }
@@ -122,16 +115,14 @@ protected:
             const size_t uTyped = random() % std::size(TYPED);
             wchar_t szInput[8] = {};
             std::wcscpy(szInput, TYPED[uTyped]);
-            wchar_t szWords[CN_WORD_MAX + 1] = {};
-            long lMask = 0;
-            tag_LocalizerResult* pResult = nullptr;
-            const int iRet =
-                logic.Search(nullptr, szInput, uTyped < 5 ? IME_SEARCH_WORD : IME_SEARCH_NUM,
-                             &everybody, 0, &pResult, &lMask, szWords);
-            strFault = iRet != 0 ? "result " + std::to_string(iRet)
-                                 : FaultOf(*pResult, *TYPED[uTyped] == 0 && !bRefused);
-            m_board->iFound += pResult == nullptr ? 0 : pResult->iResultNum;
-            logic.FreeSearchResult(pResult);
+            tag_Answer answer;
+            const IME_SEARCH_TYPE eType = uTyped < 5 ? IME_SEARCH_WORD : IME_SEARCH_NUM;
+            answer.iRet = logic.Search(nullptr, szInput, eType, &everybody, 0, &answer.pResult,
+                                       &answer.lMask, answer.szText);
+            strFault = answer.iRet != 0 ? "result " + std::to_string(answer.iRet)
+                                        : FaultOf(*answer.pResult, *szInput == 0 && !bRefused);
+            m_board->iFound += answer.pResult == nullptr ? 0 : answer.pResult->iResultNum;
+            logic.FreeSearchResult(answer.pResult);
             ++m_board->iSearches;
             usleep(static_cast<useconds_t>(random() % MAX_PAUSE));
         }
@@ -143,71 +134,59 @@ protected:
     {
         const auto Odd = [&random] { return 1 + 2 * static_cast<int>(random() % (CONTACTS / 2)); };
         const int iId = Odd();
-        switch (random() % 8)
+        const auto uKind = random() % 32;
+        if (uKind < 4)
         {
-        case 0:
             m_llNow += 1000;
             provider.SetLastTime(iId, m_llNow);
             logic.OnContactTimeChanged(iId, m_llNow);
-            return;
-        case 1:
-            provider.SetStarred(iId, true);
-            logic.OnContactStarChanged(iId, 1);
-            return;
-        case 2:
-            provider.SetOnline(iId, random() % 2 == 0);
-            logic.OnStatusUpdatesTableChanged(0, nullptr);
-            return;
-        case 3:
-            if (random() % 8 == 0)
-            {
-                logic.SetSortType(1 - logic.OnGetSortType());
-                logic.OnContactsTableChanged();
-            }
-            return;
-        default:
-            break;
         }
-        long long allIds[5];
-        provider.Execute("begin");
-        for (long long& llId : allIds)
+        else if (uKind == 4)
         {
-            const int iChanged = Odd();
-            llId = iChanged;
-            const int iForm = static_cast<int>(random() % FORMS);
-            provider.SetName(iChanged, NameOf(iChanged, iForm), KeyOf(iChanged, iForm));
-            provider.SetVisible(iChanged, random() % 3 != 0);
+            logic.SetSortType(1 - logic.OnGetSortType());
+            logic.OnContactsTableChanged();
         }
-        provider.Execute("commit");
-        logic.OnContactsTableChanged(5, allIds);
+        else
+        {
+            long long allIds[5];
+            provider.Execute("begin");
+            for (long long& llId : allIds)
+            {
+                const int iChanged = Odd();
+                const auto iForm = static_cast<int>(random() % FORMS);
+                provider.SetName(iChanged, NameOf(iChanged, iForm), Keys(iChanged)[iForm]);
+                provider.SetVisible(iChanged, random() % 3 != 0);
+                llId = iChanged;
+            }
+            provider.Execute("commit");
+            logic.OnContactsTableChanged(5, allIds);
+        }
     }
 
     CDataDirectory m_directory;
     CShared<tag_Board> m_board{};
     std::vector<std::string> m_vKeys;
-    std::vector<std::wstring> m_vWideKeys;
     long long m_llNow = FIRST_TIME + 10'000'000;
 };
 
 TEST_F(CReaders, NeverSeeAnotherContact)
 {
     ASSERT_EQ(CLocalizerLogic().MemInit(true), 0);
-    const unsigned int uSeed = g_options.uSeed;
     std::vector<std::unique_ptr<CChild>> vReaders;
-    for (unsigned int i = 0; i < READERS; ++i)
+    for (unsigned int i = 0; i < 4; ++i)
     {
-        vReaders.push_back(std::make_unique<CChild>([this, uSeed, i]
-                                                    { return ReadUntilStopped(uSeed * 10 + i); },
-                                                    g_options.uSeconds + GRACE));
+        vReaders.push_back(std::make_unique<CChild>(
+            [this, i] { return ReadUntilStopped(g_options.uSeed * 10 + i); },
+            g_options.uSeconds + GRACE));
     }
     int iChanges = 0;
     {
         CProviderDatabase provider;
         CLocalizerLogic logic;
-        std::mt19937 random(uSeed);
+        std::mt19937 random(g_options.uSeed);
         const auto end =
             std::chrono::steady_clock::now() + std::chrono::seconds(g_options.uSeconds);
-        for (; std::chrono::steady_clock::now() < end || m_board->iSearches < READERS; ++iChanges)
+        for (; std::chrono::steady_clock::now() < end || m_board->iSearches < 4; ++iChanges)
         {
             ChangeOnce(provider, logic, random);
         }

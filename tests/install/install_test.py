@@ -1,40 +1,83 @@
 """Installs the build into a temporary prefix and uses it as others would: every installed header
-alone, and the C++ program of docs/embedding.md built with CMake and with pkg-config.
+alone, and the programs of docs/embedding.md built with CMake and with pkg-config.
 
-install_test.py ARGUMENT..., as installed.py tells
+install_test.py TestClass CMAKE GENERATOR BUILD_DIR SOURCE_DIR COMPILER C_COMPILER
+                [TOOLCHAIN EMULATOR LIBRARIES]
+
+The last three belong to a build for another processor: its toolchain file, the command that runs
+its programs, and where the libraries lie that ours needs.
 """
 import os
 import pathlib
 import re
+import shlex
+import shutil
+import subprocess
 import sys
+import tempfile
 import unittest
 
-from installed import (BUILD, COMPILER, EMULATOR, SOURCE, WARNINGS, InstalledTest, run,
-                       run_built)
-
-STANDARD = "-std=c++17"
+CMAKE, GENERATOR, BUILD, SOURCE, COMPILER, C_COMPILER = sys.argv[2:8]
+TOOLCHAIN, EMULATOR, LIBRARIES = sys.argv[8:] or ("", "", "")
+LINK_SEARCH = [f"-Wl,-rpath-link,{LIBRARIES}"] if LIBRARIES else []
+WARNINGS = ["-Wall", "-Wextra", "-Wpedantic", "-Wshadow", "-Wconversion", "-Wno-psabi"]
+if os.environ.get("QV_WARNINGS_AS_ERRORS") == "1":
+    WARNINGS.append("-Werror")
+LANGUAGES = {  # CMake's name and target, pkg-config's, and the compiler
+    "cpp": ("CXX", "QV_Localize", "QV_Localize", [COMPILER, "-std=c++17"]),
+    "c": ("C", "C", "qvlocalize", [C_COMPILER, "-std=c99", "-pedantic"]),
+}
 CONSUMER = """\
 cmake_minimum_required(VERSION 3.22)
-project(consumer LANGUAGES CXX)
+project(consumer LANGUAGES {name})
 find_package(QV_Localize 1.0 REQUIRED)
-if(NOT EXISTS "${QV_Localize_PYFILE}")
-  message(FATAL_ERROR "no pinyin table at ${QV_Localize_PYFILE}")
+if(NOT EXISTS "${{QV_Localize_PYFILE}}")
+  message(FATAL_ERROR "no pinyin table at ${{QV_Localize_PYFILE}}")
 endif()
-add_executable(consumer main.cpp)
-target_link_libraries(consumer PRIVATE QV_Localize::QV_Localize)
+add_executable(consumer main.{language})
+target_link_libraries(consumer PRIVATE QV_Localize::{target})
 """
 
+
+def run(*command, **options):
+    process = subprocess.run([str(word) for word in command], capture_output=True,
+                             encoding="utf-8", check=False, **options)
+    assert process.returncode == 0, f"{command}\n{process.stdout}{process.stderr}"
+    return process.stdout
+
+
+def run_built(program, *arguments, **options):
+    emulator = shlex.split(EMULATOR)
+    if emulator:
+        emulator += ["-E", f"LD_LIBRARY_PATH={LIBRARIES}"]
+    return run(*emulator, program, *arguments, **options)
+
+
+class InstalledTest(unittest.TestCase):
+    @classmethod
+    def setUpClass(cls):
+        directory = tempfile.TemporaryDirectory(prefix="qv_install_")
+        cls.addClassCleanup(directory.cleanup)
+        cls.root = pathlib.Path(directory.name)
+        cls.prefix = cls.root / "prefix"
+        run(CMAKE, "--install", BUILD, "--prefix", cls.prefix)
+
+    def installed(self, pattern):
+        found = sorted(self.prefix.glob(pattern))
+        self.assertTrue(found, f"nothing installed as {pattern}")
+        return found
 
 class InstallTest(InstalledTest):
     def test_headers_stand_alone(self):
         include = self.prefix / "include/QV_Localize"
-        headers = sorted(path.relative_to(include) for path in include.rglob("*.h"))
+        headers = [path.relative_to(include) for path in include.rglob("*.h")]
         self.assertGreater(len(headers), 30)
-        for header in headers:
-            with self.subTest(header=header):
-                source = self.root / "alone.cpp"
-                source.write_text(f"#include <{header}>\n#include <{header}>\n", encoding="utf-8")
-                run(COMPILER, STANDARD, *WARNINGS, "-fsyntax-only", "-I", include, source)
+        for header, language, place in [*((header, "cpp", include) for header in headers),
+                                        *(("qvlocalize.h", language, include.parent)
+                                          for language in LANGUAGES)]:
+            source = self.root / f"alone.{language}"
+            source.write_text(f"#include <{header}>\n#include <{header}>\nint main(void);\n")
+            run(*LANGUAGES[language][3], *WARNINGS, "-fsyntax-only", "-I", place, source)
 
     def test_no_header_of_the_interface_is_left_out(self):
         include = self.prefix / "include/QV_Localize"
@@ -44,14 +87,6 @@ class InstallTest(InstalledTest):
         self.assertGreater(len(exporting), 30)
         missing = [str(header) for header in exporting if not (include / header).is_file()]
         self.assertEqual([], missing, "to be listed in cmake/QVInstall.cmake")
-
-    def test_program_built_with_cmake(self):
-        program = self.build_with_cmake("cpp", CONSUMER, [])
-        self.check_program(program, self.sample("data_cmake"))
-
-    def test_program_built_with_pkg_config(self):
-        program = self.build_with_pkg_config("cpp", "QV_Localize", COMPILER, [STANDARD])
-        self.check_program(program, self.sample("data_pkg_config"))
 
     def test_manual_page_names_every_command_and_option(self):
         page, = self.installed("share/man/man1/qvlocalize.1")
@@ -94,5 +129,70 @@ class InstallTest(InstalledTest):
             self.assertEqual(pathlib.Path(SOURCE, name).read_bytes(), installed.read_bytes())
 
 
+class EmbeddingTest(InstalledTest):
+    def source(self, language, name):
+        """The program of docs/embedding.md in a directory of its own."""
+        text = pathlib.Path(SOURCE, "docs/embedding.md").read_text(encoding="utf-8")
+        path = pathlib.Path(tempfile.mkdtemp(dir=self.root), name)
+        path.write_text(re.search(rf"```{language}\n(.*?)```", text, re.DOTALL).group(1),
+                        encoding="utf-8")
+        return path
+
+    def check(self, run_program, *command, **options):
+        """The program finds what is in a sample made by the installed tool."""
+        data = pathlib.Path(tempfile.mkdtemp(dir=self.root))
+        run_built(*self.installed("bin/qvlocalize"), "sample", "--data-dir", data)
+        table, = self.installed("share/QV_Localize/pyfile.bin")
+        self.assertEqual(table.read_bytes(), (data / "files/pyfile.bin").read_bytes())
+        output = run_program(*command, data, **options)
+        totals = [int(total) for total in re.findall(r": (\d+) matches", output)]
+        self.assertEqual(2, len(totals), output)
+        self.assertGreater(totals[0], totals[1])
+        self.assertGreater(totals[1], 0)
+        self.assertEqual(6, output.count("  contact "), output)
+
+    def test_programs_built_with_cmake(self):
+        for language, (name, target, _, (_, *standard)) in LANGUAGES.items():
+            project = self.source(language, f"main.{language}").parent
+            (project / "CMakeLists.txt").write_text(
+                CONSUMER.format(name=name, language=language, target=target))
+            flags = " ".join(standard + WARNINGS + LINK_SEARCH)
+            package = self.installed("**/QV_LocalizeConfig.cmake")[0].parent
+            run(CMAKE, "-G", GENERATOR, "-S", project, "-B", project / "build",
+                f"-DCMAKE_C_COMPILER={C_COMPILER}", f"-DCMAKE_CXX_COMPILER={COMPILER}",
+                f"-DCMAKE_{name}_FLAGS={flags}", f"-DQV_Localize_DIR={package}",
+                "--no-warn-unused-cli", *[f"-DCMAKE_TOOLCHAIN_FILE={TOOLCHAIN}"] * bool(TOOLCHAIN))
+            run(CMAKE, "--build", project / "build")
+            self.check(run_built, project / "build/consumer")
+
+    def test_programs_built_with_pkg_config(self):
+        environment = {**os.environ, "PKG_CONFIG_PATH": str(self.installed("**/pkgconfig")[0])}
+        for language, (_, _, package, compiler) in LANGUAGES.items():
+            table = run("pkg-config", "--variable=pyfile", package, env=environment).strip()
+            self.assertTrue(pathlib.Path(table).is_file(), table)
+            found = run("pkg-config", "--cflags", "--libs", package, env=environment).split()
+            source = self.source(language, f"main.{language}")
+            library, = self.installed(f"lib*/**/lib{package}.so")
+            run(*compiler, *WARNINGS, source, "-o", source.parent / "program", *found,
+                f"-Wl,-rpath,{library.parent}", *LINK_SEARCH)
+            self.check(run_built, source.parent / "program")
+
+    @unittest.skipIf(EMULATOR, "the interpreter loads this machine's libraries alone")
+    def test_python_program(self):
+        module, = self.installed("**/qvlocalize.py")
+        self.check(run, sys.executable, "-B", self.source("python", "program.py"),
+                   env={"PYTHONPATH": str(module.parent), "LC_ALL": "C.UTF-8"})
+
+    def test_java_program(self):
+        jars = sorted(self.prefix.glob("share/java/qvlocalize.jar"))
+        if not jars or shutil.which("javac") is None:
+            self.skipTest("there is no JDK")
+        library, = self.installed("lib*/**/libqvlocalize_jni.so")
+        source = self.source("java", "Program.java")
+        run("javac", "-Xlint:all", "-Werror", "-cp", jars[0], source)
+        self.check(run, "java", "-Xcheck:jni", f"-Djava.library.path={library.parent}", "-cp",
+                   f"{jars[0]}:{source.parent}", "Program")
+
+
 if __name__ == "__main__":
-    unittest.main(argv=sys.argv[:1], verbosity=2)
+    unittest.main(argv=sys.argv[:2], verbosity=2)

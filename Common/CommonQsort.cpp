@@ -3,8 +3,8 @@
 #include "Common/NameOrder.h"
 #include "Common/SearchSteps.h"
 #include "Common/SortSteps.h"
-#include "Core/ContactRecords.h"
-#include "Core/LocalizerCodes.h"
+#include "Core/Records/ContactRecords.h"
+#include "Core/Records/LocalizerCodes.h"
 
 #include <algorithm>
 #include <cstddef>

@@ -1,7 +1,7 @@
 #include "Common/NameOrder.h"
 
 #include "Common/WideString.h"
-#include "Core/LocalizerCodes.h"
+#include "Core/Records/LocalizerCodes.h"
 
 namespace
 {

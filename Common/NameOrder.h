@@ -1,7 +1,7 @@
 #ifndef QV_COMMON_NAMEORDER_H
 #define QV_COMMON_NAMEORDER_H
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 // The name order of contact records: names by code units of their pinyin keys, with
 // - a name that begins with a Latin letter before one that begins with a Chinese character when

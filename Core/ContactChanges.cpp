@@ -4,14 +4,14 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
+#include "Common/Stopwatch.h"
 #include "Core/LocalizerLogic.h"
-#include "Core/Stopwatch.h"
-#include "Core/StorePatch.h"
 #include "DBOperator/DBOperator.h"
-#include "DBOperator/IdList.h"
+#include "DBOperator/SqlIdList.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "MemManager/HeldStore.h"
 #include "MemManager/MemManger.h"
+#include "MemManager/StorePatch.h"
 #include "MemManager/StoreRegister.h"
 
 #include <algorithm>
@@ -48,7 +48,7 @@ private:
 // longer one would read another contact.
 bool CanListWhole(int iRecordNum, const long long* pIds)
 {
-    if (!CIdList::CanListAll(iRecordNum, pIds))
+    if (!CSqlIdList::CanListAll(iRecordNum, pIds))
     {
         return false;
     }

@@ -2,8 +2,7 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
-#include "Core/ResultOwner.h"
-#include "Core/Stopwatch.h"
+#include "Common/Stopwatch.h"
 #include "DBOperator/DBOperator.h"
 #include "DBOperator/DBOperatorFactory.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
@@ -317,7 +316,7 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
 // The set to search when the caller gives none, less what the search rules out; a failure leaves
 // it empty or null.
 void CLocalizerLogic::CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain,
-                                 CCandidateTest& test, CResultOwner& copy)
+                                 CCandidateFilter& test, CResultOwner& copy)
 {
     const CStopwatch watch;
     if (eSearchType == IME_SEARCH_SPECIAL)

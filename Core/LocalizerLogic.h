@@ -2,10 +2,10 @@
 #define QV_CORE_LOCALIZERLOGIC_H
 
 #include "Common/Export.h"
-#include "Core/ContactRecords.h"
-#include "Core/SearchRecords.h"
+#include "Core/Records/ContactRecords.h"
+#include "Core/Records/SearchRecords.h"
 
-class CCandidateTest;
+class CCandidateFilter;
 class CDBOperator;
 class CFilterChain;
 class CMemManger;
@@ -33,7 +33,7 @@ extern "C"
 //
 // Results: 0, or -1 for a null argument, a refused lock, a file that cannot be mapped, a database
 // that cannot be read or a lack of memory; LOC_ERR_MAP and LOC_ERR_PARAM of
-// Core/LocalizerCodes.h from the pinyin operations and the search itself.
+// Core/Records/LocalizerCodes.h from the pinyin operations and the search itself.
 class QV_EXPORT CLocalizerLogic
 {
 public:
@@ -137,7 +137,7 @@ private:
     QV_INTERNAL static int SortConverted(tag_ContactsInfo& record, int iSortType);
     QV_INTERNAL static int WriteSorted(tag_ContactsInfo& record, int iSortType);
     QV_INTERNAL void CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain,
-                                CCandidateTest& test, CResultOwner& copy);
+                                CCandidateFilter& test, CResultOwner& copy);
     QV_INTERNAL int RebuildStore(tag_ContactsInfo& record);
     QV_INTERNAL bool HasRoomForAll(int& iDatabaseCount);
     QV_INTERNAL bool PatchStore(int iDatabaseCount, int iRecordNum, long long* pIds,

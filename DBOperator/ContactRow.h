@@ -4,7 +4,7 @@
 // From the columns of a row to the fields of a record. The record was zero-filled; flag bits are
 // ORed into it. Columns may hold NULL or any type.
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 class CSqlStatement;
 

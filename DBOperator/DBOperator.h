@@ -2,7 +2,7 @@
 #define QV_DBOPERATOR_DBOPERATOR_H
 
 #include "Common/Export.h"
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 // Where the contacts come from. Every operation returns 0, or -1 for any failure, and opens its
 // connection when it has none. The order of the virtual operations is part of the interface.
@@ -17,7 +17,7 @@ public:
 
     // Reads the visible contacts into a new array: those among the lCount ids of pIds when lCount
     // is 1 to 200, all of them, without a look at pIds, for any other lCount. Ids whose text grows
-    // too long are cut off the end of the list; CIdList::CanListAll tells beforehand. RecordNum
+    // too long are cut off the end of the list; CSqlIdList::CanListAll tells beforehand. RecordNum
     // and pContacts are overwritten, not released. Once an array was made it stays in pRecord,
     // also when the result is -1, and the caller releases it with array delete. No visible contact
     // is a success with RecordNum 0 and pContacts untouched. -1 for a null pRecord, and for a null

@@ -3,7 +3,7 @@
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
 #include "DBOperator/ContactRow.h"
-#include "DBOperator/IdList.h"
+#include "DBOperator/SqlIdList.h"
 #include "DBOperator/SqlStatement.h"
 #include "DBOperator/StatusIndex.h"
 
@@ -37,7 +37,7 @@ constexpr char AND_ID[] = " and _id ";
 constexpr char WHERE_CONTACT_ID[] = " where contact_id ";
 
 constexpr size_t LIST_STATEMENT_SIZE =
-    sizeof(SELECT_CONTACTS) + sizeof(AND_ID) + CIdList::TEXT_SIZE;
+    sizeof(SELECT_CONTACTS) + sizeof(AND_ID) + CSqlIdList::TEXT_SIZE;
 static_assert(sizeof(SELECT_LOCALIZER) + sizeof(WHERE_CONTACT_ID) <=
                   sizeof(SELECT_CONTACTS) + sizeof(AND_ID),
               "the contacts query is the longest");
@@ -50,7 +50,7 @@ static_assert(sizeof(SELECT_CONTACT_BY_ID) + sizeof("-2147483648") <= ID_STATEME
 class CListStatement
 {
 public:
-    CListStatement(const char* szQuery, const char* szJoin, const CIdList& clIds)
+    CListStatement(const char* szQuery, const char* szJoin, const CSqlIdList& clIds)
     {
         std::snprintf(m_szText, sizeof(m_szText), "%s%s%s", szQuery, clIds.IsEmpty() ? "" : szJoin,
                       clIds.Text());
@@ -260,7 +260,7 @@ int CSQLiteOperator::ReadAllLocalizer(tag_ContactsInfo* pRecord, long lCount, lo
 {
     QV_LOGD(DB_LOG_TAG,
             "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> ReadAllLocalizer begin");
-    if (pRecord == nullptr || (CIdList::IsListed(lCount) && pIds == nullptr))
+    if (pRecord == nullptr || (CSqlIdList::IsListed(lCount) && pIds == nullptr))
     {
         QV_LOGE(DB_LOG_TAG, " QV_Contacts >>QV_ContactsLocalize_SO>>SQLiteOperator>> "
                             "ReadAllLocalizer: the input param is wrong!");
@@ -270,7 +270,7 @@ int CSQLiteOperator::ReadAllLocalizer(tag_ContactsInfo* pRecord, long lCount, lo
     {
         return -1;
     }
-    const CIdList clIds(lCount, pIds);
+    const CSqlIdList clIds(lCount, pIds);
     if (CountContacts(clIds, pRecord) != 0)
     {
         return -1;
@@ -344,7 +344,7 @@ int CSQLiteOperator::EnsureOpen()
 }
 
 // RecordNum becomes the number of contacts that the two record queries are expected to give.
-int CSQLiteOperator::CountContacts(const CIdList& clIds, tag_ContactsInfo* pRecord)
+int CSQLiteOperator::CountContacts(const CSqlIdList& clIds, tag_ContactsInfo* pRecord)
 {
     const CListStatement clSql(SELECT_COUNT, AND_ID, clIds);
     QV_LOGD(DB_LOG_TAG,
@@ -368,7 +368,7 @@ int CSQLiteOperator::CountContacts(const CIdList& clIds, tag_ContactsInfo* pReco
     return 0;
 }
 
-int CSQLiteOperator::ReadContacts(const CIdList& clIds, tag_ContactsInfo* pRecord)
+int CSQLiteOperator::ReadContacts(const CSqlIdList& clIds, tag_ContactsInfo* pRecord)
 {
     const CListStatement clSql(SELECT_CONTACTS, AND_ID, clIds);
     QV_LOGD(DB_LOG_TAG, "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_4 = %s\n",
@@ -387,7 +387,7 @@ int CSQLiteOperator::ReadContacts(const CIdList& clIds, tag_ContactsInfo* pRecor
     return 0;
 }
 
-int CSQLiteOperator::ReadLocalizer(const CIdList& clIds, tag_ContactsInfo* pRecord)
+int CSQLiteOperator::ReadLocalizer(const CSqlIdList& clIds, tag_ContactsInfo* pRecord)
 {
     const CListStatement clSql(SELECT_LOCALIZER, WHERE_CONTACT_ID, clIds);
     QV_LOGD(DB_LOG_TAG, "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_5 = %s\n",

@@ -4,7 +4,7 @@
 #include "DBOperator/DBOperator.h"
 
 struct sqlite3;
-class CIdList;
+class CSqlIdList;
 
 // Reads the provider's database file, CDataPaths::Database(), and never writes to it.
 //
@@ -46,9 +46,9 @@ public:
 
 private:
     QV_INTERNAL int EnsureOpen();
-    QV_INTERNAL int CountContacts(const CIdList& clIds, tag_ContactsInfo* pRecord);
-    QV_INTERNAL int ReadContacts(const CIdList& clIds, tag_ContactsInfo* pRecord);
-    QV_INTERNAL int ReadLocalizer(const CIdList& clIds, tag_ContactsInfo* pRecord);
+    QV_INTERNAL int CountContacts(const CSqlIdList& clIds, tag_ContactsInfo* pRecord);
+    QV_INTERNAL int ReadContacts(const CSqlIdList& clIds, tag_ContactsInfo* pRecord);
+    QV_INTERNAL int ReadLocalizer(const CSqlIdList& clIds, tag_ContactsInfo* pRecord);
     QV_INTERNAL int ReadContactRow(int iContactID, tag_ContactsStruct* pContact, int& iFound);
     QV_INTERNAL int ReadLocalizerRow(int iContactID, tag_ContactsStruct* pContact, int& iFound);
 

@@ -1,7 +1,7 @@
 #ifndef QV_DBOPERATOR_STATUSINDEX_H
 #define QV_DBOPERATOR_STATUSINDEX_H
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 #include <memory>
 

@@ -34,7 +34,7 @@ protected:
 };
 static_assert(sizeof(void*) != 4 || sizeof(CFilter) == 8, "part of the interface");
 
-// Keeps the members of a group; SECRET_GROUP_ID of Core/ContactRecords.h: secret contacts.
+// Keeps the members of a group; SECRET_GROUP_ID of Core/Records/ContactRecords.h: secret contacts.
 class QV_EXPORT CGroupFilter : public CFilter
 {
 public:

@@ -1,7 +1,7 @@
 #ifndef QV_FILTER_FILTERCHAINBUILDER_H
 #define QV_FILTER_FILTERCHAINBUILDER_H
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 class CFilterChain;
 

@@ -2,7 +2,7 @@
 #define QV_FILTER_FILTERPROCESS_H
 
 #include "Common/Export.h"
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 class CFilter;
 class CFilterChain;

@@ -1,7 +1,7 @@
 #ifndef QV_FILTER_IDLIST_H
 #define QV_FILTER_IDLIST_H
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 // The id lists of contact records: iNum elements, ending early at the first 0. A list that a
 // damaged record leaves without a 0 is never read beyond iNum. A null list is empty.

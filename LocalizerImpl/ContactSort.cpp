@@ -11,7 +11,7 @@
 
 #include "Common/NameOrder.h"
 #include "Common/SortSteps.h"
-#include "Core/LocalizerCodes.h"
+#include "Core/Records/LocalizerCodes.h"
 
 #include <cstring>
 #include <memory>

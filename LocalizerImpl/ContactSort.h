@@ -2,7 +2,7 @@
 #define QV_LOCALIZERIMPL_CONTACTSORT_H
 
 #include "Common/CommonQsort.h"
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 // Sorts iCount records in place, by SORT_NAME or SORT_TIME, into exactly the order that
 // Common_Qsort::QuickSort leaves, equal records included: the same steps run on small keys, and

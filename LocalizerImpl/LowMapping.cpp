@@ -1,6 +1,6 @@
 #include "LocalizerImpl/LowMapping.h"
 
-#include "MemManager/StoreFile.h"
+#include "MemManager/Files/StoreFile.h"
 
 #include <fcntl.h>
 #include <sys/mman.h>

@@ -3,7 +3,7 @@
 
 // What both matchers ask of pieces and spellings.
 
-#include "Core/LocalizerCodes.h"
+#include "Core/Records/LocalizerCodes.h"
 #include "LocalizerImpl/PinyinTable.h"
 
 #include <utils/Vector.h>

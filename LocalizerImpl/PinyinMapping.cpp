@@ -8,9 +8,9 @@
 #include "LocalizerImpl/PinyinTable.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "LocalizerImpl/Syllables.h"
-#include "MemManager/MappingGuards.h"
-#include "MemManager/ShareMemory.h"
-#include "MemManager/StoreFile.h"
+#include "MemManager/Files/MappingGuards.h"
+#include "MemManager/Files/ShareMemory.h"
+#include "MemManager/Files/StoreFile.h"
 
 #include <fcntl.h>
 #include <sys/mman.h>

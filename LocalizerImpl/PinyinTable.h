@@ -1,7 +1,7 @@
 #ifndef QV_LOCALIZERIMPL_PINYINTABLE_H
 #define QV_LOCALIZERIMPL_PINYINTABLE_H
 
-#include "Core/LocalizerCodes.h"
+#include "Core/Records/LocalizerCodes.h"
 
 #include <cstring>
 

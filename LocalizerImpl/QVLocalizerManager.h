@@ -2,9 +2,9 @@
 #define QV_LOCALIZERIMPL_QVLOCALIZERMANAGER_H
 
 #include "Common/Export.h"
-#include "Core/ContactRecords.h"
-#include "Core/LocalizerCodes.h"
-#include "Core/SearchRecords.h"
+#include "Core/Records/ContactRecords.h"
+#include "Core/Records/LocalizerCodes.h"
+#include "Core/Records/SearchRecords.h"
 
 #include <utils/Vector.h>
 

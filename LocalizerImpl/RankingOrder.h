@@ -1,7 +1,7 @@
 #ifndef QV_LOCALIZERIMPL_RANKINGORDER_H
 #define QV_LOCALIZERIMPL_RANKINGORDER_H
 
-#include "Core/SearchRecords.h"
+#include "Core/Records/SearchRecords.h"
 
 #include <utils/Vector.h>
 

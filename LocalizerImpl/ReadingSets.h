@@ -10,8 +10,8 @@
 // Chinese one. What asks a table for the readings of a code takes this table and a compact code
 // too.
 
-#include "Common/FileStamp.h"
-#include "Core/LocalizerCodes.h"
+#include "Core/Records/LocalizerCodes.h"
+#include "LocalizerImpl/FileStamp.h"
 
 #include <atomic>
 #include <cstdint>

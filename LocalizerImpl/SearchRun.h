@@ -1,12 +1,12 @@
 #ifndef QV_LOCALIZERIMPL_SEARCHRUN_H
 #define QV_LOCALIZERIMPL_SEARCHRUN_H
 
+#include "Core/Records/CandidateFilter.h"
 #include "LocalizerImpl/PieceTable.h"
 #include "LocalizerImpl/PinyinTable.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "LocalizerImpl/ReadingSets.h"
 #include "LocalizerImpl/RunFinder.h"
-#include "MemManager/CandidateTest.h"
 
 #include <optional>
 
@@ -17,7 +17,7 @@
 //   Begin   the text: length, codes, pinyin table; then MayMatch can sort out candidates
 //   Find    the matches among the candidates, ranked
 //   Finish  the entries, the mask, the candidate characters
-class CSearchRun : public CCandidateTest
+class CSearchRun : public CCandidateFilter
 {
 public:
     // The matcher outlives the run.

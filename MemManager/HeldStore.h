@@ -6,7 +6,7 @@
 // up after five attempts. Whatever keeps a change out of the store marks the store, so that the
 // next notification of contacts or status brings the change in.
 
-#include "MemManager/MappingGuards.h"
+#include "MemManager/Files/MappingGuards.h"
 #include "MemManager/StoreRegister.h"
 
 class CMemManger;

@@ -3,7 +3,7 @@
 
 #include "Common/Log.h"
 #include "Common/SystemTime.h"
-#include "MemManager/MappingGuards.h"
+#include "MemManager/Files/MappingGuards.h"
 
 #include <chrono>
 

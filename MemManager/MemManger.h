@@ -30,9 +30,9 @@
 // from array new; no two sets share an array. The receiver releases a set with FreeSearchResult.
 
 #include "Common/Export.h"
-#include "Core/ContactRecords.h"
-#include "Core/SearchRecords.h"
-#include "MemManager/SingleMutex.h"
+#include "Core/Records/ContactRecords.h"
+#include "Core/Records/SearchRecords.h"
+#include "MemManager/Files/SingleMutex.h"
 
 class CFilterChain;
 

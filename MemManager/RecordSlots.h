@@ -5,7 +5,7 @@
 // whoever looks at the file after this process died finds in each slot one contact, whole, or
 // none. Searches skip slots without a contact while the store is marked.
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 // Stores one record. pRecord may lie in another slot.
 void WriteSlot(tag_ContactsStruct* pSlot, const tag_ContactsStruct* pRecord);

@@ -2,7 +2,7 @@
 #define QV_MEMMANAGER_SPECIALNUMBERS_H
 
 #include "Common/Export.h"
-#include "Core/SearchRecords.h"
+#include "Core/Records/SearchRecords.h"
 
 constexpr int SPECIAL_NUMBER_COUNT = 7; // entries of g_specialNumberRecords
 

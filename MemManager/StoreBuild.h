@@ -1,7 +1,7 @@
 #ifndef QV_MEMMANAGER_STOREBUILD_H
 #define QV_MEMMANAGER_STOREBUILD_H
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 enum BUILD_RESULT
 {

@@ -2,7 +2,7 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
-#include "MemManager/MappingGuards.h"
+#include "MemManager/Files/MappingGuards.h"
 
 #include <algorithm>
 #include <atomic>

@@ -10,7 +10,7 @@
 // A writer that fails or dies in between, and a machine that loses power, leave the mark, and the
 // next notification of contacts or status (or MemInit) rebuilds the index.
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 constexpr int STORE_RECORD_SIZE = static_cast<int>(sizeof(tag_ContactsStruct));
 

@@ -1,9 +1,9 @@
 #include "bench/Floors.h"
 
 #include "Common/DataPaths.h"
-#include "Core/ContactRecords.h"
-#include "Core/SearchRecords.h"
-#include "MemManager/MappingGuards.h"
+#include "Core/Records/ContactRecords.h"
+#include "Core/Records/SearchRecords.h"
+#include "MemManager/Files/MappingGuards.h"
 
 #include <sqlite3.h>
 #include <sys/mman.h>

@@ -1,7 +1,7 @@
 #ifndef QV_BENCH_QUERIES_H
 #define QV_BENCH_QUERIES_H
 
-#include "Core/SearchRecords.h"
+#include "Core/Records/SearchRecords.h"
 
 // One text that a person types key by key.
 struct tag_Query

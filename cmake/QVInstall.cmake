@@ -16,6 +16,9 @@ set(QV_PUBLIC_HEADERS
     Core/LocalizerCodes.h
     Core/LocalizerLogic.h
     Core/SearchRecords.h
+    Core/Records/ContactRecords.h
+    Core/Records/LocalizerCodes.h
+    Core/Records/SearchRecords.h
     DBOperator/DBOperator.h
     DBOperator/DBOperatorFactory.h
     DBOperator/SQLiteOperator.h
@@ -41,7 +44,9 @@ set(QV_PUBLIC_HEADERS
     MemManager/MemManger.h
     MemManager/ShareMemory.h
     MemManager/SingleMutex.h
-    MemManager/SpecialNumbers.h)
+    MemManager/SpecialNumbers.h
+    MemManager/Files/ShareMemory.h
+    MemManager/Files/SingleMutex.h)
 if(QV_PLATFORM_STANDIN)
   list(APPEND QV_PUBLIC_HEADERS Platform/LogSink.h)
 endif()

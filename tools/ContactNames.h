@@ -1,7 +1,7 @@
 #ifndef QV_TOOLS_CONTACTNAMES_H
 #define QV_TOOLS_CONTACTNAMES_H
 
-#include "Core/SearchRecords.h"
+#include "Core/Records/SearchRecords.h"
 
 #include <functional>
 #include <string>

@@ -2,7 +2,7 @@
 #define QV_TOOLS_CONTACTSEARCH_H
 
 #include "Core/LocalizerLogic.h"
-#include "Core/SearchRecords.h"
+#include "Core/Records/SearchRecords.h"
 
 #include <cstdint>
 #include <functional>

@@ -1,8 +1,8 @@
 #include "tools/DataDirectory.h"
 
 #include "Common/DataPaths.h"
-#include "Core/LocalizerCodes.h"
 #include "Core/LocalizerLogic.h"
+#include "Core/Records/LocalizerCodes.h"
 #include "tools/PrintableText.h"
 #include "tools/ToolError.h"
 

@@ -1,7 +1,7 @@
 #include "tools/IndexUpdate.h"
 
-#include "Core/LocalizerCodes.h"
 #include "Core/LocalizerLogic.h"
+#include "Core/Records/LocalizerCodes.h"
 #include "MemManager/MemManger.h"
 #include "tools/DataDirectory.h"
 #include "tools/LibraryLog.h"

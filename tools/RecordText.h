@@ -1,7 +1,7 @@
 #ifndef QV_TOOLS_RECORDTEXT_H
 #define QV_TOOLS_RECORDTEXT_H
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 #include <iosfwd>
 

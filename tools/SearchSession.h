@@ -1,7 +1,7 @@
 #ifndef QV_TOOLS_SEARCHSESSION_H
 #define QV_TOOLS_SEARCHSESSION_H
 
-#include "Core/SearchRecords.h"
+#include "Core/Records/SearchRecords.h"
 #include "tools/ContactNames.h"
 #include "tools/ContactSearch.h"
 

@@ -3,7 +3,7 @@
 
 #include "Common/CommonQsort.h"
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 #include <gtest/gtest.h>
 

@@ -1,8 +1,8 @@
 // Files and times of the system.
 
 #include "Common/FileHelpers.h"
-#include "Common/FileStamp.h"
 #include "Common/SystemTime.h"
+#include "LocalizerImpl/FileStamp.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/WideText.h"
 

@@ -2,8 +2,8 @@
 #define QV_TESTS_CORE_FACADEFIXTURE_H
 
 #include "Common/DataPaths.h"
-#include "Core/LocalizerCodes.h"
 #include "Core/LocalizerLogic.h"
+#include "Core/Records/LocalizerCodes.h"
 #include "Filter/FilterChain.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "tests/Support/DataDirectory.h"

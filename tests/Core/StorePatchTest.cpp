@@ -1,11 +1,11 @@
 // Patches of many records against taking out and putting in one after the other.
 
-#include "Core/StorePatch.h"
+#include "MemManager/StorePatch.h"
 
 #include "Common/CommonQsort.h"
-#include "Core/LocalizerCodes.h"
-#include "Core/SlotPlan.h"
-#include "MemManager/MappingGuards.h"
+#include "Core/Records/LocalizerCodes.h"
+#include "MemManager/Files/MappingGuards.h"
+#include "MemManager/SlotPlan.h"
 #include "MemManager/StoreRegister.h"
 #include "tests/Support/DataDirectory.h"
 

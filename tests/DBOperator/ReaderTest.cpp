@@ -2,8 +2,8 @@
 // that are missing, damaged, locked or changed meanwhile.
 
 #include "Common/DataPaths.h"
-#include "DBOperator/IdList.h"
 #include "DBOperator/SQLiteOperator.h"
+#include "DBOperator/SqlIdList.h"
 #include "DBOperator/StatusIndex.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
@@ -99,7 +99,7 @@ size_t SlotOf(T pfnOperation)
 
 std::string ListText(std::vector<long long> vIds)
 {
-    return CIdList(static_cast<long>(vIds.size()), vIds.data()).Text();
+    return CSqlIdList(static_cast<long>(vIds.size()), vIds.data()).Text();
 }
 
 sqlite3* g_pReaderDB = nullptr;
@@ -171,11 +171,11 @@ TEST(IdTexts, HoldWhatFits)
     std::vector<long long> vIds(163, 1234567890);
     ASSERT_EQ(1796U + 1, ListText(vIds).size());
     vIds.push_back(-2147483648LL);
-    EXPECT_TRUE(CIdList::CanListAll(164, vIds.data()));
+    EXPECT_TRUE(CSqlIdList::CanListAll(164, vIds.data()));
     const std::string strFull = ListText(vIds);
     EXPECT_EQ(1796U + 12 + 1, strFull.size());
     vIds.push_back(1);
-    EXPECT_FALSE(CIdList::CanListAll(165, vIds.data()));
+    EXPECT_FALSE(CSqlIdList::CanListAll(165, vIds.data()));
     EXPECT_EQ(strFull, ListText(vIds));
 }
 

@@ -16,7 +16,7 @@
 #include "Filter/FilterChainBuilder.h"
 #include "Filter/FilterProcessFactory.h"
 #include "Filter/GroupFilterProcess.h"
-#include "Filter/RecordTest.h"
+#include "Filter/RecordRule.h"
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/MemoryFailure.h"
 
@@ -143,12 +143,12 @@ TEST(Filters, KeepTheirContacts)
         const bool bLogs =
             std::any_of(row.vKinds.begin(), row.vKinds.end(),
                         [](int iKind) { return iKind == 9 || iKind == FILTER_ONLINE; });
-        EXPECT_EQ(CRecordTest::CanTest(*chain), !bLogs);
+        EXPECT_EQ(CRecordRule::CanTest(*chain), !bLogs);
         chain->SetFilter(nullptr);
         Ids vKept;
         for (const tag_ContactsStruct& record : MakeRecords())
         {
-            if (CRecordTest(*chain).Keeps(record))
+            if (CRecordRule(*chain).Keeps(record))
             {
                 vKept.push_back(record.iContactID);
             }

@@ -2,7 +2,7 @@
 
 #include "Filter/Filter.h"
 #include "Filter/FilterChain.h"
-#include "MemManager/CandidateEntries.h"
+#include "MemManager/ContactSelection.h"
 #include "MemManager/MemManger.h"
 #include "MemManager/StoreRegister.h"
 #include "tests/Support/ChildProcess.h"
@@ -237,9 +237,9 @@ TEST_F(Store, MakesEntriesOfItsRecords)
         const std::unique_ptr<CFilterChain> chain(pChain);
         Records vCopy = vRecords;
         Details vEntries(30);
-        const int iKept = CCandidateEntries::Select(vCopy.data(), 30, false, *pChain, nullptr,
-                                                    vEntries.data())
-                              .iKept;
+        const int iKept =
+            CCandidateEntries::Select(vCopy.data(), 30, false, *pChain, nullptr, vEntries.data())
+                .iKept;
         tag_ContactsInfo copy = {30, vCopy.data()};
         const Set set = Own(new tag_LocalizerResult());
         CCandidateEntries::NarrowCopy(&copy, *pChain, set.get());

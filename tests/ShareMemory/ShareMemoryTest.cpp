@@ -1,4 +1,4 @@
-#include "MemManager/ShareMemory.h"
+#include "MemManager/Files/ShareMemory.h"
 
 #include "tests/Support/ChildProcess.h"
 #include "tests/Support/DataDirectory.h"

@@ -1,4 +1,4 @@
-#include "MemManager/SingleMutex.h"
+#include "MemManager/Files/SingleMutex.h"
 
 #include "Common/DataPaths.h"
 #include "MemManager/LockAttempts.h"

@@ -4,7 +4,7 @@
 // The two files of the store of the library's present root, as bytes.
 
 #include "Common/DataPaths.h"
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 #include "tests/Support/DataDirectory.h"
 
 #include <algorithm>

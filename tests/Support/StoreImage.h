@@ -1,7 +1,7 @@
 #ifndef QV_TESTS_SUPPORT_STOREIMAGE_H
 #define QV_TESTS_SUPPORT_STOREIMAGE_H
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 #include <string>
 #include <vector>

@@ -13,7 +13,7 @@ import tempfile
 import unittest
 
 ROOT = pathlib.Path(__file__).resolve().parents[2]
-sys.path.insert(0, str(ROOT / "tools" / "data"))
+sys.path.insert(0, str(ROOT / "data" / "derive"))
 # pylint: disable=wrong-import-position
 import derive_folding
 import derive_pinyin

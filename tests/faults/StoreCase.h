@@ -1,8 +1,8 @@
 #ifndef QV_TESTS_FAULTS_STORECASE_H
 #define QV_TESTS_FAULTS_STORECASE_H
 
-#include "Core/LocalizerCodes.h"
 #include "Core/LocalizerLogic.h"
+#include "Core/Records/LocalizerCodes.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/ProviderDatabase.h"
 #include "tests/Support/StoreImage.h"

@@ -1,17 +1,17 @@
-#ifndef QV_FILTER_RECORDTEST_H
-#define QV_FILTER_RECORDTEST_H
+#ifndef QV_FILTER_RECORDRULE_H
+#define QV_FILTER_RECORDRULE_H
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 class CFilterChain;
 
 // Decides on one record at a time what the pipeline of filter processes decides on a set, with
 // the processes' own rules; nothing is copied or allocated, so records can be tested where they
 // lie in a mapped file, damaged ones too. The chain must outlive the object.
-class CRecordTest
+class CRecordRule
 {
 public:
-    explicit CRecordTest(CFilterChain& chain) : m_chain(chain) {}
+    explicit CRecordRule(CFilterChain& chain) : m_chain(chain) {}
 
     // Whether the object can take the pipeline's place for this chain. False when a filter's
     // process writes log lines (FILTER_ACCOUNT_EXPAND, FILTER_ONLINE), which come in another

@@ -148,7 +148,7 @@ def make_folding(path: pathlib.Path) -> bytes:
     lookup = cpp_numbers(folded_characters(rows))
     source = "\n".join(
         [
-            "// Made from data/folding.tsv by tools/data/make_tables.py; edit that table instead.",
+            "// Made from data/folding.tsv by data/derive/make_tables.py; edit that table instead.",
             "",
             '#include "LocalizerImpl/FoldingLookup.h"',
             '#include "LocalizerImpl/NameFolding.h"',

@@ -1,9 +1,9 @@
-#include "DBOperator/IdList.h"
+#include "DBOperator/SqlIdList.h"
 
 #include <cstdint>
 #include <cstdio>
 
-CIdList::CIdList(long lCount, const long long* pIds) : m_szText{}, m_iLength(0), m_lWritten(0)
+CSqlIdList::CSqlIdList(long lCount, const long long* pIds) : m_szText{}, m_iLength(0), m_lWritten(0)
 {
     if (!IsListed(lCount) || pIds == nullptr)
     {
@@ -17,12 +17,12 @@ CIdList::CIdList(long lCount, const long long* pIds) : m_szText{}, m_iLength(0),
     m_szText[m_iLength] = ')';
 }
 
-bool CIdList::CanListAll(long lCount, const long long* pIds)
+bool CSqlIdList::CanListAll(long lCount, const long long* pIds)
 {
-    return IsListed(lCount) && CIdList(lCount, pIds).m_lWritten == lCount;
+    return IsListed(lCount) && CSqlIdList(lCount, pIds).m_lWritten == lCount;
 }
 
-void CIdList::Append(const char* szBefore, long long llId)
+void CSqlIdList::Append(const char* szBefore, long long llId)
 {
     const int iId = static_cast<int32_t>(static_cast<uint32_t>(llId));
     m_iLength += static_cast<size_t>(

@@ -1,10 +1,10 @@
-#ifndef QV_DBOPERATOR_IDLIST_H
-#define QV_DBOPERATOR_IDLIST_H
+#ifndef QV_DBOPERATOR_SQLIDLIST_H
+#define QV_DBOPERATOR_SQLIDLIST_H
 
 #include <cstddef>
 
 // The ids that a query is limited to, as the text " in(1,2,3)".
-class CIdList
+class CSqlIdList
 {
 public:
     static constexpr long MAX_IDS = 200;
@@ -15,7 +15,7 @@ public:
 
     // The list of the lCount ids of pIds, each in the decimal form of its low 32 bits; without
     // the ids that find no place, and empty (no limit) unless lCount is 1 to MAX_IDS.
-    CIdList(long lCount, const long long* pIds);
+    CSqlIdList(long lCount, const long long* pIds);
 
     // Whether the count asks for a list at all.
     static bool IsListed(long lCount) { return lCount >= 1 && lCount <= MAX_IDS; }

@@ -21,7 +21,7 @@ from typing import Dict, List
 
 import unihan
 
-DATA = pathlib.Path(__file__).resolve().parents[2] / "data"
+DATA = pathlib.Path(__file__).resolve().parents[1]
 DECISIONS = DATA / "folding_decisions.tsv"
 FOLDING = DATA / "folding.tsv"
 
@@ -40,7 +40,7 @@ MOVED_BEFORE = "觉"
 
 HEAD = """\
 # The folding table: traditional character, simplified character, one row per line from row 0 on.
-# Made by tools/data/derive_folding.py; folding.md tells from what and how.
+# Made by data/derive/derive_folding.py; folding.md tells from what and how.
 """
 
 Fields = Dict[str, Dict[str, str]]

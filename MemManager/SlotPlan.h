@@ -1,8 +1,8 @@
-#ifndef QV_CORE_SLOTPLAN_H
-#define QV_CORE_SLOTPLAN_H
+#ifndef QV_MEMMANAGER_SLOTPLAN_H
+#define QV_MEMMANAGER_SLOTPLAN_H
 
 #include "Common/CommonQsort.h"
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 // Where stored records go when some leave and others join them, found out before any is moved:
 // each then moves once, however many leave and join. Everything is as if one after the other had

@@ -15,7 +15,7 @@ from typing import Callable, Dict, Iterable, List, Sequence, Set, Tuple
 import unihan
 from syllables import SYLLABLES
 
-DATA_DIR = pathlib.Path(__file__).resolve().parents[2] / "data"
+DATA_DIR = pathlib.Path(__file__).resolve().parents[1]
 PINYIN = DATA_DIR / "pinyin.tsv"
 RECORD_COUNT = 15422
 MAX_READINGS = 3
@@ -267,7 +267,7 @@ def derive() -> str:
     fields = unihan.load("Readings", "OtherMappings", "DictionaryLikeData", "DictionaryIndices", "IRGSources", "Variants")
     rules = ReadingRules(fields, ReadingSources(fields, SYLLABLES))
     chars = CharacterChoice(fields, lambda char: bool(rules.readings(char))).characters()
-    head = "# Written by tools/data/derive_pinyin.py: a character and its readings in slot order.\n"
+    head = "# Written by data/derive/derive_pinyin.py: a character and its readings in slot order.\n"
     return head + "".join(f"{char}\t{' '.join(rules.readings(char))}\n" for char in chars)
 
 

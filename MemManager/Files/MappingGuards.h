@@ -1,11 +1,11 @@
-#ifndef QV_MEMMANAGER_MAPPINGGUARDS_H
-#define QV_MEMMANAGER_MAPPINGGUARDS_H
+#ifndef QV_MEMMANAGER_FILES_MAPPINGGUARDS_H
+#define QV_MEMMANAGER_FILES_MAPPINGGUARDS_H
 
 // Scope guards over the mapping calls and the store lock: what a guard opened or took it closes
 // or releases when it goes out of scope, unless that was done earlier.
 
-#include "MemManager/ShareMemory.h"
-#include "MemManager/SingleMutex.h"
+#include "MemManager/Files/ShareMemory.h"
+#include "MemManager/Files/SingleMutex.h"
 
 #include <sys/mman.h>
 

@@ -1,4 +1,4 @@
-#include "Common/FileStamp.h"
+#include "LocalizerImpl/FileStamp.h"
 
 #include <sys/stat.h>
 

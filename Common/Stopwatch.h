@@ -1,5 +1,5 @@
-#ifndef QV_CORE_STOPWATCH_H
-#define QV_CORE_STOPWATCH_H
+#ifndef QV_COMMON_STOPWATCH_H
+#define QV_COMMON_STOPWATCH_H
 
 #include "Common/SystemTime.h"
 

@@ -1,9 +1,9 @@
-#ifndef QV_CORE_STOREPATCH_H
-#define QV_CORE_STOREPATCH_H
+#ifndef QV_MEMMANAGER_STOREPATCH_H
+#define QV_MEMMANAGER_STOREPATCH_H
 
 // Changes to stored records where they lie, under the store lock that the caller holds.
 
-#include "Core/ContactRecords.h"
+#include "Core/Records/ContactRecords.h"
 
 #include <cstdint>
 

@@ -1,7 +1,7 @@
-#include "MemManager/ShareMemory.h"
+#include "MemManager/Files/ShareMemory.h"
 
 #include "Common/Log.h"
-#include "MemManager/StoreFile.h"
+#include "MemManager/Files/StoreFile.h"
 
 #include <algorithm>
 #include <cerrno>

@@ -1,4 +1,4 @@
-#include "Core/SlotPlan.h"
+#include "MemManager/SlotPlan.h"
 
 #include "Common/SearchSteps.h"
 #include "MemManager/RecordSlots.h"

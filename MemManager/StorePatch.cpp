@@ -1,8 +1,8 @@
-#include "Core/StorePatch.h"
+#include "MemManager/StorePatch.h"
 
 #include "Common/Log.h"
-#include "Core/SlotPlan.h"
 #include "MemManager/RecordSlots.h"
+#include "MemManager/SlotPlan.h"
 
 #include <algorithm>
 #include <cwchar>

@@ -1,4 +1,4 @@
-#include "MemManager/StoreFile.h"
+#include "MemManager/Files/StoreFile.h"
 
 #include <cerrno>
 #include <fcntl.h>

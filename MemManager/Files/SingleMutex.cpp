@@ -1,8 +1,8 @@
-#include "MemManager/SingleMutex.h"
+#include "MemManager/Files/SingleMutex.h"
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
-#include "MemManager/StoreFile.h"
+#include "MemManager/Files/StoreFile.h"
 
 #include <cerrno>
 #include <fcntl.h>

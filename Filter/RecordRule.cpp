@@ -1,4 +1,4 @@
-#include "Filter/RecordTest.h"
+#include "Filter/RecordRule.h"
 
 #include "Filter/AccountExpandFilterProcess.h"
 #include "Filter/AccountFilterProcess.h"
@@ -52,7 +52,7 @@ bool WritesLogLines(int iKind)
 
 } // namespace
 
-bool CRecordTest::CanTest(CFilterChain& chain)
+bool CRecordRule::CanTest(CFilterChain& chain)
 {
     for (int k = 0; k < chain.GetFilterNum(); ++k)
     {
@@ -66,7 +66,7 @@ bool CRecordTest::CanTest(CFilterChain& chain)
     return true;
 }
 
-bool CRecordTest::Keeps(const tag_ContactsStruct& record) const
+bool CRecordRule::Keeps(const tag_ContactsStruct& record) const
 {
     for (int k = 0; k < m_chain.GetFilterNum(); ++k)
     {

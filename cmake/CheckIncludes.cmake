@@ -1,0 +1,21 @@
+cmake_minimum_required(VERSION 3.22)
+
+# Fails when a source of FOLDER includes a header of a folder that is not in the list ALLOWED, in
+# whose folders a subfolder counts as part; writes STAMP otherwise.
+file(GLOB files RELATIVE ${CMAKE_CURRENT_SOURCE_DIR} ${FOLDER}/*.h ${FOLDER}/*.cpp)
+set(wrong "")
+foreach(file ${files})
+  file(STRINGS ${file} lines REGEX "^#include \"")
+  foreach(line ${lines})
+    string(REGEX REPLACE "^#include \"([^\"]*)\".*" "\\1" header "${line}")
+    get_filename_component(folder ${header} DIRECTORY)
+    if(NOT folder IN_LIST ALLOWED AND NOT folder MATCHES "^${FOLDER}/")
+      string(APPEND wrong "\n  ${file} includes ${header}")
+    endif()
+  endforeach()
+endforeach()
+if(wrong)
+  list(JOIN ALLOWED ", " allowed)
+  message(FATAL_ERROR "${FOLDER}/ may include headers of ${allowed} alone:${wrong}")
+endif()
+file(WRITE ${STAMP} "")

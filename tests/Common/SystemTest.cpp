@@ -2,7 +2,6 @@
 
 #include "Common/FileHelpers.h"
 #include "Common/SystemTime.h"
-#include "LocalizerImpl/FileStamp.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/WideText.h"
 
@@ -12,7 +11,6 @@
 #include <chrono>
 #include <csignal>
 #include <cstring>
-#include <ctime>
 #include <filesystem>
 #include <iterator>
 #include <string>
@@ -82,49 +80,6 @@ TEST_F(Files, HaveNamesThatAShellWouldMakeSomethingElseOf)
     wchar_t szPath[5000] = {};
     EXPECT_EQ(0, GetModuleFileName(nullptr, szPath, 4096));
     EXPECT_EQ(Wide(fs::read_symlink("/proc/self/exe").string()), szPath) << "linked into the test";
-}
-
-// A file that was written just now could change once more without a trace, whatever its own time
-// has been set to.
-TEST_F(Files, AreSettledOnceBothTheirTimesArePast)
-{
-    Make("file");
-    const auto fnSetTime = [](time_t seconds)
-    {
-        const timeval times[] = {{seconds, 0}, {seconds, 0}};
-        EXPECT_EQ(utimes("file", times), 0);
-    };
-    time_t start = 0;
-    tag_FileStamp stamp = {};
-    do // until nothing held the test up
-    {
-        start = std::time(nullptr);
-        fnSetTime(start - 1000);
-        stamp = ReadFileStamp("file");
-    } while (std::time(nullptr) - start > 1);
-    EXPECT_FALSE(stamp.bSettled);
-    EXPECT_EQ(stamp.llModified, start - 1000);
-    fnSetTime(start + 1000);
-    EXPECT_FALSE(ReadFileStamp("file").bSettled);
-    EXPECT_TRUE(ReadFileStamp("/usr/lib").bSettled);
-    EXPECT_FALSE(ReadFileStamp("no file").bSettled);
-    using FnChange = void (*)(tag_FileStamp&);
-    const FnChange OTHERS[] = {
-        [](tag_FileStamp& other) { ++other.uDevice; },
-        [](tag_FileStamp& other) { ++other.uInode; },
-        [](tag_FileStamp& other) { ++other.llSize; },
-        [](tag_FileStamp& other) { ++other.llModified; },
-        [](tag_FileStamp& other) { ++other.llChanged; },
-        [](tag_FileStamp& other) { ++other.iModifiedNs; },
-        [](tag_FileStamp& other) { ++other.iChangedNs; },
-    };
-    for (const FnChange fnChange : OTHERS)
-    {
-        tag_FileStamp other = stamp;
-        EXPECT_TRUE(IsSameStamp(stamp, other));
-        fnChange(other);
-        EXPECT_FALSE(IsSameStamp(stamp, other));
-    }
 }
 
 TEST(SystemTime, PointsInTimeHaveTheirCalendarForm)

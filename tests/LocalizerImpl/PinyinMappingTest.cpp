@@ -3,13 +3,16 @@
 #include "tests/LocalizerImpl/LocalizerFixture.h"
 
 #include "Common/DataPaths.h"
+#include "LocalizerImpl/FileStamp.h"
 #include "LocalizerImpl/ReadingSets.h"
 #include "LocalizerImpl/Syllables.h"
 #include "tests/Support/MemoryFailure.h"
 
 #include <sys/stat.h>
+#include <sys/time.h>
 
 #include <algorithm>
+#include <ctime>
 #include <cwchar>
 #include <vector>
 
@@ -87,6 +90,51 @@ TEST(PinyinHandle, IsRefusedUnlessItIsPositive)
         {ERROR_LINE, "QV_Localize", strCall + "the input mapping is -1 "},
         {ERROR_LINE, "QV_Localize", strCall + "the input mapping is wrong!"}};
     EXPECT_EQ(log.Lines(), vExpected);
+}
+
+// A file that was written just now could change once more without a trace, whatever its own time
+// has been set to.
+TEST(FileStamp, IsSettledOnceBothTimesArePast)
+{
+    const CDataDirectory directory;
+    const std::string strFile = directory.File("file");
+    CDataDirectory::WriteBytes(strFile, "file");
+    const auto fnSetTime = [&strFile](time_t seconds)
+    {
+        const timeval times[] = {{seconds, 0}, {seconds, 0}};
+        EXPECT_EQ(utimes(strFile.c_str(), times), 0);
+    };
+    time_t start = 0;
+    tag_FileStamp stamp = {};
+    do // until nothing held the test up
+    {
+        start = std::time(nullptr);
+        fnSetTime(start - 1000);
+        stamp = ReadFileStamp(strFile.c_str());
+    } while (std::time(nullptr) - start > 1);
+    EXPECT_FALSE(stamp.bSettled);
+    EXPECT_EQ(stamp.llModified, start - 1000);
+    fnSetTime(start + 1000);
+    EXPECT_FALSE(ReadFileStamp(strFile.c_str()).bSettled);
+    EXPECT_TRUE(ReadFileStamp("/usr/lib").bSettled);
+    EXPECT_FALSE(ReadFileStamp("no file").bSettled);
+    using FnChange = void (*)(tag_FileStamp&);
+    const FnChange OTHERS[] = {
+        [](tag_FileStamp& other) { ++other.uDevice; },
+        [](tag_FileStamp& other) { ++other.uInode; },
+        [](tag_FileStamp& other) { ++other.llSize; },
+        [](tag_FileStamp& other) { ++other.llModified; },
+        [](tag_FileStamp& other) { ++other.llChanged; },
+        [](tag_FileStamp& other) { ++other.iModifiedNs; },
+        [](tag_FileStamp& other) { ++other.iChangedNs; },
+    };
+    for (const FnChange fnChange : OTHERS)
+    {
+        tag_FileStamp other = stamp;
+        EXPECT_TRUE(IsSameStamp(stamp, other));
+        fnChange(other);
+        EXPECT_FALSE(IsSameStamp(stamp, other));
+    }
 }
 
 // Sets that were read from a file which could still change without a trace are not kept.

@@ -4,7 +4,6 @@
 
 #include <csignal>
 #include <cstdio>
-#include <cstdlib>
 #include <fcntl.h>
 #include <gtest/gtest.h>
 #include <stdexcept>
@@ -15,12 +14,19 @@
 namespace
 {
 
-[[noreturn]] void RunAndLeave(const std::function<void()>& fnBody)
+// Forks; each side gets its end of a pipe from the child to this process.
+pid_t ForkWithPipe(int* piPipe)
 {
-    fnBody();
-    const bool bFailed = testing::Test::HasFailure();
+    int piEnds[2];
     (void)std::fflush(nullptr);
-    _exit(bFailed ? 1 : 0);
+    const pid_t iPid = pipe(piEnds) == 0 ? fork() : -1;
+    if (iPid < 0)
+    {
+        throw std::runtime_error("no child process");
+    }
+    *piPipe = piEnds[iPid == 0 ? 1 : 0];
+    close(piEnds[iPid == 0 ? 0 : 1]);
+    return iPid;
 }
 
 std::string TextOf(const std::function<std::string()>& fnBody)
@@ -35,71 +41,45 @@ std::string TextOf(const std::function<std::string()>& fnBody)
     }
 }
 
-int WaitFor(pid_t iPid)
+void KillChild(pid_t* piPid)
 {
-    int iStatus = 0;
-    if (iPid < 0 || waitpid(iPid, &iStatus, 0) != iPid)
+    if (*piPid > 0)
     {
-        throw std::runtime_error("no child process");
+        kill(*piPid, SIGKILL);
+        waitpid(*piPid, nullptr, 0);
+        *piPid = -1;
     }
-    return iStatus;
 }
 
 } // namespace
 
 bool RunInChild(const std::function<void()>& fnBody)
 {
-    (void)std::fflush(nullptr);
-    const pid_t iPid = fork();
-    if (iPid == 0)
+    const auto fnTell = [&fnBody]
     {
-        RunAndLeave(fnBody);
-    }
-    const int iStatus = WaitFor(iPid);
-    return WIFEXITED(iStatus) && WEXITSTATUS(iStatus) == 0;
-}
-
-int StatusOfChild(const std::function<void()>& fnBody)
-{
-    (void)std::fflush(nullptr);
-    const pid_t iPid = fork();
-    if (iPid == 0)
-    {
-        const int iNull = open("/dev/null", O_WRONLY);
-        dup2(iNull, STDOUT_FILENO);
-        dup2(iNull, STDERR_FILENO);
-        RunAndLeave(fnBody);
-    }
-    return WaitFor(iPid);
+        fnBody();
+        (void)std::fflush(nullptr);
+        return std::string(testing::Test::HasFailure() ? "failed" : "");
+    };
+    return CChild(fnTell, 0).Text().empty();
 }
 
 CChild::CChild(const std::function<std::string()>& fnBody, unsigned int uSeconds)
+    : m_iPid(ForkWithPipe(&m_iPipe))
 {
-    int piPipe[2];
-    if (pipe(piPipe) != 0)
-    {
-        throw std::runtime_error("no pipe");
-    }
-    m_iPid = fork();
     if (m_iPid == 0)
     {
         alarm(uSeconds);
         const std::string strText = TextOf(fnBody);
-        (void)!write(piPipe[1], strText.data(), strText.size());
+        (void)!write(m_iPipe, strText.data(), strText.size());
         _exit(0);
     }
-    close(piPipe[1]);
-    m_iPipe = piPipe[0];
 }
 
 CChild::~CChild()
 {
     close(m_iPipe);
-    if (m_iPid > 0)
-    {
-        kill(m_iPid, SIGKILL);
-        waitpid(m_iPid, nullptr, 0);
-    }
+    KillChild(&m_iPid);
 }
 
 std::string CChild::Text()
@@ -111,7 +91,8 @@ std::string CChild::Text()
         iRead = read(m_iPipe, szBuffer, sizeof(szBuffer));
         strText.append(szBuffer, static_cast<size_t>(iRead > 0 ? iRead : 0));
     }
-    const int iStatus = WaitFor(m_iPid);
+    int iStatus = 0;
+    waitpid(m_iPid, &iStatus, 0);
     m_iPid = -1;
     if (WIFSIGNALED(iStatus))
     {
@@ -122,27 +103,22 @@ std::string CChild::Text()
 
 CLockHolder::CLockHolder()
 {
-    int piPipe[2];
-    if (pipe(piPipe) != 0)
-    {
-        throw std::runtime_error("no pipe");
-    }
-    m_iPid = fork();
+    int iPipe = -1;
+    m_iPid = ForkWithPipe(&iPipe);
     if (m_iPid == 0)
     {
         // Taken without the code under test, as any other program would.
         const int iFd = open(CDataPaths::LockFile(), O_RDWR | O_CREAT, 0777);
         const char cHeld = flock(iFd, LOCK_EX | LOCK_NB) == 0 ? 1 : 0;
-        (void)!write(piPipe[1], &cHeld, 1);
+        (void)!write(iPipe, &cHeld, 1);
         for (;;)
         {
             pause();
         }
     }
     char cHeld = 0;
-    const bool bTold = read(piPipe[0], &cHeld, 1) == 1;
-    close(piPipe[0]);
-    close(piPipe[1]);
+    const bool bTold = read(iPipe, &cHeld, 1) == 1;
+    close(iPipe);
     if (!bTold || cHeld == 0)
     {
         Kill();
@@ -157,10 +133,5 @@ CLockHolder::~CLockHolder()
 
 void CLockHolder::Kill()
 {
-    if (m_iPid > 0)
-    {
-        kill(m_iPid, SIGKILL);
-        waitpid(m_iPid, nullptr, 0);
-        m_iPid = -1;
-    }
+    KillChild(&m_iPid);
 }

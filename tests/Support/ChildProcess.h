@@ -10,15 +10,12 @@
 // expectations in it held; what failed is printed by the child.
 bool RunInChild(const std::function<void()>& fnBody);
 
-// The same without expectations: the child's status as waitpid tells it; its output is dropped.
-int StatusOfChild(const std::function<void()>& fnBody);
-
 // A forked child that runs the body. No database may be open when it starts: SQLite does not
 // outlive a fork.
 class CChild
 {
 public:
-    // An alarm ends a child that hangs for so many seconds.
+    // An alarm ends a child that hangs for so many seconds; 0: it may hang.
     explicit CChild(const std::function<std::string()>& fnBody, unsigned int uSeconds);
     // Kills a child whose text was not waited for.
     ~CChild();
@@ -29,8 +26,8 @@ public:
     std::string Text();
 
 private:
+    int m_iPipe = -1;
     pid_t m_iPid;
-    int m_iPipe;
 };
 
 // Memory, zero at first, that this process has in common with children started later.

@@ -1,10 +1,10 @@
 #ifndef QV_TESTS_SUPPORT_PROVIDERDATABASE_H
 #define QV_TESTS_SUPPORT_PROVIDERDATABASE_H
 
+#include "tools/Sqlite.h"
+
 #include <string>
 #include <vector>
-
-struct sqlite3;
 
 // One contact as the provider keeps it. What is not set is what most contacts have.
 struct tag_ProviderContact
@@ -27,16 +27,13 @@ struct tag_ProviderContact
 };
 
 // A provider database in a real file, changed through a connection of its own as the provider
-// would. Any error of SQLite is a std::runtime_error.
+// would. Any error of SQLite is thrown.
 class CProviderDatabase
 {
 public:
     // Makes the file (CDataPaths::Database() when no path is given) with its empty tables; an
     // existing database is opened and its tables kept.
     explicit CProviderDatabase(const std::string& strPath = std::string());
-    ~CProviderDatabase();
-    CProviderDatabase(const CProviderDatabase&) = delete;
-    CProviderDatabase& operator=(const CProviderDatabase&) = delete;
 
     // Inserts the contact, or replaces all its rows. The status row is set or removed too when
     // iStatusId is not 0.
@@ -57,11 +54,17 @@ public:
     void LockExclusive() { Execute("begin exclusive"); }
     void Unlock() { Execute("commit"); }
 
-    void Execute(const std::string& strSql);
-    sqlite3* Handle() const { return m_pDB; }
+    void Execute(const std::string& strSql) { m_database.Execute(strSql.c_str()); }
+    sqlite3* Handle() const { return m_database.Handle(); }
 
 private:
-    sqlite3* m_pDB;
+    template <typename... Values>
+    void Change(const char* szSql, const Values&... values)
+    {
+        CSqliteStatement(m_database, szSql).Run(values...);
+    }
+
+    CSqliteDatabase m_database;
 };
 
 #endif

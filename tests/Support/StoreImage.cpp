@@ -7,7 +7,6 @@
 #include "tests/Support/StoreFiles.h"
 
 #include <algorithm>
-#include <cstdlib>
 #include <cstring>
 #include <filesystem>
 #include <sstream>
@@ -17,37 +16,6 @@ namespace fs = std::filesystem;
 
 namespace
 {
-
-// A root of its own beside another one, whose database and pinyin table it uses.
-class CSecondRoot
-{
-public:
-    explicit CSecondRoot(const std::string& strRoot) : m_strFirst(strRoot)
-    {
-        std::string strTemplate = (fs::temp_directory_path() / "qv_fresh_XXXXXX").string();
-        if (mkdtemp(strTemplate.data()) == nullptr)
-        {
-            throw std::runtime_error("no temporary directory: " + strTemplate);
-        }
-        m_strRoot = strTemplate;
-        fs::create_directory(m_strRoot + "/files");
-        fs::create_directory_symlink(strRoot + "/databases", m_strRoot + "/databases");
-        fs::create_symlink(strRoot + "/files/pyfile.bin", m_strRoot + "/files/pyfile.bin");
-        CDataPaths::SetRoot(m_strRoot.c_str());
-    }
-    ~CSecondRoot()
-    {
-        CDataPaths::SetRoot(m_strFirst.c_str());
-        std::error_code error;
-        fs::remove_all(m_strRoot, error);
-    }
-    CSecondRoot(const CSecondRoot&) = delete;
-    CSecondRoot& operator=(const CSecondRoot&) = delete;
-
-private:
-    std::string m_strFirst;
-    std::string m_strRoot;
-};
 
 void Build(CLocalizerLogic& logic)
 {
@@ -119,15 +87,23 @@ tag_StoreImage ReadStore()
 
 tag_StoreImage FreshBuild(const std::string& strRoot, int iSortType)
 {
-    const CSecondRoot root(strRoot);
-    CLocalizerLogic logic;
-    Build(logic);
-    if (iSortType != STORE_ORDER_NAME)
+    tag_StoreImage image;
     {
-        logic.SetSortType(iSortType);
+        const CDataDirectory beside;
+        fs::remove(beside.Root() + "/databases");
+        fs::create_directory_symlink(strRoot + "/databases", beside.Root() + "/databases");
+        fs::create_symlink(strRoot + "/files/pyfile.bin", CDataPaths::PinyinSource());
+        CLocalizerLogic logic;
         Build(logic);
+        if (iSortType != STORE_ORDER_NAME)
+        {
+            logic.SetSortType(iSortType);
+            Build(logic);
+        }
+        image = ReadStore();
     }
-    return ReadStore();
+    CDataPaths::SetRoot(strRoot.c_str());
+    return image;
 }
 
 std::string DifferenceOf(const tag_StoreImage& store, const tag_StoreImage& fresh)

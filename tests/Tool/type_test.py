@@ -180,24 +180,6 @@ class ScreenTest(TypeTest):
 
 
 class KeysTest(TypeTest):
-    def test_exactly_the_keys_that_lead_on_are_lit(self):
-        terminal = self.open()
-        for kind, options, keys, texts in (
-                ("abc", [], "abcdefghijklmnopqrstuvwxyz#", ("", "z", "zha", "tom")),
-                ("123", ["--type", "num"], "0123456789", ("", "9", "942", "866"))):
-            for text in texts:
-                terminal.press(*["BSpace"] * 10, *text)
-                lit = {key for key in keys if self.found(text + key, *options)}
-                terminal.wait(lambda screen, start=f"{kind}> {text} ", lit=lit:
-                              screen.startswith(start) and self.lit(screen) == lit, lit)
-            terminal.press("Tab")
-
-    @staticmethod
-    def lit(screen):
-        """The keys of a keypad that lead on, or those of the row of letters."""
-        keys = re.findall(r"\[(.) .{4}\]|((?:[a-z·] ){26}[#·])", screen)
-        return set("".join(map("".join, keys))) - set(" ·")
-
     def test_picking_replaces_all_letters_of_the_character(self):
         table = pathlib.Path(PYFILE).read_bytes()
         words = [table[i:i + 3].decode() for i in range(0, len(table), 46)]

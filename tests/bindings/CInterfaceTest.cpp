@@ -9,6 +9,7 @@
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/ProviderDatabase.h"
 #include "tests/Support/StoreImage.h"
+#include "tools/ContactDatabase.h"
 #include "tools/SampleContacts.h"
 
 #include <algorithm>
@@ -30,11 +31,10 @@ namespace
 
 constexpr int CONTACTS = 400;
 constexpr int64_t NOW = 1700000000000;
-constexpr int32_t FILTER_KINDS[] = {
-    QV_FILTER_GROUP,       QV_FILTER_ACCOUNT, QV_FILTER_PHONE,  QV_FILTER_STARRED,
-    QV_FILTER_NOT_GROUP,   QV_FILTER_MAIL,    QV_FILTER_POSTAL, QV_FILTER_NOT_ACCOUNT,
-    QV_FILTER_NOT_CONTACT, QV_FILTER_ONLINE,
-};
+constexpr int32_t FILTER_KINDS[] = {QV_FILTER_GROUP,   QV_FILTER_ACCOUNT,     QV_FILTER_PHONE,
+                                    QV_FILTER_STARRED, QV_FILTER_NOT_GROUP,   QV_FILTER_MAIL,
+                                    QV_FILTER_POSTAL,  QV_FILTER_NOT_ACCOUNT, QV_FILTER_NOT_CONTACT,
+                                    QV_FILTER_ONLINE};
 
 using Index = std::unique_ptr<qv_index, decltype(&qv_close)>;
 using Result = std::unique_ptr<qv_result, decltype(&qv_result_free)>;
@@ -86,30 +86,17 @@ protected:
 
     void FillDatabase()
     {
-        std::vector<tag_ProviderContact> vContacts;
-        for (const tag_DatabaseContact& sample : MakeSampleContacts(CONTACTS, NOW))
+        CContactDatabase database = CContactDatabase::Replace(DatabaseFile());
+        for (tag_DatabaseContact contact : MakeSampleContacts(CONTACTS, NOW))
         {
-            tag_ProviderContact contact;
-            contact.iId = static_cast<int>(sample.llID);
-            contact.strName = sample.strName;
-            contact.strKey = Key(sample.strName);
-            contact.strGroups = sample.strGroups;
-            contact.strAccounts = sample.strAccounts;
-            contact.llLastTime = sample.llLastTimeContacted;
-            contact.iTimes = sample.iTimesContacted;
-            contact.iStatusId = static_cast<int>(sample.llStatusUpdateID);
-            contact.bStarred = sample.bStarred;
-            contact.bPhone = sample.bPhone;
-            contact.bSecret = sample.bSecret;
-            contact.bMail = sample.bMail;
-            contact.bAddress = sample.bAddress;
-            contact.bVisible = sample.bVisible;
-            contact.bOnline = sample.strStatus == "online";
+            contact.strKey = Key(contact.strName);
+            database.Add(contact);
             m_vNames.push_back(contact.strName);
-            vContacts.push_back(contact);
         }
-        m_provider.PutAll(vContacts);
+        database.Commit();
     }
+
+    std::string DatabaseFile() const { return m_directory.Root() + "/databases/contacts2.db"; }
 
     std::string Key(const std::string& strName)
     {
@@ -232,7 +219,6 @@ protected:
     }
 
     CDataDirectory m_directory;
-    CProviderDatabase m_provider;
     CLocalizerLogic m_logic;
     Index m_index{nullptr, &qv_close};
     std::vector<std::string> m_vNames;
@@ -356,19 +342,20 @@ TEST_F(CInterfaceTest, FollowsChangesOfTheDatabase)
     const auto DifferenceFromFresh = [this] {
         return DifferenceOf(ReadStore(), FreshBuild(m_directory.Root(), ReadStore().reg.iSortType));
     };
-    m_provider.Execute("update status_updates set status = 'online'");
+    CProviderDatabase provider;
+    provider.Execute("update status_updates set status = 'online'");
     EXPECT_EQ(qv_status_changed(m_index.get()), QV_OK);
     const int64_t aIds[] = {1, 2};
-    m_provider.SetName(1, "张红", Key("张红"));
-    m_provider.SetVisible(2, false);
+    provider.SetName(1, "张红", Key("张红"));
+    provider.SetVisible(2, false);
     EXPECT_EQ(qv_contacts_changed(m_index.get(), aIds, 2), QV_OK);
     EXPECT_EQ(aIds[0], 1) << "the list stays the caller's";
-    m_provider.SetStarred(3, true);
+    provider.SetStarred(3, true);
     EXPECT_EQ(qv_star_changed(m_index.get(), 3, 7), QV_OK);
-    m_provider.SetLastTime(4, NOW);
+    provider.SetLastTime(4, NOW);
     EXPECT_EQ(qv_time_changed(m_index.get(), 4, NOW), QV_OK);
     EXPECT_EQ(DifferenceFromFresh(), "");
-    m_provider.SetVisible(2, true);
+    provider.SetVisible(2, true);
     EXPECT_EQ(qv_set_sort_type(m_index.get(), QV_SORT_TIME), QV_OK);
     EXPECT_EQ(qv_all_contacts_changed(m_index.get()), QV_OK);
     EXPECT_EQ(DifferenceFromFresh(), "");
@@ -439,9 +426,9 @@ TEST_F(CInterfaceTest, SaysWhatIsMissing)
 {
     const auto status = [this](int iStatus)
     { EXPECT_EQ(qv_build(m_index.get(), 1), iStatus) << qv_strerror(iStatus); };
-    std::filesystem::remove(m_directory.Root() + "/databases/contacts2.db");
+    std::filesystem::remove(DatabaseFile());
     status(QV_ERROR_DATABASE);
-    std::filesystem::create_directory(m_directory.Root() + "/databases/contacts2.db");
+    std::filesystem::create_directory(DatabaseFile());
     status(QV_ERROR_STORE);
     std::filesystem::remove(m_directory.File("pyfile.bin"));
     status(QV_ERROR_PINYIN);

@@ -298,7 +298,7 @@ STORE_KIND CStoreCase::KindOf(tag_StoreImage image, std::string* pstrWhy) const
     {
         return KIND_AFTER;
     }
-    if (Difference(image, m_before).empty())
+    if (!Is("FirstBuild") && Difference(image, m_before).empty())
     {
         return KIND_BEFORE;
     }

@@ -57,8 +57,9 @@ class SubprojectTest(unittest.TestCase):
         for target in ("test_platform", "qv_bench", "qvlocalize"):
             self.assertFalse(self.has_target(target), target)
         run(CMAKE, "--build", self.build, "--target", "program")
-        table = (self.build / "pyfile").read_text(encoding="utf-8")
-        self.assertEqual("709412 0\n", run(self.build / "program", table))
+        run(self.build / "program")
+        table = pathlib.Path((self.build / "pyfile").read_text(encoding="utf-8"))
+        self.assertEqual(709412, table.stat().st_size)
         own = {"CMakeCache.txt", "CMakeFiles", "cmake_install.cmake", "engine", "program", "pyfile"}
         others = {path.name for path in self.build.iterdir()} - own
         self.assertFalse([name for name in others if "ninja" not in name and name != "Makefile"])

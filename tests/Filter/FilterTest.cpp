@@ -185,23 +185,18 @@ TEST(Filters, KeepTheirContacts)
 TEST(Filters, ReadAListUpToItsFirstZeroOrItsLength)
 {
     QVLong32 lList[] = {3, 5, 0, 9};
-    const struct
+    const int ROWS[][4] = {
+        // id, length of the list, whether it is a member, whether 3 and it are all
+        {3, 4, 1, 0}, {5, 4, 1, 1}, {9, 4, 0, 0}, {0, 4, 1, 0}, {0, 2, 0, 0},
+        {5, 1, 0, 0}, {3, 1, 1, 1}, {3, 0, 0, 0}, {0, -1, 0, 0}};
+    for (const auto& [iID, iNum, iMember, iConfined] : ROWS)
     {
-        int iID;
-        int iNum;
-        int iMember;
-        int iConfined; // to the accounts 3 and iID
-    } cases[] = {{3, 4, 1, 0}, {5, 4, 1, 1}, {9, 4, 0, 0}, {0, 4, 1, 0}, {0, 2, 0, 0},
-                 {5, 1, 0, 0}, {3, 1, 1, 1}, {3, 0, 0, 0}, {0, -1, 0, 0}};
-    for (const auto& row : cases)
-    {
-        SCOPED_TRACE(testing::Message() << row.iID << " of " << row.iNum);
-        const std::vector<int> vKinds(2, FILTER_ACCOUNT_EXPAND);
-        const Chain chain = Build({vKinds, {3, row.iID}, {}, {}});
-        EXPECT_EQ(GroupFilterProcess().IsSameGroup(row.iID, lList, row.iNum), row.iMember);
-        EXPECT_EQ(AccountFilterProcess().IsSameAccount(row.iID, lList, row.iNum), row.iMember);
-        EXPECT_EQ(AccountExpandFilterProcess().IsSameAccountEx(row.iID, lList, row.iNum, *chain),
-                  row.iConfined);
+        const Chain chain =
+            Build({{FILTER_ACCOUNT_EXPAND, FILTER_ACCOUNT_EXPAND}, {3, iID}, {}, {}});
+        EXPECT_EQ(GroupFilterProcess().IsSameGroup(iID, lList, iNum), iMember);
+        EXPECT_EQ(AccountFilterProcess().IsSameAccount(iID, lList, iNum), iMember);
+        EXPECT_EQ(AccountExpandFilterProcess().IsSameAccountEx(iID, lList, iNum, *chain),
+                  iConfined);
     }
 }
 

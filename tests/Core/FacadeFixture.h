@@ -17,6 +17,7 @@
 #include <gtest/gtest.h>
 #include <memory>
 #include <regex>
+#include <sstream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -124,20 +125,20 @@ protected:
             << strWhat;
     }
 
-    // The log without the milliseconds, which differ from run to run, and without SQL texts.
-    std::vector<tag_LogLine> Told() const
+    // The log lines that begin with strStart, one after the other, without the milliseconds, which
+    // differ from run to run, and without SQL texts.
+    std::string Told(const std::string& strStart = "") const
     {
-        static const std::regex TIME("(time =|EXIT takes) [0-9]+");
-        std::vector<tag_LogLine> vTold;
-        for (tag_LogLine line : m_log.Lines())
+        std::ostringstream text;
+        for (const tag_LogLine& line : m_log.Lines())
         {
-            line.strText = std::regex_replace(line.strText, TIME, "$1 ms");
-            if (line.strText.find("sqlstat_") == std::string::npos)
+            if (line.strText.find(strStart) == 0 &&
+                line.strText.find("sqlstat_") == std::string::npos)
             {
-                vTold.push_back(line);
+                text << line;
             }
         }
-        return vTold;
+        return std::regex_replace(text.str(), std::regex("(time =|EXIT takes) [0-9]+"), "$1 ms");
     }
 
     CDataDirectory m_directory;

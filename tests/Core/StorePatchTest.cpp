@@ -24,37 +24,23 @@ using Records = std::vector<tag_ContactsStruct>;
 
 constexpr int SPARE = 500;
 
-// Few names and times, so that many records are equal, and scripts under one first letter, which
-// the order does not tell apart consistently.
-tag_ContactsStruct MakeRecord(std::mt19937& rng)
-{
-    tag_ContactsStruct record = {};
-    record.iContactID = static_cast<int>(rng() % 1'000'000) + 1;
-    record.szName[0] = static_cast<wchar_t>(L'a' + rng() % 5);
-    record.szName[1] = static_cast<wchar_t>(L'a' + rng() % 3);
-    record.szLocalizerKey[0] =
-        static_cast<wchar_t>(rng() % 2 == 0 ? LOC_HANZI_BASE : LOC_ALPHA_BASE);
-    record.llLastTimeContacted = static_cast<int64_t>(rng() % 40);
-    record.iSortIndex = -1;
-    return record;
-}
-
-void InsertOne(Records& vStore, tag_ContactsStruct record, Common_Sort_enum eOrder)
-{
-    Common_Qsort sorter;
-    record.iSortIndex =
-        sorter.Search_Bin(reinterpret_cast<char*>(vStore.data()), static_cast<int>(vStore.size()),
-                          reinterpret_cast<char*>(&record), eOrder, 1);
-    vStore.insert(vStore.begin() + record.iSortIndex, record);
-}
-
 class CManyChanges : public testing::TestWithParam<Common_Sort_enum>
 {
 protected:
+    // Few names and times, so that many records are equal, and scripts under one first letter,
+    // which the order does not tell apart consistently.
     Records MakeRecords(size_t uNum)
     {
         Records vRecords(uNum);
-        std::generate(vRecords.begin(), vRecords.end(), [this] { return MakeRecord(m_rng); });
+        for (tag_ContactsStruct& record : vRecords)
+        {
+            record.iContactID = static_cast<int32_t>(m_rng() % 1'000'000) + 1;
+            record.szName[0] = static_cast<wchar_t>(L'a' + m_rng() % 5);
+            record.szName[1] = static_cast<wchar_t>(L'a' + m_rng() % 3);
+            record.szLocalizerKey[0] = m_rng() % 2 == 0 ? LOC_HANZI_BASE : LOC_ALPHA_BASE;
+            record.llLastTimeContacted = static_cast<int64_t>(m_rng() % 40);
+            record.iSortIndex = -1;
+        }
         return vRecords;
     }
     std::vector<int> PickSlots(size_t uOf)
@@ -103,9 +89,12 @@ TEST_P(CManyChanges, LeaveTheBytesOfOneAfterTheOther)
         const size_t uRoom = static_cast<size_t>(iCapacity) - vModel.size();
         EXPECT_EQ(patch.Insert(inserted), vInserted.size() > uRoom ? PATCH_FULL : PATCH_DONE);
         vInserted.resize(std::min(vInserted.size(), uRoom));
-        for (const tag_ContactsStruct& record : vInserted)
+        for (tag_ContactsStruct record : vInserted)
         {
-            InsertOne(vModel, record, GetParam());
+            record.iSortIndex = Common_Qsort().Search_Bin(
+                reinterpret_cast<char*>(vModel.data()), static_cast<int>(vModel.size()),
+                reinterpret_cast<char*>(&record), GetParam(), 1);
+            vModel.insert(vModel.begin() + record.iSortIndex, record);
         }
         ASSERT_EQ(static_cast<size_t>(patch.Count()), vModel.size());
         ASSERT_EQ(std::memcmp(pStore, vModel.data(), vModel.size() * sizeof(vModel[0])), 0);

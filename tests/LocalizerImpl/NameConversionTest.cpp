@@ -6,7 +6,7 @@
 #include "LocalizerImpl/QVNumLocalizerManager.h"
 
 #include <algorithm>
-#include <vector>
+#include <tuple>
 
 namespace
 {
@@ -21,35 +21,25 @@ std::wstring Repeat(const std::wstring& strText, int iCount)
     return iCount > 0 ? strText + Repeat(strText, iCount - 1) : L"";
 }
 
-struct tag_Name
-{
-    std::wstring strName;
-    std::wstring strCodes; // as LocalizerFixture::Codes takes it
-    std::wstring strKey;
+// Names, their codes as LocalizerFixture::Codes takes them, and their keys.
+const std::tuple<std::wstring, std::wstring, std::wstring> NAMES[] = {
+    {L"Tom 2", L"tom?2", L"tom 2"},
+    {L"李Lee", L"李lee", L"li 李lee"},
+    {L"长-@[`{~", L"长??????", L"chang 长-@[`{~"},
+    // Folding: by the first of several rows, and only in the first four characters.
+    {L"三著矽衝", L"三著硅冲", L"san 三zhu 著gui 硅chong 冲"},
+    {L"啊啊啊張張", L"啊啊啊张張", L"a 啊a 啊a 啊zhang 张zhang 張"},
+    // Three bytes without a record: the bytes stand in the key.
+    {L"한z", L"?z", L"\u00ED\u0095\u009Cz"},
+    // Two bytes: one other character, itself in the key; ASCII letters alone change case.
+    {L"\u00C9a\u0080\u07FF张", L"?a??张", L"\u00C9a\u0080\u07FFzhang 张"},
+    // No character up to U+FFFF: as if it were U+FFFD.
+    {L"\x1F600z\x80000041", L"?z?", L"\u00EF\u00BF\u00BDz\u00EF\u00BF\u00BD"},
+    // 30 characters of a name and of a key.
+    {Repeat(L"张", 30), Repeat(L"张", 10), Repeat(L"zhang 张", 4) + L"zh"},
+    {Repeat(L"x", 29) + L"张", Repeat(L"x", 10), Repeat(L"x", 29) + L"z"},
+    {Repeat(L"y", 31), Repeat(L"y", 10), Repeat(L"y", 30)},
 };
-
-const std::vector<tag_Name>& Names()
-{
-    static const std::vector<tag_Name> vNames = {
-        {L"Tom 2", L"tom?2", L"tom 2"},
-        {L"李Lee", L"李lee", L"li 李lee"},
-        {L"长-@[`{~", L"长??????", L"chang 长-@[`{~"},
-        // Folding: by the first of several rows, and only in the first four characters.
-        {L"三著矽衝", L"三著硅冲", L"san 三zhu 著gui 硅chong 冲"},
-        {L"啊啊啊張張", L"啊啊啊张張", L"a 啊a 啊a 啊zhang 张zhang 張"},
-        // Three bytes without a record: the bytes stand in the key.
-        {L"한z", L"?z", L"\u00ED\u0095\u009Cz"},
-        // Two bytes: one other character, itself in the key; ASCII letters alone change case.
-        {L"\u00C9a\u0080\u07FF张", L"?a??张", L"\u00C9a\u0080\u07FFzhang 张"},
-        // No character up to U+FFFF: as if it were U+FFFD.
-        {L"\x1F600z\x80000041", L"?z?", L"\u00EF\u00BF\u00BDz\u00EF\u00BF\u00BD"},
-        // 30 characters of a name and of a key.
-        {Repeat(L"张", 30), Repeat(L"张", 10), Repeat(L"zhang 张", 4) + L"zh"},
-        {Repeat(L"x", 29) + L"张", Repeat(L"x", 10), Repeat(L"x", 29) + L"z"},
-        {Repeat(L"y", 31), Repeat(L"y", 10), Repeat(L"y", 30)},
-    };
-    return vNames;
-}
 
 // A record whose name ends where it ends: at 31 units without a terminator.
 tag_ContactsStruct RecordOf(const std::wstring& strName)
@@ -79,41 +69,33 @@ std::wstring Pick(std::wstring strInput, int iPos, std::wstring strWord)
 
 TEST_F(NameConversion, MakesCodesAndKeysOfNames)
 {
-    for (const tag_Name& row : Names())
+    for (const auto& [strName, strCodeText, strKey] : NAMES)
     {
-        SCOPED_TRACE(testing::PrintToString(row.strName));
-        const std::wstring strCodes = Padded(Codes(row.strCodes), 10);
-        std::wstring strName = row.strName;
+        SCOPED_TRACE(testing::PrintToString(strName));
+        const std::wstring strCodes = Padded(Codes(strCodeText), 10);
+        std::wstring strGiven = strName;
         wchar_t szCodes[11] = {};
         const long hMap = reinterpret_cast<long>(m_pMap);
-        EXPECT_EQ(Manager::GetLocalizerString(hMap, strName.data(), szCodes), 0);
+        EXPECT_EQ(Manager::GetLocalizerString(hMap, strGiven.data(), szCodes), 0);
         EXPECT_EQ(std::wstring(szCodes, 10), strCodes);
-        EXPECT_EQ(strName, row.strName) << "only read";
-
-        tag_ContactsStruct record = RecordOf(row.strName);
+        EXPECT_EQ(strGiven, strName) << "only read";
+        tag_ContactsStruct record = RecordOf(strName);
         tag_ContactsInfo info = {1, &record};
         EXPECT_EQ(Manager::GetLocalizerBatch(&info), 0);
         EXPECT_EQ(std::wstring(record.szLocalizerKey, 11), strCodes + UNTOUCHED);
         const wchar_t last = record.szName[30];
         EXPECT_EQ(Manager::TransNameToPY(&record, 1), 0);
-        EXPECT_EQ(std::wstring(record.szName, 31), Padded(row.strKey, 30) + last);
+        EXPECT_EQ(std::wstring(record.szName, 31), Padded(strKey, 30) + last);
     }
-}
-
-TEST_F(NameConversion, WritesItsLines)
-{
     wchar_t szName[] = L"T2";
     wchar_t szCodes[11] = {};
     const std::string strCall = "CQVLocalizerManager::GetLocalizerString the input mapping ";
     const CLogCapture log;
     Manager::GetLocalizerChars(szName, szCodes);
     EXPECT_EQ(Manager::GetLocalizerString(-1, szName, szCodes), -1005);
-    const std::vector<tag_LogLine> vExpected = {
-        {DEBUG_LINE, "QV_Localize",
-         "QV_Contacts: TranslateNameToLocal the char is digital: 2 , the localize char is 0x5a02"},
-        {ERROR_LINE, "QV_Localize", strCall + "-1!"},
-        {ERROR_LINE, "QV_Localize", strCall + "is wrong!"}};
-    EXPECT_EQ(log.Lines(), vExpected);
+    EXPECT_EQ(log.Texts(DEBUG_LINE), Lines{"QV_Contacts: TranslateNameToLocal the char is digital: "
+                                           "2 , the localize char is 0x5a02"});
+    EXPECT_EQ(log.Texts(ERROR_LINE), (Lines{strCall + "-1!", strCall + "is wrong!"}));
 }
 
 TEST_F(NameConversion, PutsAPickedCharacterInPlaceOfItsLetters)

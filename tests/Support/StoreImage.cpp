@@ -9,7 +9,6 @@
 #include <algorithm>
 #include <cstring>
 #include <filesystem>
-#include <sstream>
 #include <stdexcept>
 
 namespace fs = std::filesystem;
@@ -32,24 +31,21 @@ Records ById(Records vRecords)
     return vRecords;
 }
 
-// The first byte that differs in records without their places, the record's size when none does.
-size_t FirstDifference(tag_ContactsStruct a, tag_ContactsStruct b)
-{
-    a.iSortIndex = b.iSortIndex = 0;
-    const char* pA = reinterpret_cast<const char*>(&a);
-    return static_cast<size_t>(
-        std::mismatch(pA, pA + sizeof(a), reinterpret_cast<const char*>(&b)).first - pA);
-}
-
+// The first record that differs in more than its place.
 std::string RecordDifference(const Records& vStore, const Records& vFresh)
 {
     for (size_t i = 0; i < vFresh.size(); ++i)
     {
-        const size_t uByte = FirstDifference(vStore[i], vFresh[i]);
-        if (uByte < sizeof(tag_ContactsStruct))
+        tag_ContactsStruct record = vStore[i];
+        record.iSortIndex = vFresh[i].iSortIndex;
+        const char* pBytes = reinterpret_cast<const char*>(&record);
+        const char* pFresh = reinterpret_cast<const char*>(&vFresh[i]);
+        const std::ptrdiff_t iByte =
+            std::mismatch(pBytes, pBytes + sizeof(record), pFresh).first - pBytes;
+        if (iByte < static_cast<std::ptrdiff_t>(sizeof(record)))
         {
-            return "contact " + std::to_string(vStore[i].iContactID) + " differs from contact " +
-                   std::to_string(vFresh[i].iContactID) + " from byte " + std::to_string(uByte);
+            return "contact " + std::to_string(record.iContactID) + " differs from contact " +
+                   std::to_string(vFresh[i].iContactID) + " from byte " + std::to_string(iByte);
         }
     }
     return {};
@@ -110,10 +106,10 @@ std::string DifferenceOf(const tag_StoreImage& store, const tag_StoreImage& fres
 {
     if (store.reg.iTotalNum != fresh.reg.iTotalNum || store.reg.iSortType != fresh.reg.iSortType)
     {
-        std::ostringstream text;
-        text << store.reg.iTotalNum << " contacts in order " << store.reg.iSortType
-             << " instead of " << fresh.reg.iTotalNum << " in order " << fresh.reg.iSortType;
-        return text.str();
+        return std::to_string(store.reg.iTotalNum) + " contacts in order " +
+               std::to_string(store.reg.iSortType) + " instead of " +
+               std::to_string(fresh.reg.iTotalNum) + " in order " +
+               std::to_string(fresh.reg.iSortType);
     }
     const std::string strDifference = RecordDifference(ById(store.vRecords), ById(fresh.vRecords));
     return strDifference.empty() ? OrderFaultOf(store) : strDifference;

@@ -14,6 +14,7 @@
 #include <sqlite3.h>
 
 #include <algorithm>
+#include <climits>
 #include <cstring>
 #include <filesystem>
 #include <numeric>
@@ -110,6 +111,26 @@ int CatchConnection(sqlite3* pDB, char** /*pszError*/, const sqlite3_api_routine
     g_pReaderDB = pDB;
     return SQLITE_OK;
 }
+
+// SQLite's memory, of which only so many allocations are granted. SQLite is told before it starts,
+// and to ask for each allocation instead of keeping small ones at hand.
+struct tag_SqliteMemory
+{
+    tag_SqliteMemory()
+    {
+        sqlite3_config(SQLITE_CONFIG_GETMALLOC, &s_system);
+        sqlite3_mem_methods methods = s_system;
+        methods.xMalloc = [](int iSize) { return IsRefused() ? nullptr : s_system.xMalloc(iSize); };
+        methods.xRealloc = [](void* pMemory, int iSize)
+        { return IsRefused() ? nullptr : s_system.xRealloc(pMemory, iSize); };
+        sqlite3_config(SQLITE_CONFIG_MALLOC, &methods);
+        sqlite3_config(SQLITE_CONFIG_LOOKASIDE, 0, 0);
+    }
+    static bool IsRefused() { return s_iGranted == 0 || --s_iGranted == 0; }
+
+    static inline sqlite3_mem_methods s_system = {};
+    static inline int s_iGranted = INT_MAX;
+} g_sqliteMemory;
 
 // A reader on an empty provider database in a directory of its own.
 class Reader : public testing::Test
@@ -319,6 +340,33 @@ TEST_F(Reader, MarksTheFirstRecordOfEachOnlineStatus)
     const CMemoryFailure failure(0);
     EXPECT_EQ(-1, ReadAll(set));
     EXPECT_EQ(Errors(), Lines{READER + "ReadAllLocalizer  NEW MEM ERR!!!!!!"});
+}
+
+// A refused allocation must not pass for an empty text: group ids that are numbers become text only
+// when they are asked for.
+TEST_F(Reader, FailsOrIsRightWithoutSqlitesMemory)
+{
+    m_provider.PutAll({{1, "a", "", "1.2"}, {2, "b", "", "7"}});
+    m_provider.Execute("create table t as select * from localizer; drop table localizer;"
+                       "create table localizer(contact_id, display_name, localizerkey, group_id "
+                       "integer, account_id, hasMail, hasAddress);"
+                       "insert into localizer select * from t");
+    int iFailed = 0;
+    for (bool bRanOut = true; bRanOut; ++iFailed)
+    {
+        CSQLiteOperator reader;
+        tag_ReadSet set;
+        tag_ContactsStruct single = {};
+        int iFound = 0;
+        tag_SqliteMemory::s_iGranted = iFailed + 1;
+        const int iAll = reader.ReadAllLocalizer(&set, 0, nullptr);
+        const int iSingle = iAll == 0 ? reader.ReadContactsByID(2, &single, iFound) : -1;
+        bRanOut = tag_SqliteMemory::s_iGranted == 0;
+        tag_SqliteMemory::s_iGranted = INT_MAX;
+        EXPECT_TRUE(iAll != 0 || set.pContacts[1].lGroupID[0] == 7) << iFailed;
+        EXPECT_TRUE(iSingle != 0 || iFound == 0 || single.lGroupID[0] == 7) << iFailed;
+    }
+    EXPECT_GT(iFailed, 50) << "SQLite asks for each allocation";
 }
 
 TEST_F(Reader, FailsOnWhatIsNoProviderDatabase)

@@ -476,21 +476,20 @@ TEST_F(Reader, WaitsForTheRecordQueriesAsLongAsItTakes)
 {
     m_provider.PutAll({{1, "a"}, {2, "b"}});
     sqlite3_auto_extension(reinterpret_cast<void (*)()>(&CatchConnection));
-    for (const auto& [strQuery, strBusy] :
-         {std::pair(SQLSTAT_4, READER + " SQLITE_BUSY: select from contacts"),
-          std::pair(SQLSTAT_5, READER + " SQLITE_BUSY: select from localizer")})
+    for (const auto& lines : {std::pair(SQLSTAT_4, READER + " SQLITE_BUSY: select from contacts"),
+                              std::pair(SQLSTAT_5, READER + " SQLITE_BUSY: select from localizer")})
     {
         int iBusy = 0;
         m_log.AtEachLine(
             [&](const std::string& strText)
             {
-                if (strText.find(strQuery) == 0)
+                if (strText.find(lines.first) == 0)
                 {
                     sqlite3_exec(g_pReaderDB, "pragma writable_schema=reset", nullptr, nullptr,
                                  nullptr);
                     m_provider.LockExclusive();
                 }
-                else if (strText == strBusy && ++iBusy == 6)
+                else if (strText == lines.second && ++iBusy == 6)
                 {
                     m_provider.Unlock();
                 }

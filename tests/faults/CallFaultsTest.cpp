@@ -135,7 +135,8 @@ protected:
 
 TEST_P(CEveryCallFails, Changing)
 {
-    const auto& [change, iSortType] = GetParam();
+    const tag_Operation& change = std::get<0>(GetParam());
+    const int iSortType = std::get<1>(GetParam());
     const CStoreCase store(change, iSortType);
     const bool bReports = std::strstr(change.szName, "Build") != nullptr;
     RunAll(

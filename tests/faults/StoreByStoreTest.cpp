@@ -217,7 +217,8 @@ class CStoreByStore : public testing::TestWithParam<std::tuple<tag_Operation, in
 
 TEST_P(CStoreByStore, IsMarkedOrRight)
 {
-    const auto& [change, iSortType] = GetParam();
+    const tag_Operation& change = std::get<0>(GetParam());
+    const int iSortType = std::get<1>(GetParam());
     const CStoreCase store(change, iSortType);
     const CShared<tag_Steps> steps;
     store.Restore();

@@ -144,7 +144,7 @@ protected:
     }
     Lines Errors()
     {
-        const Lines vErrors = m_log.Texts(ERROR_LINE);
+        Lines vErrors = m_log.Texts(ERROR_LINE);
         m_log.Clear();
         return vErrors;
     }

@@ -315,39 +315,35 @@ TEST_F(Search, ATableOfRandomReadings)
 
 TEST_F(Search, FitsPiecesToCharacters)
 {
-    const struct
+    // Whether as digits, name, pieces, what the comparison answers.
+    const std::tuple<bool, const wchar_t*, Pieces, Compared> ROWS[] = {
+        {false, L"李张三", {L"zhang", L"s"}, {1, 2, 0}},
+        {false, L"张三", {L"z", L"san"}, {1, 2, 0}},
+        {false, L"李张三", {L"zhang", L"san"}, {1, 2, 1}},
+        {false, L"张三", {L"zhang", L"sa"}, {1, 2, 0}},
+        {false, L"张三", {L"张", L"s"}, {1, 2, 0}},
+        {false, L"张三", {L"張", L"三"}, {1, 2, 1}},
+        {false, L"张三", {L"s", L"z"}, {0, 0, 0}},
+        {false, L"张三", {L"z", L"s", L"s"}, {0, 0, 0}},
+        {false, L"张三", {L"zhangs"}, {0, 0, 0}},
+        {false, L"长三", {L"zhang"}, {1, 2, 1}},
+        {false, L"a三b?7?", {L"a", L"san", L"b", L"#", L"7", L"#"}, {1, 6, 1}},
+        {false, L"a7?", {L"#"}, {1, 2, 1}},
+        {false, L"a三7?", {L"8"}, {0, 0, 0}},
+        {false, L"a三7?", {L"77"}, {0, 0, 0}},
+        {false, L"a三7?", {L"##"}, {0, 0, 0}},
+        {true, L"长三", {L"94264", L"7"}, {1, 2, 0}},
+        {true, L"长三", {L"24264", L"726"}, {1, 2, 1}},
+        {true, L"长三", {L"92"}, {0, 0, 0}},
+        {true, L"?7", {L"7"}, {1, 1, 1}},
+        {true, L"?7", {L"#"}, {0, 0, 0}},
+        {true, L"?7", {L"77"}, {0, 0, 0}},
+        {true, L"adgjmptw", {L"2", L"3", L"4", L"5", L"6", L"7", L"8", L"9"}, {1, 8, 1}},
+        {true, L"cfilosvz", {L"2", L"3", L"4", L"5", L"6", L"7", L"8", L"9"}, {1, 8, 1}}};
+    for (const auto& [bDigits, szName, vPieces, expected] : ROWS)
     {
-        bool bDigits;
-        const wchar_t* szName;
-        Pieces vPieces;
-        Compared expected;
-    } ROWS[] = {{false, L"李张三", {L"zhang", L"s"}, {1, 2, 0}},
-                {false, L"张三", {L"z", L"san"}, {1, 2, 0}},
-                {false, L"李张三", {L"zhang", L"san"}, {1, 2, 1}},
-                {false, L"张三", {L"zhang", L"sa"}, {1, 2, 0}},
-                {false, L"张三", {L"张", L"s"}, {1, 2, 0}},
-                {false, L"张三", {L"張", L"三"}, {1, 2, 1}},
-                {false, L"张三", {L"s", L"z"}, {0, 0, 0}},
-                {false, L"张三", {L"z", L"s", L"s"}, {0, 0, 0}},
-                {false, L"张三", {L"zhangs"}, {0, 0, 0}},
-                {false, L"长三", {L"zhang"}, {1, 2, 1}},
-                {false, L"a三b?7?", {L"a", L"san", L"b", L"#", L"7", L"#"}, {1, 6, 1}},
-                {false, L"a7?", {L"#"}, {1, 2, 1}},
-                {false, L"a三7?", {L"8"}, {0, 0, 0}},
-                {false, L"a三7?", {L"77"}, {0, 0, 0}},
-                {false, L"a三7?", {L"##"}, {0, 0, 0}},
-                {true, L"长三", {L"94264", L"7"}, {1, 2, 0}},
-                {true, L"长三", {L"24264", L"726"}, {1, 2, 1}},
-                {true, L"长三", {L"92"}, {0, 0, 0}},
-                {true, L"?7", {L"7"}, {1, 1, 1}},
-                {true, L"?7", {L"#"}, {0, 0, 0}},
-                {true, L"?7", {L"77"}, {0, 0, 0}},
-                {true, L"adgjmptw", {L"2", L"3", L"4", L"5", L"6", L"7", L"8", L"9"}, {1, 8, 1}},
-                {true, L"cfilosvz", {L"2", L"3", L"4", L"5", L"6", L"7", L"8", L"9"}, {1, 8, 1}}};
-    for (const auto& row : ROWS)
-    {
-        EXPECT_EQ(Do(row.bDigits, row.szName, row.vPieces), row.expected)
-            << Narrow(row.szName) << ' ' << testing::PrintToString(row.vPieces);
+        EXPECT_EQ(Do(bDigits, szName, vPieces), expected)
+            << Narrow(szName) << ' ' << testing::PrintToString(vPieces);
     }
     // Lengths that are handed in stay unless all is whole.
     EXPECT_EQ(Do(false, L"三", {L"s"}, 7, 0), (Compared{1, 7, 0}));

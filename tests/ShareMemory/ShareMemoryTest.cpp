@@ -137,13 +137,14 @@ TEST_F(ShareMemory, TellsWhyNothingIsMappedOrClosed)
     for (const auto& [strPath, strNumber] :
          {std::pair(m_directory.File("no/such/directory"), "2"), std::pair(strPipe, "22")})
     {
-        const std::string strEnd = std::string(" error no2 = ") + strNumber + "\n";
+        const std::string strNoFile = std::string(" error no2 = ") + strNumber + "\n";
+        const std::string strEnd = strPath + strNoFile;
         EXPECT_EQ(OpenShareMemory(strPath.c_str(), 12), MAP_FAILED);
         EXPECT_EQ(OpenWriteShareMemory(strPath.c_str(), 12), MAP_FAILED);
         EXPECT_EQ(OpenReadShareMemory(strPath.c_str(), 12), MAP_FAILED);
-        EXPECT_EQ(Errors(), (Lines{"QV_Contacts: OpenShareMemory" + strEnd,
-                                   "QV_Contacts: OpenWriteShareMemory " + strPath + strEnd,
-                                   "QV_Contacts: OpenReadShareMemory:" + strPath + strEnd}));
+        EXPECT_EQ(Errors(), (Lines{"QV_Contacts: OpenShareMemory" + strNoFile,
+                                   "QV_Contacts: OpenWriteShareMemory " + strEnd,
+                                   "QV_Contacts: OpenReadShareMemory:" + strEnd}));
     }
 }
 

@@ -181,7 +181,7 @@ const std::vector<tag_Operation>& AllReadings()
         {"Digits", [](auto& logic, auto& answer)
          { Search(logic, answer, L"9", IME_SEARCH_NUM, FILTER_GROUP_EXPAND); }},
         {"LoggingFilter", [](auto& logic, auto& answer)
-         { Search(logic, answer, L"", IME_SEARCH_NUM, FILTER_CONTACT_ID_EXPAND); }},
+         { Search(logic, answer, L"", IME_SEARCH_NUM, FILTER_ACCOUNT_EXPAND); }},
         {"Special",
          [](auto& logic, auto& answer) { Search(logic, answer, L"z", IME_SEARCH_SPECIAL); }},
         {"Narrowed", SearchWithin},

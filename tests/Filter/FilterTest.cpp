@@ -185,11 +185,11 @@ TEST(Filters, KeepTheirContacts)
 TEST(Filters, ReadAListUpToItsFirstZeroOrItsLength)
 {
     QVLong32 lList[] = {3, 5, 0, 9};
-    const int ROWS[][4] = {
+    const int LISTS[][4] = {
         // id, length of the list, whether it is a member, whether 3 and it are all
         {3, 4, 1, 0}, {5, 4, 1, 1}, {9, 4, 0, 0}, {0, 4, 1, 0}, {0, 2, 0, 0},
         {5, 1, 0, 0}, {3, 1, 1, 1}, {3, 0, 0, 0}, {0, -1, 0, 0}};
-    for (const auto& [iID, iNum, iMember, iConfined] : ROWS)
+    for (const auto& [iID, iNum, iMember, iConfined] : LISTS)
     {
         const Chain chain =
             Build({{FILTER_ACCOUNT_EXPAND, FILTER_ACCOUNT_EXPAND}, {3, iID}, {}, {}});

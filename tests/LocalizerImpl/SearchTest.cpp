@@ -268,7 +268,7 @@ TEST_F(Search, LongTextsOverRandomNamesTypedKeyByKey)
     std::wstring strMany;
     for (int i = 0; i < PY_WORD_COUNT; i += 17)
     {
-        strMany += static_cast<wchar_t>(LOC_HANZI_BASE + static_cast<wchar_t>(i));
+        strMany += LOC_HANZI_BASE + static_cast<wchar_t>(i);
     }
     const Details BOOKS[] = {RandomNames(200, 7, strCodes), RandomNames(1500, 1, strMany),
                              RandomNames(1200, 1, strCodes.substr(3, 6))};

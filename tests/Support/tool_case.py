@@ -11,6 +11,7 @@ import tempfile
 import unittest
 
 TOOL, PYFILE = map(os.path.abspath, sys.argv[1:3])
+RECORD = "--record" in sys.argv  # what the tool shows, anew, for people to look through
 DONE, FAILED, USAGE, MISSING, PARTLY = range(5)
 SKIPPED = 77
 
@@ -58,3 +59,7 @@ class ToolCase(unittest.TestCase):
     def sql(self, statement, *values):
         with contextlib.closing(sqlite3.connect(self.database)) as database, database:
             return database.execute(statement, values).fetchall()
+
+
+def main():
+    unittest.main(argv=[sys.argv[0], *(name for name in sys.argv[3:] if name != "--record")])

@@ -196,7 +196,7 @@ class CardReader:
     def with_charset(self, head, line):
         """The line as vobject decodes it."""
         name = b"" if b"CHARSET=" in head.upper() else b";CHARSET=" + self.charset.encode()
-        plain = QUOTED_PRINTABLE.sub(b"QUOTED-PRINTABLE", head[:-1].rstrip(b";"))
+        plain = QUOTED_PRINTABLE.sub(b"QUOTED-PRINTABLE", head[:-1].rstrip(b"; "))
         return plain + name + b":" + line[len(head):]
 
     def text(self, value):

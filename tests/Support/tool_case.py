@@ -3,6 +3,7 @@ import contextlib
 import json
 import os
 import pathlib
+import re
 import shutil
 import sqlite3
 import subprocess
@@ -25,10 +26,13 @@ class ToolCase(unittest.TestCase):
         self.root = pathlib.Path(tempfile.mkdtemp(prefix="qvtool_"))
         self.addCleanup(shutil.rmtree, self.root)
         self.data = self.root / "data"
-        self.database = self.data / "databases/contacts2.db"
         if self.WITH_SAMPLE:
             self.run_tool("sample", "--pyfile", PYFILE)
             self.run_tool("index")
+
+    @property
+    def database(self):
+        return self.data / "databases/contacts2.db"
 
     def call(self, command, *arguments):
         return [TOOL, command, "--data-dir", str(self.data), *map(str, arguments)]
@@ -59,6 +63,12 @@ class ToolCase(unittest.TestCase):
     def sql(self, statement, *values):
         with contextlib.closing(sqlite3.connect(self.database)) as database, database:
             return database.execute(statement, values).fetchall()
+
+
+def sections(path):
+    """The texts of a file by their names, each of which stands in a line behind five signs."""
+    parts = re.split(r"(?m)^===== (.*)\n", path.read_text(encoding="utf-8"))
+    return dict(zip(parts[1::2], parts[2::2]))
 
 
 def main():

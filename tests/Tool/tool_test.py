@@ -198,7 +198,7 @@ class EscapesTest(ToolCase):
                                  (["index"], DONE, f"{place}/files:"),
                                  (["sample"], USAGE, f"{place}/databases")):
             self.assertIn(text, self.printed(*call, code=code))
-        (self.data / "databases/contacts2.db").unlink()
+        self.database.unlink()
         error = self.printed("index", code=MISSING)
         self.assertIn(f"{place}/databases", error)
         advised = re.search(r"--data-dir (.*)", error).group(1)

@@ -126,8 +126,8 @@ def file_of(columns, rows):
 
 def recorded(columns, rows):
     """The recorded screens of a size by name."""
-    parts = re.split(r"(?m)^===== (.*)\n", file_of(columns, rows).read_text(encoding="utf-8"))
-    return {name: screen.rstrip() for name, screen in zip(parts[1::2], parts[2::2])}
+    return {name: screen.rstrip()
+            for name, screen in tool_case.sections(file_of(columns, rows)).items()}
 
 
 class ScreenTest(TypeTest):

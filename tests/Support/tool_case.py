@@ -51,11 +51,14 @@ class ToolCase(unittest.TestCase):
         self.assertIn(text, process.stderr)
         return process.stderr
 
-    def search(self, text, *arguments):
-        """The last step of a search, with all its matches."""
+    def steps(self, text, *arguments):
+        """The steps of a search, with all their matches."""
         process = self.run_tool("search", text, "--json", "--limit", "0", *arguments)
         self.assertEqual("", process.stderr)
-        return json.loads(process.stdout)["steps"][-1]
+        return json.loads(process.stdout)["steps"]
+
+    def search(self, text, *arguments):
+        return self.steps(text, *arguments)[-1]
 
     def found(self, text, *arguments):
         return {match["contact_id"] for match in self.search(text, "--once", *arguments)["matches"]}

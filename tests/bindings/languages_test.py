@@ -6,7 +6,9 @@ import ctypes
 import gc
 import os
 import pathlib
+import random
 import re
+import string
 import subprocess
 import sys
 import threading
@@ -23,20 +25,23 @@ if "module" in PLACES:
     import qvlocalize
     from qvlocalize import Kind, SortType, Status
 
-# Texts, what the module is asked for beside them, and what the tool is; in the order of the program
-# of Java.
+# Texts and what the module is asked for beside them, in the order of the program of Java.
 SEARCHES = [
-    ("", {}, ""),
-    ("zs", {"starred": True}, "--starred"),
-    ("张s", {"group": 2, "phone": True}, "--group 2 --phone"),
-    ("w", {"not_group": [1, 2], "account": 1}, "--not-group 1 --not-group 2 --account 1"),
-    ("l", {"mail": True, "postal": True, "not_contact": 3}, "--mail --postal --not-contact 3"),
-    ("l", {"online": True, "not_account": [1, 2]}, "--online --not-account 1 --not-account 2"),
-    ("9426", {"kind": 1}, "--type num"),
-    ("tianqi", {"kind": 2}, "--type special"),
-    ("zh", {"within": "z"}, ""),
-    ("z", {"group": -1}, "--group -1"),
+    ("", {}),
+    ("zs", {"starred": True}),
+    ("张s", {"group": 2, "phone": True}),
+    ("w", {"not_group": [1, 2], "account": 1}),
+    ("l", {"mail": True, "postal": True, "not_contact": 3}),
+    ("l", {"online": True, "not_account": [1, 2]}),
+    ("9426", {"kind": 1}),
+    ("tianqi", {"kind": 2}),
+    ("zh", {"within": "z"}),
+    ("z", {"group": -1}),
 ]
+TEXTS = ["zhangs", "ZS", "wxm", "lixiao", "z#s", "tom#l", "张s", "chang", "王é", "hjzhong", "tianqi",
+         "94264", "5494", "74#", "100"]
+FLAGS = ["starred", "phone", "mail", "postal", "online"]
+LISTS = ["group", "account", "not_group", "not_account", "not_contact"]
 
 
 class LibraryTest(ToolCase):
@@ -69,6 +74,15 @@ class ModuleTest(ToolCase):
             asked = {**asked, "within": self.index.search(asked["within"])}
         return self.index.search(text, **asked)
 
+    def told(self, text, asked, *options):
+        """The steps that the tool shows for what the module is asked."""
+        options = [*options, "--type", ("word", "num", "special")[asked.get("kind", 0)]]
+        for name, value in asked.items():
+            if name not in ("kind", "within"):
+                for number in value if isinstance(value, list) else [value]:
+                    options += ["--" + name.replace("_", "-"), *[number][number is True:]]
+        return self.steps(text, *options)
+
 
 class PythonTest(ModuleTest):
     def test_constants_and_layouts_are_those_of_the_header(self):
@@ -81,28 +95,45 @@ class PythonTest(ModuleTest):
         self.assertEqual({name: int(value) for name, value in names.items()}, mine)
         self.assertEqual(88, ctypes.sizeof(qvlocalize._Match))
 
+    def assert_same(self, step, result):
+        self.assertEqual(
+            [(match["contact_id"], match["name_order"], match["last_time_contacted"],
+              match.get("first_matched", 0), match.get("last_matched", 0),
+              match.get("index_character", "")) for match in step["matches"]],
+            [(match.contact_id, match.name_order, match.last_contacted, match.first, match.last,
+              match.index_character) for match in result])
+        keys = [key for bit, key in enumerate(string.ascii_lowercase + "#")
+                if step["mask"] >> bit & 1]
+        self.assertEqual((keys, "".join(step["candidates"])),
+                         (list(result.next_keys), result.candidates))
+        self.assertEqual(step.get("sections", {}),
+                         {section.label: section.count for section in result.sections})
+        for section in result.sections:
+            self.assertEqual(section.label, result[section.first].index_character)
+
+    def any_question(self, dice):
+        asked = {"kind": dice.choice([0, 0, 0, 1, 1, 2])}
+        for name in dice.sample(FLAGS + LISTS, dice.randrange(4)):
+            asked[name] = name in FLAGS or [dice.randrange(-1, 8) for _ in range(dice.randint(1, 2))]
+        return asked
+
     def test_finds_what_the_tool_finds(self):
-        keys = "abcdefghijklmnopqrstuvwxyz#"
+        dice = random.Random(15)
+        names = [name for name, in self.sql("SELECT display_name FROM localizer")]
         for sort_type in SortType:
             self.index.sort_type = sort_type
             self.index.build(force=True)
-            for text, asked, options in SEARCHES:
-                once = [] if "within" in asked else ["--once"]
-                step = self.search(text, *once, *options.split())
+            for text, asked in SEARCHES:
+                options = [] if "within" in asked else ["--once"]
                 with self.subTest(text=text, sort_type=sort_type), self.ask(text, asked) as result:
-                    self.assertEqual(
-                        [(match["contact_id"], match["name_order"], match["last_time_contacted"],
-                          match.get("first_matched", 0), match.get("last_matched", 0),
-                          match.get("index_character", "")) for match in step["matches"]],
-                        [(match.contact_id, match.name_order, match.last_contacted, match.first,
-                          match.last, match.index_character) for match in result])
-                    self.assertEqual([key for bit, key in enumerate(keys) if step["mask"] >> bit & 1],
-                                     list(result.next_keys))
-                    self.assertEqual("".join(step["candidates"]), result.candidates)
-                    self.assertEqual(step.get("sections", {}),
-                                     {section.label: section.count for section in result.sections})
-                    for section in result.sections:
-                        self.assertEqual(section.label, result[section.first].index_character)
+                    self.assert_same(self.told(text, asked, *options)[-1], result)
+            for _ in range(60):  # typed key by key, each searched within the one before it
+                asked, result = self.any_question(dice), None
+                text = dice.choice(TEXTS + dice.sample(names, 5))[:dice.randrange(1, 11)]
+                for step in self.told(text, asked):
+                    result = self.index.search(step["typed"], within=result, **asked)
+                    with self.subTest(text=step["typed"], sort_type=sort_type, asked=asked):
+                        self.assert_same(step, result)
 
     def test_result_is_a_sequence_until_it_is_closed(self):
         result = self.index.search("z")
@@ -200,8 +231,7 @@ class JavaTest(ModuleTest):
         return f"{text}:{matches} / {result.next_keys} / {result.candidates}{sections}"
 
     def test_finds_what_python_finds_and_keeps_the_rules_of_the_machine(self):
-        searches = [(text, asked) for text, asked, _ in SEARCHES]
-        searches += [("\U0001F600" * 10, {}), ("zh", {"not_contact": range(40)})]
+        searches = [*SEARCHES, ("\U0001F600" * 10, {}), ("zh", {"not_contact": range(40)})]
         expected = [self.line(*search) for search in searches]
         for path in (self.data / "files").glob("Contacts*"):
             path.unlink()

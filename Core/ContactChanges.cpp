@@ -70,26 +70,24 @@ void SetContacted(tag_ContactsStruct& record, int64_t llTime)
         static_cast<int32_t>(static_cast<uint32_t>(record.iTimesContacted) + 1U);
 }
 
-// The contact becomes the most recent one, in a store ordered by that.
-void SetContactedFirst(const CHeldRecords& store, int iSlot, int64_t llTime)
+// The contact becomes the most recent one, in a store ordered by that. Returns the capacity that
+// lifts the mark, 0 when it has to stay.
+int SetContactedFirst(const CHeldRecords& store, int iSlot, int64_t llTime)
 {
     const CWriteMapping mapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
     if (!mapping.IsOpen())
     {
         CStoreRegister::SetChangeLost(true);
-        return;
+        return 0;
     }
     CStoreRegister reg(*mapping.As<tag_ContactReg>());
     if (reg.Mark() != 0)
     {
-        return;
+        return 0;
     }
     SetContacted(store.Records()[iSlot], llTime);
     MoveToFront(store.Records(), iSlot);
-    if (store.Flush())
-    {
-        reg.Lift(store.Reg().iTotalNum, reg.Capacity(), STORE_ORDER_TIME);
-    }
+    return reg.Capacity();
 }
 
 // Without a store the build that writes the pinyin table never ended: names must not be kept by
@@ -254,12 +252,12 @@ bool CLocalizerLogic::PatchStore(int iDatabaseCount, int iRecordNum, long long* 
     CStorePatch patch(store.Records(), iStored, iCapacity, reg.SortType());
     const PATCH_RESULT eResult = ApplyChanges(*m_pDBOperator, patch, iRecordNum, pIds);
     patch.Cover(iDatabaseCount);
-    store.Reg().iTotalNum = iDatabaseCount;
-    if (eResult == PATCH_DONE && patch.Count() == iDatabaseCount && store.Flush())
-    {
-        reg.Lift(iDatabaseCount, iCapacity, reg.SortType());
-    }
+    reg.SetCount(iDatabaseCount);
     store.Release();
+    if (eResult == PATCH_DONE && patch.Count() == iDatabaseCount)
+    {
+        CStoreRegister::Lift(iCapacity, reg.SortType());
+    }
     QV_LOGD(QV_LOG_TAG, "QV_Contacts: OnContactsTablePartChanged1 EXIT takes %d", watch.Elapsed());
     return eResult != PATCH_FULL;
 }
@@ -309,10 +307,8 @@ bool CLocalizerLogic::RefreshOnlineStatus()
     }
     tag_ContactsInfo stored = {iStored, store.Records()};
     m_pDBOperator->ReadAllSmsOnlineStatus(&stored, 0, nullptr);
-    if (store.Flush())
-    {
-        reg.Lift(iStored, reg.Capacity(), reg.SortType());
-    }
+    store.Release();
+    CStoreRegister::Lift(reg.Capacity(), reg.SortType());
     return true;
 }
 
@@ -326,7 +322,9 @@ void CLocalizerLogic::OnContactTimeChanged(long iContactID, long long llTime)
     }
     if (store.Reg().iSortType == STORE_ORDER_TIME && iSlot > 0)
     {
-        SetContactedFirst(store, iSlot, llTime);
+        const int iCapacity = SetContactedFirst(store, iSlot, llTime);
+        store.Release();
+        CStoreRegister::Lift(iCapacity, STORE_ORDER_TIME);
     }
     else
     {

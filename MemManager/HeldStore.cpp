@@ -5,8 +5,6 @@
 #include "MemManager/LockAttempts.h"
 #include "MemManager/MemManger.h"
 
-#include <sys/mman.h>
-
 namespace
 {
 
@@ -41,8 +39,9 @@ bool WaitForLock(CStoreLock* pLock, unsigned int uPause, const char* szRefused)
 
 void MarkForLostChange()
 {
+    CWriterLock writer;
     CStoreLock lock;
-    if (TryStoreLock(&lock, [](int) {}))
+    if (TryStoreLock(&lock, [](int) {}) && writer.Take())
     {
         MarkOrRemember();
     }
@@ -55,7 +54,8 @@ void MarkForLostChange()
 CHeldStore::CHeldStore(CMemManger& manager)
     : m_manager(manager),
       m_bLocked(WaitForStoreLock([&manager] { return manager.TryLockMemo(); }, PATCH_LOCK_PAUSE,
-                                 "QV_Contacts: OnContactsTableChanged1 Lock share mem false"))
+                                 "QV_Contacts: OnContactsTableChanged1 Lock share mem false") &&
+                m_writer.Take())
 {
 }
 
@@ -82,11 +82,6 @@ HOLD_RESULT CHeldStore::Open()
     return HOLD_READY;
 }
 
-bool CHeldStore::Flush() const
-{
-    return m_pRecords == nullptr || msync(m_pRecords, StoreBytes(m_iMappedSlots), MS_SYNC) == 0;
-}
-
 void CHeldStore::Release()
 {
     m_manager.CloseWriteShareMem();
@@ -94,7 +89,7 @@ void CHeldStore::Release()
 }
 
 CHeldRecords::CHeldRecords(const char* szRefused)
-    : m_bLocked(WaitForLock(&m_lock, RECORD_LOCK_PAUSE, szRefused))
+    : m_bLocked(WaitForLock(&m_lock, RECORD_LOCK_PAUSE, szRefused) && m_writer.Take())
 {
 }
 
@@ -116,6 +111,12 @@ bool CHeldRecords::Open()
         MarkOrRemember();
     }
     return false;
+}
+
+void CHeldRecords::Release()
+{
+    m_records.Close();
+    m_lock.Release();
 }
 
 int CHeldRecords::Find(long iContactID)

@@ -1,12 +1,13 @@
 #ifndef QV_MEMMANAGER_HELDSTORE_H
 #define QV_MEMMANAGER_HELDSTORE_H
 
-// The store as the change handlers hold it: the lock, which they wait for without limit as long
-// as somebody else holds it, then the write mappings. A lock file that cannot be opened is given
-// up after five attempts. Whatever keeps a change out of the store marks the store, so that the
-// next notification of contacts or status brings the change in.
+// The store as the change handlers hold it: the store lock, which they wait for without limit as
+// long as somebody else holds it, the writer lock, then the write mappings. A lock file that cannot
+// be opened is given up after five attempts. Whatever keeps a change out of the store marks the
+// store, so that the next notification of contacts or status brings the change in.
 
 #include "MemManager/Files/MappingGuards.h"
+#include "MemManager/Files/WriterLock.h"
 #include "MemManager/StoreRegister.h"
 
 class CMemManger;
@@ -33,17 +34,17 @@ public:
 
     // Maps both files; a missing store is not created.
     HOLD_RESULT Open();
+    // Releases the mappings and the store lock; the writer lock stays.
     void Release();
 
     // What HOLD_READY gives.
     tag_ContactsStruct* Records() const { return m_pRecords; }
     tag_ContactReg& Reg() const { return *m_pReg; }
     int MappedSlots() const { return m_iMappedSlots; }
-    // Brings the changed records to the disk; false when that may have failed.
-    bool Flush() const;
 
 private:
     CMemManger& m_manager;
+    CWriterLock m_writer;
     bool m_bLocked;
     tag_ContactsStruct* m_pRecords = nullptr;
     tag_ContactReg* m_pReg = nullptr;
@@ -61,11 +62,13 @@ public:
     // What Find found.
     tag_ContactsStruct* Records() const { return m_records.As<tag_ContactsStruct>(); }
     const tag_ContactReg& Reg() const { return m_reg; }
-    bool Flush() const { return m_records.Flush(); }
+    // Releases the mapping and the store lock; the writer lock stays.
+    void Release();
 
 private:
     bool Open();
 
+    CWriterLock m_writer;
     CStoreLock m_lock; // released behind the mapping
     bool m_bLocked;
     tag_ContactReg m_reg = {};

@@ -22,9 +22,9 @@
 //  - marked, with the new iTotalNum: the new index, whole.
 // In the last two the next notification of changed contacts or status rebuilds the store, because
 // iTotalNum, or the database's count where iTotalNum is 0, exceeds iMemSize. Readers under the lock
-// meet these states only after a writer died; GetMemSize and GetSortType take no lock and may also
-// see the mark while a change is under way. A damaged record acts like a file that cannot be
-// mapped, with an error line.
+// meet the first two only after a writer died, the third also while it waits for the disk;
+// GetMemSize and GetSortType take no lock and may also see the mark while a change is under way. A
+// damaged record acts like a file that cannot be mapped, with an error line.
 //
 // Result sets. A set made here is one object from scalar new and, when it has entries, one array
 // from array new; no two sets share an array. The receiver releases a set with FreeSearchResult.

@@ -2,6 +2,7 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
+#include "MemManager/Files/WriterLock.h"
 #include "MemManager/LockAttempts.h"
 #include "MemManager/RecordSlots.h"
 #include "MemManager/StoreRegister.h"
@@ -32,8 +33,8 @@ int WriteRecords(const tag_ContactsInfo& info, STORE_STATE eOldState)
     {
         return -1;
     }
-    CWriteMapping records(CDataPaths::ContactRecords(),
-                          StoreBytes(info.RecordNum + STORE_SPARE_RECORDS));
+    const CWriteMapping records(CDataPaths::ContactRecords(),
+                                StoreBytes(info.RecordNum + STORE_SPARE_RECORDS));
     if (!records.IsOpen() || CStoreRegister::MarkFile() != 0)
     {
         return -1;
@@ -43,24 +44,40 @@ int WriteRecords(const tag_ContactsInfo& info, STORE_STATE eOldState)
     {
         WriteSlot(pSlots + i, info.pContacts + i);
     }
-    return records.Flush() ? 0 : -1;
+    return 0;
 }
 
-BUILD_RESULT WriteReg(int iTotalNum, STORE_STATE eOldState, int iSortedBy)
+// The record of a marked store; a new one counts as marked, too.
+int WriteReg(int iTotalNum, STORE_STATE eOldState, int iSortedBy)
 {
     const CWriteMapping mapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
     if (!mapping.IsOpen())
     {
-        return BUILD_FAILED;
+        return -1;
     }
     auto& reg = *mapping.As<tag_ContactReg>();
     if (!CStoreRegister::HasRecord(eOldState))
     {
         reg.iSortType = iSortedBy; // there was none to keep
     }
-    const int iCapacity = iTotalNum + STORE_SPARE_RECORDS;
-    return CStoreRegister(reg).Lift(iTotalNum, iCapacity, iSortedBy) ? BUILD_DONE
-                                                                     : BUILD_OUT_OF_ORDER;
+    CStoreRegister(reg).SetCount(iTotalNum);
+    return 0;
+}
+
+// Under both locks: everything but lifting the mark. 0 or -1.
+int WriteMarked(const tag_ContactsInfo& info, const int* piSortedBy, int* piSortType)
+{
+    tag_ContactReg regOld = {};
+    const STORE_STATE eOldState = CStoreRegister::Inspect(&regOld);
+    if (eOldState == STORE_UNREADABLE)
+    {
+        return -1; // its sort type would be lost
+    }
+    const int iWritten =
+        info.pContacts != nullptr ? WriteRecords(info, eOldState) : CStoreRegister::MarkFile();
+    const bool bAnyOrder = piSortedBy == nullptr || info.RecordNum == 0;
+    *piSortType = bAnyOrder ? regOld.iSortType : *piSortedBy;
+    return iWritten == 0 ? WriteReg(info.RecordNum, eOldState, *piSortType) : -1;
 }
 
 } // namespace
@@ -71,21 +88,20 @@ BUILD_RESULT CStoreBuild::Write(const tag_ContactsInfo& info, const int* piSorte
     {
         return BUILD_FAILED;
     }
+    int iSortedBy = STORE_ORDER_NAME;
+    CWriterLock writer;
     CStoreLock lock;
-    if (!TakeLockForBuild(&lock))
+    if (!TakeLockForBuild(&lock) || !writer.Take() ||
+        WriteMarked(info, piSortedBy, &iSortedBy) != 0)
     {
         return BUILD_FAILED;
     }
-    tag_ContactReg regOld = {};
-    const STORE_STATE eOldState = CStoreRegister::Inspect(&regOld);
-    if (eOldState == STORE_UNREADABLE)
-    {
-        return BUILD_FAILED; // its sort type would be lost
-    }
-    if (info.pContacts != nullptr && WriteRecords(info, eOldState) != 0)
+    lock.Release();
+    const LIFT_RESULT eResult =
+        CStoreRegister::Lift(info.RecordNum + STORE_SPARE_RECORDS, iSortedBy);
+    if (eResult == LIFT_FAILED)
     {
         return BUILD_FAILED;
     }
-    const bool bAnyOrder = piSortedBy == nullptr || info.RecordNum == 0;
-    return WriteReg(info.RecordNum, eOldState, bAnyOrder ? regOld.iSortType : *piSortedBy);
+    return eResult == LIFT_OUT_OF_ORDER ? BUILD_OUT_OF_ORDER : BUILD_DONE;
 }

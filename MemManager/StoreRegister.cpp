@@ -2,13 +2,17 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
+#include "MemManager/Files/Descriptor.h"
 #include "MemManager/Files/MappingGuards.h"
+#include "MemManager/Files/StoreFile.h"
 
 #include <algorithm>
 #include <atomic>
 #include <cerrno>
+#include <fcntl.h>
 #include <sys/mman.h>
 #include <sys/stat.h>
+#include <unistd.h>
 
 namespace
 {
@@ -92,6 +96,30 @@ tag_ContactReg Copy(const tag_ContactReg& mapped)
 int Flush(tag_ContactReg& reg)
 {
     return msync(&reg, sizeof(reg), MS_SYNC);
+}
+
+// Brings the records to the disk; false when that may have failed. A store that was empty from the
+// first has no file.
+bool FlushRecords()
+{
+    const CDescriptor file(OpenStoreFile(CDataPaths::ContactRecords(), O_RDWR));
+    return file.IsOpen() ? fdatasync(file.Get()) == 0 : errno == ENOENT;
+}
+
+// Puts the capacity back unless the sort type is not, or no longer, the one sorted by.
+LIFT_RESULT SetCapacity(tag_ContactReg& reg, int iCapacity, int iSortedBy)
+{
+    if (Load(reg.iSortType) != iSortedBy)
+    {
+        return LIFT_OUT_OF_ORDER;
+    }
+    Store(reg.iMemSize, iCapacity);
+    if (Load(reg.iSortType) == iSortedBy)
+    {
+        return LIFT_DONE;
+    }
+    Store(reg.iMemSize, 0);
+    return LIFT_OUT_OF_ORDER;
 }
 
 } // namespace
@@ -188,18 +216,18 @@ int CStoreRegister::Mark()
     return Flush(m_reg);
 }
 
-bool CStoreRegister::Lift(int iTotalNum, int iCapacity, int iSortedBy)
+void CStoreRegister::SetCount(int iTotalNum)
 {
     Store(m_reg.iTotalNum, iTotalNum);
-    if (Load(m_reg.iSortType) != iSortedBy)
+}
+
+LIFT_RESULT CStoreRegister::Lift(int iCapacity, int iSortedBy)
+{
+    if (iCapacity == 0 || !FlushRecords())
     {
-        return false;
+        return LIFT_FAILED;
     }
-    Store(m_reg.iMemSize, iCapacity);
-    if (Load(m_reg.iSortType) == iSortedBy)
-    {
-        return true;
-    }
-    Store(m_reg.iMemSize, 0);
-    return false;
+    const CWriteMapping mapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
+    return mapping.IsOpen() ? SetCapacity(*mapping.As<tag_ContactReg>(), iCapacity, iSortedBy)
+                            : LIFT_FAILED;
 }

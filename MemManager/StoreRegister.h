@@ -3,12 +3,14 @@
 
 // The registration record and its dirty flag: a capacity of 0, called the mark.
 //
-// Protocol of every change to stored records, under the store lock:
-//   1. Mark: the capacity becomes 0, on the disk too, before the first record changes;
-//   2. the records change and are flushed to the disk;
-//   3. Lift: the count, then the capacity.
-// A writer that fails or dies in between, and a machine that loses power, leave the mark, and the
-// next notification of contacts or status (or MemInit) rebuilds the index.
+// Protocol of every change to stored records, under the writer lock:
+//   1. Mark, under the store lock too: the capacity becomes 0, on the disk too, before the first
+//      record changes;
+//   2. the records change, then the count; the store lock is released;
+//   3. Lift: the records are flushed to the disk, then the capacity is put back.
+// While the disk is waited for, searches find the new index. A writer that fails or dies before 3
+// is done, and a machine that loses power, leave the mark, and the next notification of contacts
+// or status (or MemInit) rebuilds the index.
 
 #include "Core/Records/ContactRecords.h"
 
@@ -32,6 +34,13 @@ enum STORE_STATE
     STORE_WHOLE
 };
 
+enum LIFT_RESULT
+{
+    LIFT_DONE,
+    LIFT_FAILED,      // the mark stays: there was no capacity, or the disk may lack records
+    LIFT_OUT_OF_ORDER // the mark stays: the sort type was set meanwhile
+};
+
 class CStoreRegister
 {
 public:
@@ -49,8 +58,11 @@ public:
     // Whether the states that have a record: marked or whole.
     static bool HasRecord(STORE_STATE eState);
 
-    // Marks the record in the file, if there is one. 0, or -1 when that failed. Under the lock.
+    // Marks the record in the file, if there is one. 0, or -1 when that failed. Under both locks.
     static int MarkFile();
+
+    // Step 3, under the writer lock. iSortedBy is the sort type that the records are sorted by.
+    static LIFT_RESULT Lift(int iCapacity, int iSortedBy);
 
     // Sets the sort type of an existing record and marks it, on the disk too. Needs no lock: a
     // writer that lifts its mark at the same time notices. Nothing is changed or created in any
@@ -62,7 +74,7 @@ public:
     static bool IsChangeLost();
     static void SetChangeLost(bool bLost);
 
-    // The mapped record of a writer that holds the lock; it is not owned. Sort type and capacity
+    // The mapped record of a writer that holds both locks; it is not owned. Sort type and capacity
     // are those of construction: a capacity above 0 says that the records are in that order.
     explicit CStoreRegister(tag_ContactReg& reg);
     int SortType() const { return m_iSortType; }
@@ -70,9 +82,8 @@ public:
 
     // Step 1. 0, or -1 when the mark may not have reached the disk: nothing may be changed then.
     int Mark();
-    // Step 3, after the records have reached the disk. The mark stays, and false is returned, when
-    // the stored sort type is not, or no longer, the one that the records are sorted by.
-    bool Lift(int iTotalNum, int iCapacity, int iSortedBy);
+    // The end of step 2.
+    void SetCount(int iTotalNum);
 
 private:
     tag_ContactReg& m_reg;

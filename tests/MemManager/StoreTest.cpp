@@ -1,8 +1,10 @@
 // The store's files, its registration record and its lock, and the result sets made of it.
 
+#include "Common/SystemTime.h"
 #include "Filter/Filter.h"
 #include "Filter/FilterChain.h"
 #include "MemManager/ContactSelection.h"
+#include "MemManager/Files/WriterLock.h"
 #include "MemManager/MemManger.h"
 #include "MemManager/StoreRegister.h"
 #include "tests/Support/ChildProcess.h"
@@ -16,6 +18,7 @@
 #include <gtest/gtest.h>
 #include <memory>
 #include <sys/stat.h>
+#include <thread>
 
 namespace
 {
@@ -167,6 +170,21 @@ TEST_F(Store, CopiesAllRecordsOutAsSoonAsItHasTheLock)
     ASSERT_EQ(info->RecordNum, 5);
     EXPECT_EQ(std::memcmp(contacts.get(), vRecords.data(), 5 * 704), 0);
     EXPECT_EQ(m_log.Texts(ERROR_LINE), Lines{strRefusal});
+}
+
+TEST_F(Store, WaitsForAWriterThatWaitsForTheDisk)
+{
+    CWriterLock other;
+    ASSERT_TRUE(other.Take());
+    std::thread flusher(
+        [&other]
+        {
+            Sleep(20);
+            other.Release();
+        });
+    EXPECT_EQ(Build(MakeRecords(2)), 0);
+    flusher.join();
+    EXPECT_EQ(Reg(), (tag_ContactReg{2, 0, 1002}));
 }
 
 TEST_F(Store, HoldsTheLockUntilItIsReleased)
@@ -352,9 +370,11 @@ TEST_F(Store, TellsItsStates)
     EXPECT_EQ(CStoreRegister::Inspect(&reg), STORE_UNREADABLE);
     EXPECT_EQ(Build(MakeRecords(3)), -1) << "its sort type would be lost";
     // A sort type that is set while records are written in another order leaves the mark.
-    tag_ContactReg mapped = {3, 1, 0};
-    EXPECT_FALSE(CStoreRegister(mapped).Lift(4, 1003, 0));
-    EXPECT_EQ(mapped, (tag_ContactReg{4, 1, 0}));
-    EXPECT_TRUE(CStoreRegister(mapped).Lift(5, 1003, 1));
-    EXPECT_EQ(mapped, (tag_ContactReg{5, 1, 1003}));
+    fs::remove(CDataPaths::ContactReg());
+    SetReg({3, 1, 0});
+    EXPECT_EQ(CStoreRegister::Lift(1003, STORE_ORDER_NAME), LIFT_OUT_OF_ORDER);
+    EXPECT_EQ(CStoreRegister::Lift(0, STORE_ORDER_TIME), LIFT_FAILED);
+    EXPECT_EQ(Reg(), (tag_ContactReg{3, 1, 0}));
+    EXPECT_EQ(CStoreRegister::Lift(1003, STORE_ORDER_TIME), LIFT_DONE);
+    EXPECT_EQ(Reg(), (tag_ContactReg{3, 1, 1003}));
 }

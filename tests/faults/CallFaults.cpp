@@ -70,17 +70,16 @@ tag_Mapping* FindMapping(const void* pAddr)
     return pMapping;
 }
 
-void Tell(MAP_EVENT eEvent, const void* pAddr)
+void Tell(MAP_EVENT eEvent, const tag_Mapping& mapping)
 {
-    const tag_Mapping* pMapping = FindMapping(pAddr);
-    if (g_pWatch != nullptr && pMapping != std::end(g_aMappings))
+    if (g_pWatch != nullptr)
     {
         CMapWatch* pWatch = g_pWatch;
         const CALL_GROUP eGroup = g_failures.eGroup;
         const int iError = errno;
         g_pWatch = nullptr;
         g_failures.eGroup = CALLS_NONE;
-        pWatch->Happens(eEvent, *pMapping);
+        pWatch->Happens(eEvent, mapping);
         g_pWatch = pWatch;
         g_failures.eGroup = eGroup;
         errno = iError;
@@ -133,7 +132,7 @@ void Tell(MAP_EVENT eEvent, const void* pAddr)
         {                                                                                          \
             *pFree = {pMapped, uSize, iFlags == MAP_SHARED && (iProt & PROT_WRITE) != 0, ""};      \
             std::strcpy(pFree->szFile, g_aszFiles[iFd]);                                           \
-            Tell(MAP_MADE, pMapped);                                                               \
+            Tell(MAP_MADE, *pFree);                                                                \
         }                                                                                          \
         return pMapped;                                                                            \
     }
@@ -181,7 +180,18 @@ extern "C"
     // Nothing here outlives the machine: the disk is not waited for.
     int fdatasync(int iFd)
     {
-        return IsOurs(iFd) && Fails(CALLS_FILES, "fdatasync") ? -1 : 0;
+        if (!IsOurs(iFd))
+        {
+            return 0;
+        }
+        if (Fails(CALLS_FILES, "fdatasync"))
+        {
+            return -1;
+        }
+        tag_Mapping mapping = {nullptr, 0, true, ""};
+        std::strcpy(mapping.szFile, g_aszFiles[iFd]);
+        Tell(MAP_FLUSHED, mapping);
+        return 0;
     }
 
     int msync(void* pAddr, size_t /*uSize*/, int iFlags)
@@ -190,9 +200,10 @@ extern "C"
         {
             return -1;
         }
-        if ((iFlags & MS_SYNC) != 0)
+        const tag_Mapping* pMapping = FindMapping(pAddr);
+        if ((iFlags & MS_SYNC) != 0 && pMapping != std::end(g_aMappings))
         {
-            Tell(MAP_FLUSHED, pAddr);
+            Tell(MAP_FLUSHED, *pMapping);
         }
         return 0;
     }
@@ -200,10 +211,11 @@ extern "C"
     int munmap(void* pAddr, size_t uSize) noexcept
     {
         QV_NEXT(munmap);
-        Tell(MAP_ENDS, pAddr);
-        if (FindMapping(pAddr) != std::end(g_aMappings))
+        tag_Mapping* pMapping = FindMapping(pAddr);
+        if (pMapping != std::end(g_aMappings))
         {
-            FindMapping(pAddr)->pAddr = nullptr;
+            Tell(MAP_ENDS, *pMapping);
+            pMapping->pAddr = nullptr;
         }
         return pfnNext(pAddr, uSize);
     }

@@ -204,7 +204,7 @@ TEST(Faults, ReadsRecordsUnderTheLock)
     for (const tag_Operation& reading : AllReadings())
     {
         tag_Answer answer;
-        CStoreStepper stepper(*steps, false);
+        CStoreStepper stepper(*steps);
         reading.pfnRun(logic, answer);
         EXPECT_EQ(stepper.Fault(), "") << reading.szName;
         logic.FreeSearchResult(answer.pResult);
@@ -233,7 +233,7 @@ TEST_P(CStoreByStore, IsMarkedOrRight)
     {
         CLocalizerLogic logic;
         tag_Answer answer;
-        CStoreStepper stepper(*steps, store.Is("SortType"));
+        CStoreStepper stepper(*steps);
         pfnRun(logic, answer);
         return stepper.Fault();
     };

@@ -4,6 +4,7 @@
 #include "tests/Support/StoreFiles.h"
 
 #include <algorithm>
+#include <cerrno>
 #include <csignal>
 #include <cstring>
 #include <fcntl.h>
@@ -31,6 +32,14 @@ tag_Steps* g_pSteps;
 tag_Region g_window; // that is writable for one instruction
 bool g_bWindowOfReg;
 char g_acBefore[WINDOW];
+
+bool IsLocked(const std::string& strPath)
+{
+    const int iFd = open(strPath.c_str(), O_RDONLY);
+    const bool bLocked = flock(iFd, LOCK_EX | LOCK_NB) != 0 && errno == EWOULDBLOCK;
+    close(iFd);
+    return bLocked;
+}
 
 #if defined(__x86_64__) && !defined(__SANITIZE_ADDRESS__)
 constexpr bool CAN_STEP = true;
@@ -106,7 +115,7 @@ bool CStoreStepper::IsPossible()
     return CAN_STEP;
 }
 
-CStoreStepper::CStoreStepper(tag_Steps& steps, bool bSetsSortType) : m_bSetsSortType(bSetsSortType)
+CStoreStepper::CStoreStepper(tag_Steps& steps)
 {
     g_pSteps = &steps;
     steps.uSteps = 0;
@@ -129,9 +138,9 @@ void CStoreStepper::Happens(MAP_EVENT eEvent, const tag_Mapping& mapping)
 {
     const bool bReg = std::strcmp(mapping.szFile, REG_FILE) == 0;
     const bool bRecords = std::strcmp(mapping.szFile, RECORDS_FILE) == 0;
-    if (bRecords || (bReg && mapping.bWritten && eEvent == MAP_MADE && !m_bSetsSortType))
+    if (bRecords)
     {
-        RequireLock(mapping.szFile);
+        ExamineLocks(eEvent == MAP_FLUSHED);
     }
     if (!CAN_STEP || !mapping.bWritten || (!bReg && !bRecords))
     {
@@ -154,12 +163,15 @@ void CStoreStepper::Happens(MAP_EVENT eEvent, const tag_Mapping& mapping)
     }
 }
 
-void CStoreStepper::RequireLock(const char* szWhat)
+void CStoreStepper::ExamineLocks(bool bFlushes)
 {
-    const int iFd = open(CDataPaths::LockFile(), O_RDWR | O_CREAT, 0777);
-    if (flock(iFd, LOCK_EX | LOCK_NB) == 0)
+    const std::string strLock = CDataPaths::LockFile();
+    if (IsLocked(strLock) == bFlushes)
     {
-        m_strFault = std::string("no lock around ") + szWhat;
+        m_strFault = bFlushes ? "searches wait for the disk" : "no lock around records";
     }
-    close(iFd);
+    if (bFlushes && !IsLocked(strLock.substr(0, strLock.rfind('/'))))
+    {
+        m_strFault = "another writer may lift the mark";
+    }
 }

@@ -35,15 +35,15 @@ struct tag_Steps
 
 // Steps over each store to the store files' shared mappings while it is watching: they are
 // read-only, and the instruction that is refused runs alone with its pages writable. And sees that
-// the lock is held around each mapping of records and each write mapping of the registration
-// record, but for the sort type, which is set without it.
+// the store lock is held around each mapping of records, and the writer lock alone while they are
+// flushed.
 class CStoreStepper : public CMapWatch
 {
 public:
     // Where steps cannot be taken, only the mappings are looked at.
     static bool IsPossible();
 
-    CStoreStepper(tag_Steps& steps, bool bSetsSortType);
+    explicit CStoreStepper(tag_Steps& steps);
     ~CStoreStepper();
     CStoreStepper(const CStoreStepper&) = delete;
     CStoreStepper& operator=(const CStoreStepper&) = delete;
@@ -53,9 +53,8 @@ public:
     void Happens(MAP_EVENT eEvent, const tag_Mapping& mapping) override;
 
 private:
-    void RequireLock(const char* szWhat);
+    void ExamineLocks(bool bFlushes);
 
-    bool m_bSetsSortType;
     std::string m_strFault{};
 };
 

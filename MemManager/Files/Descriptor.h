@@ -1,0 +1,43 @@
+#ifndef QV_MEMMANAGER_FILES_DESCRIPTOR_H
+#define QV_MEMMANAGER_FILES_DESCRIPTOR_H
+
+#include <cerrno>
+#include <unistd.h>
+
+// An open file of its own; closed with the scope, without a change to errno.
+class CDescriptor
+{
+public:
+    explicit CDescriptor(int iFd = NONE) : m_iFd(iFd) {}
+    ~CDescriptor() { Reset(); }
+    CDescriptor(const CDescriptor&) = delete;
+    CDescriptor& operator=(const CDescriptor&) = delete;
+
+    bool IsOpen() const { return m_iFd >= 0; }
+    int Get() const { return m_iFd; }
+    // Closes what is open and owns iFd instead.
+    void Reset(int iFd = NONE)
+    {
+        if (IsOpen())
+        {
+            const int iError = errno;
+            close(m_iFd);
+            errno = iError;
+        }
+        m_iFd = iFd;
+    }
+    // Hands the descriptor over: the caller closes it.
+    int Detach()
+    {
+        const int iFd = m_iFd;
+        m_iFd = NONE;
+        return iFd;
+    }
+
+private:
+    static constexpr int NONE = -1;
+
+    int m_iFd; // negative when nothing is open
+};
+
+#endif

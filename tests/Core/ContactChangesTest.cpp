@@ -5,8 +5,6 @@
 #include "tests/Core/FacadeFixture.h"
 #include "tests/Support/ChildProcess.h"
 
-#include <algorithm>
-#include <filesystem>
 #include <functional>
 #include <random>
 
@@ -15,7 +13,6 @@ namespace
 
 using LongIds = std::vector<long long>;
 
-constexpr long long FIRST_TIME = 1'600'000'000'000;
 constexpr int CAPACITY = 8 + STORE_SPARE_RECORDS;
 
 class CContactChangesTest : public CFacadeTest
@@ -24,85 +21,15 @@ protected:
     // Contacts 1 to 8 of every kind of name, last contacted in the order of their ids.
     void BuildStore(int iSortType = STORE_ORDER_NAME)
     {
-        std::vector<tag_ProviderContact> vContacts;
-        for (const char* szName : {"张安", "李四", "Tom", "王小明", "", "7-11", "阿明", "Anna"})
-        {
-            vContacts.push_back(Contact(static_cast<int>(vContacts.size()) + 1, szName));
-        }
-        Store(vContacts);
-        ASSERT_EQ(m_logic.MemInit(true), 0);
-        m_logic.SetSortType(iSortType);
-        ASSERT_EQ(m_logic.MemInit(true), 0);
-        m_log.Clear();
-    }
-
-    static tag_ProviderContact Contact(int iId, const std::string& strName)
-    {
-        tag_ProviderContact contact;
-        contact.iId = iId;
-        contact.strName = strName;
-        contact.llLastTime = FIRST_TIME + iId % 20 * 1000LL;
-        contact.iStatusId = 1000 + iId;
-        return contact;
+        SetReg({0, iSortType, 0});
+        BuildNames({"张安", "李四", "Tom", "王小明", "", "7-11", "阿明", "Anna"});
     }
 
     void Notify(LongIds vIds)
     {
         m_logic.OnContactsTableChanged(static_cast<int>(vIds.size()), vIds.data());
     }
-    void NotifyStatus() { m_logic.OnStatusUpdatesTableChanged(0, nullptr); }
-
-    static int SlotOf(int iId)
-    {
-        const Records vRecords = ReadStore().vRecords;
-        int iSlot = static_cast<int>(vRecords.size()) - 1;
-        while (iSlot >= 0 && vRecords[static_cast<size_t>(iSlot)].iContactID != iId)
-        {
-            --iSlot;
-        }
-        return iSlot;
-    }
 };
-
-TEST_F(CContactChangesTest, TellsEachStepAndRenewsAContactInItsSlot)
-{
-    BuildStore(STORE_ORDER_TIME);
-    tag_ProviderContact contact = Contact(4, "王小明");
-    contact.bPhone = true;
-    contact.llLastTime += 100'000; // told by no time notification: the slot stays all the same
-    Store({contact});
-    const size_t uSlot = static_cast<size_t>(SlotOf(4));
-    m_log.Clear();
-    Notify({4});
-    NotifyStatus();
-    m_logic.OnContactTimeChanged(999, 1);
-    m_logic.OnContactStarChanged(999, 1);
-    m_logic.OnContactsTableChanged(1, nullptr);
-    long long llUnused = 0;
-    m_logic.OnContactsTableChanged(0, &llUnused);
-    const tag_ContactsStruct record = ReadStore().vRecords.at(uSlot);
-    EXPECT_EQ(record.llLastTimeContacted, FIRST_TIME + 104'000);
-    EXPECT_EQ(record.iFlags, CONTACT_FLAG_PHONE);
-    EXPECT_EQ(record.iSortIndex, 4) << "its place by name";
-    m_logic.OnContactsTableChanged();
-    const std::string strAll = "[3 QV_Localize] QV_Contacts: OnContactsTable";
-    const std::string strPatch = strAll + "Changed1 ";
-    const std::string strPart = strAll + "PartChanged1 ";
-    EXPECT_EQ(Told("QV_Contacts: On"),
-              strPatch + "iRecordNum = 1\n" + strPatch +
-                  "m_pclMemManger->GetMemSize; memSize = 1008 memContactsNum = 8" + strPatch +
-                  "GetContactsCount = 8\n" + strPatch + "contactCount less than memSize, right!" +
-                  strPatch + "old contact count = 8\n" + strPatch + "stRecord.RecordNum: 1" +
-                  strPatch + "found same item, renew it k=0, stRecord.RecordNum=0" + strPart +
-                  "find matchedNum=0, stRecord.RecordNum=0" + strPart + "EXIT takes ms" + strPatch +
-                  "old contact count = 8\n" + strPatch + "iRecordNum = 0\n" + strAll +
-                  "Changed  iSortType = 1\n" + strAll + "Changed stRecord.num = 8 \n");
-    EXPECT_EQ(m_logic.OnGetSortType(), STORE_ORDER_TIME);
-    Store({Contact(9, "阿")});
-    Notify({9});
-    EXPECT_EQ(ReadStore().vRecords.at(1).iSortIndex, 1) << "its slot in time order";
-    ExpectFresh();
-}
 
 // Random changes of many contacts with many equal names and times, told by every handler.
 class CAnyChanges : public CContactChangesTest, public testing::WithParamInterface<int>
@@ -115,18 +42,16 @@ protected:
         const char* szNames[] = {"张三", "张山", "zhang", "Tom",  "tom",
                                  "",     "9",    "重庆",  "張三", "李Lee"};
         const std::string strName = szNames[Pick(10)];
-        const int iKind = Pick(4);
-        if (SlotOf(iId) < 0)
+        switch (Pick(5))
         {
-            Store({Contact(iId, strName)});
-        }
-        else if (iKind < 2)
-        {
-            iKind == 0 ? m_provider.Remove(iId) : m_provider.SetVisible(iId, false);
-        }
-        else
-        {
-            m_provider.SetStarred(iId, iKind == 2);
+        case 0:
+            return m_provider.Remove(iId);
+        case 1:
+            return m_provider.SetVisible(iId, false);
+        case 2:
+            return Store({Contact(iId, strName)});
+        default:
+            m_provider.SetStarred(iId, Pick(2) == 0);
             m_provider.SetName(iId, strName, LocalizerKeyOf(strName));
         }
     }
@@ -142,7 +67,6 @@ protected:
         }
         Notify(vIds);
         EXPECT_FALSE(IsMarked(Reg()));
-        NotifyStatus();
     }
 
     // A time, a star and an online state, also of contacts that are not stored.
@@ -157,7 +81,6 @@ protected:
         m_provider.SetStarred(iId, lStarred == 1);
         m_logic.OnContactStarChanged(iId, lStarred);
         m_provider.SetOnline(1001 + Pick(60), Pick(2) == 0);
-        NotifyStatus();
     }
 
     std::mt19937 m_random{20260401};
@@ -167,10 +90,11 @@ protected:
 TEST_P(CAnyChanges, EndLikeAFreshBuild)
 {
     BuildStore(GetParam());
-    for (int iRound = 0; iRound < 60; ++iRound)
+    for (int iRound = 0; iRound < 80; ++iRound)
     {
         SCOPED_TRACE(iRound);
         Pick(2) == 0 ? ChangeOthers() : ChangeContacts();
+        m_logic.OnStatusUpdatesTableChanged(0, nullptr);
         EXPECT_EQ(Reg().iMemSize, CAPACITY) << "patched, not rebuilt";
         ExpectFresh();
     }
@@ -178,38 +102,66 @@ TEST_P(CAnyChanges, EndLikeAFreshBuild)
 
 INSTANTIATE_TEST_SUITE_P(Orders, CAnyChanges, testing::Values(STORE_ORDER_NAME, STORE_ORDER_TIME));
 
+// Who keeps his name keeps his slot, whatever else the database tells.
+TEST_F(CContactChangesTest, RenewsAContactInItsSlot)
+{
+    BuildStore(STORE_ORDER_TIME);
+    const Records vBefore = ReadStore().vRecords;
+    tag_ProviderContact contact = Contact(4, "王小明");
+    contact.bPhone = true;
+    contact.llLastTime += 100'000; // told by no time notification
+    Store({contact});
+    Notify({4});
+    const tag_ContactsStruct record = ReadStore().vRecords.at(4);
+    EXPECT_EQ(vBefore.at(4).iContactID, 4);
+    EXPECT_EQ(record.llLastTimeContacted, contact.llLastTime);
+    EXPECT_EQ(record.iFlags, CONTACT_FLAG_PHONE);
+    EXPECT_EQ(record.iSortIndex, vBefore.at(4).iSortIndex) << "its place by name";
+    m_logic.OnContactsTableChanged();
+    Store({Contact(9, "阿")});
+    Notify({9});
+    EXPECT_EQ(ReadStore().vRecords.at(1).iSortIndex, 1) << "its slot in time order";
+    ExpectFresh();
+}
+
 // Lists that the reader would cut or misread, and stores that cannot take the change.
 TEST_F(CContactChangesTest, RebuildsWhereAPatchCannotDo)
 {
     const struct
     {
         const char* szWhat;
-        LongIds vIds;
+        LongIds vIds; // none: a status notification
         tag_ContactReg reg;
-        bool bStatusToo; // a status notification rebuilds too
     } ROWS[] = {
-        {"201 ids", LongIds(201, 9), {8, 0, CAPACITY}, false},
-        {"200 long ids", LongIds(200, 1'000'000'000), {8, 0, CAPACITY}, false},
-        {"an id beyond 32 bits", {(1LL << 32) + 9}, {8, 0, CAPACITY}, false},
-        {"no room for the database", {9}, {8, 0, 8}, false},
-        {"no capacity", {9}, {8, 0, 0}, true},
-        {"more contacts than capacity", {9}, {8, 0, 7}, true},
-        {"a writer died before it counted", {9}, {0, 0, 0}, true},
-        {"a damaged record", {9}, {-1, 0, CAPACITY}, true},
-        {"a record of a larger store", {9}, {5000, 0, 6000}, true},
+        {"201 ids", LongIds(201, 9), {8, 0, CAPACITY}},
+        {"200 long ids", LongIds(200, 1'000'000'000), {8, 0, CAPACITY}},
+        {"an id beyond 32 bits", {(1LL << 32) + 9}, {8, 0, CAPACITY}},
+        {"no room for the database", {9}, {8, 0, 8}},
+        {"no capacity", {9}, {8, 0, 0}},
+        {"no capacity", {}, {8, 0, 0}},
+        {"more contacts than capacity", {9}, {8, 0, 7}},
+        {"more contacts than capacity", {}, {8, 0, 7}},
+        {"a writer died before it counted", {9}, {0, 0, 0}},
+        {"a writer died before it counted", {}, {0, 0, 0}},
+        {"a damaged record", {9}, {-1, 0, CAPACITY}},
+        {"a damaged record", {}, {-1, 0, CAPACITY}},
+        {"a record of a larger store", {9}, {5000, 0, 6000}},
+        {"a record of a larger store", {}, {5000, 0, 6000}},
     };
     for (const auto& row : ROWS)
     {
-        for (int iStatus = 0; iStatus <= (row.bStatusToo ? 1 : 0); ++iStatus)
+        SCOPED_TRACE(row.szWhat);
+        m_provider.Remove(9);
+        BuildStore();
+        Store({Contact(9, "新")});
+        SetReg(row.reg);
+        Notify(row.vIds);
+        if (row.vIds.empty())
         {
-            m_provider.Remove(9);
-            BuildStore();
-            Store({Contact(9, "新")});
-            SetReg(row.reg);
-            iStatus == 1 ? NotifyStatus() : Notify(row.vIds);
-            ExpectFresh(row.szWhat);
-            EXPECT_EQ(Reg(), (tag_ContactReg{9, 0, CAPACITY + 1})) << row.szWhat;
+            m_logic.OnStatusUpdatesTableChanged(0, nullptr);
         }
+        ExpectFresh();
+        EXPECT_EQ(Reg(), (tag_ContactReg{9, 0, CAPACITY + 1}));
     }
     // A contact that went without being told still takes the room of a new one.
     m_provider.Remove(1);
@@ -217,6 +169,20 @@ TEST_F(CContactChangesTest, RebuildsWhereAPatchCannotDo)
     SetReg({9, 0, 9});
     Notify({10});
     ExpectFresh();
+}
+
+TEST_F(CContactChangesTest, KnowTheSmallestStores)
+{
+    m_logic.OnStatusUpdatesTableChanged(0, nullptr);
+    EXPECT_FALSE(CDataDirectory::Exists(CDataPaths::ContactReg())) << "nobody to build for";
+    BuildNames({"张"});
+    for (const auto& [before, after] :
+         {std::pair(tag_ContactReg{1, 0, 1}, 1), std::pair(tag_ContactReg{0, 0, 0}, 1001)})
+    {
+        SetReg(before);
+        m_logic.OnStatusUpdatesTableChanged(0, nullptr);
+        EXPECT_EQ(Reg(), (tag_ContactReg{1, 0, after}));
+    }
 }
 
 // A change that could not be written is not forgotten: the next notification makes up for it.
@@ -250,7 +216,7 @@ TEST_F(CContactChangesTest, MarksAStoreWhoseChangeFailed)
         EXPECT_EQ(Reg(), (tag_ContactReg{row.iTotalNum, 0, 0}));
         EXPECT_EQ(ReadStore().vRecords.back().iContactID == 0, row.iTotalNum > 8) << "cleared";
         row.fnRepair();
-        NotifyStatus();
+        m_logic.OnStatusUpdatesTableChanged(0, nullptr);
         ExpectFresh();
     }
 }
@@ -260,29 +226,27 @@ TEST_F(CContactChangesTest, WaitForTheLock)
 {
     const std::pair<std::string, std::function<void()>> ROWS[] = {
         {"OnContactsTableChanged1", [this] { Notify({3}); }},
-        {"OnContactsTableChanged1", [this] { NotifyStatus(); }},
+        {"OnContactsTableChanged1", [this] { m_logic.OnStatusUpdatesTableChanged(0, nullptr); }},
         {"OnContactTimeChanged", [this] { m_logic.OnContactTimeChanged(999, 1); }},
         {"OnContactStarChanged", [this] { m_logic.OnContactStarChanged(999, 1); }},
     };
     BuildStore();
-    for (const auto& [strHandler, fnCall] : ROWS)
+    for (const auto& row : ROWS)
     {
-        const std::string strRefusal = "QV_Contacts: " + strHandler + " Lock share mem false";
-        int iRefusals = 0;
         CLockHolder holder;
+        int iRefusals = 0;
         m_log.AtEachLine(
             [&](const std::string& strText)
             {
-                iRefusals += strText == strRefusal ? 1 : 0;
+                iRefusals += strText == "QV_Contacts: " + row.first + " Lock share mem false";
                 if (iRefusals == 7)
                 {
-                    holder.Kill();
+                    holder.Release();
                 }
             });
-        fnCall();
-        EXPECT_EQ(iRefusals, 7) << strHandler;
+        row.second();
+        EXPECT_EQ(iRefusals, 7) << row.first;
     }
-    m_log.AtEachLine(nullptr);
     ExpectFresh();
 }
 
@@ -300,27 +264,26 @@ TEST_F(CContactChangesTest, NoticesASortTypeThatIsSetMeanwhile)
         {"stRecord.num", [this] { m_logic.OnContactsTableChanged(); }, false},
         {"find matchedNum", [this] { Notify({3}); }, true},
     };
-    for (const int iSortType : {STORE_ORDER_NAME, STORE_ORDER_TIME})
+    for (int i = 0; i < 6; ++i)
     {
-        for (const auto& row : ROWS)
-        {
-            BuildStore(iSortType);
-            m_provider.Put(Contact(3, "Zoe"));
-            m_log.AtEachLine(
-                [&](const std::string& strText)
+        const auto& row = ROWS[i / 2];
+        const int iSortType = i % 2;
+        BuildStore(1 - iSortType);
+        Store({Contact(3, "Zoe")});
+        m_log.AtEachLine(
+            [&](const std::string& strText)
+            {
+                if (strText.find(row.szLine) != std::string::npos)
                 {
-                    if (strText.find(row.szLine) != std::string::npos)
-                    {
-                        CMemManger().SetSortType(1 - iSortType);
-                    }
-                });
-            row.fnCall();
-            m_log.AtEachLine(nullptr);
-            EXPECT_EQ(Reg().iSortType, 1 - iSortType) << row.szLine;
-            EXPECT_EQ(Reg().iMemSize == 0, row.bMarked) << row.szLine;
-            Notify({3});
-            ExpectFresh();
-        }
+                    CMemManger().SetSortType(iSortType);
+                }
+            });
+        row.fnCall();
+        m_log.AtEachLine(nullptr);
+        EXPECT_EQ(Reg().iSortType, iSortType) << row.szLine;
+        EXPECT_EQ(Reg().iMemSize == 0, row.bMarked) << row.szLine;
+        Notify({3});
+        ExpectFresh();
     }
 }
 

@@ -227,25 +227,4 @@ TEST_F(CSearchTest, FailsWithoutTouchingWhatItHandsOut)
     EXPECT_EQ(Search("警", SPECIAL).Contacts(), (Ids{0, 3, 6}));
 }
 
-TEST_F(CSearchTest, TellsEachStepInOrder)
-{
-    BuildNames({"张三", "李四"});
-    const tag_Found all = Search("");
-    m_log.Clear();
-    Search("z", WORD, nullptr, Chain(FILTER_GROUP, 99).get());
-    Search("l", WORD, all.set);
-    const std::string strLine = "[3 QV_Localize] QV_Contacts:";
-    const std::string strSearch = strLine + "DoSearch ";
-    EXPECT_EQ(Told(),
-              strLine + " Search Start\n" + strLine + "Lock TRY LOCK" + strLine + "LOCK RET = 1 " +
-                  strLine + "CopyContactsResult iContactCount = 2\n" + strLine +
-                  "UnLock TRY UNLOCK" + strLine + "UNLOCK RET = 1 " + strLine +
-                  " CopyContactsResult Filter Result Num = 0\n" + strLine +
-                  " Search CopyContactsResult time = ms\n" + strSearch +
-                  "m_vLocateArray nCount = 0\n" + strSearch + "QVLocalizerManger pMask = 0\n" +
-                  strLine + " Search IFL_Search time = ms\n" + strLine + " Search Start\n" +
-                  strSearch + "m_vLocateArray nCount = 1\n" + strSearch +
-                  "QVLocalizerManger pMask = 40100\n" + strLine + " Search IFL_Search time = ms\n");
-}
-
 } // namespace

@@ -10,7 +10,7 @@
 #include "tests/Support/ChildProcess.h"
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/MemoryFailure.h"
-#include "tests/Support/StoreFiles.h"
+#include "tests/Support/StoreImage.h"
 
 #include <algorithm>
 #include <cstring>
@@ -105,7 +105,7 @@ TEST_F(Store, IsRewritten)
     const Records vFew = MakeRecords(20, 1000);
     EXPECT_EQ(Build(vFew), 0);
     EXPECT_EQ(Reg(), (tag_ContactReg{20, 1, 1020}));
-    EXPECT_EQ(RecordsFile(),
+    EXPECT_EQ(ReadFiles().strRecords,
               BytesOf(vFew) + BytesOf(vOld).substr(20 * 704) + std::string(1000 * 704, '\0'))
         << "slots behind the new records keep what they held, the file its length";
     int iTotal = 0;
@@ -113,7 +113,7 @@ TEST_F(Store, IsRewritten)
     EXPECT_EQ(iTotal, 20);
     EXPECT_EQ(Build({}), 0);
     EXPECT_EQ(Reg(), (tag_ContactReg{0, 1, 1000}));
-    EXPECT_EQ(RecordsFile().size(), 1050U * 704);
+    EXPECT_EQ(ReadFiles().strRecords.size(), 1050U * 704);
     m_log.Clear();
     EXPECT_EQ(m_store.InitContactRecord(nullptr), -1);
     tag_ContactsStruct record = {};
@@ -142,7 +142,9 @@ TEST_F(Store, GivesUpAfterFiveRefusals)
     }
     vExpected.back().erase(12, 1); // the last line alone has no blank there
     EXPECT_EQ(m_log.Texts(ERROR_LINE), vExpected);
-    EXPECT_EQ(m_log.Count(DEBUG_LINE, "QV_Contacts:Lock TRY LOCK"), 10) << "retries are silent";
+    const Lines vDebug = m_log.Texts(DEBUG_LINE);
+    EXPECT_EQ(std::count(vDebug.begin(), vDebug.end(), "QV_Contacts:Lock TRY LOCK"), 10)
+        << "retries are silent";
     EXPECT_EQ(Reg(), (tag_ContactReg{2, 0, 1002}));
     ASSERT_NE(set, nullptr);
     EXPECT_EQ(set->pDetail, nullptr);
@@ -160,7 +162,7 @@ TEST_F(Store, CopiesAllRecordsOutAsSoonAsItHasTheLock)
         {
             if (strText == strRefusal)
             {
-                holder.Kill();
+                holder.Release();
             }
         });
     tag_ContactsInfo* pInfo = nullptr;

@@ -155,11 +155,13 @@ TEST_F(ShareMemory, RefusesASizeAboveTheProcessLimit)
     EXPECT_TRUE(RunInChild(
         [&]
         {
-            const rlimit limit = {4096, 4096};
+            rlimit limit = {4096, RLIM_INFINITY};
             ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &limit), 0);
             EXPECT_EQ(Open(5000), MAP_FAILED);
             EXPECT_EQ(Errors(), MapError("OpenWriteShareMemory", EFBIG));
             EXPECT_NE(Open(4096), MAP_FAILED);
+            limit.rlim_cur = RLIM_INFINITY;
+            setrlimit(RLIMIT_FSIZE, &limit);
         }));
 }
 
@@ -264,7 +266,7 @@ TEST_F(SingleMutex, RefusesASecondHolderUntilTheFirstDies)
         {
             if (strText == "QV_Contacts:LOCK RET = 0 ")
             {
-                holder.Kill();
+                holder.Release();
             }
         });
     CStoreLock lock;

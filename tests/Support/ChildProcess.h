@@ -16,7 +16,7 @@ class CChild
 {
 public:
     // An alarm ends a child that hangs for so many seconds; 0: it may hang.
-    explicit CChild(const std::function<std::string()>& fnBody, unsigned int uSeconds);
+    CChild(const std::function<std::string()>& fnBody, unsigned int uSeconds);
     // Kills a child whose text was not waited for.
     ~CChild();
     CChild(const CChild&) = delete;
@@ -27,44 +27,37 @@ public:
 
 private:
     int m_iPipe = -1;
-    pid_t m_iPid;
+    pid_t m_iPid = -1;
 };
 
-// Memory, zero at first, that this process has in common with children started later.
+// Memory, zero at first, that this process has in common with children started later. It is never
+// released.
 template <typename T>
-class CShared
+T& NewShared()
 {
-public:
-    CShared()
-        : m_pMemory(
-              mmap(nullptr, sizeof(T), PROT_READ | PROT_WRITE, MAP_SHARED | MAP_ANONYMOUS, -1, 0))
-    {
-    }
-    ~CShared() { munmap(m_pMemory, sizeof(T)); }
-    CShared(const CShared&) = delete;
-    CShared& operator=(const CShared&) = delete;
+    constexpr int FLAGS = MAP_SHARED | MAP_ANONYMOUS;
+    return *static_cast<T*>(mmap(nullptr, sizeof(T), PROT_READ | PROT_WRITE, FLAGS, -1, 0));
+}
 
-    T* operator->() const { return static_cast<T*>(m_pMemory); }
-    T& operator*() const { return *static_cast<T*>(m_pMemory); }
-
-private:
-    void* m_pMemory;
-};
-
-// A second process that holds the store lock for as long as the object lives, or until Kill.
+// Holds the store lock until Release, if nobody else does: taken without the code under test, as
+// any other program would. An open file of its own excludes this process, too.
 class CLockHolder
 {
 public:
-    CLockHolder(); // returns when the lock is held; std::runtime_error when it cannot be
-    ~CLockHolder();
+    CLockHolder();
+    ~CLockHolder() { Release(); }
     CLockHolder(const CLockHolder&) = delete;
     CLockHolder& operator=(const CLockHolder&) = delete;
 
-    // Kills the process, which leaves the release to the system. Done once.
-    void Kill();
+    bool IsHeld() const { return m_bHeld; }
+    void Release();
 
 private:
-    pid_t m_iPid = -1;
+    int m_iFd;
+    bool m_bHeld;
 };
+
+// How many descriptors this process has.
+std::ptrdiff_t OpenDescriptors();
 
 #endif

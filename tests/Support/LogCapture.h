@@ -1,7 +1,11 @@
 #ifndef QV_TESTS_SUPPORT_LOGCAPTURE_H
 #define QV_TESTS_SUPPORT_LOGCAPTURE_H
 
+#include "Platform/LogSink.h"
+
+#include <algorithm>
 #include <functional>
+#include <ostream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -22,26 +26,36 @@ struct tag_LogLine
     {
         return iPriority == other.iPriority && strTag == other.strTag && strText == other.strText;
     }
+    friend std::ostream& operator<<(std::ostream& stream, const tag_LogLine& line)
+    {
+        return stream << '[' << line.iPriority << ' ' << line.strTag << "] " << line.strText;
+    }
 };
-std::ostream& operator<<(std::ostream& stream, const tag_LogLine& line);
 
 // Collects every log line for as long as the object lives, one object at a time.
 class CLogCapture
 {
 public:
-    CLogCapture();
-    ~CLogCapture();
+    CLogCapture() { CLogSink::Set(&CLogCapture::Collect, this); }
+    ~CLogCapture() { CLogSink::Set(nullptr, nullptr); }
     CLogCapture(const CLogCapture&) = delete;
     CLogCapture& operator=(const CLogCapture&) = delete;
 
     const std::vector<tag_LogLine>& Lines() const { return m_vLines; }
     // The texts of the lines with the priority, in order.
-    std::vector<std::string> Texts(int iPriority) const;
-    // How many lines have exactly this priority and text.
-    int Count(int iPriority, const std::string& strText) const;
+    std::vector<std::string> Texts(int iPriority) const
+    {
+        std::vector<std::string> vTexts;
+        for (const tag_LogLine& line : m_vLines)
+        {
+            vTexts.insert(vTexts.end(), line.iPriority == iPriority ? 1U : 0U, line.strText);
+        }
+        return vTexts;
+    }
     bool Has(int iPriority, const std::string& strText) const
     {
-        return Count(iPriority, strText) > 0;
+        const std::vector<std::string> vTexts = Texts(iPriority);
+        return std::find(vTexts.begin(), vTexts.end(), strText) != vTexts.end();
     }
     void Clear() { m_vLines.clear(); }
     // Runs a function at every line, in the middle of the operation that logs it: this is how a
@@ -52,7 +66,15 @@ public:
     }
 
 private:
-    static void Collect(void* pContext, int iPriority, const char* szTag, const char* szText);
+    static void Collect(void* pContext, int iPriority, const char* szTag, const char* szText)
+    {
+        auto* pLog = static_cast<CLogCapture*>(pContext);
+        pLog->m_vLines.push_back({iPriority, szTag, szText});
+        if (pLog->m_fnAtLine)
+        {
+            pLog->m_fnAtLine(szText);
+        }
+    }
 
     std::vector<tag_LogLine> m_vLines;
     std::function<void(const std::string&)> m_fnAtLine;

@@ -11,9 +11,6 @@ public:
     ~CMemoryFailure();
     CMemoryFailure(const CMemoryFailure&) = delete;
     CMemoryFailure& operator=(const CMemoryFailure&) = delete;
-
-    // How many allocations have failed so far.
-    int Failures() const;
 };
 
 #endif

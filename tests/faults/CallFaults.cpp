@@ -13,6 +13,7 @@
 #include <sys/file.h>
 #include <sys/mman.h>
 #include <unistd.h>
+#include <utility>
 
 namespace
 {
@@ -20,11 +21,10 @@ namespace
 constexpr size_t MAX_FILES = 1024;
 
 // Zero before anything runs: memory is allocated long before main.
-tag_Failures g_failures;
+tag_Failures g_failures; // has a name as long as there is a CCallFault
 int g_iGranted;
-bool g_bFaultsOn; // as long as there is a CCallFault, also after its call failed
 const char* g_szFailed = "";
-CMapWatch* g_pWatch;
+MapWatch g_pfnWatch;
 char g_aszFiles[MAX_FILES][sizeof(tag_Mapping::szFile)]; // by descriptor; empty for files elsewhere
 tag_Mapping g_aMappings[64];
 
@@ -72,16 +72,12 @@ tag_Mapping* FindMapping(const void* pAddr)
 
 void Tell(MAP_EVENT eEvent, const tag_Mapping& mapping)
 {
-    if (g_pWatch != nullptr)
+    if (g_pfnWatch != nullptr)
     {
-        CMapWatch* pWatch = g_pWatch;
-        const CALL_GROUP eGroup = g_failures.eGroup;
+        const MapWatch pfnWatch = std::exchange(g_pfnWatch, nullptr);
         const int iError = errno;
-        g_pWatch = nullptr;
-        g_failures.eGroup = CALLS_NONE;
-        pWatch->Happens(eEvent, mapping);
-        g_pWatch = pWatch;
-        g_failures.eGroup = eGroup;
+        pfnWatch(eEvent, mapping);
+        g_pfnWatch = pfnWatch;
         errno = iError;
     }
 }
@@ -163,9 +159,10 @@ extern "C"
                  (iFd, iMode, iAt, iSize), , CALLS_WRITE)
     QV_FILE_CALL(int, flock, (int iFd, int iOperation), (iFd, iOperation), noexcept,
                  CALLS_FILES | CALLS_LOCK)
-    QV_CALL(int, usleep, (useconds_t uMicroseconds), (uMicroseconds), , g_bFaultsOn, 0)
-    QV_CALL(int, nanosleep, (const timespec* pTime, timespec* pRest), (pTime, pRest), , g_bFaultsOn,
-            0)
+    QV_CALL(int, usleep, (useconds_t uMicroseconds), (uMicroseconds), ,
+            g_failures.szName != nullptr, 0)
+    QV_CALL(int, nanosleep, (const timespec* pTime, timespec* pRest), (pTime, pRest), ,
+            g_failures.szName != nullptr, 0)
 
     // The sanitizers keep allocation to themselves.
 #ifndef __SANITIZE_ADDRESS__
@@ -225,14 +222,12 @@ CCallFault::CCallFault(const tag_Failures& failures, int iGranted)
 {
     g_szFailed = "";
     g_iGranted = iGranted;
-    g_bFaultsOn = true;
     g_failures = failures;
 }
 
 CCallFault::~CCallFault()
 {
-    g_failures.eGroup = CALLS_NONE;
-    g_bFaultsOn = false;
+    g_failures = {};
 }
 
 const char* CCallFault::Failed()
@@ -240,7 +235,7 @@ const char* CCallFault::Failed()
     return g_szFailed;
 }
 
-void CMapWatch::Set(CMapWatch* pWatch)
+void WatchMappings(MapWatch pfnWatch)
 {
-    g_pWatch = pWatch;
+    g_pfnWatch = pfnWatch;
 }

@@ -54,16 +54,9 @@ enum MAP_EVENT
     MAP_ENDS
 };
 
-// Is told of mappings. What it calls itself is neither counted nor told.
-class CMapWatch
-{
-public:
-    virtual void Happens(MAP_EVENT eEvent, const tag_Mapping& mapping) = 0;
-    // Null ends the watch.
-    static void Set(CMapWatch* pWatch);
-
-protected:
-    ~CMapWatch() = default;
-};
+// Who is told of mappings, null for nobody; not while calls fail. What it calls itself is not
+// told.
+using MapWatch = void (*)(MAP_EVENT eEvent, const tag_Mapping& mapping);
+void WatchMappings(MapWatch pfnWatch);
 
 #endif

@@ -1,18 +1,16 @@
 // Four processes search while one changes the contacts. Which names a contact can have follows
 // from its id, so every entry tells by itself whether it is right.
 
-#include "Filter/FilterChain.h"
 #include "Platform/LogSink.h"
 #include "tests/Support/ChildProcess.h"
 #include "tests/Support/WideText.h"
-#include "tests/faults/Options.h"
 #include "tests/faults/StoreCase.h"
 
 #include <atomic>
 #include <chrono>
-#include <cstring>
 #include <gtest/gtest.h>
-#include <memory>
+#include <iostream>
+#include <list>
 #include <random>
 #include <set>
 #include <unistd.h>
@@ -20,10 +18,12 @@
 namespace
 {
 
-constexpr int CONTACTS = 2000;           // those with even ids never change
-constexpr int FORMS = 3;                 // of a contact's name, far apart in name order
-constexpr unsigned int MAX_PAUSE = 8000; // microseconds between two searches
-constexpr unsigned int GRACE = 60;       // seconds that a reader may take longer
+using Clock = std::chrono::steady_clock;
+
+constexpr int CONTACTS = 2000;             // those with even ids never change
+constexpr int FORMS[] = {'a', L'张', 'y'}; // first characters of a contact's names
+constexpr unsigned int MAX_PAUSE = 8000;   // microseconds between two searches
+constexpr unsigned int GRACE = 60;         // seconds that a reader may take longer
 constexpr long long FIRST_TIME = 1'600'000'000'000;
 
 struct tag_Board
@@ -35,7 +35,7 @@ struct tag_Board
 
 std::string NameOf(int iId, int iForm)
 {
-    std::string strName = iForm == 1 ? "张" : std::string(1, static_cast<char>('a' + 12 * iForm));
+    std::string strName = Narrow({static_cast<wchar_t>(iForm)});
     for (int i = iId; i > 0; i /= 10)
     {
         strName += static_cast<char>('b' + i % 10);
@@ -53,14 +53,16 @@ protected:
         std::vector<tag_ProviderContact> vContacts;
         for (int iId = 1; iId <= CONTACTS; ++iId)
         {
-            for (int iForm = 0; iForm < FORMS; ++iForm)
+            m_vKeys.push_back({});
+            for (const int iForm : FORMS)
             {
-                m_vKeys.push_back(LocalizerKeyOf(NameOf(iId, iForm)));
+                m_vKeys.back().push_back(LocalizerKeyOf(NameOf(iId, iForm)));
             }
             tag_ProviderContact contact;
             contact.iId = contact.iStatusId = iId;
-            contact.strName = NameOf(iId, iId % FORMS);
-            contact.strKey = *(Keys(iId) + iId % FORMS);
+            const auto uForm = static_cast<size_t>(iId) % std::size(FORMS);
+            contact.strName = NameOf(iId, FORMS[uForm]);
+            contact.strKey = KeysOf(iId)[uForm];
             contact.llLastTime = FIRST_TIME + iId * 7919LL % CONTACTS;
             vContacts.push_back(contact);
         }
@@ -68,9 +70,9 @@ protected:
     }
 
     // The keys of the forms of a contact's name.
-    const std::string* Keys(int iId) const
+    const std::vector<std::string>& KeysOf(int iId) const
     {
-        return m_vKeys.data() + static_cast<ptrdiff_t>(iId - 1) * FORMS;
+        return m_vKeys[static_cast<size_t>(iId) - 1];
     }
 
     // What is wrong with a search's result; nothing in most cases.
@@ -85,8 +87,8 @@ protected:
             {
                 return "contact " + std::to_string(iId) + " unknown or twice";
             }
-            const std::string* pEnd = Keys(iId) + FORMS;
-            if (std::find(Keys(iId), pEnd, Narrow(result.pDetail[i].szLocalizerKey)) == pEnd)
+            const std::string strKey = Narrow(result.pDetail[i].szLocalizerKey);
+            if (std::count(KeysOf(iId).begin(), KeysOf(iId).end(), strKey) == 0)
             {
                 return "contact " + std::to_string(iId) + " with another's key";
             }
@@ -107,23 +109,18 @@ protected:
             &bRefused);
         std::mt19937 random(uSeed);
         CLocalizerLogic logic;
-        CFilterChain everybody;
         std::string strFault;
-        while (m_board->iStop == 0 && strFault.empty())
+        while (m_board.iStop == 0 && strFault.empty())
         {
             bRefused = false;
             const size_t uTyped = random() % std::size(TYPED);
-            wchar_t szInput[8] = {};
-            std::wcscpy(szInput, TYPED[uTyped]);
             tag_Answer answer;
-            const IME_SEARCH_TYPE eType = uTyped < 5 ? IME_SEARCH_WORD : IME_SEARCH_NUM;
-            answer.iRet = logic.Search(nullptr, szInput, eType, &everybody, 0, &answer.pResult,
-                                       &answer.lMask, answer.szText);
+            Search(logic, answer, TYPED[uTyped], uTyped < 5 ? IME_SEARCH_WORD : IME_SEARCH_NUM);
             strFault = answer.iRet != 0 ? "result " + std::to_string(answer.iRet)
-                                        : FaultOf(*answer.pResult, *szInput == 0 && !bRefused);
-            m_board->iFound += answer.pResult == nullptr ? 0 : answer.pResult->iResultNum;
+                                        : FaultOf(*answer.pResult, uTyped < 2 && !bRefused);
+            m_board.iFound += answer.pResult == nullptr ? 0 : answer.pResult->iResultNum;
             logic.FreeSearchResult(answer.pResult);
-            ++m_board->iSearches;
+            ++m_board.iSearches;
             usleep(static_cast<useconds_t>(random() % MAX_PAUSE));
         }
         return strFault;
@@ -132,14 +129,15 @@ protected:
     // A change of some odd contacts, and the library told of it.
     void ChangeOnce(CProviderDatabase& provider, CLocalizerLogic& logic, std::mt19937& random)
     {
-        const auto Odd = [&random] { return 1 + 2 * static_cast<int>(random() % (CONTACTS / 2)); };
-        const int iId = Odd();
+        long long allIds[5];
+        std::generate(std::begin(allIds), std::end(allIds),
+                      [&random] { return 1 + 2 * static_cast<int>(random() % (CONTACTS / 2)); });
         const auto uKind = random() % 32;
         if (uKind < 4)
         {
             m_llNow += 1000;
-            provider.SetLastTime(iId, m_llNow);
-            logic.OnContactTimeChanged(iId, m_llNow);
+            provider.SetLastTime(static_cast<int>(allIds[0]), m_llNow);
+            logic.OnContactTimeChanged(static_cast<long>(allIds[0]), m_llNow);
         }
         else if (uKind == 4)
         {
@@ -148,15 +146,13 @@ protected:
         }
         else
         {
-            long long allIds[5];
             provider.Execute("begin");
-            for (long long& llId : allIds)
+            for (const long long llId : allIds)
             {
-                const int iChanged = Odd();
-                const auto iForm = static_cast<int>(random() % FORMS);
-                provider.SetName(iChanged, NameOf(iChanged, iForm), Keys(iChanged)[iForm]);
-                provider.SetVisible(iChanged, random() % 3 != 0);
-                llId = iChanged;
+                const auto iId = static_cast<int>(llId);
+                const size_t uForm = random() % std::size(FORMS);
+                provider.SetName(iId, NameOf(iId, FORMS[uForm]), KeysOf(iId)[uForm]);
+                provider.SetVisible(iId, random() % 3 != 0);
             }
             provider.Execute("commit");
             logic.OnContactsTableChanged(5, allIds);
@@ -164,43 +160,41 @@ protected:
     }
 
     CDataDirectory m_directory;
-    CShared<tag_Board> m_board{};
-    std::vector<std::string> m_vKeys;
+    tag_Board& m_board = NewShared<tag_Board>();
+    std::vector<std::vector<std::string>> m_vKeys;
     long long m_llNow = FIRST_TIME + 10'000'000;
 };
 
 TEST_F(CReaders, NeverSeeAnotherContact)
 {
     ASSERT_EQ(CLocalizerLogic().MemInit(true), 0);
-    std::vector<std::unique_ptr<CChild>> vReaders;
+    std::list<CChild> readers;
     for (unsigned int i = 0; i < 4; ++i)
     {
-        vReaders.push_back(std::make_unique<CChild>(
-            [this, i] { return ReadUntilStopped(g_options.uSeed * 10 + i); },
-            g_options.uSeconds + GRACE));
+        readers.emplace_back([this, i] { return ReadUntilStopped(g_uSeed * 10 + i); },
+                             g_uSeconds + GRACE);
     }
     int iChanges = 0;
     {
         CProviderDatabase provider;
         CLocalizerLogic logic;
-        std::mt19937 random(g_options.uSeed);
-        const auto end =
-            std::chrono::steady_clock::now() + std::chrono::seconds(g_options.uSeconds);
-        for (; std::chrono::steady_clock::now() < end || m_board->iSearches < 4; ++iChanges)
+        std::mt19937 random(g_uSeed);
+        const auto end = Clock::now() + std::chrono::seconds(g_uSeconds);
+        for (; Clock::now() < end || m_board.iSearches < 4; ++iChanges)
         {
             ChangeOnce(provider, logic, random);
         }
         logic.OnStatusUpdatesTableChanged(0, nullptr);
     }
-    m_board->iStop = 1;
-    for (const auto& pReader : vReaders)
+    m_board.iStop = 1;
+    for (CChild& reader : readers)
     {
-        EXPECT_EQ(pReader->Text(), "");
+        EXPECT_EQ(reader.Text(), "");
     }
     const tag_StoreImage store = ReadStore();
     EXPECT_EQ(DifferenceOf(store, FreshBuild(m_directory.Root(), store.reg.iSortType)), "");
-    std::printf("%d changes, %d searches, %d entries\n", iChanges, m_board->iSearches.load(),
-                m_board->iFound.load());
+    std::cout << iChanges << " changes, " << m_board.iSearches << " searches, " << m_board.iFound
+              << " entries\n";
 }
 
 } // namespace

@@ -2,9 +2,6 @@
 // there: each state of the files is marked or right, shows nobody under another's name, and ends
 // like a fresh build after the next notification.
 
-#include "Common/DataPaths.h"
-#include "tests/Support/ChildProcess.h"
-#include "tests/Support/StoreFiles.h"
 #include "tests/faults/StoreCase.h"
 #include "tests/faults/StoreStepper.h"
 
@@ -16,114 +13,84 @@
 namespace
 {
 
-constexpr unsigned int HANGS = 60; // seconds
-
-// The two files while the steps are replayed.
-struct tag_Files
+void Apply(const tag_Step& step, std::string& strFile)
 {
-    std::string strReg;
-    std::string strRecords;
-
-    std::string& Of(const tag_Step& step) { return step.bReg ? strReg : strRecords; }
-    void Apply(const tag_Step& step)
+    if (step.eKind == STEP_LENGTH)
     {
-        std::string& strFile = Of(step);
-        if (step.eKind == STEP_LENGTH)
-        {
-            strFile.resize(step.uOffset);
-        }
-        else if (step.eKind == STEP_STORE)
-        {
-            strFile.replace(step.uOffset, step.uBytes, step.acBytes, step.uBytes);
-        }
+        strFile.resize(step.uOffset);
     }
+    strFile.replace(step.uOffset, step.strBytes.size(), step.strBytes);
+}
 
-    tag_StoreImage Image() const
+// What tells states apart that have to be looked at from outside: the registration record and
+// where each contact lies.
+std::string OutsideOf(const tag_StoreFiles& files)
+{
+    std::string strOutside = files.strReg;
+    for (const tag_ContactsStruct& record : tag_StoreImage(files).vRecords)
     {
-        tag_StoreImage image;
-        if (strReg.size() == sizeof(image.reg))
-        {
-            std::memcpy(&image.reg, strReg.data(), sizeof(image.reg));
-        }
-        const auto uCount = static_cast<size_t>(std::max(image.reg.iTotalNum, 0));
-        image.vRecords.resize(std::min(uCount, strRecords.size() / sizeof(tag_ContactsStruct)));
-        std::memcpy(static_cast<void*>(image.vRecords.data()), strRecords.data(),
-                    image.vRecords.size() * sizeof(tag_ContactsStruct));
-        return image;
+        strOutside += ' ' + std::to_string(record.iContactID);
     }
-
-    // What tells states apart that have to be looked at from outside: the registration record and
-    // where each contact lies.
-    std::string Kind() const
-    {
-        std::string strKind = strReg;
-        for (const tag_ContactsStruct& record : Image().vRecords)
-        {
-            strKind += ' ' + std::to_string(record.iContactID);
-        }
-        return strKind;
-    }
-};
+    return strOutside;
+}
 
 // What a disk may hold of the files when the power goes: of each page what it held at the last
-// flush, or anything that it was since.
+// flush, or anything that it was since. The registration record lies in one page.
 class CDisk
 {
 public:
-    explicit CDisk(const tag_Files& files) : m_flushed(files) {}
-
-    void Note(const tag_Step& step, tag_Files& files)
+    explicit CDisk(const tag_StoreFiles& files)
+        : m_vRegs({files.strReg}), m_strRecords(files.strRecords)
     {
-        if (step.eKind == STEP_FLUSH)
+    }
+
+    // A step after which the files are these.
+    void Note(const tag_Step& step, const tag_StoreFiles& files)
+    {
+        if (step.eKind == STEP_LENGTH)
         {
-            m_flushed.Of(step) = files.Of(step);
-            m_aPages[step.bReg ? 1 : 0].clear();
+            Apply(step, step.bReg ? m_vRegs.front() : m_strRecords);
         }
-        else if (step.eKind == STEP_LENGTH)
+        else if (step.bReg)
         {
-            m_flushed.Apply(step);
+            m_vRegs.resize(step.eKind == STEP_FLUSH ? 0 : m_vRegs.size());
+            m_vRegs.push_back(files.strReg);
+        }
+        else if (step.eKind == STEP_FLUSH)
+        {
+            m_strRecords = files.strRecords;
+            m_mapPages.clear();
         }
         else
         {
-            for (size_t i = step.uOffset / PAGE; i * PAGE < step.uOffset + step.uBytes; ++i)
+            for (size_t i = step.uOffset / PAGE; i * PAGE < step.uOffset + step.strBytes.size();
+                 ++i)
             {
-                m_aPages[step.bReg ? 1 : 0][i].push_back(files.Of(step).substr(i * PAGE, PAGE));
+                m_mapPages[i].push_back(files.strRecords.substr(i * PAGE, PAGE));
             }
         }
     }
 
-    // Calls fnLook with each state in which the registration record asks for no rebuild; false
-    // when there are too many, since records have changed under such a record.
-    template <typename FnLook>
-    bool EachWhole(FnLook fnLook) const
+    // Looks at each state in which the registration record asks for no rebuild. Too many of them
+    // mean that records have changed under such a record.
+    std::string Fault(const CStoreCase& store) const
     {
-        std::vector<std::string> vRegs = {m_flushed.strReg};
-        for (const auto& [uPage, vVersions] : m_aPages[1])
-        {
-            vRegs.insert(vRegs.end(), vVersions.begin(), vVersions.end());
-        }
         size_t uStates = 1;
-        for (const auto& [uPage, vVersions] : m_aPages[0])
+        for (const auto& [uPage, vVersions] : m_mapPages)
         {
             uStates = std::min(MAX_STATES, uStates * (vVersions.size() + 1));
         }
-        for (const std::string& strReg : vRegs)
+        std::string strFault;
+        for (const std::string& strReg : m_vRegs)
         {
-            const tag_Files files = {strReg, m_flushed.strRecords};
-            if (files.Image().reg == tag_ContactReg{} || IsMarked(files.Image().reg))
+            const bool bMarked = IsMarked(tag_StoreImage({strReg, ""}).reg);
+            for (size_t i = 0; i < uStates && !bMarked && strFault.empty(); ++i)
             {
-                continue;
-            }
-            if (uStates == MAX_STATES)
-            {
-                return false;
-            }
-            for (size_t i = 0; i < uStates; ++i)
-            {
-                fnLook(Mixed(files, i));
+                store.KindOf(tag_StoreImage({strReg, Records(i)}), &strFault);
+                strFault += uStates == MAX_STATES ? "changes without a mark" : "";
             }
         }
-        return true;
+        return strFault;
     }
 
 private:
@@ -131,22 +98,25 @@ private:
     static constexpr size_t MAX_STATES = 1000;
 
     // The uState-th choice of what is on each page of the records.
-    tag_Files Mixed(tag_Files files, size_t uState) const
+    std::string Records(size_t uState) const
     {
-        for (const auto& [uPage, vVersions] : m_aPages[0])
+        std::string strRecords = m_strRecords;
+        for (const auto& [uPage, vVersions] : m_mapPages)
         {
             const size_t uVersion = uState % (vVersions.size() + 1);
             uState /= vVersions.size() + 1;
             if (uVersion > 0)
             {
-                files.strRecords.replace(uPage * PAGE, PAGE, vVersions[uVersion - 1]);
+                strRecords.replace(uPage * PAGE, PAGE, vVersions[uVersion - 1]);
             }
         }
-        return files;
+        return strRecords;
     }
 
-    tag_Files m_flushed;
-    std::map<size_t, std::vector<std::string>> m_aPages[2]; // since then; records, then reg
+    // As they were flushed and, behind that, each version since.
+    std::vector<std::string> m_vRegs;
+    std::string m_strRecords;
+    std::map<size_t, std::vector<std::string>> m_mapPages{};
 };
 
 // What a search of everybody shows in a marked store.
@@ -171,23 +141,19 @@ std::string SearchFault(const CStoreCase& store)
 std::string NextFault(const CStoreCase& store, STORE_KIND eKind, bool bStatus)
 {
     CLocalizerLogic logic;
-    long long llOther = 4;
     if (eKind == KIND_BEFORE)
     {
         logic.OnContactsTableChanged();
     }
-    else if (bStatus)
-    {
-        logic.OnStatusUpdatesTableChanged(0, nullptr);
-    }
     else
     {
-        logic.OnContactsTableChanged(1, &llOther);
+        long long llOther = 4;
+        logic.OnContactsTableChanged(bStatus ? 0 : 1, &llOther);
         logic.OnStatusUpdatesTableChanged(0, nullptr);
     }
     logic.MemInit(false);
     const std::string strFault = store.RepairFault();
-    const tag_StoreImage image = CStoreCase::Present();
+    const tag_StoreImage image = ReadStore();
     const bool bRebuilt = strFault.empty() && eKind != KIND_AFTER;
     return bRebuilt && BytesOf(image.vRecords) != BytesOf(store.After(image.reg.iSortType).vRecords)
                ? "other bytes than a fresh build"
@@ -199,14 +165,13 @@ TEST(Faults, ReadsRecordsUnderTheLock)
 {
     const CStoreCase store(AllChanges().back(), STORE_ORDER_NAME);
     store.Restore();
-    const CShared<tag_Steps> steps;
     CLocalizerLogic logic;
     for (const tag_Operation& reading : AllReadings())
     {
         tag_Answer answer;
-        CStoreStepper stepper(*steps);
-        reading.pfnRun(logic, answer);
-        EXPECT_EQ(stepper.Fault(), "") << reading.szName;
+        std::string strFault;
+        StepThrough([&] { reading.pfnRun(logic, answer); }, &strFault);
+        EXPECT_EQ(strFault, "") << reading;
         logic.FreeSearchResult(answer.pResult);
     }
 }
@@ -218,57 +183,42 @@ class CStoreByStore : public testing::TestWithParam<std::tuple<tag_Operation, in
 TEST_P(CStoreByStore, IsMarkedOrRight)
 {
     const tag_Operation& change = std::get<0>(GetParam());
-    const int iSortType = std::get<1>(GetParam());
-    const CStoreCase store(change, iSortType);
-    const CShared<tag_Steps> steps;
+    const CStoreCase store(change, std::get<1>(GetParam()));
     store.Restore();
-    tag_Files files = {CDataDirectory::ReadBytes(CDataPaths::ContactReg()), RecordsFile()};
-    uint32_t uStep = 0;
-    const auto Expect = [&](const std::string& strFault)
-    {
-        EXPECT_EQ(strFault, "") << change << iSortType << ", store " << uStep;
-        return strFault.empty();
-    };
-    const auto fnRun = [&, pfnRun = change.pfnRun]
+    tag_StoreFiles files = ReadFiles();
+    CDisk disk(files);
+    const auto fnRun = [&change]
     {
         CLocalizerLogic logic;
         tag_Answer answer;
-        CStoreStepper stepper(*steps);
-        pfnRun(logic, answer);
-        return stepper.Fault();
+        change.pfnRun(logic, answer);
     };
-    Expect(CChild(fnRun, HANGS).Text());
-    if (!CStoreStepper::IsPossible())
+    std::string strFault;
+    const std::vector<tag_Step> vSteps = StepThrough(fnRun, &strFault);
+    EXPECT_EQ(strFault, "");
+    if (!CAN_STEP)
     {
         GTEST_SKIP() << "no single steps here: only the lock was looked at";
     }
-    ASSERT_LT(steps->uSteps, tag_Steps::MAX_STEPS);
-    const tag_Files last = {CDataDirectory::ReadBytes(CDataPaths::ContactReg()), RecordsFile()};
-    std::set<std::string> setKinds;
+    const tag_StoreFiles last = ReadFiles();
+    std::set<std::string> setSeen;
     STORE_KIND eKind = KIND_NONE;
-    CDisk disk(files);
-    const auto fnLook = [&](const tag_Files& left)
+    for (size_t i = 0; i < vSteps.size() && !HasFailure(); ++i)
     {
-        std::string strLeft;
-        Expect(store.KindOf(left.Image(), &strLeft) == KIND_WRONG ? "on disk: " + strLeft : "");
-    };
-    for (; uStep < steps->uSteps; ++uStep)
-    {
-        files.Apply(steps->aSteps[uStep]);
-        disk.Note(steps->aSteps[uStep], files);
-        Expect(disk.EachWhole(fnLook) ? "" : "on disk: changes without a mark");
-        std::string strWhy;
-        eKind = store.KindOf(files.Image(), &strWhy);
-        if (!Expect(eKind == KIND_WRONG ? strWhy : "") || !setKinds.insert(files.Kind()).second)
+        SCOPED_TRACE(i);
+        Apply(vSteps[i], vSteps[i].bReg ? files.strReg : files.strRecords);
+        disk.Note(vSteps[i], files);
+        EXPECT_EQ(disk.Fault(store), "") << "on the disk";
+        eKind = store.KindOf(tag_StoreImage(files), &strFault);
+        EXPECT_EQ(strFault, "");
+        if (setSeen.insert(OutsideOf(files)).second)
         {
-            continue;
+            CStoreCase::Write(files);
+            EXPECT_EQ(SearchFault(store), "");
+            EXPECT_EQ(NextFault(store, eKind, setSeen.size() % 2 == 0), "");
         }
-        CStoreCase::Write(files.strReg, files.strRecords, files.strRecords.size());
-        Expect(SearchFault(store));
-        Expect(NextFault(store, eKind, setKinds.size() % 2 == 0));
     }
-    std::cout << change << iSortType << ": " << uStep << " stores, " << setKinds.size()
-              << " repairs\n";
+    std::cout << vSteps.size() << " steps, " << setSeen.size() << " repairs\n";
     EXPECT_EQ(eKind, store.Is("SortType") ? KIND_MARKED : KIND_AFTER);
     EXPECT_TRUE(files.strReg == last.strReg && files.strRecords == last.strRecords);
 }

@@ -1,15 +1,11 @@
 #include "tests/faults/StoreCase.h"
 
-#include "Common/DataPaths.h"
 #include "Filter/Filter.h"
 #include "Filter/FilterChain.h"
-#include "tests/Support/StoreFiles.h"
 #include "tests/Support/WideText.h"
 
-#include <algorithm>
 #include <cwchar>
 #include <filesystem>
-#include <initializer_list>
 
 namespace fs = std::filesystem;
 
@@ -66,27 +62,11 @@ void ChangeStatus(CProviderDatabase& provider)
                      "status_update_data_id=1001");
 }
 
-void Tell(CLocalizerLogic& logic, std::initializer_list<long long> ids)
+template <long long... IDS>
+void Tell(CLocalizerLogic& logic, tag_Answer& /*answer*/)
 {
-    long long allIds[8] = {};
-    std::copy(ids.begin(), ids.end(), allIds);
-    logic.OnContactsTableChanged(static_cast<int>(ids.size()), allIds);
-}
-
-void Search(CLocalizerLogic& logic, tag_Answer& answer, const wchar_t* szTyped,
-            IME_SEARCH_TYPE eType, int iFilter = 0, tag_LocalizerResult* pLast = nullptr)
-{
-    wchar_t szInput[16] = {};
-    std::wcscpy(szInput, szTyped);
-    QVLong32 lId = 3;
-    CFilterChain* pChain = nullptr;
-    answer.iRet = logic.CreateFilterChain(&iFilter, &lId, iFilter == 0 ? 0 : 1, &pChain);
-    if (answer.iRet == 0)
-    {
-        answer.iRet = logic.Search(pLast, szInput, eType, pChain, 0, &answer.pResult, &answer.lMask,
-                                   answer.szText);
-    }
-    delete pChain;
+    long long allIds[] = {IDS...};
+    logic.OnContactsTableChanged(sizeof...(IDS), allIds);
 }
 
 void SearchWithin(CLocalizerLogic& logic, tag_Answer& answer)
@@ -128,21 +108,34 @@ void ConvertByMapping(CLocalizerLogic& logic, tag_Answer& answer)
 }
 
 // Without what a patch or a failed read of the status leaves to the next status notification.
-tag_StoreImage WithoutOnline(tag_StoreImage image)
+std::string Difference(tag_StoreImage store, tag_StoreImage fresh)
 {
-    for (tag_ContactsStruct& record : image.vRecords)
+    for (Records* pRecords : {&store.vRecords, &fresh.vRecords})
     {
-        record.iFlags &= ~CONTACT_FLAG_ONLINE;
+        for (tag_ContactsStruct& record : *pRecords)
+        {
+            record.iFlags &= ~CONTACT_FLAG_ONLINE;
+        }
     }
-    return image;
-}
-
-std::string Difference(const tag_StoreImage& store, const tag_StoreImage& fresh)
-{
-    return DifferenceOf(WithoutOnline(store), WithoutOnline(fresh));
+    return DifferenceOf(store, fresh);
 }
 
 } // namespace
+
+void Search(CLocalizerLogic& logic, tag_Answer& answer, const wchar_t* szTyped,
+            IME_SEARCH_TYPE eType, int iFilter, tag_LocalizerResult* pLast)
+{
+    std::wstring strInput = szTyped;
+    QVLong32 lId = 3;
+    CFilterChain* pChain = nullptr;
+    answer.iRet = logic.CreateFilterChain(&iFilter, &lId, iFilter == 0 ? 0 : 1, &pChain);
+    if (answer.iRet == 0)
+    {
+        answer.iRet = logic.Search(pLast, strInput.data(), eType, pChain, 0, &answer.pResult,
+                                   &answer.lMask, answer.szText);
+    }
+    delete pChain;
+}
 
 const std::vector<tag_Operation>& AllChanges()
 {
@@ -150,15 +143,11 @@ const std::vector<tag_Operation>& AllChanges()
         {"FirstBuild", [](auto& logic, auto& answer) { answer.iRet = logic.MemInit(false); }},
         {"Build", [](auto& logic, auto& answer) { answer.iRet = logic.MemInit(true); }, ChangeMuch},
         {"Rebuild", [](auto& logic, auto&) { logic.OnContactsTableChanged(); }, ChangeMuch},
-        {"Insert", [](auto& logic, auto&) { Tell(logic, {6}); }, Insert},
-        {"Rename", [](auto& logic, auto&) { Tell(logic, {3}); }, Rename},
-        {"Remove", [](auto& logic, auto&) { Tell(logic, {2}); }, Remove},
-        {"Renew", [](auto& logic, auto&) { Tell(logic, {4}); }, Renew},
-        {"Many",
-         [](auto& logic, auto&) {
-             Tell(logic, {6, 3, 2, 4, 777});
-         },
-         ChangeMuch},
+        {"Insert", Tell<6>, Insert},
+        {"Rename", Tell<3>, Rename},
+        {"Remove", Tell<2>, Remove},
+        {"Renew", Tell<4>, Renew},
+        {"Many", Tell<6, 3, 2, 4, 777>, ChangeMuch},
         {"Status", [](auto& logic, auto&) { logic.OnStatusUpdatesTableChanged(0, nullptr); },
          ChangeStatus},
         {"Time", [](auto& logic, auto&) { logic.OnContactTimeChanged(3, FIRST_TIME + 60'000); },
@@ -215,8 +204,7 @@ CStoreCase::CStoreCase(const tag_Operation& change, int iSortType)
 {
     m_directory.InstallPinyinTable();
     CProviderDatabase provider;
-    CLocalizerLogic logic;
-    logic.MemInit(true);
+    CLocalizerLogic().MemInit(true);
     int iId = 0;
     for (const char* szName : NAMES)
     {
@@ -224,10 +212,8 @@ CStoreCase::CStoreCase(const tag_Operation& change, int iSortType)
     }
     m_before = FreshBuild(m_directory.Root(), iSortType);
     change.pfnChange(provider);
-    for (const int iType : {0, 1})
-    {
-        m_aAfter[iType] = FreshBuild(m_directory.Root(), iType);
-    }
+    m_aAfter[0] = FreshBuild(m_directory.Root(), 0);
+    m_aAfter[1] = FreshBuild(m_directory.Root(), 1);
     for (const tag_StoreImage* pImage : {&m_before, &m_aAfter[0]})
     {
         for (const tag_ContactsStruct& record : pImage->vRecords)
@@ -235,43 +221,34 @@ CStoreCase::CStoreCase(const tag_Operation& change, int iSortType)
             m_mapTexts.insert({record.iContactID, {record.szName, record.szLocalizerKey}});
         }
     }
-    if (Is("FirstBuild"))
-    {
-        m_before = {};
-    }
 }
 
-void CStoreCase::Write(const std::string& strReg, const std::string& strRecords, size_t uLength)
+void CStoreCase::Write(const tag_StoreFiles& files)
 {
-    if (strReg.empty())
+    const auto PutFile = [](const char* szPath, const std::string& strBytes)
     {
-        fs::remove(CDataPaths::ContactReg());
-        fs::remove(CDataPaths::ContactRecords());
-        return;
-    }
-    CDataDirectory::WriteBytes(CDataPaths::ContactReg(), strReg);
-    CDataDirectory::WriteBytes(CDataPaths::ContactRecords(), strRecords);
-    fs::resize_file(CDataPaths::ContactRecords(), uLength);
+        fs::remove(szPath);
+        if (!strBytes.empty())
+        {
+            CDataDirectory::WriteBytes(szPath, strBytes);
+        }
+    };
+    PutFile(CDataPaths::ContactReg(), files.strReg);
+    PutFile(CDataPaths::ContactRecords(), files.strRecords);
 }
 
 void CStoreCase::Restore() const
 {
     if (Is("FirstBuild"))
     {
-        Write("", "", 0);
+        Write({});
         fs::remove(CDataPaths::PinyinMapping());
         return;
     }
-    Write({reinterpret_cast<const char*>(&m_before.reg), sizeof(m_before.reg)},
-          BytesOf(m_before.vRecords),
-          static_cast<size_t>(m_before.reg.iMemSize) * sizeof(tag_ContactsStruct));
-}
-
-tag_StoreImage CStoreCase::Present()
-{
-    const bool bBuilt =
-        CDataDirectory::ReadBytes(CDataPaths::ContactReg()).size() == sizeof(tag_ContactReg);
-    return bBuilt ? ReadStore() : tag_StoreImage{};
+    Write({"", BytesOf(m_before.vRecords)});
+    SetReg(m_before.reg);
+    fs::resize_file(CDataPaths::ContactRecords(),
+                    static_cast<size_t>(m_before.reg.iMemSize) * sizeof(tag_ContactsStruct));
 }
 
 STORE_KIND CStoreCase::KindOf(tag_StoreImage image, std::string* pstrWhy) const
@@ -280,7 +257,6 @@ STORE_KIND CStoreCase::KindOf(tag_StoreImage image, std::string* pstrWhy) const
     {
         return KIND_NONE;
     }
-    const tag_StoreImage& after = After(image.reg.iSortType);
     if (image.reg.iSortType != m_iSortType && !Is("SortType"))
     {
         *pstrWhy = "sort type lost";
@@ -294,11 +270,9 @@ STORE_KIND CStoreCase::KindOf(tag_StoreImage image, std::string* pstrWhy) const
         }
         return pstrWhy->empty() ? KIND_MARKED : KIND_WRONG;
     }
-    if (Difference(image, after).empty())
-    {
-        return KIND_AFTER;
-    }
-    if (!Is("FirstBuild") && Difference(image, m_before).empty())
+    const tag_StoreImage& after = After(image.reg.iSortType);
+    if (!Difference(image, after).empty() && !Is("FirstBuild") &&
+        Difference(image, m_before).empty())
     {
         return KIND_BEFORE;
     }
@@ -313,26 +287,23 @@ STORE_KIND CStoreCase::KindOf(tag_StoreImage image, std::string* pstrWhy) const
     return pstrWhy->empty() ? KIND_AFTER : KIND_WRONG;
 }
 
+// A slot without a contact is nobody's.
 std::string CStoreCase::MixedContact(int iContactID, const wchar_t* szName,
                                      const wchar_t* szKey) const
 {
-    const auto range = m_mapTexts.equal_range(iContactID);
+    const auto [first, end] = m_mapTexts.equal_range(iContactID);
     const bool bKnown =
-        std::any_of(range.first, range.second,
-                    [&](const auto& entry) {
-                        return (szName == nullptr || entry.second.first == szName) &&
-                               entry.second.second == szKey;
+        std::any_of(first, end,
+                    [szName, szKey](const auto& entry)
+                    {
+                        const auto& [strName, strKey] = entry.second;
+                        return (szName == nullptr || strName == szName) && strKey == szKey;
                     });
-    // A slot without a contact is nobody's.
-    return iContactID == 0 || bKnown ? std::string() : "a contact beside another's name";
+    return iContactID == 0 || bKnown ? "" : "a contact beside another's name";
 }
 
 std::string CStoreCase::RepairFault() const
 {
-    const tag_StoreImage store = Present();
-    if (IsMarked(store.reg) || store.reg == tag_ContactReg{})
-    {
-        return "not repaired";
-    }
-    return DifferenceOf(store, After(store.reg.iSortType));
+    const tag_StoreImage store = ReadStore();
+    return IsMarked(store.reg) ? "not repaired" : DifferenceOf(store, After(store.reg.iSortType));
 }

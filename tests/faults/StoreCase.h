@@ -3,7 +3,6 @@
 
 #include "Core/LocalizerLogic.h"
 #include "Core/Records/LocalizerCodes.h"
-#include "tests/Support/DataDirectory.h"
 #include "tests/Support/ProviderDatabase.h"
 #include "tests/Support/StoreImage.h"
 
@@ -11,6 +10,10 @@
 #include <ostream>
 #include <string>
 #include <vector>
+
+// What the program was started with.
+extern unsigned int g_uSeed;
+extern unsigned int g_uSeconds; // that the readers run
 
 // What an operation hands out. Nothing in here allocates.
 struct tag_Answer
@@ -34,6 +37,10 @@ inline std::ostream& operator<<(std::ostream& stream, const tag_Operation& opera
 {
     return stream << operation.szName;
 }
+
+// Searches the contacts that pass the filter of a kind, 0 for all, or the set.
+void Search(CLocalizerLogic& logic, tag_Answer& answer, const wchar_t* szTyped,
+            IME_SEARCH_TYPE eType, int iFilter = 0, tag_LocalizerResult* pLast = nullptr);
 
 // Whether it is a result code of the facade's.
 inline bool IsResult(int iRet)
@@ -65,10 +72,9 @@ public:
     const tag_StoreImage& After(int iSortType) const { return m_aAfter[iSortType == 1 ? 1 : 0]; }
     // The files as they were before the library was told.
     void Restore() const;
-    static void Write(const std::string& strReg, const std::string& strRecords, size_t uLength);
+    // An empty one is removed.
+    static void Write(const tag_StoreFiles& files);
 
-    // The store as it is now; empty when there is none.
-    static tag_StoreImage Present();
     // The kind of a state. What only the next status notification brings may be missing.
     STORE_KIND KindOf(tag_StoreImage image, std::string* pstrWhy) const;
     // What a marked store must not hold: a contact's id beside a name or key that it never had.
@@ -80,7 +86,7 @@ private:
     std::string m_strChange;
     int m_iSortType;
     CDataDirectory m_directory;
-    tag_StoreImage m_before; // empty where there is no store before the change
+    tag_StoreImage m_before;
     tag_StoreImage m_aAfter[2];
     std::multimap<int, std::pair<std::wstring, std::wstring>> m_mapTexts; // names and keys by id
 };

@@ -1,7 +1,7 @@
 #include "tests/faults/StoreStepper.h"
 
-#include "Common/DataPaths.h"
-#include "tests/Support/StoreFiles.h"
+#include "tests/Support/StoreImage.h"
+#include "tests/faults/CallFaults.h"
 
 #include <algorithm>
 #include <cerrno>
@@ -27,12 +27,14 @@ struct tag_Region
     size_t uSize; // whole pages; 0 while nothing is mapped
 };
 
+std::vector<tag_Step> g_vSteps;
+std::string g_strFault;
 tag_Region g_aRegions[2]; // of the records and of the registration record
-tag_Steps* g_pSteps;
-tag_Region g_window; // that is writable for one instruction
+tag_Region g_window;      // that is writable for one instruction
 bool g_bWindowOfReg;
 char g_acBefore[WINDOW];
 
+// Not where there is no such file.
 bool IsLocked(const std::string& strPath)
 {
     const int iFd = open(strPath.c_str(), O_RDONLY);
@@ -41,8 +43,7 @@ bool IsLocked(const std::string& strPath)
     return bLocked;
 }
 
-#if defined(__x86_64__) && !defined(__SANITIZE_ADDRESS__)
-constexpr bool CAN_STEP = true;
+#ifdef QV_CAN_STEP
 constexpr greg_t TRAP_FLAG = 0x100;
 
 void SetTrap(void* pContext, bool bOn)
@@ -51,8 +52,6 @@ void SetTrap(void* pContext, bool bOn)
     flags = bOn ? flags | TRAP_FLAG : flags & ~TRAP_FLAG;
 }
 #else
-constexpr bool CAN_STEP = false;
-
 void SetTrap(void* /*pContext*/, bool /*bOn*/) {}
 #endif
 
@@ -73,31 +72,26 @@ void OnRefusedStore(int iSignal, siginfo_t* pInfo, void* pContext)
             return;
         }
     }
-    std::signal(iSignal, SIG_DFL);
+    (void)std::signal(iSignal, SIG_DFL);
 }
 
-// The instruction is done: notes what it changed.
+// The instruction is done: notes what it changed. It wrote to a mapping and is in no allocation.
 void OnStep(int /*iSignal*/, siginfo_t* /*pInfo*/, void* pContext)
 {
     SetTrap(pContext, false);
     mprotect(g_window.pAddr, g_window.uSize, PROT_READ);
     const char* pEnd = g_window.pAddr + g_window.uSize;
     const char* pFirst = std::mismatch<const char*>(g_window.pAddr, pEnd, g_acBefore).first;
-    if (pFirst == pEnd)
+    while (pEnd > pFirst && *(pEnd - 1) == g_acBefore[pEnd - 1 - g_window.pAddr])
     {
-        return;
+        --pEnd;
     }
-    const char* pLast = pEnd;
-    while (*(pLast - 1) == g_acBefore[pLast - 1 - g_window.pAddr])
+    if (pFirst < pEnd)
     {
-        --pLast;
+        const char* pFile = g_aRegions[g_bWindowOfReg ? 1 : 0].pAddr;
+        const auto uOffset = static_cast<size_t>(pFirst - pFile);
+        g_vSteps.push_back({STEP_STORE, g_bWindowOfReg, uOffset, {pFirst, pEnd}});
     }
-    tag_Step& step = g_pSteps->aSteps[g_pSteps->uSteps++ % tag_Steps::MAX_STEPS];
-    step.eKind = STEP_STORE;
-    step.bReg = g_bWindowOfReg;
-    step.uBytes = static_cast<uint8_t>(pLast - pFirst);
-    step.uOffset = static_cast<uint32_t>(pFirst - g_aRegions[g_bWindowOfReg ? 1 : 0].pAddr);
-    std::memcpy(step.acBytes, pFirst, std::min<size_t>(step.uBytes, tag_Step::MAX_BYTES));
 }
 
 void SetHandler(int iSignal, void (*pfnHandler)(int, siginfo_t*, void*))
@@ -108,33 +102,20 @@ void SetHandler(int iSignal, void (*pfnHandler)(int, siginfo_t*, void*))
     sigaction(iSignal, &action, nullptr);
 }
 
-} // namespace
-
-bool CStoreStepper::IsPossible()
+void ExamineLocks(bool bFlushes)
 {
-    return CAN_STEP;
-}
-
-CStoreStepper::CStoreStepper(tag_Steps& steps)
-{
-    g_pSteps = &steps;
-    steps.uSteps = 0;
-    if (CAN_STEP)
+    const std::string strLock = CDataPaths::LockFile();
+    if (IsLocked(strLock) == bFlushes)
     {
-        SetHandler(SIGSEGV, &OnRefusedStore);
-        SetHandler(SIGTRAP, &OnStep);
+        g_strFault = bFlushes ? "searches wait for the disk" : "no lock around records";
     }
-    Set(this);
+    if (bFlushes && !IsLocked(strLock.substr(0, strLock.rfind('/'))))
+    {
+        g_strFault = "another writer may lift the mark";
+    }
 }
 
-CStoreStepper::~CStoreStepper()
-{
-    Set(nullptr);
-    std::signal(SIGSEGV, SIG_DFL);
-    std::signal(SIGTRAP, SIG_DFL);
-}
-
-void CStoreStepper::Happens(MAP_EVENT eEvent, const tag_Mapping& mapping)
+void OnMapping(MAP_EVENT eEvent, const tag_Mapping& mapping)
 {
     const bool bReg = std::strcmp(mapping.szFile, REG_FILE) == 0;
     const bool bRecords = std::strcmp(mapping.szFile, RECORDS_FILE) == 0;
@@ -147,31 +128,37 @@ void CStoreStepper::Happens(MAP_EVENT eEvent, const tag_Mapping& mapping)
         return;
     }
     tag_Region& region = g_aRegions[bReg ? 1 : 0];
-    if (eEvent == MAP_ENDS)
-    {
-        region.uSize = region.pAddr == mapping.pAddr ? 0 : region.uSize;
-        return;
-    }
-    tag_Step& step = g_pSteps->aSteps[g_pSteps->uSteps++];
-    step = {eEvent == MAP_MADE ? STEP_LENGTH : STEP_FLUSH, bReg, 0, 0, {}};
     if (eEvent == MAP_MADE)
     {
-        step.uOffset = static_cast<uint32_t>(
-            (bReg ? CDataDirectory::ReadBytes(CDataPaths::ContactReg()) : RecordsFile()).size());
+        const tag_StoreFiles files = ReadFiles();
+        g_vSteps.push_back(
+            {STEP_LENGTH, bReg, (bReg ? files.strReg : files.strRecords).size(), ""});
         region = {static_cast<char*>(mapping.pAddr), (mapping.uSize + PAGE - 1) / PAGE * PAGE};
         mprotect(mapping.pAddr, mapping.uSize, PROT_READ);
     }
+    else if (eEvent == MAP_FLUSHED)
+    {
+        g_vSteps.push_back({STEP_FLUSH, bReg, 0, ""});
+    }
+    else if (region.pAddr == mapping.pAddr)
+    {
+        region.uSize = 0;
+    }
 }
 
-void CStoreStepper::ExamineLocks(bool bFlushes)
+} // namespace
+
+std::vector<tag_Step> StepThrough(const std::function<void()>& fnRun, std::string* pstrFault)
 {
-    const std::string strLock = CDataPaths::LockFile();
-    if (IsLocked(strLock) == bFlushes)
-    {
-        m_strFault = bFlushes ? "searches wait for the disk" : "no lock around records";
-    }
-    if (bFlushes && !IsLocked(strLock.substr(0, strLock.rfind('/'))))
-    {
-        m_strFault = "another writer may lift the mark";
-    }
+    g_vSteps.clear();
+    g_strFault.clear();
+    SetHandler(SIGSEGV, &OnRefusedStore);
+    SetHandler(SIGTRAP, &OnStep);
+    WatchMappings(&OnMapping);
+    fnRun();
+    WatchMappings(nullptr);
+    (void)std::signal(SIGSEGV, SIG_DFL);
+    (void)std::signal(SIGTRAP, SIG_DFL);
+    *pstrFault = g_strFault;
+    return g_vSteps;
 }

@@ -9,15 +9,14 @@
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/MemoryFailure.h"
 #include "tests/Support/ProviderDatabase.h"
+#include "tests/Support/WideText.h"
 
 #include <gtest/gtest.h>
 #include <sqlite3.h>
 
 #include <algorithm>
-#include <climits>
-#include <cstring>
 #include <filesystem>
-#include <numeric>
+#include <sstream>
 #include <tuple>
 
 namespace
@@ -34,68 +33,28 @@ const std::string COUNT_STEP = " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllL
 const std::string SQLSTAT_4 = "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_4 = ";
 const std::string SQLSTAT_5 = "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_5 = ";
 
-// 1, 2 and so on up to iLast, and their text.
-Groups UpTo(int iLast)
-{
-    Groups vIds(static_cast<size_t>(iLast));
-    std::iota(vIds.begin(), vIds.end(), 1);
-    return vIds;
-}
+// The numbers from 1 on.
 std::string IdText(int iLast)
 {
     return iLast == 1 ? "1" : IdText(iLast - 1) + "." + std::to_string(iLast);
 }
 
-// What a read leaves, released with the object.
-struct tag_ReadSet : tag_ContactsInfo
+// What a record holds: its numbers, name, key, groups and accounts.
+std::string TextOf(const tag_ContactsStruct& record)
 {
-    tag_ReadSet() : tag_ContactsInfo{0, nullptr} {}
-    ~tag_ReadSet() { delete[] pContacts; }
-    tag_ReadSet(const tag_ReadSet&) = delete;
-    tag_ReadSet& operator=(const tag_ReadSet&) = delete;
-
-    Ids IdsRead() const
+    std::ostringstream text;
+    text << record.iContactID << ' ' << record.iFlags << ' ' << record.llLastTimeContacted << ' '
+         << record.iTimesContacted << ' ' << record.iStatusUpdateID << ' ' << Narrow(record.szName)
+         << ' ' << Narrow(record.szLocalizerKey) << " ";
+    const char* szSeparator = "";
+    for (const QVLong32 lId : record.lGroupID)
     {
-        Ids vIds(static_cast<size_t>(RecordNum));
-        std::transform(pContacts, pContacts + RecordNum, vIds.begin(),
-                       [](const auto& record) { return record.iContactID; });
-        return vIds;
+        text << (lId == 0 ? "" : szSeparator + std::to_string(lId));
+        szSeparator = ".";
     }
-};
-
-// The record of a contact whose texts are read as these.
-tag_ContactsStruct RecordOf(const tag_ProviderContact& contact, const std::wstring& strName,
-                            const std::wstring& strKey, const Groups& vGroups,
-                            const Groups& vAccounts)
-{
-    tag_ContactsStruct record = {};
-    record.iContactID = contact.iId;
-    record.iFlags =
-        (contact.bStarred ? CONTACT_FLAG_STARRED : 0) | (contact.bPhone ? CONTACT_FLAG_PHONE : 0) |
-        (contact.bSecret ? CONTACT_FLAG_SECRET : 0) | (contact.bMail ? CONTACT_FLAG_MAIL : 0) |
-        (contact.bAddress ? CONTACT_FLAG_ADDRESS : 0);
-    record.llLastTimeContacted = contact.llLastTime;
-    record.iTimesContacted = contact.iTimes;
-    record.iStatusUpdateID = contact.iStatusId;
-    std::copy(strName.begin(), strName.end(), record.szName);
-    std::copy(strKey.begin(), strKey.end(), record.szLocalizerKey);
-    std::copy(vGroups.begin(), vGroups.end(), record.lGroupID);
-    std::copy(vAccounts.begin(), vAccounts.end(), record.lAccountID);
-    return record;
-}
-
-bool IsSame(const tag_ContactsStruct& a, const tag_ContactsStruct& b)
-{
-    return std::memcmp(&a, &b, sizeof(a)) == 0;
-}
-
-// The place of a virtual operation, as it stands in a pointer to it.
-template <typename T>
-size_t SlotOf(T pfnOperation)
-{
-    size_t uOffset = 0;
-    std::memcpy(&uOffset, &pfnOperation, sizeof(uOffset));
-    return uOffset / sizeof(void*);
+    const auto pEnd = std::find(record.lAccountID, std::end(record.lAccountID), 0);
+    text << " " << (pEnd - record.lAccountID) << " accounts";
+    return text.str();
 }
 
 std::string ListText(std::vector<long long> vIds)
@@ -105,43 +64,48 @@ std::string ListText(std::vector<long long> vIds)
 
 sqlite3* g_pReaderDB = nullptr;
 
+// An SQL function: a value that takes memory once it is asked for, when there is none any more.
+void RefuseMemory(sqlite3_context* pContext, int /*iArguments*/, sqlite3_value** /*ppArguments*/)
+{
+    sqlite3_result_zeroblob(pContext, 5000);
+    sqlite3_hard_heap_limit64(1);
+}
+
 // Gives the reader's own connection to the tests.
 int CatchConnection(sqlite3* pDB, char** /*pszError*/, const sqlite3_api_routines* /*pApi*/)
 {
     g_pReaderDB = pDB;
-    return SQLITE_OK;
+    return sqlite3_create_function(pDB, "refuse_memory", 0, SQLITE_UTF8, nullptr, &RefuseMemory,
+                                   nullptr, nullptr);
 }
-
-// SQLite's memory, of which only so many allocations are granted. SQLite is told before it starts,
-// and to ask for each allocation instead of keeping small ones at hand.
-struct tag_SqliteMemory
-{
-    tag_SqliteMemory()
-    {
-        sqlite3_config(SQLITE_CONFIG_GETMALLOC, &s_system);
-        sqlite3_mem_methods methods = s_system;
-        methods.xMalloc = [](int iSize) { return IsRefused() ? nullptr : s_system.xMalloc(iSize); };
-        methods.xRealloc = [](void* pMemory, int iSize)
-        { return IsRefused() ? nullptr : s_system.xRealloc(pMemory, iSize); };
-        sqlite3_config(SQLITE_CONFIG_MALLOC, &methods);
-        sqlite3_config(SQLITE_CONFIG_LOOKASIDE, 0, 0);
-    }
-    static bool IsRefused() { return s_iGranted == 0 || --s_iGranted == 0; }
-
-    static inline sqlite3_mem_methods s_system = {};
-    static inline int s_iGranted = INT_MAX;
-} g_sqliteMemory;
 
 // A reader on an empty provider database in a directory of its own.
 class Reader : public testing::Test
 {
 protected:
-    int ReadAll(tag_ContactsInfo& set) { return m_reader.ReadAllLocalizer(&set, 0, nullptr); }
-    int Count() { return m_reader.GetContactsCount(&m_iCount); }
-    int ReadOnline(tag_ContactsInfo& set)
+    Reader() { sqlite3_auto_extension(reinterpret_cast<void (*)()>(&CatchConnection)); }
+    ~Reader() override
     {
-        return m_reader.ReadAllSmsOnlineStatus(&set, 0, nullptr);
+        sqlite3_reset_auto_extension();
+        delete[] m_set.pContacts;
     }
+
+    int ReadAll(CSQLiteOperator& reader, long lCount = 0, long long* pIds = nullptr)
+    {
+        delete[] m_set.pContacts;
+        m_set = {0, nullptr};
+        return reader.ReadAllLocalizer(&m_set, lCount, pIds);
+    }
+    int ReadAll() { return ReadAll(m_reader); }
+    Ids IdsRead() const
+    {
+        Ids vIds;
+        std::transform(m_set.pContacts, m_set.pContacts + m_set.RecordNum, std::back_inserter(vIds),
+                       [](const auto& record) { return record.iContactID; });
+        return vIds;
+    }
+    int Count() { return m_reader.GetContactsCount(&m_iCount); }
+    int ReadOnline() { return m_reader.ReadAllSmsOnlineStatus(&m_set, 0, nullptr); }
     Lines Errors()
     {
         Lines vErrors = m_log.Texts(ERROR_LINE);
@@ -153,18 +117,11 @@ protected:
     CProviderDatabase m_provider;
     CLogCapture m_log;
     CSQLiteOperator m_reader;
+    tag_ContactsInfo m_set = {0, nullptr};
     int m_iCount = 42;
 };
 
 } // namespace
-
-TEST(DBOperatorInterface, KeepsTheOrderOfItsSlots)
-{
-    EXPECT_EQ(2U, SlotOf(&CDBOperator::GetContactsCount));
-    EXPECT_EQ(3U, SlotOf(&CDBOperator::ReadAllLocalizer));
-    EXPECT_EQ(4U, SlotOf(&CDBOperator::ReadContactsByID));
-    EXPECT_EQ(5U, SlotOf(&CDBOperator::ReadAllSmsOnlineStatus));
-}
 
 TEST(IdTexts, HoldWhatFits)
 {
@@ -203,46 +160,46 @@ TEST(IdTexts, HoldWhatFits)
 // The rows of a database and their records; those of a single contact may have one group more.
 TEST_F(Reader, MakesRecordsOfRows)
 {
-    const std::wstring strLetters(30, L'x');
-    const std::wstring strZhang(10, L'\u5F20');
-    const std::string strZhangBytes = "张张张张张张张张张张张张张张张张";
+    const std::string strZhang = "张张张张张张张张张张";
+    const std::string strTen(10, 'x');
     tag_ProviderContact full = {-4, "安", "k", IdText(101), "6", 1'700'000'000'123, 2, 8};
     full.bSecret = full.bMail = full.bPhone = true;
-    Groups vFullGroups = UpTo(99);
-    vFullGroups.push_back(SECRET_GROUP_ID);
     tag_ProviderContact secret = {1, "", "", "7.x.9", IdText(21)};
     secret.bSecret = secret.bStarred = secret.bAddress = true;
-    const std::tuple<tag_ProviderContact, tag_ContactsStruct> ROWS[] = {
-        {full, RecordOf(full, L"安", L"k", vFullGroups, {6})},
-        {secret, RecordOf(secret, L"", L"", {7, SECRET_GROUP_ID}, UpTo(20))},
+    const std::string strFull =
+        std::to_string(CONTACT_FLAG_SECRET | CONTACT_FLAG_MAIL | CONTACT_FLAG_PHONE);
+    const std::string strSecret =
+        std::to_string(CONTACT_FLAG_SECRET | CONTACT_FLAG_STARRED | CONTACT_FLAG_ADDRESS);
+    const std::pair<tag_ProviderContact, std::string> ROWS[] = {
+        {full, "-4 " + strFull + " 1700000000123 2 8 安 k " + IdText(99) + ".-1 1 accounts"},
+        {secret, "1 " + strSecret + " 0 0 0   7.-1 20 accounts"},
         {{2, std::string(40, 'x'), std::string(40, 'x')},
-         RecordOf({2}, strLetters, strLetters.substr(0, 10), {}, {})},
-        {{3, strZhangBytes, strZhangBytes}, RecordOf({3}, strZhang, strZhang, {}, {})},
+         "2 0 0 0 0 " + strTen + strTen + strTen + " " + strTen + "  0 accounts"},
+        {{3, strZhang + strZhang, strZhang + strZhang},
+         "3 0 0 0 0 " + strZhang + " " + strZhang + "  0 accounts"},
         // The last character would end behind the limit.
-        {{4, "x" + strZhangBytes, "x" + strZhangBytes},
-         RecordOf({4}, L"x" + strZhang.substr(1), L"x" + strZhang.substr(1), {}, {})},
+        {{4, "x" + strZhang, "x" + strZhang},
+         "4 0 0 0 0 x张张张张张张张张张 x张张张张张张张张张  0 accounts"},
         // Not UTF-8 from some byte on.
-        {{5, "ab\xF0\x9F\x98\x80zz", std::string("ab\0cd", 5)},
-         RecordOf({5}, L"ab", L"ab", {}, {})},
+        {{5, "ab\xF0\x9F\x98\x80zz", std::string("ab\0cd", 5)}, "5 0 0 0 0 ab ab  0 accounts"},
     };
     for (const auto& [contact, expected] : ROWS)
     {
         m_provider.Put(contact);
     }
-    tag_ReadSet set;
-    ASSERT_EQ(0, ReadAll(set));
-    ASSERT_EQ(6, set.RecordNum);
+    ASSERT_EQ(0, ReadAll());
+    ASSERT_EQ(6, m_set.RecordNum);
     for (int i = 0; i < 6; ++i)
     {
-        tag_ContactsStruct expected = std::get<1>(ROWS[i]);
-        EXPECT_TRUE(IsSame(expected, set.pContacts[i])) << i;
+        tag_ContactsStruct expected = m_set.pContacts[i];
+        EXPECT_EQ(TextOf(expected), ROWS[i].second);
         tag_ContactsStruct record = {};
         expected.lGroupID[99] = i == 0 ? 100 : 0;
         record.iStatusUpdateID = expected.iStatusUpdateID = 77; // not read
         int iFound = 5;
         EXPECT_EQ(0, m_reader.ReadContactsByID(expected.iContactID, &record, iFound));
         EXPECT_EQ(1, iFound);
-        EXPECT_TRUE(IsSame(expected, record)) << i;
+        EXPECT_EQ(TextOf(expected), TextOf(record));
     }
     EXPECT_TRUE(
         m_log.Has(DEBUG_LINE, READER + " CSQLiteOperator ReadContactsByID iContactID = -4\n"));
@@ -271,9 +228,8 @@ TEST_F(Reader, ReadsTheListedVisibleContactsOnly)
     for (const auto& [lCount, vRead] : COUNTS)
     {
         m_log.Clear();
-        tag_ReadSet set;
-        ASSERT_EQ(0, m_reader.ReadAllLocalizer(&set, lCount, vIds.data()));
-        EXPECT_EQ(vRead, set.IdsRead()) << lCount;
+        ASSERT_EQ(0, ReadAll(m_reader, lCount, vIds.data()));
+        EXPECT_EQ(vRead, IdsRead()) << lCount;
     }
     const std::string strVisible =
         "contacts where cast(exists(select _id from visible_contacts where "
@@ -312,95 +268,81 @@ TEST(StatusIndex, FindsTheSameWithoutItsTable)
 // With its table and, without memory, without it.
 TEST_F(Reader, MarksTheFirstRecordOfEachOnlineStatus)
 {
-    m_provider.Execute("insert into status_updates values(-5,'online'),(0,'online'),(7,'away'),"
-                       "(8,null),(9,'online'),(11,'online'),(12,'Online')");
-    const std::string strFound = "CSQLiteOperator:Find one contact is sms online:statusid:";
-    std::vector<tag_ContactsStruct> vRecords;
+    int iId = 0;
     for (const int iStatusId : {7, 9, 0, 8, 9, 0, -5, 12})
     {
-        vRecords.push_back({});
-        vRecords.back().iStatusUpdateID = iStatusId;
-        vRecords.back().iFlags = CONTACT_FLAG_ONLINE;
+        m_provider.Put({++iId, "", "", "", "", 0, 0, iStatusId});
     }
-    tag_ContactsInfo set = {8, vRecords.data()};
+    m_provider.Execute("insert into status_updates values(-5,'online'),(0,'online'),(7,'away'),"
+                       "(8,null),(9,'online'),(11,'online'),(12,'Online')");
+    ASSERT_EQ(0, ReadAll());
+    const std::string strFound = "CSQLiteOperator:Find one contact is sms online:statusid:";
     for (const int iGranted : {1000, 0})
     {
         EXPECT_EQ(0, Count()); // opens the database
         m_log.Clear();
         const CMemoryFailure failure(iGranted);
-        EXPECT_EQ(0, ReadOnline(set)) << iGranted;
-        for (size_t i = 0; i < 8; ++i)
+        EXPECT_EQ(0, ReadOnline()) << iGranted;
+        for (int i = 0; i < 8; ++i)
         {
-            EXPECT_EQ(i == 1 || i == 2 || i == 6 ? CONTACT_FLAG_ONLINE : 0, vRecords[i].iFlags);
+            EXPECT_EQ(i == 1 || i == 2 || i == 6 ? CONTACT_FLAG_ONLINE : 0,
+                      m_set.pContacts[i].iFlags);
+            m_set.pContacts[i].iFlags = CONTACT_FLAG_ONLINE;
         }
         EXPECT_EQ(m_log.Texts(DEBUG_LINE),
                   (Lines{strFound + "-5\n", strFound + "0\n", strFound + "9\n"}));
     }
-    m_provider.Put({1});
     const CMemoryFailure failure(0);
-    EXPECT_EQ(-1, ReadAll(set));
+    EXPECT_EQ(-1, ReadAll());
     EXPECT_EQ(Errors(), Lines{READER + "ReadAllLocalizer  NEW MEM ERR!!!!!!"});
 }
 
-// A refused allocation must not pass for an empty text: group ids that are numbers become text only
-// when they are asked for.
-TEST_F(Reader, FailsOrIsRightWithoutSqlitesMemory)
+// A refused allocation must not pass for an empty text.
+TEST_F(Reader, FailsWhereSqliteHasNoMemoryForATextOfTheLastRow)
 {
-    m_provider.PutAll({{1, "a", "", "1.2"}, {2, "b", "", "7"}});
-    m_provider.Execute("create table t as select * from localizer; drop table localizer;"
-                       "create table localizer(contact_id, display_name, localizerkey, group_id "
-                       "integer, account_id, hasMail, hasAddress);"
-                       "insert into localizer select * from t");
-    int iFailed = 0;
-    for (bool bRanOut = true; bRanOut; ++iFailed)
-    {
-        CSQLiteOperator reader;
-        tag_ReadSet set;
-        tag_ContactsStruct single = {};
-        int iFound = 0;
-        tag_SqliteMemory::s_iGranted = iFailed + 1;
-        const int iAll = reader.ReadAllLocalizer(&set, 0, nullptr);
-        const int iSingle = iAll == 0 ? reader.ReadContactsByID(2, &single, iFound) : -1;
-        bRanOut = tag_SqliteMemory::s_iGranted == 0;
-        tag_SqliteMemory::s_iGranted = INT_MAX;
-        EXPECT_TRUE(iAll != 0 || set.pContacts[1].lGroupID[0] == 7) << iFailed;
-        EXPECT_TRUE(iSingle != 0 || iFound == 0 || single.lGroupID[0] == 7) << iFailed;
-    }
-    EXPECT_GT(iFailed, 50) << "SQLite asks for each allocation";
+    m_provider.Put({1, "a"});
+    m_provider.Execute("alter table localizer rename to names;"
+                       "create view localizer as select contact_id, display_name, localizerkey, "
+                       "group_id, refuse_memory() as account_id, hasMail, hasAddress from names");
+    tag_ContactsStruct record = {};
+    EXPECT_EQ(-1, ReadAll());
+    sqlite3_hard_heap_limit64(0);
+    EXPECT_EQ(-1, m_reader.ReadContactsByID(1, &record, m_iCount));
+    sqlite3_hard_heap_limit64(0);
+    EXPECT_EQ(1, m_iCount) << "found";
 }
 
 TEST_F(Reader, FailsOnWhatIsNoProviderDatabase)
 {
-    tag_ReadSet set;
     tag_ContactsStruct record = {};
     fs::remove(CDataPaths::Database());
-    EXPECT_EQ(-1, ReadAll(set));
+    EXPECT_EQ(-1, ReadAll());
     EXPECT_EQ(-1, Count());
     EXPECT_EQ(-1, m_reader.ReadContactsByID(1, &record, m_iCount));
-    EXPECT_EQ(-1, ReadOnline(set));
+    EXPECT_EQ(-1, ReadOnline());
     EXPECT_EQ(Errors(), Lines(4, READER + "CSQLiteOperator  open iRetCode = 14"));
     EXPECT_FALSE(fs::exists(CDataPaths::Database()));
 
     CDataDirectory::WriteBytes(CDataPaths::Database(), std::string(5000, 'x'));
-    EXPECT_EQ(-1, ReadAll(set));
+    EXPECT_EQ(-1, ReadAll());
     EXPECT_EQ(-1, Count());
-    EXPECT_EQ(-1, ReadOnline(set));
+    EXPECT_EQ(-1, ReadOnline());
     EXPECT_EQ(Errors(), (Lines{COUNT_STEP + "sqlite3_prepare ERROR result=26",
                                " " + READER + " select contacts count ERROR result=26",
                                " select contacts count ERROR result=26"}));
     EXPECT_EQ(42, m_iCount);
-    EXPECT_EQ(nullptr, set.pContacts);
+    EXPECT_EQ(nullptr, m_set.pContacts);
 
     fs::remove(CDataPaths::Database());
     CProviderDatabase provider;
     provider.PutAll({{1}, {2}});
     provider.Execute("alter table localizer drop column hasMail");
     CSQLiteOperator reader;
-    EXPECT_EQ(-1, reader.ReadAllLocalizer(&set, 0, nullptr));
-    EXPECT_EQ(2, set.RecordNum);
+    EXPECT_EQ(-1, ReadAll(reader));
+    EXPECT_EQ(2, m_set.RecordNum);
     provider.Execute("alter table contacts drop column photo_file_id");
-    tag_ReadSet another;
-    EXPECT_EQ(-1, CSQLiteOperator().ReadAllLocalizer(&another, 0, nullptr));
+    CSQLiteOperator another;
+    EXPECT_EQ(-1, ReadAll(another));
     EXPECT_EQ(Errors(), Lines{" " + READER + " select from contacts ERROR result=1"});
 }
 
@@ -416,16 +358,14 @@ TEST_F(Reader, FailsWithoutContactsGoneSinceTheCountAndLeavesNewOnesOut)
                 bRemoves ? m_provider.Remove(2) : m_provider.Put({3, "c"});
             }
         });
-    tag_ReadSet set;
-    EXPECT_EQ(-1, ReadAll(set));
-    EXPECT_EQ((Ids{1, 4, 0}), set.IdsRead());
-    EXPECT_STREQ(L"d", set.pContacts[1].szName);
+    EXPECT_EQ(-1, ReadAll());
+    EXPECT_EQ((Ids{1, 4, 0}), IdsRead());
+    EXPECT_STREQ(L"d", m_set.pContacts[1].szName);
     EXPECT_EQ(Errors(),
               Lines{READER + "SQLiteOperator>>ReadAllLocalizer: iIndex < pRecord->RecordNum\n"});
     bRemoves = false;
-    tag_ReadSet later;
-    EXPECT_EQ(0, ReadAll(later));
-    EXPECT_EQ((Ids{1, 3}), later.IdsRead());
+    EXPECT_EQ(0, ReadAll());
+    EXPECT_EQ((Ids{1, 3}), IdsRead());
     EXPECT_EQ(Errors(),
               (Lines{" " + READER + " select from contacts sqlite3_step ERROR result=100",
                      READER + " SQLiteOperator>>ReadAllLocalizer: sqlite3_step  error from "
@@ -442,23 +382,22 @@ TEST_F(Reader, TriesALockedDatabaseForAWhile)
         vLines.push_back(strLast);
         return vLines;
     };
-    tag_ReadSet set;
     m_provider.Put({1});
     m_provider.LockExclusive();
-    EXPECT_EQ(-1, ReadAll(set));
+    EXPECT_EQ(-1, ReadAll());
     EXPECT_EQ(Errors(), fnRepeat(4, READER + " SQLITE_BUSY: select count",
                                  COUNT_STEP + "sqlite3_prepare ERROR result=5"));
     EXPECT_EQ(-1, Count());
     EXPECT_EQ(Errors(), fnRepeat(4, READER + " SQLITE_BUSY: GetContactsCount",
                                  " " + READER + " select contacts count ERROR result=5"));
-    EXPECT_EQ(-1, ReadOnline(set));
+    EXPECT_EQ(-1, ReadOnline());
     EXPECT_EQ(m_log.Texts(DEBUG_LINE), Lines(4, "!!! SQLITE_BUSY: select count"));
     m_provider.Unlock();
     EXPECT_EQ(0, Count());
     EXPECT_EQ(1, m_iCount);
     m_provider.LockExclusive();
     m_log.Clear();
-    EXPECT_EQ(-1, ReadAll(set));
+    EXPECT_EQ(-1, ReadAll());
     const std::string strBusy = COUNT_STEP + "sqlite3_step is busy try ";
     EXPECT_EQ(Errors(), (Lines{strBusy + "1 times", strBusy + "2 times", strBusy + "3 times",
                                COUNT_STEP + "sqlite3_step ERROR result=5"}));
@@ -475,7 +414,6 @@ TEST_F(Reader, TriesALockedDatabaseForAWhile)
 TEST_F(Reader, WaitsForTheRecordQueriesAsLongAsItTakes)
 {
     m_provider.PutAll({{1, "a"}, {2, "b"}});
-    sqlite3_auto_extension(reinterpret_cast<void (*)()>(&CatchConnection));
     for (const auto& lines : {std::pair(SQLSTAT_4, READER + " SQLITE_BUSY: select from contacts"),
                               std::pair(SQLSTAT_5, READER + " SQLITE_BUSY: select from localizer")})
     {
@@ -494,25 +432,22 @@ TEST_F(Reader, WaitsForTheRecordQueriesAsLongAsItTakes)
                     m_provider.Unlock();
                 }
             });
-        tag_ReadSet set;
-        EXPECT_EQ(0, ReadAll(set));
+        EXPECT_EQ(0, ReadAll());
         EXPECT_EQ(6, iBusy);
-        EXPECT_EQ((Ids{1, 2}), set.IdsRead());
+        EXPECT_EQ((Ids{1, 2}), IdsRead());
     }
-    sqlite3_reset_auto_extension();
 }
 
 // The file is replaced by another: an operation that kept its connection still reads the old one.
 TEST_F(Reader, KeepsItsConnectionUntilAReadIsComplete)
 {
     m_provider.Put({1});
-    tag_ReadSet set;
-    EXPECT_EQ(0, ReadOnline(set));
+    EXPECT_EQ(0, ReadOnline());
     fs::remove(CDataPaths::Database());
     CProviderDatabase().PutAll({{1}, {2}});
     EXPECT_EQ(0, Count());
     EXPECT_EQ(1, m_iCount);
-    EXPECT_EQ(0, ReadAll(set));
+    EXPECT_EQ(0, ReadAll());
     EXPECT_EQ(0, Count());
     EXPECT_EQ(2, m_iCount);
 }

@@ -20,7 +20,7 @@ esac
 case "${1:-}" in
     --lint) packages+=(clang clang-format-14 clang-tidy-14 abigail-tools doxygen) ;;
     --armhf) packages+=(g++-arm-linux-gnueabihf qemu-user googletest) ;;
-    --peers) packages+=(openjdk-17-jdk-headless libwinpr2-2 python3-gi gir1.2-ebookcontacts-1.2) ;;
+    --peers) packages+=(openjdk-17-jdk-headless python3-gi gir1.2-ebookcontacts-1.2) ;;
     --bare) packages=(debootstrap debian-archive-keyring git) ;;
 esac
 

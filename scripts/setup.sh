@@ -3,8 +3,7 @@
 #   scripts/setup.sh          compiler (clang where CXX names it), build tools and libraries
 #   scripts/setup.sh --lint   also what .ci/run checks with: clang and its tools, libabigail, Doxygen
 #   scripts/setup.sh --armhf  also the cross compiler and the emulator for 32-bit ARM
-#   scripts/setup.sh --peers  also what some tests meet beside the library and are skipped without:
-#                             a JDK, a library with names of ours, another reader of vCards
+#   scripts/setup.sh --java   also a JDK: without it the Java classes are neither built nor tested
 #   scripts/setup.sh --bare   only what makes a bare Debian to try the two commands in
 # Touches neither apt nor the network when nothing is missing.
 set -euo pipefail
@@ -20,7 +19,7 @@ esac
 case "${1:-}" in
     --lint) packages+=(clang clang-format-14 clang-tidy-14 abigail-tools doxygen) ;;
     --armhf) packages+=(g++-arm-linux-gnueabihf qemu-user googletest) ;;
-    --peers) packages+=(openjdk-17-jdk-headless python3-gi gir1.2-ebookcontacts-1.2) ;;
+    --java) packages+=(openjdk-17-jdk-headless) ;;
     --bare) packages=(debootstrap debian-archive-keyring git) ;;
 esac
 

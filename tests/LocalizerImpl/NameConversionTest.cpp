@@ -96,6 +96,13 @@ TEST_F(NameConversion, MakesCodesAndKeysOfNames)
     EXPECT_EQ(log.Texts(DEBUG_LINE), Lines{"QV_Contacts: TranslateNameToLocal the char is digital: "
                                            "2 , the localize char is 0x5a02"});
     EXPECT_EQ(log.Texts(ERROR_LINE), (Lines{strCall + "-1!", strCall + "is wrong!"}));
+    RemoveTable();
+    tag_ContactsInfo nobody = {0, nullptr};
+    tag_ContactsStruct record = {};
+    EXPECT_EQ(Manager::GetLocalizerChars(szName, szCodes), -1);
+    EXPECT_EQ(Manager::GetLocalizerBatch(&nobody), -1000);
+    EXPECT_EQ(Manager::TransNameToPY(&record, 1), -1000);
+    EXPECT_EQ(Pick(L"yi", 2, L"一"), L"-1000 ");
 }
 
 TEST_F(NameConversion, PutsAPickedCharacterInPlaceOfItsLetters)
@@ -104,39 +111,34 @@ TEST_F(NameConversion, PutsAPickedCharacterInPlaceOfItsLetters)
     EXPECT_EQ(Pick(L"sss", 2, L"三"), L"0 S三") << "the last one before the position";
     EXPECT_EQ(Pick(L"sss", 99, L"三"), L"0 SS三");
     EXPECT_EQ(Pick(L"sss", INT32_MIN, L"三"), L"0 sss") << "nothing is before it";
+    EXPECT_EQ(Pick(L"yi", 2, L"一"), L"0 一") << "the first record";
     EXPECT_EQ(Pick(L"liz", 3, L"长"), L"0 LI长") << "the second reading";
     EXPECT_EQ(Pick(L"Zhangs", 5, L"三"), L"0 zhangs") << "no letter fits";
     EXPECT_EQ(Pick(L"Li", 2, L"한"), L"-1000 li") << "not in the table";
     EXPECT_EQ(Pick(L"Li", 1, L"abc"), L"0 LIABC") << "no Chinese character";
 }
 
-TEST_F(NameConversion, FindsTheIndexCharacterOfACode)
+TEST_F(NameConversion, FindsTheIndexCharacterOfACodeOrATime)
 {
-    const std::pair<wchar_t, wchar_t> ROWS[] = {{0x4F00, L'A'}, {0x4F19, L'Z'}, {0x4F1A, L'#'},
-                                                {0x5000, L'#'}, {0x5A05, L'#'}, {0, L'#'},
-                                                {0x4C3E, L'#'}, {0x0FFF, L'#'}, {0x14F01, L'B'}};
+    const std::pair<wchar_t, wchar_t> ROWS[] = {
+        {0x4F00, L'A'}, {0x4F19, L'Z'}, {0x4F1A, L'#'}, {0x5000, L'#'},  {0x5A05, L'#'},
+        {0, L'#'},      {0x4C3E, L'#'}, {0x0FFF, L'#'}, {0x14F01, L'B'}, {HanZi(L'长'), L'C'}};
     wchar_t szOut[] = {UNTOUCHED, UNTOUCHED};
     for (const auto& [code, expected] : ROWS)
     {
         Manager::GetFirstWord(m_pMap, code, szOut);
-        EXPECT_EQ(szOut[0], expected) << std::hex << static_cast<unsigned>(code);
+        EXPECT_EQ(std::wstring(szOut, 2), (std::wstring{expected, UNTOUCHED})) << std::hex << +code;
     }
-    Manager::GetFirstWord(m_pMap, HanZi(L'长'), szOut);
-    EXPECT_EQ(std::wstring(szOut, 2), (std::wstring{L'C', UNTOUCHED})) << "one character";
-}
-
-TEST_F(NameConversion, FindsTheIndexCharacterOfATime)
-{
     CQVNumLocalizerManager atZero(1); // its present is 0
     constexpr long long DAYS_30 = 2592000000;
     const long long FIRST_AGES[] = {INT64_MIN + 1, DAYS_30, 3 * DAYS_30, 6 * DAYS_30, 12 * DAYS_30};
-    wchar_t szOut[] = {UNTOUCHED, 0};
     for (int i = 0; i < 5; ++i)
     {
-        atZero.GetFirstWord(-FIRST_AGES[i], szOut);
-        EXPECT_EQ(szOut[0] - L'1', static_cast<wchar_t>(i));
-        atZero.GetFirstWord(i == 4 ? -INT64_MAX : 1 - FIRST_AGES[i + 1], szOut);
-        EXPECT_EQ(szOut[0] - L'1', static_cast<wchar_t>(i));
+        for (const long long llAge : {FIRST_AGES[i], i == 4 ? INT64_MAX : FIRST_AGES[i + 1] - 1})
+        {
+            atZero.GetFirstWord(-llAge, szOut);
+            EXPECT_EQ(szOut[0], L'1' + static_cast<wchar_t>(i));
+        }
     }
 }
 

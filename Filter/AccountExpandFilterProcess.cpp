@@ -2,7 +2,7 @@
 
 #include "Common/Log.h"
 #include "Filter/FilterChain.h"
-#include "Filter/IdList.h"
+#include "Filter/RecordIds.h"
 
 namespace
 {

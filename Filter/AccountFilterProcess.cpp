@@ -1,6 +1,6 @@
 #include "Filter/AccountFilterProcess.h"
 
-#include "Filter/IdList.h"
+#include "Filter/RecordIds.h"
 
 int AccountFilterProcess::IsSameAccount(int iID, QVLong32* plList, int iNum)
 {

@@ -10,8 +10,7 @@ class QV_EXPORT FavouritesFilterProcess : public FilterProcess
 public:
     // The kind of filter served, and its rule.
     static constexpr int KIND = FILTER_FAVOURITES;
-    QV_INTERNAL static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                                  CFilterChain& chain);
+    static constexpr RecordRuleFn Keeps = HasFlag<CONTACT_FLAG_STARRED>;
 
     int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
 };

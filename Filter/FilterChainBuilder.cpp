@@ -2,7 +2,9 @@
 
 #include <new>
 
+#include "Filter/Filter.h"
 #include "Filter/FilterChain.h"
+#include "Filter/FilterKinds.h"
 
 namespace
 {
@@ -17,37 +19,6 @@ bool Append(CFilterChain& chain, CFilter* pFilter)
     const int iBefore = chain.GetFilterNum();
     chain.SetFilter(pFilter);
     return chain.GetFilterNum() > iBefore;
-}
-
-// Appends a new filter of the kind; true for an unknown kind, which has none. The id at plID is
-// read only for a kind that has one.
-bool AppendKind(CFilterChain& chain, int iKind, const QVLong32* plID)
-{
-    switch (iKind)
-    {
-    case FILTER_GROUP:
-        return Append(chain, new (std::nothrow) CGroupFilter(*plID));
-    case FILTER_ACCOUNT:
-        return Append(chain, new (std::nothrow) CAccountFilter(*plID));
-    case FILTER_PHONE:
-        return Append(chain, new (std::nothrow) CPhoneFilter);
-    case FILTER_FAVOURITES:
-        return Append(chain, new (std::nothrow) CFavouritesFilter);
-    case FILTER_GROUP_EXPAND:
-        return Append(chain, new (std::nothrow) CGroupExpandFilter(*plID));
-    case FILTER_MAIL:
-        return Append(chain, new (std::nothrow) CMailFilter);
-    case FILTER_POSTAL:
-        return Append(chain, new (std::nothrow) CPostalFilter);
-    case FILTER_ACCOUNT_EXPAND:
-        return Append(chain, new (std::nothrow) CAccountExpandFilter(*plID));
-    case FILTER_CONTACT_ID_EXPAND:
-        return Append(chain, new (std::nothrow) CContactIdExpandFilter(*plID));
-    case FILTER_ONLINE:
-        return Append(chain, new (std::nothrow) OnlineFilter);
-    default:
-        return true;
-    }
 }
 
 } // namespace
@@ -65,7 +36,8 @@ int BuildFilterChain(const int* piType, const QVLong32* plID, int iNum, CFilterC
     }
     for (int i = 0; i < iNum; ++i)
     {
-        if (!AppendKind(**ppChain, piType[i], plID + i))
+        const tag_FilterKind* pKind = FindFilterKind(piType[i]);
+        if (pKind != nullptr && !Append(**ppChain, pKind->pfnMakeFilter(plID + i)))
         {
             return -1;
         }

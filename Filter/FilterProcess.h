@@ -12,6 +12,13 @@ class CFilterChain;
 using RecordRuleFn = bool (*)(const tag_ContactsStruct& record, const CFilter& filter,
                               CFilterChain& chain);
 
+// The rule of the kinds that ask for a flag of the record.
+template <uint32_t FLAG>
+bool HasFlag(const tag_ContactsStruct& record, const CFilter& /*filter*/, CFilterChain& /*chain*/)
+{
+    return (record.iFlags & FLAG) != 0;
+}
+
 // One step of the pipeline that narrows a set of records by a chain of filters. Each subclass
 // serves the filters of one kind and states two things: that kind (KIND) and its rule (Keeps).
 // Records and chain belong to the caller, no lock is taken.
@@ -28,8 +35,7 @@ public:
     // front in their order and RecordNum becomes their number, 0 when none is left; the array is
     // not shrunk and what lies behind stays. Filters of other kinds and null ones are skipped.
     // Then runs the next process and returns its result; the last one returns 0. A null pInfo
-    // returns -1 with no further process run. Nothing else fails: for want of memory for its
-    // array of indices a process moves each kept record at once, with the same result.
+    // returns -1 with no further process run. Nothing else fails.
     virtual int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) = 0;
 
     FilterProcess* m_pNext = nullptr; // owned; null in the last process

@@ -1,6 +1,6 @@
 #include "Filter/GroupExpandFilterProcess.h"
 
-#include "Filter/IdList.h"
+#include "Filter/RecordIds.h"
 
 bool GroupExpandFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& filter,
                                      CFilterChain& /*chain*/)

@@ -1,6 +1,6 @@
 #include "Filter/GroupFilterProcess.h"
 
-#include "Filter/IdList.h"
+#include "Filter/RecordIds.h"
 
 int GroupFilterProcess::IsSameGroup(int iID, QVLong32* plList, int iNum)
 {

@@ -10,8 +10,7 @@ class QV_EXPORT MailFilterProcess : public FilterProcess
 public:
     // The kind of filter served, and its rule.
     static constexpr int KIND = FILTER_MAIL;
-    QV_INTERNAL static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
-                                  CFilterChain& chain);
+    static constexpr RecordRuleFn Keeps = HasFlag<CONTACT_FLAG_MAIL>;
 
     int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
 };

@@ -9,10 +9,10 @@ constexpr const char* TRACE_TAG = "Filter/OnlineFilterProcess";
 
 } // namespace
 
-bool OnlineFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& /*filter*/,
-                                CFilterChain& /*chain*/)
+bool OnlineFilterProcess::Keeps(const tag_ContactsStruct& record, const CFilter& filter,
+                                CFilterChain& chain)
 {
-    const bool bOnline = (record.iFlags & CONTACT_FLAG_ONLINE) != 0;
+    const bool bOnline = HasFlag<CONTACT_FLAG_ONLINE>(record, filter, chain);
     if (bOnline)
     {
         QV_LOGD(TRACE_TAG, "OnlineFilterProcess: find one contact is  sms online\n");

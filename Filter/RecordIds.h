@@ -1,5 +1,5 @@
-#ifndef QV_FILTER_IDLIST_H
-#define QV_FILTER_IDLIST_H
+#ifndef QV_FILTER_RECORDIDS_H
+#define QV_FILTER_RECORDIDS_H
 
 #include "Core/Records/ContactRecords.h"
 

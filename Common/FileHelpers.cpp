@@ -7,6 +7,8 @@
 #include <cstdio>
 #include <cstdlib>
 #include <cstring>
+#include <memory>
+#include <new>
 
 namespace
 {
@@ -23,27 +25,23 @@ constexpr size_t ESCAPED_QUOTE_BYTES = 4;
 constexpr size_t QUOTING_BYTES = 5; // a blank, two quotes, "./"
 constexpr size_t MAX_UTF8_BYTES = 3;
 
-// A file of the C library, closed at the end of the scope.
+struct CFileCloser
+{
+    void operator()(FILE* pFile) const { std::fclose(pFile); }
+};
+
+// A file of the C library that is read by lines.
 class CTextFile
 {
 public:
     explicit CTextFile(const char* szPath) : m_pFile(std::fopen(szPath, "r")) {}
-    ~CTextFile()
-    {
-        if (m_pFile != nullptr)
-        {
-            std::fclose(m_pFile);
-        }
-    }
-    CTextFile(const CTextFile&) = delete;
-    CTextFile& operator=(const CTextFile&) = delete;
 
     bool IsOpen() const { return m_pFile != nullptr; }
 
     // The next line without its end; empty for one that does not fit. False at the file's end.
     bool ReadLine(char* szLine, int iSize)
     {
-        if (std::fgets(szLine, iSize, m_pFile) == nullptr)
+        if (std::fgets(szLine, iSize, m_pFile.get()) == nullptr)
         {
             return false;
         }
@@ -63,11 +61,11 @@ private:
         int iByte = 0;
         do
         {
-            iByte = std::fgetc(m_pFile);
+            iByte = std::fgetc(m_pFile.get());
         } while (iByte != '\n' && iByte != EOF);
     }
 
-    FILE* m_pFile;
+    std::unique_ptr<FILE, CFileCloser> m_pFile;
 };
 
 // The path in a line of the list of mappings when the line's range is executable and holds
@@ -85,15 +83,15 @@ const char* PathOfMapping(const char* szLine, uintptr_t uAddress)
     return ulStart <= uAddress && uAddress < ulEnd ? szPath : nullptr;
 }
 
-// A shell command, put together in memory of its own: words, then quoted paths. Null when memory
-// ran out.
+// A shell command, put together in memory of its own: words, then quoted paths. Null when the
+// allocation fails.
 class CShellCommand
 {
 public:
     CShellCommand(const char* szWords, const char* const* pPaths, int iPaths)
-        : m_szText(static_cast<char*>(std::malloc(Room(szWords, pPaths, iPaths))))
+        : m_text(new (std::nothrow) char[Room(szWords, pPaths, iPaths)])
     {
-        if (m_szText == nullptr)
+        if (m_text == nullptr)
         {
             return;
         }
@@ -103,16 +101,13 @@ public:
             AddPath(pPaths[i]);
         }
     }
-    ~CShellCommand() { std::free(m_szText); }
-    CShellCommand(const CShellCommand&) = delete;
-    CShellCommand& operator=(const CShellCommand&) = delete;
 
     void Run() const
     {
-        if (m_szText != nullptr)
+        if (m_text != nullptr)
         {
             // The callers report nothing of what becomes of the command.
-            const int iStatus = std::system(m_szText);
+            const int iStatus = std::system(m_text.get());
             static_cast<void>(iStatus);
         }
     }
@@ -145,36 +140,25 @@ private:
     void AddText(const char* szText)
     {
         const size_t uLength = std::strlen(szText);
-        std::memcpy(m_szText + m_uUsed, szText, uLength + 1);
+        std::memcpy(m_text.get() + m_uUsed, szText, uLength + 1);
         m_uUsed += uLength;
     }
 
-    char* m_szText;
+    std::unique_ptr<char[]> m_text;
     size_t m_uUsed = 0;
 };
 
-// A wide path in UTF-8, released at the end of the scope; null when memory ran out.
-class CUtf8Path
+// A wide path in UTF-8; null when the allocation fails.
+std::unique_ptr<char[]> Utf8Path(const wchar_t* szPath)
 {
-public:
-    explicit CUtf8Path(const wchar_t* szPath)
+    const size_t uUnits = _wcslen(szPath);
+    std::unique_ptr<char[]> path(new (std::nothrow) char[(uUnits + 1) * MAX_UTF8_BYTES]());
+    if (path != nullptr)
     {
-        const size_t uUnits = _wcslen(szPath);
-        m_szPath = static_cast<char*>(std::calloc(uUnits + 1, MAX_UTF8_BYTES));
-        if (m_szPath != nullptr)
-        {
-            _wcstombs(m_szPath, szPath, static_cast<int>(uUnits));
-        }
+        _wcstombs(path.get(), szPath, static_cast<int>(uUnits));
     }
-    ~CUtf8Path() { std::free(m_szPath); }
-    CUtf8Path(const CUtf8Path&) = delete;
-    CUtf8Path& operator=(const CUtf8Path&) = delete;
-
-    const char* Get() const { return m_szPath; }
-
-private:
-    char* m_szPath;
-};
+    return path;
+}
 
 // Runs the words with the paths, unless one of them is null.
 void RunCommand(const char* szWords, const char* const* pPaths, int iPaths)
@@ -233,9 +217,9 @@ int _wc_MoveFile(const wchar_t* szSource, const wchar_t* szTarget)
 {
     if (szSource != nullptr && szTarget != nullptr)
     {
-        const CUtf8Path clSource(szSource);
-        const CUtf8Path clTarget(szTarget);
-        const char* const pPaths[] = {clSource.Get(), clTarget.Get()};
+        const std::unique_ptr<char[]> source = Utf8Path(szSource);
+        const std::unique_ptr<char[]> target = Utf8Path(szTarget);
+        const char* const pPaths[] = {source.get(), target.get()};
         RunCommand(MOVE_WORDS, pPaths, 2);
     }
     return 1;
@@ -245,8 +229,8 @@ int _wc_DeleteFile(const wchar_t* szPath)
 {
     if (szPath != nullptr)
     {
-        const CUtf8Path clPath(szPath);
-        const char* const pPaths[] = {clPath.Get()};
+        const std::unique_ptr<char[]> path = Utf8Path(szPath);
+        const char* const pPaths[] = {path.get()};
         RunCommand(DELETE_WORDS, pPaths, 1);
     }
     return 1;

@@ -3,6 +3,8 @@
 #include "Common/WideString.h"
 #include "Core/Records/LocalizerCodes.h"
 
+#include <cwchar>
+
 namespace
 {
 
@@ -10,12 +12,7 @@ constexpr int COMPARE_EQUAL = 2; // of _CompareString: 1 before, 2 equal, 3 behi
 
 int BoundedLength(const wchar_t (&szName)[CONTACT_MAX_NAME + 1])
 {
-    int iLength = 0;
-    while (iLength <= CONTACT_MAX_NAME && szName[iLength] != 0)
-    {
-        ++iLength;
-    }
-    return iLength;
+    return static_cast<int>(wcsnlen(szName, CONTACT_MAX_NAME + 1));
 }
 
 // -1, 0 or 1: which of two records a property of only one of them puts behind.

@@ -1,42 +1,49 @@
 #include "Common/NumberText.h"
 
+#include <algorithm>
+#include <charconv>
 #include <climits>
 #include <cstdint>
 #include <cstdlib>
-#include <cstring>
+#include <iterator>
+#include <type_traits>
 
 namespace
 {
 
 constexpr int DECIMAL_RADIX = 10;
-constexpr const char* LOWER_DIGITS = "0123456789abcdefghijklmnopqrstuvwxyz";
-constexpr const char* UPPER_DIGITS = "0123456789ABCDEFGHIJKLMNOPQRSTUVWXYZ";
+// The longest text: a minus sign and a digit for each bit.
+constexpr size_t MAX_NUMBER_TEXT = 1 + sizeof(unsigned long) * CHAR_BIT;
 
-// Room for the longest text: a minus sign, a digit for each bit, the terminator.
-constexpr int MAX_NUMBER_TEXT = 1 + static_cast<int>(sizeof(unsigned long)) * CHAR_BIT + 1;
-
-// A number's text, built from its last digit to the front.
+// A number's text. Only decimal ones have a sign.
 class CNumberText
 {
 public:
-    CNumberText(unsigned long ulValue, int iRadix, const char* szDigits)
+    template <typename Number>
+    CNumberText(Number number, int iRadix)
     {
-        const unsigned long ulRadix = static_cast<unsigned long>(iRadix);
-        do
-        {
-            Prepend(szDigits[ulValue % ulRadix]);
-            ulValue /= ulRadix;
-        } while (ulValue != 0);
+        using Unsigned = std::make_unsigned_t<Number>;
+        m_pEnd = iRadix == DECIMAL_RADIX ? std::to_chars(m_acText, std::end(m_acText), number).ptr
+                                         : std::to_chars(m_acText, std::end(m_acText),
+                                                         static_cast<Unsigned>(number), iRadix)
+                                               .ptr;
     }
 
-    void Prepend(char cFirst) { m_szText[--m_iStart] = cFirst; }
-    // With the terminator.
-    size_t Size() const { return static_cast<size_t>(MAX_NUMBER_TEXT - m_iStart); }
-    void CopyTo(char* szBuffer) const { std::memcpy(szBuffer, m_szText + m_iStart, Size()); }
+    size_t Length() const { return static_cast<size_t>(m_pEnd - m_acText); }
+    void CopyTo(char* szBuffer) const { *std::copy(Begin(), m_pEnd, szBuffer) = 0; }
+    void CopyUpperCaseTo(char* szBuffer) const
+    {
+        *std::transform(Begin(), m_pEnd, szBuffer,
+                        [](char cDigit) {
+                            return cDigit >= 'a' ? static_cast<char>(cDigit - 'a' + 'A') : cDigit;
+                        }) = 0;
+    }
 
 private:
-    char m_szText[MAX_NUMBER_TEXT] = {};
-    int m_iStart = MAX_NUMBER_TEXT - 1;
+    const char* Begin() const { return m_acText; }
+
+    char m_acText[MAX_NUMBER_TEXT];
+    const char* m_pEnd;
 };
 
 } // namespace
@@ -57,36 +64,24 @@ char* itoa(int iValue, char* szBuffer, int iRadix)
     {
         return nullptr;
     }
-    const bool bMinus = iRadix == DECIMAL_RADIX && iValue < 0;
-    const unsigned uBits = static_cast<unsigned>(iValue);
-    CNumberText clText(bMinus ? 0U - uBits : uBits, iRadix, LOWER_DIGITS);
-    if (bMinus)
-    {
-        clText.Prepend('-');
-    }
+    const CNumberText text(iValue, iRadix);
     if (szBuffer == nullptr)
     {
-        szBuffer = static_cast<char*>(std::malloc(clText.Size()));
+        szBuffer = static_cast<char*>(std::malloc(text.Length() + 1));
     }
     if (szBuffer != nullptr)
     {
-        clText.CopyTo(szBuffer);
+        text.CopyTo(szBuffer);
     }
     return szBuffer;
 }
 
 void _ultoa(unsigned long ulValue, char* szBuffer, int iRadix)
 {
-    CNumberText(ulValue, iRadix, UPPER_DIGITS).CopyTo(szBuffer);
+    CNumberText(ulValue, iRadix).CopyUpperCaseTo(szBuffer);
 }
 
 void _ltoa(long lValue, char* szBuffer, int iRadix)
 {
-    unsigned long ulValue = static_cast<unsigned long>(lValue);
-    if (lValue < 0 && iRadix == DECIMAL_RADIX)
-    {
-        *szBuffer++ = '-';
-        ulValue = 0UL - ulValue;
-    }
-    _ultoa(ulValue, szBuffer, iRadix);
+    CNumberText(lValue, iRadix).CopyUpperCaseTo(szBuffer);
 }

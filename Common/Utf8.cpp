@@ -5,7 +5,8 @@
 #include <cstdarg>
 #include <cstdint>
 #include <cstdio>
-#include <cstdlib>
+#include <memory>
+#include <new>
 
 namespace
 {
@@ -121,21 +122,6 @@ bool Decode(const char* szSource, wchar_t* szTarget, int iLastByte, int& iWritte
     return true;
 }
 
-// Memory from malloc, released at the end of the scope.
-class CByteBuffer
-{
-public:
-    explicit CByteBuffer(size_t uSize) : m_pBytes(static_cast<char*>(std::malloc(uSize))) {}
-    ~CByteBuffer() { std::free(m_pBytes); }
-    CByteBuffer(const CByteBuffer&) = delete;
-    CByteBuffer& operator=(const CByteBuffer&) = delete;
-
-    char* Get() const { return m_pBytes; }
-
-private:
-    char* m_pBytes;
-};
-
 // Formats into szText, which has FORMATTED_BYTES; the length, or -1 when that fails or is cut.
 __attribute__((format(printf, 2, 0))) int Format(char* szText, const char* szFormat, va_list args)
 {
@@ -147,14 +133,14 @@ __attribute__((format(printf, 2, 0))) int Format(char* szText, const char* szFor
 int FormatWide(char* szText, const wchar_t* szFormat, va_list args)
 {
     const size_t uUnits = _wcslen(szFormat);
-    const CByteBuffer clFormat(uUnits * MAX_BYTES_PER_UNIT + 1);
-    if (clFormat.Get() == nullptr)
+    const std::unique_ptr<char[]> format(
+        new (std::nothrow) char[uUnits * MAX_BYTES_PER_UNIT + 1]());
+    if (format == nullptr)
     {
         return -1;
     }
-    const int iBytes = _wcstombs(clFormat.Get(), szFormat, static_cast<int>(uUnits));
-    clFormat.Get()[iBytes] = 0;
-    return Format(szText, clFormat.Get(), args);
+    _wcstombs(format.get(), szFormat, static_cast<int>(uUnits));
+    return Format(szText, format.get(), args);
 }
 
 } // namespace

@@ -61,8 +61,7 @@ const tag_FilterKind FILTER_KINDS[FILTER_KIND_NUM] = {
 const tag_FilterKind* FindFilterKind(int iKind)
 {
     const tag_FilterKind* pEnd = FILTER_KINDS + FILTER_KIND_NUM;
-    const tag_FilterKind* pRow =
-        std::find_if(FILTER_KINDS, pEnd,
-                     [iKind](const tag_FilterKind& row) { return row.iKind == iKind; });
+    const tag_FilterKind* pRow = std::find_if(
+        FILTER_KINDS, pEnd, [iKind](const tag_FilterKind& row) { return row.iKind == iKind; });
     return pRow != pEnd ? pRow : nullptr;
 }

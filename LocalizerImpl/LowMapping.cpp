@@ -1,5 +1,6 @@
 #include "LocalizerImpl/LowMapping.h"
 
+#include "MemManager/Files/Descriptor.h"
 #include "MemManager/Files/StoreFile.h"
 
 #include <fcntl.h>
@@ -42,21 +43,14 @@ bool CLowMapping::IsHandle(const void* pMap)
 
 void* CLowMapping::Map(const char* szPath, size_t uSize)
 {
-    const int iFd = OpenStoreFile(szPath, O_RDONLY);
-    if (iFd < 0)
-    {
-        return MAP_FAILED;
-    }
+    const CDescriptor file(OpenStoreFile(szPath, O_RDONLY));
     void* pMap = MAP_FAILED;
-    for (uintptr_t uHint = FIRST_HINT; uHint <= LAST_HINT && uHint < g_uLimit; uHint += HINT_STEP)
+    for (uintptr_t uHint = FIRST_HINT;
+         file.IsOpen() && pMap == MAP_FAILED && uHint <= LAST_HINT && uHint < g_uLimit;
+         uHint += HINT_STEP)
     {
-        pMap = MapWithHint(iFd, uSize, uHint);
-        if (pMap != MAP_FAILED)
-        {
-            break;
-        }
+        pMap = MapWithHint(file.Get(), uSize, uHint);
     }
-    close(iFd);
     return pMap;
 }
 

@@ -8,6 +8,7 @@
 #include "LocalizerImpl/PinyinTable.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "LocalizerImpl/Syllables.h"
+#include "MemManager/Files/Descriptor.h"
 #include "MemManager/Files/MappingGuards.h"
 #include "MemManager/Files/ShareMemory.h"
 #include "MemManager/Files/StoreFile.h"
@@ -40,15 +41,9 @@ uint32_t WordNumber(const char (&szWord)[sizeof(PYOFWORDS::szWord)])
 // Fills the buffer, PY_FILE_SIZE zeroed bytes, from the shipped table.
 bool ReadShippedTable(char* pBuffer)
 {
-    const int iFd = OpenStoreFile(CDataPaths::PinyinSource(), O_RDWR);
-    if (iFd < 0)
-    {
-        return false;
-    }
+    const CDescriptor file(OpenStoreFile(CDataPaths::PinyinSource(), O_RDWR));
     // A short file is no failure: the characters that it lacks have no readings.
-    const ssize_t iRead = read(iFd, pBuffer, PY_FILE_SIZE);
-    close(iFd);
-    return iRead >= 0;
+    return file.IsOpen() && read(file.Get(), pBuffer, PY_FILE_SIZE) >= 0;
 }
 
 } // namespace

@@ -1,6 +1,7 @@
 #include "MemManager/Files/ShareMemory.h"
 
 #include "Common/Log.h"
+#include "MemManager/Files/Descriptor.h"
 #include "MemManager/Files/StoreFile.h"
 
 #include <algorithm>
@@ -206,21 +207,6 @@ void* MapShared(int iFd, size_t uSize, int* piError)
     return pAddr;
 }
 
-tag_OpenOutcome OpenForWriting(const char* szPath, size_t uSize)
-{
-    umask(0);
-    tag_OpenOutcome outcome = {MAP_FAILED, -1, 0};
-    outcome.iFd = OpenStoreFile(szPath, O_RDWR | O_CREAT, SHARED_FILE_MODE);
-    if (outcome.iFd < 0)
-    {
-        outcome.iError = errno;
-        return outcome;
-    }
-    outcome.pAddr = MapShared(outcome.iFd, uSize, &outcome.iError);
-    close(outcome.iFd);
-    return outcome;
-}
-
 // Maps an open file that has to be long enough already.
 void* MapPrivate(int iFd, size_t uSize, int* piError)
 {
@@ -240,18 +226,22 @@ void* MapPrivate(int iFd, size_t uSize, int* piError)
     return pAddr;
 }
 
-tag_OpenOutcome OpenForReading(const char* szPath, size_t uSize)
+// Maps what OpenStoreFile opened, or failed to open.
+tag_OpenOutcome MapOpened(int iFd, size_t uSize, void* (*pfnMap)(int, size_t, int*))
 {
-    tag_OpenOutcome outcome = {MAP_FAILED, -1, 0};
-    outcome.iFd = OpenStoreFile(szPath, O_RDONLY);
-    if (outcome.iFd < 0)
+    tag_OpenOutcome outcome = {MAP_FAILED, iFd, errno};
+    const CDescriptor file(iFd);
+    if (file.IsOpen())
     {
-        outcome.iError = errno;
-        return outcome;
+        outcome.pAddr = pfnMap(iFd, uSize, &outcome.iError);
     }
-    outcome.pAddr = MapPrivate(outcome.iFd, uSize, &outcome.iError);
-    close(outcome.iFd);
     return outcome;
+}
+
+tag_OpenOutcome OpenForWriting(const char* szPath, size_t uSize)
+{
+    umask(0);
+    return MapOpened(OpenStoreFile(szPath, O_RDWR | O_CREAT, SHARED_FILE_MODE), uSize, MapShared);
 }
 
 bool IsOpenFailure(const tag_OpenOutcome& outcome)
@@ -302,7 +292,7 @@ void* OpenWriteShareMemory(const char* szPath, size_t uSize)
 void* OpenReadShareMemory(const char* szPath, size_t uSize)
 {
     szPath = PathOrEmpty(szPath);
-    const tag_OpenOutcome outcome = OpenForReading(szPath, uSize);
+    const tag_OpenOutcome outcome = MapOpened(OpenStoreFile(szPath, O_RDONLY), uSize, MapPrivate);
     if (IsOpenFailure(outcome))
     {
         QV_LOGE(QV_LOG_TAG, "QV_Contacts: OpenReadShareMemory:%s error no2 = %d\n", szPath,
@@ -373,21 +363,20 @@ int writeToFile(const char* szPath, const void* pBuf, int iLen)
     {
         return 0;
     }
-    const int iFd = open(szPath, O_RDWR | O_CREAT | O_TRUNC | O_CLOEXEC, SHARED_FILE_MODE);
-    if (iFd < 0)
+    const CDescriptor file(open(szPath, O_RDWR | O_CREAT | O_TRUNC | O_CLOEXEC, SHARED_FILE_MODE));
+    if (!file.IsOpen())
     {
         QV_LOGE(QV_LOG_TAG, "QV_Contacts: writeToFile open error = %d, %s\n", errno,
                 std::strerror(errno));
         return 0;
     }
-    const bool bWritten = write(iFd, pBuf, static_cast<size_t>(iLen)) == iLen;
-    if (!bWritten)
+    if (write(file.Get(), pBuf, static_cast<size_t>(iLen)) != iLen)
     {
         QV_LOGE(QV_LOG_TAG, "QV_Contacts: writeToFile write error = %d, %s\n", errno,
                 std::strerror(errno));
+        return 0;
     }
-    close(iFd);
-    return bWritten ? 1 : 0;
+    return 1;
 }
 
 int readFromFile(const char* szPath, void* pBuf, int* piLen)
@@ -396,14 +385,13 @@ int readFromFile(const char* szPath, void* pBuf, int* piLen)
     {
         return 0;
     }
-    const int iFd = open(szPath, O_RDONLY | O_CLOEXEC);
-    if (iFd < 0)
+    const CDescriptor file(open(szPath, O_RDONLY | O_CLOEXEC));
+    if (!file.IsOpen())
     {
         QV_LOGE(QV_LOG_TAG, "QV_Contacts: readFromFile open error = %d, %s\n", errno,
                 std::strerror(errno));
         return 0;
     }
-    *piLen = static_cast<int>(read(iFd, pBuf, static_cast<size_t>(*piLen)));
-    close(iFd);
+    *piLen = static_cast<int>(read(file.Get(), pBuf, static_cast<size_t>(*piLen)));
     return 1;
 }

@@ -2,6 +2,7 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
+#include "MemManager/Files/Descriptor.h"
 #include "MemManager/Files/StoreFile.h"
 
 #include <cerrno>
@@ -24,11 +25,8 @@ int MoveAboveStandard(int iFd)
     {
         return iFd;
     }
-    const int iMoved = fcntl(iFd, F_DUPFD_CLOEXEC, FIRST_FREE_FD);
-    const int iError = errno;
-    close(iFd);
-    errno = iError;
-    return iMoved;
+    const CDescriptor moved(iFd);
+    return fcntl(iFd, F_DUPFD_CLOEXEC, FIRST_FREE_FD);
 }
 
 int OpenLockFile()
@@ -36,19 +34,6 @@ int OpenLockFile()
     umask(0);
     return MoveAboveStandard(
         OpenStoreFile(CDataPaths::LockFile(), O_RDWR | O_CREAT, LOCK_FILE_MODE));
-}
-
-// Locks the open file. A refusal or failure closes it.
-LOCK_RESULT LockOpenFile(int iFd)
-{
-    if (flock(iFd, LOCK_EX | LOCK_NB) == 0)
-    {
-        return LOCK_TAKEN;
-    }
-    const int iError = errno;
-    close(iFd);
-    errno = iError;
-    return iError == EWOULDBLOCK || iError == EINTR ? LOCK_REFUSED : LOCK_UNAVAILABLE;
 }
 
 // Whether an open file is the lock file, or was until that was deleted.
@@ -69,9 +54,8 @@ bool ReleaseLock(int iFd)
     {
         return false;
     }
-    const bool bReleased = flock(iFd, LOCK_UN) == 0;
-    close(iFd);
-    return bReleased;
+    const CDescriptor lock(iFd);
+    return flock(iFd, LOCK_UN) == 0;
 }
 
 int LogUnlockResult(int iResult)
@@ -85,13 +69,14 @@ int LogUnlockResult(int iResult)
 LOCK_RESULT CSingleMutex::TryLockQuietly(int* pFd)
 {
     *pFd = 0;
-    const int iFd = OpenLockFile();
-    const LOCK_RESULT eResult = iFd < 0 ? LOCK_UNAVAILABLE : LockOpenFile(iFd);
-    if (eResult == LOCK_TAKEN)
+    CDescriptor lock(OpenLockFile());
+    if (lock.IsOpen() && flock(lock.Get(), LOCK_EX | LOCK_NB) == 0)
     {
-        *pFd = iFd;
+        *pFd = lock.Detach();
+        return LOCK_TAKEN;
     }
-    return eResult;
+    const bool bRefused = lock.IsOpen() && (errno == EWOULDBLOCK || errno == EINTR);
+    return bRefused ? LOCK_REFUSED : LOCK_UNAVAILABLE;
 }
 
 LOCK_RESULT CSingleMutex::TryLock(int* pFd)

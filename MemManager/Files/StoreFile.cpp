@@ -1,24 +1,23 @@
 #include "MemManager/Files/StoreFile.h"
 
+#include "MemManager/Files/Descriptor.h"
+
 #include <cerrno>
 #include <fcntl.h>
 #include <sys/stat.h>
-#include <unistd.h>
 
 int OpenStoreFile(const char* szPath, int iFlags, mode_t uMode)
 {
-    const int iFd = open(szPath, iFlags | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, uMode);
-    if (iFd < 0)
+    CDescriptor file(open(szPath, iFlags | O_NONBLOCK | O_NOCTTY | O_CLOEXEC, uMode));
+    struct stat info = {};
+    if (!file.IsOpen() || fstat(file.Get(), &info) != 0)
     {
         return -1;
     }
-    struct stat info = {};
-    const int iError = fstat(iFd, &info) != 0 ? errno : EINVAL;
-    if (S_ISREG(info.st_mode))
+    if (!S_ISREG(info.st_mode))
     {
-        return iFd;
+        errno = EINVAL;
+        return -1;
     }
-    close(iFd);
-    errno = iError;
-    return -1;
+    return file.Detach();
 }

@@ -17,10 +17,22 @@ DONE, FAILED, USAGE, MISSING, PARTLY = range(5)
 SKIPPED = 77
 
 
+# The tool as transcripts call it: subcommands in the directory data.
+SHELL = """qvlocalize() {
+    local command=${1-}
+    case $command in
+        [a-z]*) shift; "$TOOL" "$command" --data-dir data "$@" ;;
+        *) "$TOOL" "$@" ;;
+    esac
+}
+"""
+
+
 class ToolCase(unittest.TestCase):
     """Each test has a data directory of its own, with the sample and its index."""
 
     WITH_SAMPLE = True
+    maxDiff = None
 
     def setUp(self):
         self.root = pathlib.Path(tempfile.mkdtemp(prefix="qvtool_"))
@@ -43,6 +55,27 @@ class ToolCase(unittest.TestCase):
         process.stdout, process.stderr = process.stdout.decode(), process.stderr.decode()
         self.assertEqual(code, process.returncode, (arguments, process.stdout, process.stderr))
         return process
+
+    def check_transcript(self, path):
+        """The calls of the file, behind dollar signs, print in a shell what stands below them: the
+        standard output, the error output behind exclamation marks, and an exit code that is not 0.
+        """
+        recorded, printed = path.read_text(encoding="utf-8"), ""
+        for line in re.findall(r"(?m)^\$ (.*)$", recorded):
+            process = subprocess.run(["bash", "-c", SHELL + line], cwd=self.root, check=False,
+                                     capture_output=True, encoding="utf-8",
+                                     env={**os.environ, "TOOL": TOOL, "PYFILE": PYFILE,
+                                          "TZ": "UTC", "LC_ALL": "C.UTF-8"})
+            errors = re.sub("(?m)^(?=.)", "! ", process.stderr)
+            code = f"exit code {process.returncode}\n" if process.returncode else ""
+            printed += f"$ {line}\n{process.stdout}{errors}{code}"
+        for varying, shown in ((re.escape(str(self.root)), "ROOT"), (r" +\d+ ms\n", " (time)\n"),
+                               (r"hFile=\d+", "hFile=N")):
+            printed = re.sub(varying, shown, printed)
+        if RECORD:
+            path.write_text(printed, encoding="utf-8")
+        else:
+            self.assertEqual(recorded, printed)
 
     def refused(self, code, text, *call, **options):
         """The error output, which holds the text, of a call that prints nothing else."""

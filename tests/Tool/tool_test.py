@@ -3,12 +3,10 @@
 tool_test.py TOOL PYFILE [--record] [TestClass...]
 """
 import contextlib
-import fcntl
 import math
 import os
 import pathlib
 import re
-import shlex
 import shutil
 import sqlite3
 import struct
@@ -18,35 +16,18 @@ import sys
 sys.path.insert(0, str(pathlib.Path(__file__).parents[1] / "Support"))
 # pylint: disable=wrong-import-position
 import tool_case
-from tool_case import DONE, FAILED, MISSING, PYFILE, RECORD, TOOL, USAGE, ToolCase
+from tool_case import DONE, FAILED, MISSING, PYFILE, TOOL, USAGE, ToolCase
 
 TOP = pathlib.Path(__file__).resolve().parents[2]
-CALLS = TOP / "tests/Tool/calls.txt"
 EVERYTHING = "SELECT * FROM contacts JOIN localizer ON contact_id = _id"
 
 
 class CallsTest(ToolCase):
-    """Calls on a sample, one after the other, print what calls.txt says: the standard output, the
-    error output behind exclamation marks, and the exit code that is not 0."""
-
-    def transcript(self, line):
-        _, *words = shlex.split(line)
-        call = self.call(*words) if words and words[0].isalpha() else [TOOL, *words]
-        process = subprocess.run(call, capture_output=True, check=False, encoding="utf-8",
-                                 env={**os.environ, "TZ": "UTC"})
-        errors = re.sub("(?m)^", "! ", process.stderr.rstrip()) + "\n" if process.stderr else ""
-        code = f"exit code {process.returncode}\n" if process.returncode else ""
-        text = f"{line}\n{process.stdout}{errors}{code}".replace(str(self.data), "DIRECTORY")
-        return re.sub(r" +\d+ ms\n", " (time)\n", text)
-
     def test_calls(self):
-        recorded = CALLS.read_text(encoding="utf-8")
-        printed = "".join(f"$ {self.transcript(line)}"
-                          for line in re.findall(r"(?m)^\$ (.*)\n", recorded))
-        if RECORD:
-            CALLS.write_text(printed, encoding="utf-8")
-            recorded = printed
-        self.assertEqual(recorded, printed)
+        self.check_transcript(TOP / "tests/Tool/calls.txt")
+
+    def test_errors(self):
+        self.check_transcript(TOP / "tests/Tool/errors.txt")
 
 
 class FilesTest(ToolCase):
@@ -76,7 +57,8 @@ class FilesTest(ToolCase):
                 self.assertEqual(content, bytes.fromhex(example))
             if name == "ContactsLocalizer":
                 at, = [at for at in range(0, len(content), end) if content[at:at + 4] == contact]
-                for offset, line in re.findall(r"(?m)^([\da-f]{3})((?:  ?[\da-f]{2}){16})", section):
+                lines = re.findall(r"(?m)^([\da-f]{3})((?:  ?[\da-f]{2}){16})", section)
+                for offset, line in lines:
                     start = at + int(offset, 16)
                     self.assertEqual(bytes.fromhex(line), content[start:start + 16], offset)
         self.assertEqual({}, counts)
@@ -245,81 +227,12 @@ class CompletionTest(ToolCase):
                                  (shell, words))
 
 
-class ErrorsTest(ToolCase):
-    def test_says_what_is_missing_and_what_makes_it(self):
-        indexed, self.data = self.data, self.root / "it's empty"
-        advice = f"qvlocalize sample --data-dir '{self.root}/it'\\''s empty'"
-        self.refused(MISSING, advice, "index")
-        self.refused(MISSING, advice, "search", "a")
-        self.refused(MISSING, "qvlocalize index --data-dir", "show")
-        self.refused(MISSING, "--pyfile", "sample", "--pyfile", self.root / "none")
-        self.data = indexed
-        (indexed / "files/ContactsReg.bin").unlink()
-        self.refused(MISSING, f"qvlocalize index --data-dir {indexed}\n", "search", "a")
-        self.run_tool("notify", "status", code=MISSING)
-        (indexed / "files/pyfile.bin").unlink()
-        self.refused(MISSING, "there is no pinyin table", "index")
-        self.data = "x" * 4001
-        self.refused(USAGE, "too long", "search", "a")
-
-    def test_refuses_a_pinyin_table_of_another_size(self):
-        table = self.data / "files/pyfile.bin"
-        for content in (table.read_bytes()[:-1], table.read_bytes() + b"0", b""):
-            table.write_bytes(content)
-            text = f"it has {len(content)} bytes, a pinyin table has 709412"
-            self.refused(FAILED, text, "index")
-            self.refused(FAILED, text, "sample", "--force", "--pyfile", table)
-            self.assertEqual(709412, (self.data / "files/PyFileMappint.bin").stat().st_size)
-            self.assertEqual(content, table.read_bytes())
-
-    def test_tells_what_is_damaged(self):
-        reg, records, database = "ContactsReg.bin", "ContactsLocalizer.bin", "contacts2.db"
-        for name, content, calls in (  # a file, what becomes of it, and what each call says of it
-                (reg, b"abc", {"show": "could not be read", "search a": "could not be read"}),
-                (reg, b"\xff" * 12, {"show": "the index is damaged"}),
-                (records, None, dict.fromkeys(("show", "search a", "notify star 5"), "is damaged")),
-                ("PyFileMappint.bin", b"abc", dict.fromkeys(
-                    ("search a", "search hj --type special"), "index's pinyin table")),
-                (database, b"no database", {
-                    "index": "ReadAllLocalizer select contacts count sqlite3_prepare ERROR",
-                    "search a": "not a contacts database: file is not a database"}),
-                (database, b"", {"search a": "not a contacts database: no such table"})):
-            path, = self.data.glob(f"*/{name}")
-            whole = path.read_bytes()
-            path.unlink()
-            if content is not None:
-                path.write_bytes(content)
-            for call, text in calls.items():
-                self.refused(FAILED, text, *call.split())
-            if name in (reg, records):
-                self.assertIn("Index built", self.run_tool("index", "--if-needed").stdout)
-                self.run_tool("show")
-            path.write_bytes(whole)
-
-    def test_a_store_or_database_that_another_process_holds(self):
-        with open(self.data / "files/memlock.ini", "ab") as lock:
-            fcntl.flock(lock, fcntl.LOCK_EX)
-            self.refused(FAILED, "(result -1): another process holds the store\n"
-                                 "  QV_Contacts:InitContactRecord write share memo lock", "index")
-            self.refused(FAILED, "the index could not be read", "search", "a", "--json")
-            self.refused(FAILED, "another process holds the store", "show")
+class LockedTest(ToolCase):
+    def test_a_database_that_another_process_holds(self):
         with contextlib.closing(sqlite3.connect(self.database)) as database:
             database.execute("BEGIN EXCLUSIVE")
             self.refused(FAILED, "the database cannot be read: database is locked", "search", "")
         self.run_tool("search", "a")
-        (self.data / "files/memlock.ini").unlink()
-        (self.data / "files/memlock.ini").mkdir()
-        self.refused(FAILED, "the lock file cannot be opened", "search", "")
-
-    def test_output_that_cannot_be_written(self):
-        for call in (self.call("search", "zs"), self.call("search", "zs", "--json"),
-                     self.call("index"), [TOOL, "--help"]):
-            for close, target in (("", "/dev/full"), (">&-", "/dev/null")):
-                with open(target, "wb") as output:
-                    process = subprocess.run(["bash", "-c", f'"$0" "$@" {close}', *call],
-                                             stdout=output, stderr=subprocess.PIPE, check=False)
-                self.assertEqual((FAILED, b"qvlocalize: the output could not be written\n"),
-                                 (process.returncode, process.stderr), (call, target))
 
 
 if __name__ == "__main__":

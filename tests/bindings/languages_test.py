@@ -237,7 +237,6 @@ class JavaTest(ModuleTest):
             env={**os.environ, "LC_ALL": "C.UTF-8"})
         self.assertEqual(0, process.returncode, process.stdout[-2000:] + process.stderr)
         self.assertNotRegex(process.stdout + process.stderr, "WARNING|FATAL")
-        self.maxDiff = 2000
         self.assertEqual(expected, process.stdout.splitlines())
 
 

@@ -450,36 +450,29 @@ TEST_F(Search, JudgesWhetherTheMatchedCharactersAreLettersOrOthers)
 
 TEST_F(Search, FindsThePlaceOfAChangedRecord)
 {
-    std::vector<tag_ContactsStruct> vStored(3, tag_ContactsStruct{});
-    std::wcscpy(vStored[0].szName, L"三");
-    std::wcscpy(vStored[1].szName, L"张三");
+    tag_ContactsStruct aStored[3] = {};
+    std::wcscpy(aStored[0].szName, L"三");
+    std::wcscpy(aStored[1].szName, L"张三");
     for (int i = 0; i < 3; ++i)
     {
-        vStored[static_cast<size_t>(i)].llLastTimeContacted = 30 - 10 * i;
+        aStored[i].llLastTimeContacted = 30 - 10 * i;
     }
-    ASSERT_EQ(Manager::TransNameToPY(vStored.data(), 3), 0);
-    const struct
-    {
-        const wchar_t* szName;
-        int iCount;
-        int iSortType;
-        long long llTime;
-        int iExpected;
-        const wchar_t* szNameAfter;
-    } ROWS[] = {{L"愛", 3, 0, 0, 0, L"ai 爱"},   {L"张三", 3, 0, 0, 1, L"zhang 张san 三"},
-                {L"赵", 3, 0, 0, 2, L"zhao 赵"}, {L"赵", 0, 0, 0, 0, L"zhao 赵"},
-                {L"赵", 3, 1, 25, 1, L"赵"},     {L"赵", 3, 1, 10, 3, L"赵"}};
-    for (const auto& row : ROWS)
+    ASSERT_EQ(Manager::TransNameToPY(aStored, 3), 0);
+    // Name, number of records, sort type and time; the place, and the name afterwards.
+    const std::tuple<const wchar_t*, int, int, int, int, const wchar_t*> ROWS[] = {
+        {L"愛", 3, 0, 0, 0, L"ai 爱"},   {L"张三", 3, 0, 0, 1, L"zhang 张san 三"},
+        {L"赵", 3, 0, 0, 2, L"zhao 赵"}, {L"赵", 0, 0, 0, 0, L"zhao 赵"},
+        {L"赵", 3, 1, 25, 1, L"赵"},     {L"赵", 3, 1, 10, 3, L"赵"}};
+    for (const auto& [szName, iCount, iSortType, iTime, iPlace, szNameAfter] : ROWS)
     {
         tag_ContactsStruct record = {};
-        std::wcscpy(record.szName, row.szName);
-        record.llLastTimeContacted = row.llTime;
-        EXPECT_EQ(Manager::LocalizerSearchPos(vStored.data(), row.iCount, &record, row.iSortType),
-                  row.iExpected);
-        EXPECT_EQ(std::wstring(record.szName), row.szNameAfter);
+        std::wcscpy(record.szName, szName);
+        record.llLastTimeContacted = iTime;
+        EXPECT_EQ(Manager::LocalizerSearchPos(aStored, iCount, &record, iSortType), iPlace);
+        EXPECT_STREQ(record.szName, szNameAfter);
     }
     RemoveTable();
-    EXPECT_EQ(Manager::LocalizerSearchPos(vStored.data(), 3, &vStored[0], 0), -1);
+    EXPECT_EQ(Manager::LocalizerSearchPos(aStored, 3, aStored, 0), -1);
 }
 
 // A search runs on threads of callers that have little stack, also where the matches come farthest

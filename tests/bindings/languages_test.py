@@ -109,7 +109,8 @@ class PythonTest(ModuleTest):
     def any_question(self, dice):
         asked = {"kind": dice.choice([0, 0, 0, 1, 1, 2])}
         for name in dice.sample(FLAGS + LISTS, dice.randrange(4)):
-            asked[name] = name in FLAGS or [dice.randrange(-1, 8) for _ in range(dice.randint(1, 2))]
+            numbers = [dice.randrange(-1, 8) for _ in range(dice.randint(1, 2))]
+            asked[name] = numbers if name in LISTS else True
         return asked
 
     def test_finds_what_the_tool_finds(self):

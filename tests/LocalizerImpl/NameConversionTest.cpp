@@ -25,6 +25,7 @@ std::wstring Repeat(const std::wstring& strText, int iCount)
 const std::tuple<std::wstring, std::wstring, std::wstring> NAMES[] = {
     {L"Tom 2", L"tom?2", L"tom 2"},
     {L"李Lee", L"李lee", L"li 李lee"},
+    {L"一", L"一", L"yi 一"}, // the first record
     {L"长-@[`{~", L"长??????", L"chang 长-@[`{~"},
     // Folding: by the first of several rows, and only in the first four characters.
     {L"三著矽衝", L"三著硅冲", L"san 三zhu 著gui 硅chong 冲"},
@@ -116,6 +117,7 @@ TEST_F(NameConversion, PutsAPickedCharacterInPlaceOfItsLetters)
     EXPECT_EQ(Pick(L"Zhangs", 5, L"三"), L"0 zhangs") << "no letter fits";
     EXPECT_EQ(Pick(L"Li", 2, L"한"), L"-1000 li") << "not in the table";
     EXPECT_EQ(Pick(L"Li", 1, L"abc"), L"0 LIABC") << "no Chinese character";
+    EXPECT_EQ(Pick(L"Li", 1, L"abcdefghijk"), L"0 LIABCDEFGHI") << "nine bytes of it";
 }
 
 TEST_F(NameConversion, FindsTheIndexCharacterOfACodeOrATime)

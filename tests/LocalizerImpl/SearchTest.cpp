@@ -280,7 +280,7 @@ TEST_F(Search, EveryShortTextOverCraftedNames)
 TEST_F(Search, LongTextsOverRandomNamesTypedKeyByKey)
 {
     const std::wstring strCodes =
-        Codes(L"张章长常江姜蒋庄双安恩啊西乐解单曾重行嗯aghnz2?") + DAMAGED_CODE;
+        Codes(L"张章长常江姜蒋庄双安恩啊西乐解单曾重行嗯aghnz2?") + L"\x6FFF\x15000\x24F07\x30000";
     std::wstring strMany;
     for (int i = 0; i < PY_WORD_COUNT; i += 17)
     {

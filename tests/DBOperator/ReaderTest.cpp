@@ -27,11 +27,20 @@ namespace fs = std::filesystem;
 using Ids = std::vector<int>;
 using Groups = std::vector<QVLong32>;
 
-const std::string READER = "QV_Contacts>>QV_ContactsLocalize_SO>>";
-const std::string COUNT_STEP = " QV_Contacts >>QV_ContactsLocalize_SO>> ReadAllLocalizer select "
-                               "contacts count ";
-const std::string SQLSTAT_4 = "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_4 = ";
-const std::string SQLSTAT_5 = "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_5 = ";
+// The section of log.txt with that name, which stands in a line behind five signs.
+std::string Recorded(const std::string& strName)
+{
+    const std::string strText = "\n" + CDataDirectory::ReadBytes(QV_READER_LOG) + "===== ";
+    const std::string strHead = "\n===== " + strName + "\n";
+    const size_t uBegin = strText.find(strHead) + strHead.size();
+    return strText.substr(uBegin, strText.find("===== ", uBegin) - uBegin);
+}
+
+bool Begins(const std::string& strText, const char* szStatement)
+{
+    return strText.find(std::string("QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> ") +
+                        szStatement) == 0;
+}
 
 // The numbers from 1 on.
 std::string IdText(int iLast)
@@ -106,11 +115,18 @@ protected:
     }
     int Count() { return m_reader.GetContactsCount(&m_iCount); }
     int ReadOnline() { return m_reader.ReadAllSmsOnlineStatus(&m_set, 0, nullptr); }
-    Lines Errors()
+    // What was logged since the last call: errors behind an exclamation mark, line ends as \n.
+    std::string Told()
     {
-        Lines vErrors = m_log.Texts(ERROR_LINE);
+        std::string strTold;
+        for (const tag_LogLine& line : m_log.Lines())
+        {
+            strTold += (line.iPriority == ERROR_LINE ? "! " : "") + line.strText;
+            const bool bEnds = strTold.back() == '\n';
+            strTold.replace(strTold.size() - (bEnds ? 1 : 0), 1, bEnds ? "\\n\n" : "\n");
+        }
         m_log.Clear();
-        return vErrors;
+        return strTold;
     }
 
     CDataDirectory m_directory;
@@ -201,8 +217,6 @@ TEST_F(Reader, MakesRecordsOfRows)
         EXPECT_EQ(1, iFound);
         EXPECT_EQ(TextOf(expected), TextOf(record));
     }
-    EXPECT_TRUE(
-        m_log.Has(DEBUG_LINE, READER + " CSQLiteOperator ReadContactsByID iContactID = -4\n"));
     // Found tells of the name row; a hidden contact is read alone.
     m_provider.Execute("delete from contacts where _id=1; delete from localizer where "
                        "contact_id=2; delete from visible_contacts");
@@ -231,22 +245,7 @@ TEST_F(Reader, ReadsTheListedVisibleContactsOnly)
         ASSERT_EQ(0, ReadAll(m_reader, lCount, vIds.data()));
         EXPECT_EQ(vRead, IdsRead()) << lCount;
     }
-    const std::string strVisible =
-        "contacts where cast(exists(select _id from visible_contacts where "
-        "contacts._id = visible_contacts._id ) as integer)=1";
-    EXPECT_EQ(m_log.Texts(DEBUG_LINE),
-              (Lines{READER + "SQLiteOperator>> ReadAllLocalizer begin",
-                     READER +
-                         "SQLiteOperator>> ReadAllLocalizer>> sqlstat_3 = select count(*) "
-                         "from " +
-                         strVisible + " and _id  in(5)\n",
-                     SQLSTAT_4 +
-                         "select _id,times_contacted,starred,has_phone_number,"
-                         "last_time_contacted,single_is_secret,photo_file_id,status_update_id  "
-                         "from " +
-                         strVisible + "  and _id  in(5)\n",
-                     SQLSTAT_5 + "select contact_id,display_name,localizerkey,group_id,account_id,"
-                                 "hasMail,hasAddress from localizer where contact_id  in(5)\n"}));
+    EXPECT_EQ(Told(), Recorded("one listed contact"));
 }
 
 TEST(StatusIndex, FindsTheSameWithoutItsTable)
@@ -276,7 +275,6 @@ TEST_F(Reader, MarksTheFirstRecordOfEachOnlineStatus)
     m_provider.Execute("insert into status_updates values(-5,'online'),(0,'online'),(7,'away'),"
                        "(8,null),(9,'online'),(11,'online'),(12,'Online')");
     ASSERT_EQ(0, ReadAll());
-    const std::string strFound = "CSQLiteOperator:Find one contact is sms online:statusid:";
     for (const int iGranted : {1000, 0})
     {
         EXPECT_EQ(0, Count()); // opens the database
@@ -289,12 +287,11 @@ TEST_F(Reader, MarksTheFirstRecordOfEachOnlineStatus)
                       m_set.pContacts[i].iFlags);
             m_set.pContacts[i].iFlags = CONTACT_FLAG_ONLINE;
         }
-        EXPECT_EQ(m_log.Texts(DEBUG_LINE),
-                  (Lines{strFound + "-5\n", strFound + "0\n", strFound + "9\n"}));
+        EXPECT_EQ(Told(), Recorded("online"));
     }
     const CMemoryFailure failure(0);
     EXPECT_EQ(-1, ReadAll());
-    EXPECT_EQ(Errors(), Lines{READER + "ReadAllLocalizer  NEW MEM ERR!!!!!!"});
+    EXPECT_EQ(Told(), Recorded("no memory"));
 }
 
 // A refused allocation must not pass for an empty text.
@@ -320,16 +317,12 @@ TEST_F(Reader, FailsOnWhatIsNoProviderDatabase)
     EXPECT_EQ(-1, Count());
     EXPECT_EQ(-1, m_reader.ReadContactsByID(1, &record, m_iCount));
     EXPECT_EQ(-1, ReadOnline());
-    EXPECT_EQ(Errors(), Lines(4, READER + "CSQLiteOperator  open iRetCode = 14"));
     EXPECT_FALSE(fs::exists(CDataPaths::Database()));
 
     CDataDirectory::WriteBytes(CDataPaths::Database(), std::string(5000, 'x'));
     EXPECT_EQ(-1, ReadAll());
     EXPECT_EQ(-1, Count());
     EXPECT_EQ(-1, ReadOnline());
-    EXPECT_EQ(Errors(), (Lines{COUNT_STEP + "sqlite3_prepare ERROR result=26",
-                               " " + READER + " select contacts count ERROR result=26",
-                               " select contacts count ERROR result=26"}));
     EXPECT_EQ(42, m_iCount);
     EXPECT_EQ(nullptr, m_set.pContacts);
 
@@ -343,7 +336,7 @@ TEST_F(Reader, FailsOnWhatIsNoProviderDatabase)
     provider.Execute("alter table contacts drop column photo_file_id");
     CSQLiteOperator another;
     EXPECT_EQ(-1, ReadAll(another));
-    EXPECT_EQ(Errors(), Lines{" " + READER + " select from contacts ERROR result=1"});
+    EXPECT_EQ(Told(), Recorded("no provider database"));
 }
 
 TEST_F(Reader, FailsWithoutContactsGoneSinceTheCountAndLeavesNewOnesOut)
@@ -353,7 +346,7 @@ TEST_F(Reader, FailsWithoutContactsGoneSinceTheCountAndLeavesNewOnesOut)
     m_log.AtEachLine(
         [&](const std::string& strText)
         {
-            if (strText.find(SQLSTAT_4) == 0)
+            if (Begins(strText, "sqlstat_4"))
             {
                 bRemoves ? m_provider.Remove(2) : m_provider.Put({3, "c"});
             }
@@ -361,52 +354,29 @@ TEST_F(Reader, FailsWithoutContactsGoneSinceTheCountAndLeavesNewOnesOut)
     EXPECT_EQ(-1, ReadAll());
     EXPECT_EQ((Ids{1, 4, 0}), IdsRead());
     EXPECT_STREQ(L"d", m_set.pContacts[1].szName);
-    EXPECT_EQ(Errors(),
-              Lines{READER + "SQLiteOperator>>ReadAllLocalizer: iIndex < pRecord->RecordNum\n"});
     bRemoves = false;
     EXPECT_EQ(0, ReadAll());
     EXPECT_EQ((Ids{1, 3}), IdsRead());
-    EXPECT_EQ(Errors(),
-              (Lines{" " + READER + " select from contacts sqlite3_step ERROR result=100",
-                     READER + " SQLiteOperator>>ReadAllLocalizer: sqlite3_step  error from "
-                              "localizer"}));
+    EXPECT_EQ(Told(), Recorded("contacts come and go"));
 }
 
 // A fresh connection must read the tables' definitions first, and the prepare is busy; one that
 // knows them meets the lock in its first step.
 TEST_F(Reader, TriesALockedDatabaseForAWhile)
 {
-    const auto fnRepeat = [](int iTimes, const std::string& strLine, const std::string& strLast)
-    {
-        Lines vLines(static_cast<size_t>(iTimes), strLine);
-        vLines.push_back(strLast);
-        return vLines;
-    };
     m_provider.Put({1});
     m_provider.LockExclusive();
     EXPECT_EQ(-1, ReadAll());
-    EXPECT_EQ(Errors(), fnRepeat(4, READER + " SQLITE_BUSY: select count",
-                                 COUNT_STEP + "sqlite3_prepare ERROR result=5"));
     EXPECT_EQ(-1, Count());
-    EXPECT_EQ(Errors(), fnRepeat(4, READER + " SQLITE_BUSY: GetContactsCount",
-                                 " " + READER + " select contacts count ERROR result=5"));
     EXPECT_EQ(-1, ReadOnline());
-    EXPECT_EQ(m_log.Texts(DEBUG_LINE), Lines(4, "!!! SQLITE_BUSY: select count"));
     m_provider.Unlock();
     EXPECT_EQ(0, Count());
     EXPECT_EQ(1, m_iCount);
     m_provider.LockExclusive();
-    m_log.Clear();
     EXPECT_EQ(-1, ReadAll());
-    const std::string strBusy = COUNT_STEP + "sqlite3_step is busy try ";
-    EXPECT_EQ(Errors(), (Lines{strBusy + "1 times", strBusy + "2 times", strBusy + "3 times",
-                               COUNT_STEP + "sqlite3_step ERROR result=5"}));
     EXPECT_EQ(-1, Count());
-    const std::string strStep = " " + READER + " sqlite3_step error result=5";
-    const std::string strTry = strStep + " first, and has try ";
-    EXPECT_EQ(Errors(),
-              (Lines{strTry + "1 times.", strTry + "2 times.", strTry + "3 times.", strStep}));
     m_provider.Unlock();
+    EXPECT_EQ(Told(), Recorded("locked"));
 }
 
 // The reader's connection forgets the tables' definitions before the query, so that its prepare
@@ -414,20 +384,21 @@ TEST_F(Reader, TriesALockedDatabaseForAWhile)
 TEST_F(Reader, WaitsForTheRecordQueriesAsLongAsItTakes)
 {
     m_provider.PutAll({{1, "a"}, {2, "b"}});
-    for (const auto& lines : {std::pair(SQLSTAT_4, READER + " SQLITE_BUSY: select from contacts"),
-                              std::pair(SQLSTAT_5, READER + " SQLITE_BUSY: select from localizer")})
+    const std::string strBusy = "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: select from ";
+    for (const auto& query :
+         {std::pair("sqlstat_4", "contacts"), std::pair("sqlstat_5", "localizer")})
     {
         int iBusy = 0;
         m_log.AtEachLine(
             [&](const std::string& strText)
             {
-                if (strText.find(lines.first) == 0)
+                if (Begins(strText, query.first))
                 {
                     sqlite3_exec(g_pReaderDB, "pragma writable_schema=reset", nullptr, nullptr,
                                  nullptr);
                     m_provider.LockExclusive();
                 }
-                else if (strText == lines.second && ++iBusy == 6)
+                else if (strText == strBusy + query.second && ++iBusy == 6)
                 {
                     m_provider.Unlock();
                 }

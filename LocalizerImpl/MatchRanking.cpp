@@ -13,7 +13,6 @@
 namespace
 {
 
-constexpr int SPLIT_SHIFT = 32; // a discovery key: split above, place in the vector below
 constexpr int RANGE_STACK_DEPTH = 32;
 
 // Places in name order are sorted digit by digit.
@@ -22,6 +21,7 @@ constexpr int DIGITS = 4;
 constexpr size_t DIGIT_VALUES = 1U << DIGIT_BITS;
 constexpr uint32_t DIGIT_MASK = DIGIT_VALUES - 1;
 constexpr uint32_t SIGN_BIT = 0x80000000;
+constexpr int PLACE_BITS = 32;
 
 // Kind, start and span of a match from one search: starts are 0..9, spans 1..10.
 constexpr int BUCKET_POSITION_BITS = 4;
@@ -69,37 +69,70 @@ int CompareMatches(const _MatchResult& a, const _MatchResult& b, const tag_Local
     return static_cast<int>(iIndexA > iIndexB) - static_cast<int>(iIndexA < iIndexB);
 }
 
-// Moves the entries around the first one as a hole travels between the ends; returns where the
-// first one came to stand.
-int PartitionMatches(android::Vector<_MatchResult>& vMatches, int iLow, int iHigh,
-                     const tag_LocalizerDetail* pDetail)
+// Moves the items around the first one as a hole travels between the ends; returns where the first
+// one came to stand.
+template <typename Item, typename Compare>
+int Partition(Item* pItems, int iLow, int iHigh, Compare compare)
 {
-    const auto at = [&vMatches](int i) -> const _MatchResult&
-    { return vMatches[static_cast<size_t>(i)]; };
-    const _MatchResult pivot = at(iLow);
+    const Item pivot = pItems[iLow];
     int i = iLow;
     int j = iHigh;
     while (i < j)
     {
-        while (j > i && CompareMatches(at(j), pivot, pDetail) >= 0)
+        while (j > i && compare(pItems[j], pivot) >= 0)
         {
             --j;
         }
         if (j > i)
         {
-            vMatches.replaceAt(at(j), static_cast<size_t>(i++));
+            pItems[i++] = pItems[j];
         }
-        while (i < j && CompareMatches(at(i), pivot, pDetail) <= 0)
+        while (i < j && compare(pItems[i], pivot) <= 0)
         {
             ++i;
         }
         if (i < j)
         {
-            vMatches.replaceAt(at(i), static_cast<size_t>(j--));
+            pItems[j--] = pItems[i];
         }
     }
-    vMatches.replaceAt(pivot, static_cast<size_t>(i));
+    pItems[i] = pivot;
     return i;
+}
+
+// Quicksort of items iLow..iHigh whose pivot is the first item; which order equal items end in
+// depends on its steps alone. They leave a sorted range as it is, so it is not partitioned.
+template <typename Item, typename Compare>
+void QuickSort(Item* pItems, int iLow, int iHigh, Compare compare)
+{
+    // Ranges do not meet again once they are parted, so the longer one can wait on a small stack.
+    struct tag_Range
+    {
+        int iLow;
+        int iHigh;
+    };
+    tag_Range aWaiting[RANGE_STACK_DEPTH];
+    int iWaiting = 0;
+    const auto before = [compare](const Item& a, const Item& b) { return compare(a, b) < 0; };
+    for (;;)
+    {
+        while (iLow < iHigh && !std::is_sorted(pItems + iLow, pItems + iHigh + 1, before))
+        {
+            const int iPivot = Partition(pItems, iLow, iHigh, compare);
+            const bool bLeftLonger = iPivot - iLow > iHigh - iPivot;
+            aWaiting[iWaiting++] =
+                bLeftLonger ? tag_Range{iLow, iPivot - 1} : tag_Range{iPivot + 1, iHigh};
+            iLow = bLeftLonger ? iPivot + 1 : iLow;
+            iHigh = bLeftLonger ? iHigh : iPivot - 1;
+        }
+        if (iWaiting == 0)
+        {
+            return;
+        }
+        --iWaiting;
+        iLow = aWaiting[iWaiting].iLow;
+        iHigh = aWaiting[iWaiting].iHigh;
+    }
 }
 
 int BucketOf(const _MatchResult& match)
@@ -216,27 +249,45 @@ bool HasTies(const tag_NamePlace* pPlaces, const _MatchResult* pSorted, size_t u
     return std::adjacent_find(pSorted, pSorted + uCount, tied) != pSorted + uCount;
 }
 
-// The order in which the matches were first found: split by split, candidate by candidate.
-int OrderByDiscovery(android::Vector<_MatchResult>& vMatches, const uint16_t* pFirstSplits)
+// A match with its four ranking keys in one number.
+struct tag_RankedMatch
+{
+    uint64_t uRank;
+    uint32_t uMatch;
+};
+
+// Sorts matches of which some are equal in all four keys: those keep the order that the quicksort
+// leaves when it starts from the order of discovery, split by split and candidate by candidate.
+bool SortWithTies(const android::Vector<_MatchResult>& vMatches, const uint16_t* pFirstSplits,
+                  const tag_LocalizerDetail* pDetail, _MatchResult* pSorted)
 {
     const size_t uCount = vMatches.size();
-    const std::unique_ptr<uint64_t[]> keys(new (std::nothrow) uint64_t[uCount]);
-    const std::unique_ptr<_MatchResult[]> found(new (std::nothrow) _MatchResult[uCount]);
-    if (keys == nullptr || found == nullptr)
+    const std::unique_ptr<tag_RankedMatch[]> ranked(new (std::nothrow) tag_RankedMatch[uCount]);
+    if (ranked == nullptr)
     {
-        return -1;
+        return false;
     }
     for (size_t i = 0; i < uCount; ++i)
     {
-        keys[i] = (static_cast<uint64_t>(pFirstSplits[i]) << SPLIT_SHIFT) | i;
+        const auto uPlace = static_cast<uint32_t>(pDetail[vMatches[i].iIndex].iSortIndex);
+        const auto uBucket = static_cast<uint64_t>(BucketOf(vMatches[i]));
+        ranked[i] = {uBucket << PLACE_BITS | (uPlace ^ SIGN_BIT), static_cast<uint32_t>(i)};
     }
-    std::sort(keys.get(), keys.get() + uCount);
-    std::copy_n(vMatches.array(), uCount, found.get());
+    std::sort(ranked.get(), ranked.get() + uCount,
+              [pFirstSplits](const tag_RankedMatch& a, const tag_RankedMatch& b)
+              {
+                  return std::pair(pFirstSplits[a.uMatch], a.uMatch) <
+                         std::pair(pFirstSplits[b.uMatch], b.uMatch);
+              });
+    QuickSort(ranked.get(), 0, static_cast<int>(uCount) - 1,
+              [](const tag_RankedMatch& a, const tag_RankedMatch& b) {
+                  return static_cast<int>(a.uRank > b.uRank) - static_cast<int>(a.uRank < b.uRank);
+              });
     for (size_t i = 0; i < uCount; ++i)
     {
-        vMatches.replaceAt(found[static_cast<uint32_t>(keys[i])], i);
+        pSorted[i] = vMatches[ranked[i].uMatch];
     }
-    return 0;
+    return true;
 }
 
 } // namespace
@@ -251,18 +302,13 @@ int RankMatches(android::Vector<_MatchResult>& vMatches, const uint16_t* pFirstS
     {
         return -1;
     }
-    // Kept aside, since ties are ordered from the order of discovery, not from the sorted one.
     Distribute(vMatches, places.get(), sorted.get());
-    if (!HasTies(places.get(), sorted.get(), uCount, pDetail))
-    {
-        std::copy_n(sorted.get(), uCount, vMatches.editArray());
-        return 0;
-    }
-    if (OrderByDiscovery(vMatches, pFirstSplits) != 0)
+    if (HasTies(places.get(), sorted.get(), uCount, pDetail) &&
+        !SortWithTies(vMatches, pFirstSplits, pDetail, sorted.get()))
     {
         return -1;
     }
-    CQVLocalizerManager::LocalResultQuickSort(vMatches, 0, static_cast<int>(uCount) - 1, pDetail);
+    std::copy_n(sorted.get(), uCount, vMatches.editArray());
     return 0;
 }
 
@@ -283,33 +329,10 @@ int CQVLocalizerManager::AddToVector(android::Vector<_MatchResult>& vMatches, _M
 int CQVLocalizerManager::LocalResultQuickSort(android::Vector<_MatchResult>& vMatches, int iLow,
                                               int iHigh, tag_LocalizerDetail* pDetail)
 {
-    // Ranges do not meet again once they are parted, so the longer one can wait on a small stack.
-    struct tag_Range
-    {
-        int iLow;
-        int iHigh;
-    };
-    tag_Range aWaiting[RANGE_STACK_DEPTH];
-    int iWaiting = 0;
-    for (;;)
-    {
-        while (iLow < iHigh)
-        {
-            const int iPivot = PartitionMatches(vMatches, iLow, iHigh, pDetail);
-            const bool bLeftLonger = iPivot - iLow > iHigh - iPivot;
-            aWaiting[iWaiting++] =
-                bLeftLonger ? tag_Range{iLow, iPivot - 1} : tag_Range{iPivot + 1, iHigh};
-            iLow = bLeftLonger ? iPivot + 1 : iLow;
-            iHigh = bLeftLonger ? iHigh : iPivot - 1;
-        }
-        if (iWaiting == 0)
-        {
-            return 1;
-        }
-        --iWaiting;
-        iLow = aWaiting[iWaiting].iLow;
-        iHigh = aWaiting[iWaiting].iHigh;
-    }
+    QuickSort(vMatches.editArray(), iLow, iHigh,
+              [pDetail](const _MatchResult& a, const _MatchResult& b)
+              { return CompareMatches(a, b, pDetail); });
+    return 1;
 }
 
 void CQVLocalizerManager::LocalResultQuickSort(android::Vector<_MatchResult>& vMatches,

@@ -105,8 +105,7 @@ unsigned CPieceTable::AskEnds(int iKey, int iOffset)
 {
     unsigned uEnds = 0;
     unsigned uFull = 0;
-    const bool bMayFit = iKey >= m_sets.Count() || m_sets.MayBegin(iKey, m_szInput[iOffset]);
-    for (int iEnd = iOffset + 1; bMayFit && iEnd <= m_iInputLen; ++iEnd)
+    for (int iEnd = iOffset + 1; iEnd <= m_iInputLen; ++iEnd)
     {
         bool bFull = false;
         if (!Fits(iKey, Piece(iOffset, iEnd), bFull))

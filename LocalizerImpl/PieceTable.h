@@ -61,35 +61,6 @@ public:
         return uEnds != NOT_ASKED ? uEnds : AskEnds(iKey, iOffset);
     }
 
-    // The same two answers for a loop over many names, as long as the table lives: where they are
-    // is taken out of the objects once.
-    class CLookup
-    {
-    public:
-        explicit CLookup(CPieceTable& table)
-            : m_table(table), m_pKeys(table.m_pKeys), m_pEnds(table.m_pEnds.get()),
-              m_iKeys(table.KeyCount())
-        {
-        }
-
-        int KeyOf(wchar_t code) const
-        {
-            const uint32_t uCode = static_cast<uint32_t>(code);
-            return uCode < CReadingSets::CODE_COUNT ? m_pKeys[uCode] : m_table.KeyOfWide(code);
-        }
-        unsigned Ends(int iKey, int iOffset) const
-        {
-            const uint16_t uEnds = m_pEnds[iOffset * m_iKeys + iKey];
-            return uEnds != NOT_ASKED ? uEnds : m_table.AskEnds(iKey, iOffset);
-        }
-
-    private:
-        CPieceTable& m_table;
-        const uint16_t* m_pKeys;
-        const uint16_t* m_pEnds;
-        int m_iKeys;
-    };
-
     tag_PieceRow& RowOf(int iKey) { return m_pRows.get()[iKey]; }
     int InputLength() const { return m_iInputLen; }
     const CReadingSets& Sets() const { return m_sets; }

@@ -25,11 +25,10 @@ public:
     // text is not empty.
     bool Accept(const wchar_t* pCodes)
     {
-        const CPieceTable::CLookup table(m_table);
         int iState = START;
         for (int i = 0; i < AT_ONCE; ++i)
         {
-            iState = *StepOf(iState, table.KeyOf(pCodes[i]));
+            iState = *StepOf(iState, m_table.KeyOf(pCodes[i]));
         }
         return iState <= REFUSED ? iState == ACCEPTED : GoOn(pCodes, iState);
     }

@@ -1,7 +1,6 @@
 #include "LocalizerImpl/ReadingSets.h"
 
 #include <cstring>
-#include <mutex>
 #include <new>
 
 namespace
@@ -80,58 +79,53 @@ private:
 
 } // namespace
 
-// The sets that the process keeps from one search to the next. No one waits for the mutex: in a
-// child forked at the wrong moment it stays taken for good, and making the sets anew is cheap.
-class CKeptSets
+// The sets that the process keeps from one search to the next. A search takes them out of their
+// place and puts them back, so it never waits; one that finds the place empty makes sets of its
+// own, which is cheap. Kept as long as the process lives, since threads may search while it exits.
+struct tag_KeptSets
 {
-public:
-    CReadingSets::Ptr Lend(const tag_FileStamp& stamp)
-    {
-        const std::unique_lock<std::mutex> lock(m_mutex, std::try_to_lock);
-        return lock.owns_lock() && m_pSets != nullptr && IsSameStamp(stamp, m_stamp)
-                   ? m_pSets->Share()
-                   : nullptr;
-    }
-
-    void Keep(const CReadingSets& sets, const tag_FileStamp& stamp)
-    {
-        CReadingSets::Ptr pSets = sets.Share();
-        const std::unique_lock<std::mutex> lock(m_mutex, std::try_to_lock);
-        if (lock.owns_lock())
-        {
-            m_pSets.swap(pSets);
-            m_stamp = stamp;
-        }
-    }
-
-private:
-    std::mutex m_mutex;
-    CReadingSets::Ptr m_pSets;
-    tag_FileStamp m_stamp = {};
+    CReadingSets::Ptr sets;
+    tag_FileStamp stamp;
 };
 
 namespace
 {
 
-// Never destroyed, since other threads may search while the process exits.
-CKeptSets& KeptSets()
+std::atomic<tag_KeptSets*> g_pKept(nullptr);
+
+void PutKept(tag_KeptSets* pKept)
 {
-    alignas(CKeptSets) static unsigned char acPlace[sizeof(CKeptSets)];
-    static CKeptSets* pKept = new (acPlace) CKeptSets;
-    return *pKept;
+    delete g_pKept.exchange(pKept);
 }
 
 } // namespace
 
+CReadingSets::Ptr CReadingSets::Lend(const tag_FileStamp& stamp)
+{
+    tag_KeptSets* pKept = g_pKept.exchange(nullptr);
+    if (pKept == nullptr)
+    {
+        return nullptr;
+    }
+    Ptr sets = IsSameStamp(stamp, pKept->stamp) ? pKept->sets->Share() : nullptr;
+    PutKept(pKept);
+    return sets;
+}
+
+void CReadingSets::Keep(const tag_FileStamp& stamp) const
+{
+    PutKept(new (std::nothrow) tag_KeptSets{Share(), stamp});
+}
+
 CReadingSets::Ptr CReadingSets::Of(const PYOFWORDS* pMap, const tag_FileStamp& stamp)
 {
-    Ptr pSets = KeptSets().Lend(stamp);
+    Ptr pSets = Lend(stamp);
     if (pSets == nullptr)
     {
         pSets = Make(pMap);
         if (pSets != nullptr && stamp.bSettled)
         {
-            KeptSets().Keep(*pSets, stamp);
+            pSets->Keep(stamp);
         }
     }
     return pSets;
@@ -176,36 +170,18 @@ bool CReadingSets::Fill(const PYOFWORDS* pMap)
     }
     m_iCount = index.Count();
     FillOtherKeys();
-    if (!MakeRoomForSets())
+    m_pRecords.reset(new (std::nothrow) PYOFWORDS[static_cast<size_t>(m_iCount)]);
+    if (m_pRecords == nullptr)
     {
         return false;
     }
     PYOFWORDS* pRecords = m_pRecords.get();
-    uint64_t* pInitials = m_pInitials.get();
     for (int i = 0; i < m_iCount; ++i)
     {
         pRecords[i] = index.FirstOf(i);
         std::memset(pRecords[i].szWord, 0, sizeof(tag_Word));
-        pInitials[i] = InitialsOf(pRecords[i]);
     }
     return true;
-}
-
-bool CReadingSets::MakeRoomForSets()
-{
-    m_pRecords.reset(new (std::nothrow) PYOFWORDS[static_cast<size_t>(m_iCount)]);
-    m_pInitials.reset(new (std::nothrow) uint64_t[static_cast<size_t>(m_iCount)]);
-    return m_pRecords != nullptr && m_pInitials != nullptr;
-}
-
-uint64_t CReadingSets::InitialsOf(const PYOFWORDS& record)
-{
-    uint64_t uInitials = 0;
-    for (int i = 0; i < PY_READINGS; ++i)
-    {
-        uInitials |= InitialBit(record.szPinyin[i][0]) | InitialBit(record.szPinyinNum[i][0]);
-    }
-    return uInitials;
 }
 
 void CReadingSets::FillOtherKeys()

@@ -39,13 +39,6 @@ public:
     // By set; their characters are empty. Shared by all searches: to be read only.
     PYOFWORDS* Records() const { return m_pRecords.get(); }
 
-    // False when no spelling of the set, in letters or digits, begins with the unit.
-    bool MayBegin(int iSet, wchar_t unit) const
-    {
-        const uint64_t uBit = InitialBit(unit);
-        return uBit == 0 || (m_pInitials.get()[iSet] & uBit) != 0;
-    }
-
     // Keys are 0..KeyCount() - 1, first one for each set. A code acts by its low 16 bits, except
     // that LOC_OTHER and LOC_NO_CODE have other keys with upper bits set, which only a damaged
     // record holds.
@@ -76,38 +69,25 @@ private:
     static constexpr int PLACE_END = PLACE_OTHER + 3; // of LOC_NO_CODE alone
     static constexpr int PLACE_COUNT = PLACE_OTHER + 4;
 
-    // 0 for units that are neither a small letter nor a digit: nothing is kept of these.
-    static uint64_t InitialBit(wchar_t unit)
-    {
-        if (unit >= L'a' && unit <= L'z')
-        {
-            return uint64_t{1} << (unit - L'a');
-        }
-        return unit >= L'0' && unit <= L'9' ? uint64_t{1} << (LOC_ALPHA_COUNT + unit - L'0') : 0;
-    }
-    static uint64_t InitialsOf(const PYOFWORDS& record);
-
     struct tag_Word
     {
         char szWord[sizeof(PYOFWORDS::szWord)];
     };
 
-    friend class CKeptSets;
-
     CReadingSets() = default;
     ~CReadingSets() = default;
     static Ptr Make(const PYOFWORDS* pMap);
     bool Fill(const PYOFWORDS* pMap);
-    bool MakeRoomForSets();
     void FillOtherKeys();
     int KeyOfWide(wchar_t code) const;
     Ptr Share() const;
+    static Ptr Lend(const tag_FileStamp& stamp);
+    void Keep(const tag_FileStamp& stamp) const;
 
     int m_iCount = 0;
     std::unique_ptr<uint16_t[]> m_pKeyOf; // by code
     std::unique_ptr<tag_Word[]> m_pWords; // by record of the pinyin table
     std::unique_ptr<PYOFWORDS[]> m_pRecords;
-    std::unique_ptr<uint64_t[]> m_pInitials; // by set: the first units of its spellings
     mutable std::atomic<int> m_iUsers{1};
 };
 

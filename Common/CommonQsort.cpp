@@ -74,7 +74,7 @@ private:
     alignas(tag_ContactsStruct) char m_acSwap[MAX_RECORD_SIZE]; // one side of an exchange
 };
 
-// A key beside the records of a sorted array.
+// A key to compare with the records of a sorted array.
 class CKeyedArray
 {
 public:
@@ -116,7 +116,7 @@ int SearchExact(CKeyedArray& array, int iCount)
     return bFound ? iPos : -1;
 }
 
-// The insertion place that prefers an equal first or last record to the place behind it.
+// The insertion place; an equal first or last record is preferred to the place behind it.
 int SearchInsertion(CKeyedArray& array, int iCount, bool* pbFound)
 {
     const int iLast = iCount - 1;
@@ -183,8 +183,8 @@ void Common_Qsort::InsertionSort(char* base, int lo, int hi)
     }
 }
 
-// Whether there are records to look at; where there are none, *piResult is the answer. An empty
-// array, null or not, has one place for a key: its beginning.
+// Whether there are records to search; if not, *piResult is the answer. In an empty array, null or
+// not, a key is inserted at index 0.
 bool Common_Qsort::BeginSearch(const char* base, int count, const char* key, Common_Sort_enum type,
                                int bInsertPos, int* piResult)
 {

@@ -39,20 +39,22 @@ public:
     // Searches count sorted records for key, a record of the same kind (for SORT_PYWORD only its
     // leading zero-terminated string matters).
     // bInsertPos 0: the index of an equal record, or -1. bInsertPos not 0: the index 0..count at
-    // which the key keeps the order; that of an equal record where one is met.
+    // which the key keeps the order; that of an equal record if the search meets one.
     // A count of 0 or less: -1 or 0, whatever base and key are; else -1 for a null base or key.
     int Search_Bin(char* base, int count, char* key, Common_Sort_enum type, int bInsertPos);
 
-    // The same search; with bInsertPos it sets *pbFound to 1 when an equal record was met, and
-    // then returns that record's index. It never clears *pbFound.
-    int Search_BinEx(char* base, int count, char* key, Common_Sort_enum type, int bInsertPos,
-                     int* pbFound);
-
     // Relations between two records of the current kind: 1, 0, or -1 for an unknown kind.
-    // QSORT_EQ of SORT_NAME looks at the names only.
+    // QSORT_EQ of SORT_NAME compares the names only.
     int QSORT_EQ(char* a, char* b);
     int QSORT_GT(char* a, char* b);
     int QSORT_LT(char* a, char* b);
+
+    // --- For callers outside: nothing in the library calls this ---
+
+    // As Search_Bin; with bInsertPos it sets *pbFound to 1 when an equal record was met, and
+    // then returns that record's index. It never clears *pbFound.
+    int Search_BinEx(char* base, int count, char* key, Common_Sort_enum type, int bInsertPos,
+                     int* pbFound);
 
 private:
     bool IsReady() const { return m_iRecSize > 0; }

@@ -3,15 +3,15 @@
 
 #include "Common/Export.h"
 
-// The one place that knows where the provider keeps its files. On a device the paths never
-// change; SetRoot is the seam through which tests and the tool work in a directory of their own.
+// The paths of the provider's files. On a device they never change; SetRoot lets tests and the tool
+// work in another directory.
 // The library reads no environment variable and no configuration file.
 class QV_EXPORT CDataPaths
 {
 public:
     // Puts all paths under szRoot (UTF-8, at most 4000 bytes, without a slash at its end) instead
     // of /data/data/com.android.providers.contacts. Called once, before anything else of the
-    // library; null brings the device's paths back. 0, or -1 with nothing changed for a root that
+    // library; null restores the device's paths. 0, or -1 with nothing changed for a root that
     // is too long. Not synchronised.
     static int SetRoot(const char* szRoot);
 

@@ -83,8 +83,7 @@ const char* PathOfMapping(const char* szLine, uintptr_t uAddress)
     return ulStart <= uAddress && uAddress < ulEnd ? szPath : nullptr;
 }
 
-// A shell command, put together in memory of its own: words, then quoted paths. Null when the
-// allocation fails.
+// A shell command: words, then quoted paths. Run does nothing if the allocation failed.
 class CShellCommand
 {
 public:
@@ -106,14 +105,14 @@ public:
     {
         if (m_text != nullptr)
         {
-            // The callers report nothing of what becomes of the command.
+            // The callers do not report whether the command succeeded.
             const int iStatus = std::system(m_text.get());
             static_cast<void>(iStatus);
         }
     }
 
 private:
-    // Bytes for the words, the paths, as if they were all quotes, and the terminator.
+    // Bytes for the words, the paths, as if every character were a quote, and the terminator.
     static size_t Room(const char* szWords, const char* const* pPaths, int iPaths)
     {
         size_t uRoom = std::strlen(szWords) + 1;
@@ -124,8 +123,8 @@ private:
         return uRoom;
     }
 
-    // Between quotes only a quote means something to the shell; a name that starts with a dash
-    // would be an option of the command.
+    // Between quotes only a quote is special to the shell; the command would take a name that
+    // starts with a dash for an option.
     void AddPath(const char* szPath)
     {
         AddText(szPath[0] == '-' ? " './" : " '");
@@ -182,9 +181,8 @@ int GetModuleFileName(void* /*hModule*/, wchar_t* szPath, int iLastByte)
     {
         return -1;
     }
-    // A function of this file only: it lies in the library's text and no other library's function
-    // takes its place. A constant would lie in a mapping that current linkers do not make
-    // executable.
+    // A static function lies in this library's text, and another library cannot interpose it. A
+    // constant would lie in a mapping that current linkers do not make executable.
     const uintptr_t uOwnText = reinterpret_cast<uintptr_t>(&PathOfMapping);
     int iResult = -1;
     char szLine[MAX_MAPS_READ];

@@ -15,13 +15,13 @@ int BoundedLength(const wchar_t (&szName)[CONTACT_MAX_NAME + 1])
     return static_cast<int>(wcsnlen(szName, CONTACT_MAX_NAME + 1));
 }
 
-// -1, 0 or 1: which of two records a property of only one of them puts behind.
+// 1 if only a has a property that sorts behind, -1 if only b has it, else 0.
 int BehindByProperty(bool bHasA, bool bHasB)
 {
     return static_cast<int>(bHasA) - static_cast<int>(bHasB);
 }
 
-// A letter and a Chinese character under one first letter: the letter goes first.
+// A Latin letter sorts before a Chinese character under the same first letter.
 int BehindByScript(wchar_t codeA, wchar_t codeB)
 {
     if (IsHanZiCode(CodeBits(codeA)) && IsAlphaCode(CodeBits(codeB)))

@@ -11,6 +11,8 @@ constexpr int NUMBER_MAX_RADIX = 36;
 
 extern "C"
 {
+    // --- For callers outside: nothing in the library calls these ---
+
     // Value of the decimal digits at the start of szText, which is not null: no blanks, no sign;
     // 0 without digits. Wraps at 32 bits.
     QV_EXPORT int _atoi(const wchar_t* szText);
@@ -18,7 +20,7 @@ extern "C"
     // Text of iValue with digits above 9 as 'a'..'z', zero-terminated, in szBuffer (33 bytes are
     // always enough) or, when that is null, in memory of exactly the needed size that the caller
     // releases with free. A minus sign only in radix 10; other radices show the 32 bits as an
-    // unsigned number. Returns the text; null for a radix outside 2..36 or when memory runs out.
+    // unsigned number. Returns the text; null for a radix outside 2..36 or if malloc fails.
     QV_EXPORT char* itoa(int iValue, char* szBuffer, int iRadix);
 
     // Text of ulValue with digits above 9 as 'A'..'Z', zero-terminated, in szBuffer: one byte per

@@ -1,9 +1,9 @@
 #ifndef QV_COMMON_SEARCHSTEPS_H
 #define QV_COMMON_SEARCHSTEPS_H
 
-// The steps of the binary search, free of what is searched: the sorter runs them on an array of
-// records, a change of the store on records in an order that they are still to be brought into.
-// Whoever runs them meets the same one of several equal elements.
+// The binary search, independent of the elements: the sorter runs it on an array of records, a
+// patch of the store on records that are still to be moved into the order searched. Both find the
+// same one of several equal elements.
 //
 // TArray offers, for a key and indexes of its sorted elements:
 //   bool KeyEquals(int i)

@@ -3,9 +3,9 @@
 
 #include <utility>
 
-// The steps of the record sort, free of what is sorted: the sorter runs them on whole records,
-// the index build on small keys. Whoever runs them compares and moves in the same order and so
-// leaves records that compare equal in the same order.
+// The record sort, independent of the elements: the sorter runs it on whole records, the index
+// build on small keys. Both make the same comparisons and moves in the same sequence, so records
+// that compare equal end in the same order.
 //
 // TArray offers, for indexes of its elements:
 //   bool Greater(int a, int b)      element a sorts behind element b
@@ -86,7 +86,7 @@ void SortPartitions(TArray& array, int lo, int hi)
         while (hi - lo >= SORT_PARTITION_DISTANCE)
         {
             const std::pair<int, int> split = SortPartition(array, lo, hi);
-            // The halves do not meet again, so their order is free: the shorter one goes first.
+            // The halves are independent; sorting the shorter one first bounds the stack.
             if (split.first - lo < hi - split.second)
             {
                 pending[iDepth++] = {split.second, hi};

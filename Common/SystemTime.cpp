@@ -20,7 +20,7 @@ timeval WallClock()
     return now;
 }
 
-// What localtime does, into the caller's memory; like it, looks at the time zone each time.
+// localtime into the caller's memory; like it, this reads the time zone each time.
 bool BreakDown(time_t seconds, tm& fields)
 {
     tzset();

@@ -40,14 +40,16 @@ extern "C"
     // Pauses the calling thread for the whole time, whatever signals it handles meanwhile.
     QV_EXPORT void Sleep(unsigned int uMilliseconds);
 
+    // --- For callers outside: nothing in the library calls these ---
+
     // The wall clock as a calendar time.
     QV_EXPORT void GetLocalTime(tag_SystemTime* pTime);
 
     // Between calendar and point in time; always 1. A calendar time is taken as standard time,
-    // without daylight saving, and its dayOfWeek is not looked at. The seconds are a field of 32
-    // bits: a calendar time before December 1901 or after January 2038 does not fit and gives -1,
-    // also where the C library counts in 64 bits. A point in time without a calendar form leaves
-    // pTime untouched.
+    // without daylight saving, and its dayOfWeek is ignored. The seconds are a field of 32 bits: of
+    // a calendar time before December 1901 or after January 2038, which does not fit, they become
+    // -1, also where the C library counts in 64 bits. A point in time without a calendar form
+    // leaves pTime untouched.
     QV_EXPORT int SystemTimeToFileTime(const tag_SystemTime* pTime, tag_FileTime* pFileTime);
     QV_EXPORT int FileTimeToSystemTime(const tag_FileTime* pFileTime, tag_SystemTime* pTime);
 }

@@ -27,6 +27,8 @@ extern "C"
     QV_EXPORT int _mbstowcs(wchar_t* szTarget, const char* szSource, int iLastByte);
     QV_EXPORT int _wcstombs(char* szTarget, const wchar_t* szSource, int iLastUnit);
 
+    // --- For callers outside: nothing in the library calls these ---
+
     // Writes szFormat as it stands, in UTF-8, and a line end to standard output; the arguments
     // are ignored. Any length; a null szFormat writes the line end. Returns the number of bytes
     // written.
@@ -35,8 +37,8 @@ extern "C"
     // Formats by the rules of the narrow vsprintf (%s takes a narrow string) and decodes the
     // result into szTarget, which needs room for the decoded text and its terminator. A text that
     // does not decode ends before the offending character. Returns the formatted length in bytes
-    // plus 1, or -1 with szTarget untouched when formatting fails, the text has 1024 bytes or
-    // more, memory runs out, or an argument is null.
+    // plus 1, or -1 with szTarget untouched when formatting or an allocation fails, the text has
+    // 1024 bytes or more, or an argument is null.
     QV_EXPORT int _u_wsprintf(wchar_t* szTarget, const wchar_t* szFormat, ...);
 }
 

@@ -31,16 +31,24 @@ extern "C"
     QV_EXPORT int _wcscmp(const wchar_t* szLeft, const wchar_t* szRight);
     QV_EXPORT int _wcsncmp(const wchar_t* szLeft, const wchar_t* szRight, size_t uCount);
 
-    // First occurrence of szKey in szText, szText itself for an empty szKey, null when it does
-    // not occur or either is null.
-    QV_EXPORT const wchar_t* _wcsstr(const wchar_t* szText, const wchar_t* szKey);
-
     // Change the case of ASCII letters and of nothing else; the string forms work in place and
     // return szText.
     QV_EXPORT wchar_t _towlower(wchar_t cUnit);
     QV_EXPORT wchar_t _towupr(wchar_t cUnit);
     QV_EXPORT wchar_t* _wcslwr(wchar_t* szText);
     QV_EXPORT wchar_t* _wcsupr(wchar_t* szText);
+
+    // Compares in the order of code units over the longer of the two lengths: 1 when szLeft comes
+    // first, 2 when they are equal, 3 when szRight comes first. The lengths are those of the
+    // strings; iLocale and iFlags change nothing.
+    QV_EXPORT int _CompareString(int iLocale, int iFlags, const wchar_t* szLeft, int iLeftLength,
+                                 const wchar_t* szRight, int iRightLength);
+
+    // --- For callers outside: nothing in the library calls these ---
+
+    // First occurrence of szKey in szText, szText itself for an empty szKey, null when it does
+    // not occur or either is null.
+    QV_EXPORT const wchar_t* _wcsstr(const wchar_t* szText, const wchar_t* szKey);
 
     // Uppercases a byte string in place with the C library's toupper; returns szText.
     QV_EXPORT char* strupr(char* szText);
@@ -49,12 +57,6 @@ extern "C"
     // inside the source, the bytes before it repeat. Returns pTarget; null, with nothing copied,
     // when either is null.
     QV_EXPORT void* _memcpy(void* pTarget, const void* pSource, size_t uSize);
-
-    // Compares in the order of code units over the longer of the two lengths: 1 when szLeft comes
-    // first, 2 when they are equal, 3 when szRight comes first. The lengths are those of the
-    // strings; iLocale and iFlags change nothing.
-    QV_EXPORT int _CompareString(int iLocale, int iFlags, const wchar_t* szLeft, int iLeftLength,
-                                 const wchar_t* szRight, int iRightLength);
 }
 
 #endif

@@ -1,5 +1,5 @@
 // The change handlers of CLocalizerLogic: patches in place under the store lock, and the full
-// rebuild where a patch cannot do. A rebuild takes the lock itself, so it never runs while a
+// rebuild where no patch is possible. A rebuild takes the lock itself, so it never runs while a
 // handler holds it.
 
 #include "Common/DataPaths.h"
@@ -44,8 +44,8 @@ private:
     tag_ContactsInfo m_info = {};
 };
 
-// Whether a read of the listed contacts gives them all. The reader writes 32 bits of each id: a
-// longer one would read another contact.
+// Whether a read of the listed contacts gives them all. The reader uses 32 bits of each id: a
+// larger one would name another contact.
 bool CanListWhole(int iRecordNum, const long long* pIds)
 {
     if (!CSqlIdList::CanListAll(iRecordNum, pIds))
@@ -70,8 +70,8 @@ void SetContacted(tag_ContactsStruct& record, int64_t llTime)
         static_cast<int32_t>(static_cast<uint32_t>(record.iTimesContacted) + 1U);
 }
 
-// The contact becomes the most recent one, in a store ordered by that. Returns the capacity that
-// lifts the mark, 0 when it has to stay.
+// Makes the contact the first record of a store in time order. Returns the capacity to lift the
+// mark with, 0 when the mark has to stay.
 int SetContactedFirst(const CHeldRecords& store, int iSlot, int64_t llTime)
 {
     const CWriteMapping mapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
@@ -90,8 +90,8 @@ int SetContactedFirst(const CHeldRecords& store, int iSlot, int64_t llTime)
     return reg.Capacity();
 }
 
-// Without a store the build that writes the pinyin table never ended: names must not be kept by
-// whatever it left. With one, the table is complete and stays as it is.
+// Without a store no build has completed, and the pinyin table may be missing or partial: it is
+// written again. With a store the table is complete and stays as it is.
 int CompletePinyinTable()
 {
     tag_ContactReg reg = {};
@@ -202,7 +202,7 @@ void CLocalizerLogic::OnContactsTableChanged(int iRecordNum, long long* pIds)
     }
 }
 
-// Whether the store is complete and has room for the database's contacts, whose number it tells.
+// Whether the store is complete and has room for the database's contacts, which it counts.
 bool CLocalizerLogic::HasRoomForAll(int& iDatabaseCount)
 {
     int iTotalNum = 0;
@@ -273,8 +273,8 @@ void CLocalizerLogic::OnStatusUpdatesTableChanged(int /*iRecordNum*/, long long*
     }
 }
 
-// Whether a store without capacity lacks contacts. An empty one does when the database has some:
-// a writer that died before it counted its first contact leaves that.
+// Whether a store without capacity lacks contacts. An empty one does if the database has some: a
+// writer that died before it set the first count leaves it so.
 bool CLocalizerLogic::HasUnbuiltContacts(int iTotalNum)
 {
     int iDatabaseCount = 0;

@@ -39,8 +39,7 @@ int FileSize(const char* szPath)
     return static_cast<int>(info.st_size);
 }
 
-// Whether the store is complete. A change that is under way is waited for, as long as a build
-// would wait.
+// Whether the store is complete. Waits for a change that is under way, as long as a build would.
 bool IsStoreWhole()
 {
     if (CStoreRegister::IsChangeLost())
@@ -56,7 +55,7 @@ bool IsStoreWhole()
     return TryStoreLock(&lock, [](int) {}) && CStoreRegister::Inspect(&reg) == STORE_WHOLE;
 }
 
-// The matcher for a kind of input, null without memory.
+// The matcher for a kind of input; null if the allocation fails.
 std::unique_ptr<CQVLocalizerManager> CreateMatcher(IME_SEARCH_TYPE eSearchType)
 {
     using Owner = std::unique_ptr<CQVLocalizerManager>;
@@ -71,7 +70,7 @@ bool IsKnownType(IME_SEARCH_TYPE eSearchType)
            eSearchType == IME_SEARCH_SPECIAL;
 }
 
-// The caller's result with room for iNum entries; null for want of memory.
+// The caller's result with room for iNum entries; null if an allocation fails.
 tag_LocalizerResult* NewResult(int iNum)
 {
     bool bNoEntries = false;
@@ -83,9 +82,9 @@ tag_LocalizerResult* NewResult(int iNum)
     return pResult;
 }
 
-// Finishes a search into the caller's result: the facade's own copy of the source where all of it
-// was found and its array is dense, else a new set. 0, or -1 without memory or without a place
-// for the result; the keys that can follow are written all the same.
+// Finishes a search into the caller's result: the facade's own candidate set if all of it matches
+// and its array is dense, else a new set. 0, or -1 if the allocation fails or ppResult is null;
+// the keys that can follow are written all the same.
 int HandOut(CSearchRun& run, CResultOwner& copy, const tag_LocalizerResult& source, int iFound,
             tag_LocalizerResult** ppResult, long* pMask, wchar_t* szWordOut)
 {
@@ -206,7 +205,7 @@ int CLocalizerLogic::ReadContacts(tag_ContactsInfo& record)
     return 0;
 }
 
-// The contacts are worth having without their online state, so a failure is only logged.
+// An index without online states is still useful, so a failure is only logged.
 void CLocalizerLogic::ReadOnlineStatus(tag_ContactsInfo& record)
 {
     const int iRet = m_pDBOperator->ReadAllSmsOnlineStatus(&record, 0, nullptr);
@@ -217,7 +216,7 @@ void CLocalizerLogic::ReadOnlineStatus(tag_ContactsInfo& record)
 }
 
 // The stored sort type, STORE_ORDER_NAME where there is none. 0, or -1 when it cannot be read: a
-// build must not take that for an order.
+// build must not take a failed read for name order.
 int CLocalizerLogic::ReadStoredOrder(int& iSortType)
 {
     tag_ContactReg reg = {};
@@ -233,7 +232,7 @@ int CLocalizerLogic::ConvertAndSort(tag_ContactsInfo& record, int iSortType)
     return iRet == 0 ? SortConverted(record, iSortType) : iRet;
 }
 
-// By name first, which numbers the records, then by any other order.
+// Sorts by name, which numbers the records, then by any other order.
 int CLocalizerLogic::SortConverted(tag_ContactsInfo& record, int iSortType)
 {
     const int iRet = CQVLocalizerManager::LocalizerQuickSort(record.pContacts, record.RecordNum,
@@ -246,7 +245,7 @@ int CLocalizerLogic::SortConverted(tag_ContactsInfo& record, int iSortType)
 }
 
 // Writes the records, sorted by iSortType, and sorts them anew if the sort type was set meanwhile.
-// Somebody who sets it again and again is left with a marked store.
+// If that happens again and again, the store stays marked.
 int CLocalizerLogic::WriteSorted(tag_ContactsInfo& record, int iSortType)
 {
     BUILD_RESULT eResult = CStoreBuild::Write(record, &iSortType);
@@ -281,14 +280,14 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
     {
         return -1;
     }
-    // The text is looked at before the store, so that only what can match is copied out of it.
+    // The text is prepared before the store is read, so that only what can match gets an entry.
     CSearchRun run(*matcher);
     const bool bKnown = IsKnownType(eSearchType);
     const bool bComplete = szInput != nullptr && pMask != nullptr && szWordOut != nullptr;
     const int iBegun = bKnown && bComplete ? run.Begin(szInput) : LOC_ERR_PARAM;
     if (iBegun != 0)
     {
-        return bKnown ? iBegun : 0; // nobody waits for the lock of a search that finds nothing
+        return bKnown ? iBegun : 0; // a search that finds nothing does not wait for the lock
     }
     CResultOwner copy(*m_pclMemManger);
     tag_LocalizerResult* pSource = pLastResult;
@@ -313,8 +312,8 @@ int CLocalizerLogic::Search(tag_LocalizerResult* pLastResult, wchar_t* szInput,
     return iRet;
 }
 
-// The set to search when the caller gives none, less what the search rules out; a failure leaves
-// it empty or null.
+// The candidate set of a whole-store search, without the contacts that cannot match; empty or null
+// after a failure.
 void CLocalizerLogic::CopySource(IME_SEARCH_TYPE eSearchType, CFilterChain& chain,
                                  CCandidateFilter& test, CResultOwner& copy)
 {

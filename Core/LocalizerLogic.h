@@ -27,29 +27,29 @@ extern "C"
 // the library reads the same one.
 //
 // Side effects: MemInit that builds, Search without pLastResult (special numbers apart),
-// SetSortType and the change notifications leave the process's file-creation mask at 0. The files
-// have the permission bits 0777; the directory's mode, 0700 as a rule, is what protects them. A
-// build opens the pinyin table for writing too, though it changes nothing in it.
+// SetSortType and the change notifications set the process's file-creation mask to 0 and leave it.
+// The files have the permission bits 0777; the directory's mode, usually 0700, protects them. A
+// build opens the pinyin table for writing too, but changes nothing in it.
 //
 // Results: 0, or -1 for a null argument, a refused lock, a file that cannot be mapped, a database
-// that cannot be read or a lack of memory; LOC_ERR_MAP and LOC_ERR_PARAM of
+// that cannot be read or a failed allocation; LOC_ERR_MAP and LOC_ERR_PARAM of
 // Core/Records/LocalizerCodes.h from the pinyin operations and the search itself.
 class QV_EXPORT CLocalizerLogic
 {
 public:
-    // Opens no file and reads nothing. When its parts find no memory, MemInit and Search return
-    // -1 and nothing else may be called.
+    // Opens no file. If an allocation fails, MemInit cannot build and Search may return -1; nothing
+    // else may be called then.
     CLocalizerLogic();
     ~CLocalizerLogic();
     CLocalizerLogic(const CLocalizerLogic&) = delete;
     CLocalizerLogic& operator=(const CLocalizerLogic&) = delete;
 
-    // Builds the whole index from the provider's database, unless bForce is false and a whole index
-    // is there: one that is marked, damaged or unreadable is built anew. The database is read
+    // Builds the whole index from the provider's database, unless bForce is false and the index is
+    // complete; one that is missing, marked, damaged or unreadable is built. The database is read
     // without the store lock; the lock is held while the files are written, after at most five
     // attempts 200 ms apart. The stored sort type is kept. The online state may fail to be read:
-    // that is logged and ignored. LOC_ERR_MAP without a pinyin table. After a failure the old index
-    // stays.
+    // that is logged and ignored. LOC_ERR_MAP if the pinyin table is missing or cannot be copied.
+    // After a failure the old index stays.
     int MemInit(bool bForce);
 
     // One search, within pLastResult (read only, stays the caller's) or, when it is null, within
@@ -57,14 +57,15 @@ public:
     // pFilterChain is never null, also where it is not used.
     //   szInput    at most 10 characters; its letters become lowercase and its Chinese characters
     //              their codes, in place, also in a search that fails afterwards
-    //   ppResult   gets a set of its own, released with FreeSearchResult: the matches, best
-    //              first; null when only its memory could not be had; untouched after any earlier
-    //              failure. When it is null, pMask and szWordOut are written and the result is -1
+    //   ppResult   gets a new set, released with FreeSearchResult: the matches, best first; null
+    //              if only its allocation failed; untouched after any earlier failure. If that
+    //              allocation fails or ppResult itself is null, the result is -1 and pMask and
+    //              szWordOut are written all the same
     //   pMask      gets the keys that can follow: bits 0..25 letters, 0x4000000 anything else
     //   szWordOut  at least 20 wide characters, zeroed: gets the Chinese characters that the last
     //              letters may stand for, without terminator
-    // iReserved is not used. A store lock refused five times in a second, or no index: an empty
-    // set. A search type outside 0..2: 0, with nothing written.
+    // iReserved is not used. The set is empty if the store lock was refused five times (for a
+    // second) or there is no index. A search type outside 0..2: 0, with nothing written.
     int Search(tag_LocalizerResult* pLastResult, wchar_t* szInput, IME_SEARCH_TYPE eSearchType,
                CFilterChain* pFilterChain, int iReserved, tag_LocalizerResult** ppResult,
                long* pMask, wchar_t* szWordOut);
@@ -90,25 +91,25 @@ public:
     // Change notifications of the provider, after its change is in the database. They wait for
     // the store lock without limit while somebody holds it (one error line per refused attempt),
     // except for a rebuild, which gives up like MemInit; a lock file that cannot be opened is
-    // given up after five attempts. A store that is missing is not created, only built. The changes
-    // of the database, their notifications, SetSortType and MemInit are the business of one process
-    // at a time; any process may search meanwhile.
+    // given up after five attempts. A missing store is built by notifications of contacts and
+    // status, if the database has contacts, and by no other. Only one process at a time changes the
+    // database, sends notifications and calls SetSortType and MemInit; any may search meanwhile.
     //
-    // A change that fails leaves the store marked (capacity 0), and the next notification of
-    // contacts or status then rebuilds it; where the mark cannot be written, this process
-    // remembers to. So it does with a store that a killed process left
-    // unfinished and with a damaged one; the notifications of times and stars repair nothing.
+    // A change that fails leaves the store marked (dirty: capacity 0); if the mark cannot be
+    // written, this process remembers the change. The next notification of contacts or status then
+    // rebuilds the store, as it does with one that a killed process left unfinished or that is
+    // damaged; notifications of times and stars repair nothing.
 
     // Rebuilds the store from the database in the stored order. The pinyin table stays as it is,
     // unless there is no store yet.
     void OnContactsTableChanged();
-    // The iRecordNum contacts of pIds appeared, changed or went. Contacts that appear or go
-    // together are named in one call: the stored count becomes the database's. The array is used
-    // up: ids found in the store are taken out, the last one moving into each gap. The store is
-    // rebuilt instead of patched when its capacity or its mark asks for it, the database cannot
-    // be counted, or the reader cannot list the ids whole (more than 200, more text than it
-    // takes, ids beyond 32 bits). Online bits of patched contacts wait for the next notification
-    // of status. Null pIds or a count of 0 or less: nothing.
+    // The iRecordNum contacts of pIds were added, changed or removed. Contacts that are added or
+    // removed together are named in one call: the stored count becomes the database's. The array
+    // is modified: ids found in the store are removed, the last one moving into each gap. The
+    // store is rebuilt instead of patched when its capacity is too small or it is marked, the
+    // database cannot be counted, or the reader cannot list all ids (more than 200, more text than
+    // it takes, ids beyond 32 bits). Patched contacts have no online bit until the next
+    // notification of status. Null pIds or a count of 0 or less: nothing.
     void OnContactsTableChanged(int iRecordNum, long long* pIds);
     // Who is online changed: sets and clears the bits of all contacts in place. The arguments are
     // not used. When who is online cannot be read, the bits stay.
@@ -122,7 +123,7 @@ public:
     // The stored sort type, read from the file; 0 when there is no store or it is damaged.
     int OnGetSortType();
 
-    // Whether the constructor found memory for its parts.
+    // Whether all allocations of the constructor succeeded.
     QV_INTERNAL bool IsReady() const
     {
         return m_pclMemManger != nullptr && m_pDBOperator != nullptr;

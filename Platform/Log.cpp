@@ -29,7 +29,7 @@ void CLogSink::Set(LogSinkFn pfnSink, void* pContext)
 
 int __android_log_print(int iPriority, const char* szTag, const char* szFormat, ...)
 {
-    // Debug lines stand in hot loops: nothing is formatted for a line that nobody reads.
+    // Debug lines stand in hot loops: a line that is dropped is not formatted.
     if (g_pfnSink == nullptr && iPriority < ERROR_PRIORITY)
     {
         return 0;

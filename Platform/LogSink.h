@@ -10,8 +10,8 @@ using LogSinkFn = void (*)(void* pContext, int iPriority, const char* szTag, con
 class __attribute__((visibility("default"))) CLogSink
 {
 public:
-    // Sends all following lines to pfnSink, which is handed pContext with each; null brings the
-    // default back. Not synchronised: set it while no other thread logs.
+    // Sends all following lines to pfnSink, which gets pContext with each; null restores the
+    // default. Not synchronised: set it while no other thread logs.
     static void Set(LogSinkFn pfnSink, void* pContext);
 };
 

@@ -15,7 +15,7 @@ static_assert(sizeof(wchar_t) == 4, "text is kept in 32-bit units");
 using QVLong32 = std::conditional<sizeof(long) == sizeof(int32_t), long, int32_t>::type;
 static_assert(sizeof(QVLong32) == 4, "ids are 32-bit fields of the record");
 
-// What a record has room for.
+// Sizes of a record's lists and texts.
 constexpr int CONTACT_MAX_GROUPS = 100;
 constexpr int CONTACT_MAX_ACCOUNTS = 20;
 constexpr int CONTACT_MAX_NAME = 30; // characters of szName before its terminator

@@ -1,14 +1,14 @@
 #ifndef QV_CORE_RECORDS_LOCALIZERCODES_H
 #define QV_CORE_RECORDS_LOCALIZERCODES_H
 
-// The code alphabet of names and the record of the pinyin table. One home for both the sorter
-// and the localizer, so that neither needs the other.
+// The codes of names and the record of the pinyin table, apart from the sorter and the localizer,
+// so that neither needs the other.
 
 #include <cstddef>
 #include <cstdint>
 
 // Result codes of the localizer.
-constexpr int LOC_ERR_MAP = -1000;   // the pinyin table cannot be built, opened or asked
+constexpr int LOC_ERR_MAP = -1000;   // the pinyin table cannot be built, opened or searched
 constexpr int LOC_ERR_PARAM = -1005; // a missing argument, or an input that is too long
 
 // Codes: one per character of a name, LOC_NO_CODE ends the array.
@@ -41,7 +41,7 @@ constexpr int PY_RECORD_SIZE = static_cast<int>(sizeof(PYOFWORDS));
 constexpr int PY_FILE_SIZE = PY_WORD_COUNT * PY_RECORD_SIZE;
 static_assert(PY_FILE_SIZE == 709412, "the table is the file");
 
-// Classes of codes. A code is looked at in its low 16 bits.
+// Classes of codes, by the low 16 bits of a code.
 constexpr bool IsGBIndex(uint16_t uIndex)
 {
     return uIndex < PY_WORD_COUNT;
@@ -59,7 +59,7 @@ constexpr bool IsDigitCode(uint16_t uCode)
     return static_cast<uint16_t>(uCode - LOC_DIGIT_BASE) < LOC_DIGIT_COUNT;
 }
 
-// The low 16 bits of a code, which is all that a class or a record index is taken from.
+// The low 16 bits of a code, which alone give its class and its record.
 constexpr uint16_t CodeBits(wchar_t code)
 {
     return static_cast<uint16_t>(code);

@@ -41,7 +41,7 @@ struct tag_LocalizerResult
 static_assert(sizeof(void*) != 4 || sizeof(tag_LocalizerResult) == 8, "part of the interface");
 
 // How well the typed text fits a name; the larger value ranks first.
-constexpr int32_t MATCH_LIST = 0;     // empty input, everybody is listed
+constexpr int32_t MATCH_LIST = 0;     // empty input, every candidate is listed
 constexpr int32_t MATCH_PARTIAL = 1;  // some character took only the beginning of a reading
 constexpr int32_t MATCH_FULL = 2;     // every Chinese character took a whole reading
 constexpr int32_t MATCH_INITIALS = 3; // one typed character per name character

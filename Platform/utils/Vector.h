@@ -13,8 +13,8 @@ namespace android
 {
 
 // Stands in for the platform's vector where there is none: the operations that the library
-// calls, for items that are copied as bytes. Growing never throws: an item that finds no memory
-// is not added and the call says so.
+// calls, for items that are copied as bytes. Growing never throws: if the allocation fails, the
+// item is not added and the call returns an error.
 template <class T>
 class Vector
 {
@@ -37,7 +37,7 @@ public:
     const T& itemAt(size_t uIndex) const { return m_pItems[uIndex]; }
     T& editItemAt(size_t uIndex) { return m_pItems[uIndex]; }
 
-    // Appends an item; its index, or -1 when memory ran out.
+    // Appends an item; its index, or -1 if the allocation fails.
     ssize_t add(const T& item)
     {
         if (m_uCount == m_uCapacity && setCapacity(m_uCapacity * 2 + FIRST_CAPACITY) < 0)
@@ -60,7 +60,7 @@ public:
         return static_cast<ssize_t>(uIndex);
     }
 
-    // Makes room for uCapacity items; the room, or -1 when memory ran out. Never shrinks.
+    // Makes room for uCapacity items; the room, or -1 if the allocation fails. Never shrinks.
     ssize_t setCapacity(size_t uCapacity)
     {
         if (uCapacity > MAX_CAPACITY)
@@ -90,7 +90,7 @@ public:
 
 private:
     static constexpr size_t FIRST_CAPACITY = 4;
-    // No block of memory is larger than what pointers into it can measure.
+    // No block is larger than a difference of pointers can hold.
     static constexpr size_t MAX_CAPACITY = PTRDIFF_MAX / sizeof(T);
 
     T* m_pItems = nullptr;

@@ -9,7 +9,9 @@
 
 #include <algorithm>
 #include <climits>
+#include <sstream>
 #include <string>
+#include <tuple>
 #include <vector>
 
 namespace
@@ -51,11 +53,18 @@ std::string Sorted(const std::string& strValues, Common_Sort_enum eOrder)
     return strPlaces;
 }
 
-tag_ContactsStruct MakeName(const std::wstring& strName, wchar_t code)
+tag_ContactsStruct Name(const std::wstring& strName, wchar_t code)
 {
     tag_ContactsStruct record = {};
-    std::copy_n(strName.begin(), std::min<size_t>(strName.size(), 31), record.szName);
+    strName.copy(record.szName, CONTACT_MAX_NAME + 1);
     record.szLocalizerKey[0] = code;
+    return record;
+}
+
+tag_ContactsStruct Time(int64_t llTime)
+{
+    tag_ContactsStruct record = {};
+    record.llLastTimeContacted = llTime;
     return record;
 }
 
@@ -96,30 +105,32 @@ TEST(CommonQsort, MeetsOneOfTheEqualRecords)
     {
         Records vRecords = MakeRecords(szTimes);
         const int iCount = static_cast<int>(vRecords.size());
-        std::string strFound;
-        std::string strPlaces;
-        std::string strMarked;
-        for (const char cKey : {'0', '1', '2', '3', '4', '5', '6', '7', '8', '9'})
+        std::ostringstream found;
+        std::ostringstream places;
+        std::ostringstream marked;
+        for (const char* szKey : {"0", "1", "2", "3", "4", "5", "6", "7", "8", "9"})
         {
-            Records vKey = MakeRecords({cKey});
+            Records vKey = MakeRecords(szKey);
+            const auto Search = [&](int bPlace, int* pbMarked)
+            {
+                Common_Qsort sorter;
+                return pbMarked == nullptr
+                           ? sorter.Search_Bin(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME,
+                                               bPlace)
+                           : sorter.Search_BinEx(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME,
+                                                 bPlace, pbMarked);
+            };
             int bMarked = 0;
-            Common_Qsort sorter;
-            const int iFound =
-                sorter.Search_Bin(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME, 0);
-            EXPECT_EQ(
-                sorter.Search_BinEx(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME, 0, &bMarked),
-                iFound);
+            const int iFound = Search(0, nullptr);
+            EXPECT_EQ(Search(0, &bMarked), iFound);
             EXPECT_EQ(bMarked, 0);
-            strFound += iFound < 0 ? "-" : std::to_string(iFound);
-            strPlaces += std::to_string(
-                sorter.Search_Bin(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME, 1));
-            strMarked += std::to_string(
-                sorter.Search_BinEx(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME, 1, &bMarked));
-            strMarked += bMarked == 1 ? "!" : "";
+            found << (iFound < 0 ? "-" : std::to_string(iFound));
+            places << Search(1, nullptr);
+            marked << Search(1, &bMarked) << (bMarked == 1 ? "!" : "");
         }
-        EXPECT_EQ(strFound, szFound);
-        EXPECT_EQ(strPlaces, szPlaces) << szTimes;
-        EXPECT_EQ(strMarked, szMarked);
+        EXPECT_EQ(found.str(), szFound);
+        EXPECT_EQ(places.str(), szPlaces) << szTimes;
+        EXPECT_EQ(marked.str(), szMarked);
     }
 }
 
@@ -127,34 +138,34 @@ TEST(CommonQsort, OrdersNamesAndTimes)
 {
     const std::wstring strEmpty(1, NAME_EMPTY_MARK);
     const std::wstring strLong(31, L'a');
-    const struct
-    {
-        tag_ContactsStruct before;
-        tag_ContactsStruct behind;
-    } ROWS[] = {
-        {MakeName(L"a", 0x4F00), MakeName(L"ab", 0x4F00)},
-        {MakeName(strLong.substr(1), 0x4F00), MakeName(strLong, 0x4F00)},
+    const std::tuple<Common_Sort_enum, tag_ContactsStruct, tag_ContactsStruct> ROWS[] = {
+        {SORT_NAME, Name(L"a", 0x4F00), Name(L"ab", 0x4F00)},
+        {SORT_NAME, Name(strLong.substr(1), 0x4F00), Name(strLong, 0x4F00)},
         // A letter goes before a Chinese character under one first letter only.
-        {MakeName(L"az", 0x4F00), MakeName(L"aa", 0x1000)},
-        {MakeName(L"az", 0x4F19), MakeName(L"aa", 0x4C3D)},
-        {MakeName(L"az", 0x1000), MakeName(L"bb", 0x4F00)},
-        {MakeName(L"aa", 0x4C3E), MakeName(L"az", 0x4F00)}, // no Chinese character's code
-        {MakeName(L"aa", 0x1000), MakeName(L"az", 0x4F1A)}, // no letter's code
+        {SORT_NAME, Name(L"az", 0x4F00), Name(L"aa", 0x1000)},
+        {SORT_NAME, Name(L"az", 0x4F19), Name(L"aa", 0x4C3D)},
+        {SORT_NAME, Name(L"az", 0x1000), Name(L"bb", 0x4F00)},
+        {SORT_NAME, Name(L"aa", 0x4C3E), Name(L"az", 0x4F00)}, // no Chinese character's code
+        {SORT_NAME, Name(L"aa", 0x1000), Name(L"az", 0x4F1A)}, // no letter's code
         // Nameless behind all others, then other characters, then digits.
-        {MakeName(L"z", 0x5000), MakeName(strEmpty, 0)},
-        {MakeName(L"z", 0x5A00), MakeName(L"a", 0x5000)},
-        {MakeName(L"z", 0x1000), MakeName(L"a", 0x5A00)},
-        {MakeName(L"z", 0x1000), MakeName(L"a", 0x5A09)},
-        {MakeName(L"a", 0x5A0A), MakeName(L"z", 0x5A0A)},
-        {MakeName(L"z", 0x15000), MakeName(L"a", 0x5000)},
-        {MakeName(L"z", 0x1000), MakeName(L"a", 0x15A00)},
+        {SORT_NAME, Name(L"z", 0x5000), Name(strEmpty, 0)},
+        {SORT_NAME, Name(L"z", 0x5A00), Name(L"a", 0x5000)},
+        {SORT_NAME, Name(L"z", 0x1000), Name(L"a", 0x5A00)},
+        {SORT_NAME, Name(L"z", 0x1000), Name(L"a", 0x5A09)},
+        {SORT_NAME, Name(L"a", 0x5A0A), Name(L"z", 0x5A0A)},
+        {SORT_NAME, Name(L"z", 0x15000), Name(L"a", 0x5000)},
+        {SORT_NAME, Name(L"z", 0x1000), Name(L"a", 0x15A00)},
+        {SORT_TIME, Time(INT64_MAX), Time(1LL << 32)},
+        {SORT_TIME, Time(1LL << 32), Time(1LL << 31)},
+        {SORT_TIME, Time(1), Time(0)},
+        {SORT_TIME, Time(0), Time(-1)},
+        {SORT_TIME, Time(-1), Time(INT64_MIN)},
     };
-    Common_Qsort sorter;
-    sorter.InitInterData(SORT_NAME);
-    for (const auto& row : ROWS)
+    for (const auto& [eOrder, before, behind] : ROWS)
     {
-        SCOPED_TRACE(&row - ROWS);
-        Records vRecords = {row.before, row.behind};
+        Common_Qsort sorter;
+        sorter.InitInterData(eOrder);
+        Records vRecords = {before, behind};
         char* const pBefore = Bytes(vRecords);
         char* const pBehind = pBefore + sizeof(tag_ContactsStruct);
         EXPECT_EQ(sorter.QSORT_GT(pBehind, pBefore), 1);
@@ -164,17 +175,6 @@ TEST(CommonQsort, OrdersNamesAndTimes)
         EXPECT_EQ(sorter.QSORT_EQ(pBefore, pBehind), 0);
         EXPECT_EQ(sorter.QSORT_EQ(pBehind, pBehind), 1);
         EXPECT_EQ(sorter.QSORT_GT(pBehind, pBehind), 0);
-    }
-    const int64_t TIMES[] = {INT64_MAX, 1LL << 32, 1LL << 31, 1, 0, -1, INT64_MIN};
-    Records vRecords(std::size(TIMES), tag_ContactsStruct{});
-    for (size_t i = 0; i < vRecords.size(); ++i)
-    {
-        vRecords[i].llLastTimeContacted = TIMES[6 - i];
-    }
-    sorter.QuickSort(Bytes(vRecords), 7, SORT_TIME);
-    for (size_t i = 0; i < vRecords.size(); ++i)
-    {
-        EXPECT_EQ(vRecords[i].llLastTimeContacted, TIMES[i]);
     }
 }
 

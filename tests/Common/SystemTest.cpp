@@ -24,26 +24,24 @@ namespace
 class Files : public testing::Test
 {
 protected:
-    Files() : m_pathBefore(fs::current_path()) { fs::current_path(m_directory.Root()); }
-    ~Files() override { fs::current_path(m_pathBefore); }
+    Files() { fs::current_path(m_directory.File("")); }
+    ~Files() override { fs::current_path("/"); }
 
     static void Make(const std::string& strName) { CDataDirectory::WriteBytes(strName, strName); }
-    // How many entries the directory has besides the two that every data directory has.
     static long Entries()
     {
-        return std::distance(fs::directory_iterator("."), fs::directory_iterator()) - 2;
+        return std::distance(fs::directory_iterator("."), fs::directory_iterator());
     }
 
 private:
     CDataDirectory m_directory;
-    fs::path m_pathBefore;
 };
 
-template <typename T>
-uint32_t Milliseconds(T time)
+// Milliseconds of the wall clock.
+uint32_t Now()
 {
-    const auto sinceEpoch = std::chrono::duration_cast<std::chrono::milliseconds>(time);
-    return static_cast<uint32_t>(sinceEpoch.count());
+    const auto sinceEpoch = std::chrono::system_clock::now().time_since_epoch();
+    return static_cast<uint32_t>(sinceEpoch / std::chrono::milliseconds(1));
 }
 
 } // namespace
@@ -77,6 +75,8 @@ TEST_F(Files, HaveNamesThatAShellWouldMakeSomethingElseOf)
     EXPECT_EQ(0, Entries());
     EXPECT_EQ(1, _MoveFile(nullptr, "file"));
     EXPECT_EQ(1, _DeleteFile(nullptr));
+    EXPECT_EQ(1, _wc_MoveFile(nullptr, L"file"));
+    EXPECT_EQ(1, _wc_DeleteFile(nullptr));
     wchar_t szPath[5000] = {};
     EXPECT_EQ(0, GetModuleFileName(nullptr, szPath, 4096));
     EXPECT_EQ(Wide(fs::read_symlink("/proc/self/exe").string()), szPath) << "linked into the test";
@@ -117,17 +117,16 @@ TEST(SystemTime, PointsInTimeHaveTheirCalendarForm)
 // Ticks are the low bits of the wall clock; signals do not shorten a pause.
 TEST(SystemTime, TellsTicksAndPauses)
 {
-    using Clock = std::chrono::system_clock;
-    const uint32_t uBefore = Milliseconds(Clock::now().time_since_epoch());
+    const uint32_t uBefore = Now();
     const uint32_t uTicks = static_cast<uint32_t>(GetTickCount());
-    EXPECT_LE(uTicks - uBefore, Milliseconds(Clock::now().time_since_epoch()) - uBefore);
-    const auto pfnPrevious = std::signal(SIGALRM, [](int /*iSignal*/) {});
+    EXPECT_LE(uTicks - uBefore, Now() - uBefore);
+    (void)std::signal(SIGALRM, [](int /*iSignal*/) {});
     const itimerval often = {{0, 500}, {0, 500}};
     const itimerval never = {};
     ASSERT_EQ(0, setitimer(ITIMER_REAL, &often, nullptr));
     const auto start = std::chrono::steady_clock::now();
     Sleep(60);
-    EXPECT_GE(Milliseconds(std::chrono::steady_clock::now() - start), 60U);
+    EXPECT_GE(std::chrono::steady_clock::now() - start, std::chrono::milliseconds(60));
     setitimer(ITIMER_REAL, &never, nullptr);
-    (void)std::signal(SIGALRM, pfnPrevious);
+    (void)std::signal(SIGALRM, SIG_DFL);
 }

@@ -15,22 +15,6 @@ constexpr IME_SEARCH_TYPE WORD = IME_SEARCH_WORD;
 constexpr IME_SEARCH_TYPE NUM = IME_SEARCH_NUM;
 constexpr IME_SEARCH_TYPE SPECIAL = IME_SEARCH_SPECIAL;
 
-constexpr int At(int iFirst, int iLast)
-{
-    return iFirst << 16 | iLast;
-}
-
-// The mask of these letters, '#' standing for all other keys.
-long Keys(const std::string& strKeys)
-{
-    long lMask = 0;
-    for (const char cKey : strKeys)
-    {
-        lMask |= cKey == '#' ? 0x4000000L : 1L << (cKey - 'a');
-    }
-    return lMask;
-}
-
 class CSearchTest : public CFacadeTest
 {
 protected:
@@ -41,56 +25,9 @@ protected:
     }
 };
 
-// Contacts are 1, 2, ... in the order of the names.
-TEST_F(CSearchTest, FindsRanksAndTellsWhatMayFollow)
-{
-    const struct
-    {
-        std::vector<std::string> vNames;
-        const char* szInput;
-        IME_SEARCH_TYPE eType;
-        Ids vIds;
-        std::vector<int32_t> vMatches;
-        const char* szKeys;
-        const char* szWords;
-    } CASES[] = {
-        // Initials, whole readings and their beginnings, on the leftmost character that fits.
-        {{"李张三"}, "zs", WORD, {1}, {At(1, 2)}, "a", "三"},
-        {{"张三"}, "zhangs", WORD, {1}, {At(0, 1)}, "a", "三"},
-        {{"张三"}, "zx", WORD, {}, {}, "", ""},
-        {{"先安", "先"}, "xian", WORD, {2, 1}, {At(0, 0), At(0, 1)}, "a", "先安"},
-        // Every reading of a character counts.
-        {{"长江"}, "c", WORD, {1}, {At(0, 0)}, "hj", "长"},
-        {{"长江"}, "ZHANGJ", WORD, {1}, {At(0, 1)}, "i", "江"},
-        // Letters only one by one; what lies between takes a key of its own.
-        {{"王Li"}, "954", NUM, {1}, {At(0, 2)}, "", ""},
-        {{"张 三"}, "zs", WORD, {}, {}, "", ""},
-        {{"张 三"}, "z#s", WORD, {1}, {At(0, 2)}, "a", "三"},
-        // Initials before beginnings.
-        {{"林", "Lia"}, "li", WORD, {2, 1}, {At(0, 1), At(0, 0)}, "an", "林"},
-        // Chinese characters among letters.
-        {{"张三", "张四"}, "zhang三", WORD, {1}, {At(0, 1)}, "", ""},
-        // Nameless contacts are listed and never found.
-        {{"", "李a", "长 5"}, "", NUM, {3, 2, 1}, {0, 0, 0}, "acz#l", ""},
-        {{""}, "#", WORD, {}, {}, "", ""},
-    };
-    for (const auto& row : CASES)
-    {
-        SCOPED_TRACE(row.vNames[0] + " / " + row.szInput);
-        m_provider.Execute("delete from visible_contacts");
-        BuildNames(row.vNames);
-        const tag_Found found = Search(row.szInput, row.eType);
-        EXPECT_EQ(found.iRet, 0);
-        EXPECT_EQ(found.Contacts(), row.vIds);
-        EXPECT_EQ(found.Column(&tag_LocalizerDetail::iMatchPos), row.vMatches);
-        EXPECT_EQ(found.lMask, Keys(row.szKeys)) << std::hex << found.lMask;
-        EXPECT_EQ(found.strWords, row.szWords);
-    }
-}
-
-// The limits that the README states, each on a name of its own: texts that find it and texts that
-// do not.
-TEST_F(CSearchTest, StaysWithinItsLimits)
+// On a name of its own: texts that find it and, among them the limits that the README states, texts
+// that do not.
+TEST_F(CSearchTest, FindsWithinItsLimits)
 {
     const struct
     {
@@ -101,11 +38,15 @@ TEST_F(CSearchTest, StaysWithinItsLimits)
     } ROWS[] = {
         {"José Álvarez", WORD, {"lvar", "jos###"}, {"lvare", "jose", "josé", "ja"}},
         {"John Smith", NUM, {"5646", "76484"}, {"56467", "5646#7"}},
-        {"张小三", WORD, {"zx", "xs", "zhangxiaos"}, {"zs", "zhangsan"}},
+        {"张小三", WORD, {"zx", "xs", "zhangxiaos", "zhang小"}, {"zs", "zhangsan"}},
+        {"张 三", WORD, {"z#s"}, {"zs"}},
+        {"王Li", NUM, {"954"}, {"9548"}},
         {"吕布", WORD, {"lv", "lvb"}, {"lu"}},
+        {"长江", WORD, {"c", "ZHANGJ"}, {"cg"}},
         {"重庆", WORD, {"chong", "zhong", "cq", "zq"}, {"chong4"}},
         {"㐂久", WORD, {"#j", "j"}, {"㐂", "㐂久", "xj"}},
         {"李四张学友會長", WORD, {"hui", "xy"}, {"会", "會"}},
+        {"", WORD, {""}, {"#"}}, // listed and never found
     };
     for (const auto& row : ROWS)
     {
@@ -119,11 +60,24 @@ TEST_F(CSearchTest, StaysWithinItsLimits)
             EXPECT_EQ(Search(szText, row.eType).Contacts(), Ids{}) << szText << ' ' << row.szName;
         }
     }
-    EXPECT_EQ(Search("zhangsan12").lMask, 0);
+}
+
+TEST_F(CSearchTest, RanksAndTellsWhatMayFollow)
+{
+    BuildNames({"先安", "先", "李", "Lia"});
+    const tag_Found found = Search("xian");
+    EXPECT_EQ(found.Contacts(), (Ids{2, 1})) << "the shorter match first";
+    EXPECT_EQ(found.Column(&tag_LocalizerDetail::iMatchPos), (std::vector<int32_t>{0, 1}));
+    EXPECT_EQ(found.lMask, 1) << "an a";
+    EXPECT_EQ(found.strWords, "先安");
+    const tag_Found all = Search("", NUM);
+    EXPECT_EQ(all.Contacts(), (Ids{4, 3, 2, 1}));
+    EXPECT_EQ(all.lMask, 0x800901) << "a, i, l or x";
     // The caller's text is changed in place.
     const std::string strCode = LocalizerKeyOf("李");
     EXPECT_EQ(Narrow(Search("Z李# 9").strInput), "z" + strCode + "# 9");
-    EXPECT_EQ(Search(strCode + "s").Contacts(), Ids{1}) << "codes stay codes";
+    EXPECT_EQ(Search(strCode).Contacts(), Ids{3}) << "codes stay codes";
+    EXPECT_EQ(Search("ZHANGSAN12").lMask, 0);
     EXPECT_EQ(Search("ZHANGSAN123").iRet, LOC_ERR_PARAM);
     EXPECT_EQ(Search("ZHANGSAN123").strInput, L"zhangsan123");
 }
@@ -152,14 +106,12 @@ TEST_F(CSearchTest, ListsUnderIndexCharacters)
 {
     constexpr long long DAY = 86400000;
     const long long llNow = static_cast<long long>(std::time(nullptr)) * 1000;
-    const std::pair<const char*, long long> NAMES[] = {
-        {"Ann", llNow - 29 * DAY},   {"zoe", llNow - 31 * DAY}, {"长江", llNow - 89 * DAY},
-        {"张三", llNow - 181 * DAY}, {"-x", llNow - 361 * DAY}, {"", 0}};
-    std::vector<tag_ProviderContact> vContacts;
-    for (const auto& [szName, llTime] : NAMES)
+    std::vector<tag_ProviderContact> vContacts = {{1, "Ann"},  {2, "zoe"}, {3, "长江"},
+                                                  {4, "张三"}, {5, "-x"},  {6, ""}};
+    size_t uContact = 0;
+    for (const int iDays : {29, 31, 89, 181, 361})
     {
-        vContacts.push_back({static_cast<int>(vContacts.size()) + 1, szName});
-        vContacts.back().llLastTime = llTime;
+        vContacts[uContact++].llLastTime = llNow - iDays * DAY;
     }
     Store(vContacts);
     ASSERT_EQ(m_logic.MemInit(true), 0);
@@ -179,10 +131,14 @@ TEST_F(CSearchTest, ListsUnderIndexCharacters)
     const tag_Found byTime = Search("");
     EXPECT_EQ(byTime.Contacts(), (Ids{1, 2, 3, 4, 5, 6}));
     EXPECT_EQ(IndexCharacters(byTime), "122455");
+    std::fill(std::begin(iCounts), std::end(iCounts), 0);
+    EXPECT_EQ(m_logic.GetFirstWordInfo(byTime.set.get(), iCounts), 0);
     // A narrowed list keeps its order and takes the characters from the names.
     const tag_Found narrowed = Search("", WORD, byTime.set);
     EXPECT_EQ(narrowed.Contacts(), byTime.Contacts());
     EXPECT_EQ(IndexCharacters(narrowed), "AZCZ##");
+    EXPECT_EQ(m_logic.GetFirstWordInfo(narrowed.set.get(), iCounts), 0);
+    EXPECT_EQ(Ids(iCounts, iCounts + 7), (Ids{1, 2, 0, 1, 2, 6, 0})) << "of both";
     EXPECT_EQ(Search("z").Contacts(), (Ids{3, 2, 4})) << "matches rank by name in any order";
 }
 

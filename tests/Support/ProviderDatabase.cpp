@@ -2,8 +2,6 @@
 
 #include "Common/DataPaths.h"
 
-#include <sqlite3.h>
-
 namespace
 {
 
@@ -47,13 +45,12 @@ void CProviderDatabase::Put(const tag_ProviderContact& contact)
 
 void CProviderDatabase::PutAll(const std::vector<tag_ProviderContact>& vContacts)
 {
-    const bool bOwnTransaction = sqlite3_get_autocommit(Handle()) != 0;
-    Execute(bOwnTransaction ? "begin" : "");
+    Execute("begin");
     for (const tag_ProviderContact& contact : vContacts)
     {
         Put(contact);
     }
-    Execute(bOwnTransaction ? "commit" : "");
+    Execute("commit");
 }
 
 void CProviderDatabase::Remove(int iId)

@@ -38,7 +38,7 @@ public:
     // Inserts the contact, or replaces all its rows. The status row is set or removed too when
     // iStatusId is not 0.
     void Put(const tag_ProviderContact& contact);
-    // All of them in one transaction, or in the caller's when one is open.
+    // All of them in one transaction.
     void PutAll(const std::vector<tag_ProviderContact>& vContacts);
     // Removes the contact from every table but status_updates.
     void Remove(int iId);
@@ -55,7 +55,6 @@ public:
     void Unlock() { Execute("commit"); }
 
     void Execute(const std::string& strSql) { m_database.Execute(strSql.c_str()); }
-    sqlite3* Handle() const { return m_database.Handle(); }
 
 private:
     template <typename... Values>

@@ -47,8 +47,7 @@ bool IsEmptySlot(const tag_ContactsStruct& record)
     return record.iContactID == 0;
 }
 
-// Of each record a few fields are read, too far apart for the processor to see a pattern: it is
-// told ahead where they are.
+// Of each record a few fields are read, too far apart for the hardware prefetcher to see a pattern.
 constexpr int PREFETCH_AHEAD = 12;
 
 void Prefetch(const tag_ContactsStruct& record)
@@ -153,15 +152,15 @@ std::unique_ptr<T[]> NewUnderLock(int iCount)
     return pArray;
 }
 
-// The store as a search holds it while it reads: the lock, the mapping, the number of records.
+// The store while a search reads it: the lock, the mapping, the number of records.
 struct tag_OpenStore
 {
     CStoreLock lock;
     CReadMapping records;
     int iCount = 0;
-    bool bMarked = false; // slots without a contact are no contacts of id 0
+    bool bMarked = false; // then slots of contact id 0 are skipped
 
-    // Maps all stored records; false when there are none to be read.
+    // Maps all stored records; false when there are none or they cannot be mapped.
     bool Open()
     {
         tag_ContactReg reg = {};
@@ -181,10 +180,10 @@ struct tag_OpenStore
     }
 };
 
-// Makes the entries from the records where they lie. That holds the lock no longer than copying
-// the records would: of each a few cache lines are read, and entries are an eighth of them.
-// Room for all is taken, but most of it is never touched.
-// Returns whether the array is dense: what is spare is no more than what is used.
+// Makes the entries straight from the mapping. That holds the lock no longer than copying the
+// records would: of each record a few cache lines are read, and an entry is an eighth of its size.
+// The array has room for all records, but its unused part is never touched.
+// Returns whether the array is dense: at least half of it is used.
 bool SelectFromStore(tag_OpenStore* pStore, CFilterChain& chain, CCandidateFilter* pTest,
                      tag_LocalizerResult* pResult)
 {
@@ -206,7 +205,7 @@ bool SelectFromStore(tag_OpenStore* pStore, CFilterChain& chain, CCandidateFilte
     return counts.iWritten == 0 || counts.iWritten >= pStore->iCount - counts.iWritten;
 }
 
-// Copies the records out, gives the store back and filters the copy.
+// Copies the records, releases the store and filters the copy.
 void CopyFromStore(tag_OpenStore* pStore, CFilterChain& chain, tag_LocalizerResult* pResult)
 {
     const auto pCopy = NewUnderLock<tag_ContactsStruct>(pStore->iCount);

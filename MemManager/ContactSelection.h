@@ -7,35 +7,35 @@
 
 class CFilterChain;
 
-// The two ways from contact records to the entries that a search looks through. Both give the
-// same entries, in the records' order; they differ in what they may do with the records.
+// The two ways from contact records to a search's candidate set. Both give the same entries, in
+// the records' order; they differ in what they may do with the records.
 class CCandidateEntries
 {
 public:
     struct Counts
     {
         int iKept;    // records that pass the filters
-        int iWritten; // those of them that the test does not rule out
+        int iWritten; // those of them that the test accepts
     };
 
     // Writes an entry for each of the iCount records that passes the chain, which has to be one
-    // that CRecordRule::CanTest accepts, and that pTest (may be null) does not rule out. The
-    // records are only read, so they may lie in a mapping; pEntries has room for iCount entries.
-    // With bEmptySlots records of contact id 0 are none: a writer that died left them.
+    // that CRecordRule::CanTest accepts, and that pTest (may be null) accepts. The records are only
+    // read, so they may lie in a mapping; pEntries has room for iCount entries. With bEmptySlots,
+    // records of contact id 0, which a writer that died leaves, are skipped.
     static Counts Select(const tag_ContactsStruct* pRecords, int iCount, bool bEmptySlots,
                          CFilterChain& chain, CCandidateFilter* pTest,
                          tag_LocalizerDetail* pEntries);
 
-    // Takes the records of contact id 0 out of the copy.
+    // Removes the records of contact id 0 from the copy.
     static void DropEmptySlots(tag_ContactsInfo* pCopy);
 
     // Narrows the caller's copy of the records by the pipeline of filter processes and makes the
-    // entries of what is left, in a new array of pResult, which comes in empty. It stays empty
-    // when nothing is left, a process fails or memory runs out.
+    // entries of what is left, in a new array of pResult, which must be empty. It stays empty when
+    // nothing is left, a process fails or an allocation fails.
     static void NarrowCopy(tag_ContactsInfo* pCopy, CFilterChain& chain,
                            tag_LocalizerResult* pResult);
 
-    // The debug line that tells how many records the filters left.
+    // Writes the debug line with the number of records that passed the filters.
     static void LogFilterResult(int iNum);
 };
 
@@ -43,10 +43,10 @@ public:
 class CContactSelection
 {
 public:
-    // As CMemManger::CopyContactsResult, less the contacts that pTest (may be null) rules out.
-    // With a chain whose processes write log lines all survivors of the filters stay in the set.
-    // The set's array may have room for every stored contact; *pbDense tells whether at least
-    // half of it is used, so that it may be handed on as it is.
+    // As CMemManger::CopyContactsResult, without the contacts that pTest (may be null) rejects; a
+    // chain that works on a copy of the records keeps these. The set's array may have room for
+    // every stored contact; *pbDense tells whether at least half of it is used, so that it can be
+    // handed on as it is.
     static void Copy(CFilterChain& chain, CCandidateFilter* pTest, tag_LocalizerResult** ppResult,
                      bool* pbDense);
 };

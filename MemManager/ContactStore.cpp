@@ -106,7 +106,7 @@ int CMemManger::OpenWriteShareMem(tag_ContactsStruct** ppContacts, tag_ContactRe
     {
         return -1;
     }
-    // The mapped capacity counts: a sort type may have been set since. It cannot have grown.
+    // The mapped capacity may be 0 by now, if a sort type was set; it cannot have grown.
     const int iCapacity = std::min(reg.As<tag_ContactReg>()->iMemSize, regFile.iMemSize);
     const size_t uSize = iCapacity > 0 ? StoreBytes(iCapacity) : 0;
     CWriteMapping records;
@@ -132,9 +132,8 @@ void CMemManger::CloseWriteShareMem()
 
 LOCK_RESULT CMemManger::TryLockMemo()
 {
-    // Another attempt while the lock is held would be refused and would lose the handle that
-    // keeps it. A handle that is not the lock any more, because its descriptor was closed by
-    // somebody else, is given up.
+    // Another attempt while the lock is held would be refused and would overwrite the handle that
+    // holds it. A handle whose descriptor somebody else has closed is dropped.
     return CSingleMutex::IsHeld(m_hMemLock) ? LOCK_REFUSED : CSingleMutex::TryLock(&m_hMemLock);
 }
 

@@ -1,10 +1,10 @@
 #ifndef QV_MEMMANAGER_HELDSTORE_H
 #define QV_MEMMANAGER_HELDSTORE_H
 
-// The store as the change handlers hold it: the store lock, which they wait for without limit as
-// long as somebody else holds it, the writer lock, then the write mappings. A lock file that cannot
-// be opened is given up after five attempts. Whatever keeps a change out of the store marks the
-// store, so that the next notification of contacts or status brings the change in.
+// The store as the change handlers hold it: the store lock, then the writer lock, then the write
+// mappings. They wait for the store lock without limit as long as somebody else holds it, and give
+// up after five attempts if its file cannot be opened. If a change cannot be made, the store is
+// marked, so that the next notification of contacts or status makes up for it.
 
 #include "MemManager/Files/MappingGuards.h"
 #include "MemManager/Files/WriterLock.h"
@@ -16,14 +16,14 @@ enum HOLD_RESULT
 {
     HOLD_READY,
     HOLD_NOTHING, // there is no store, or it cannot be changed now and was marked
-    HOLD_REBUILD  // the store has to be rebuilt, with the lock free
+    HOLD_REBUILD  // the caller has to release the lock and rebuild the store
 };
 
-// Marks the store for a change that did not reach it. Without the lock, which is tried like that
-// of a build, a running writer may lift the mark: then the process remembers the change as well.
+// Marks the store for a change that did not reach it. Tries the lock like a build; without it a
+// running writer may lift the mark, so the process remembers the change as well.
 void MarkForLostChange();
 
-// The store during a patch: the lock and the mappings are the manager's.
+// The store during a patch: the manager owns the store lock and the mappings.
 class CHeldStore
 {
 public:
@@ -51,7 +51,7 @@ private:
     int m_iMappedSlots = 0;
 };
 
-// The stored records during a change of one: a lock of its own and a mapping of the used slots.
+// The stored records while one of them changes: owns its lock and a mapping of the used slots.
 class CHeldRecords
 {
 public:
@@ -69,7 +69,7 @@ private:
     bool Open();
 
     CWriterLock m_writer;
-    CStoreLock m_lock; // released behind the mapping
+    CStoreLock m_lock; // released after the mapping
     bool m_bLocked;
     tag_ContactReg m_reg = {};
     CWriteMapping m_records;

@@ -11,8 +11,8 @@ constexpr int STORE_LOCK_ATTEMPTS = 5;
 constexpr std::chrono::milliseconds STORE_LOCK_PAUSE(200);
 constexpr unsigned int STORE_LOCK_RETRY = 2; // milliseconds
 
-// Pauses, as long as the lock cannot be had: a search holds it for a fraction of the pause, and
-// whoever waits for it is not to sleep on when it is free again. True when the lock is held.
+// Retries quietly throughout one pause: a search holds the lock for a fraction of the pause, and a
+// waiter should not sleep on when it is free again. True when the lock was taken.
 inline bool TryDuringPause(CStoreLock* pLock)
 {
     using Clock = std::chrono::steady_clock;
@@ -28,9 +28,9 @@ inline bool TryDuringPause(CStoreLock* pLock)
     return false;
 }
 
-// Tries a few times to take the store lock. After each refusal it pauses, and calls fnRefused with
-// the number of the attempt, counted from 0, when the lock did not become free meanwhile. False
-// when it never did.
+// Tries a few times to take the store lock. After each refusal it pauses as above; if the lock did
+// not become free meanwhile, it calls fnRefused with the number of the attempt, from 0. False when
+// all attempts failed.
 template <typename FnRefused>
 bool TryStoreLock(CStoreLock* pLock, FnRefused fnRefused)
 {
@@ -47,7 +47,7 @@ bool TryStoreLock(CStoreLock* pLock, FnRefused fnRefused)
 
 // Takes the store lock by fnTry, which returns a LOCK_RESULT. Waits without limit while somebody
 // else holds it, with uPause milliseconds and the error line szRefused between attempts; false
-// after STORE_LOCK_ATTEMPTS in which the lock file could not be opened, which waiting may not mend.
+// after STORE_LOCK_ATTEMPTS in which the lock file could not be opened, which waiting may not fix.
 template <typename FnTry>
 bool WaitForStoreLock(FnTry fnTry, unsigned int uPause, const char* szRefused)
 {

@@ -9,7 +9,7 @@
 namespace
 {
 
-constexpr size_t MIN_PREPARED = 65536; // bytes; below, a few faults are cheaper
+constexpr size_t MIN_PREPARED = 65536; // bytes; for fewer, a few page faults are cheaper
 
 constexpr size_t BODY_OFFSET = offsetof(tag_ContactsStruct, lGroupID);
 constexpr size_t BODY_SIZE = sizeof(tag_ContactsStruct) - BODY_OFFSET;
@@ -26,14 +26,14 @@ const char* Body(const tag_ContactsStruct* pRecord)
     return reinterpret_cast<const char*>(pRecord) + BODY_OFFSET;
 }
 
-// The slot stands without a contact before its body changes.
+// Clears the contact id before the body changes.
 void BeginSlot(tag_ContactsStruct* pSlot)
 {
     __atomic_store_n(&pSlot->iContactID, 0, __ATOMIC_RELAXED);
     __atomic_thread_fence(__ATOMIC_RELEASE);
 }
 
-// The contact id appears after its body.
+// Sets the contact id after the body.
 void EndSlot(tag_ContactsStruct* pSlot, int32_t iContactID)
 {
     __atomic_store_n(&pSlot->iContactID, iContactID, __ATOMIC_RELEASE);
@@ -65,8 +65,8 @@ void MoveSlots(tag_ContactsStruct* pSlots, int iFrom, int iTo, int iCount)
         MoveUpward(pSlots, iFrom, iTo, iTo < iFrom ? iCount : 0);
         return;
     }
-    // Each record is read before its slot is written: the last ones go first. As many as the
-    // distance do not touch each other and go upward, in which memory is faster.
+    // Each record is read before its slot is overwritten: the last ones go first. Blocks as long
+    // as the distance do not overlap and are copied upward, which is faster.
     const int iBlock = iTo - iFrom;
     for (int iLeft = iCount; iLeft > 0; iLeft -= iBlock)
     {
@@ -75,8 +75,8 @@ void MoveSlots(tag_ContactsStruct* pSlots, int iFrom, int iTo, int iCount)
     }
 }
 
-// A page that was only read is made writable more slowly than one that is not mapped yet. The
-// first page shows whether the system does it at all.
+// Making a page writable that was only read is slower than mapping it writable, so the pages are
+// dropped first. The first page shows whether the system supports it at all.
 void PrepareSlots(tag_ContactsStruct* pSlots, int iFirst, int iEnd)
 {
 #ifdef MADV_POPULATE_WRITE

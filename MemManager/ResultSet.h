@@ -7,8 +7,8 @@
 #include <memory>
 #include <new>
 
-// A set of iNum entries that are not filled yet; null for want of memory. *pbArrayFailed tells
-// which allocation it was.
+// A set of iNum entries that are not filled yet; null if an allocation fails. *pbArrayFailed tells
+// whether it was the array's.
 inline tag_LocalizerResult* NewSet(int iNum, bool* pbArrayFailed)
 {
     *pbArrayFailed = false;
@@ -51,7 +51,7 @@ public:
         return pResult;
     }
 
-    // Whether a set is there whose array is worth handing on, little of it being spare.
+    // Whether there is a set and at least half of its array is used: worth handing on as it is.
     bool IsDense() const { return m_pResult != nullptr && m_bDense; }
     void SetDense(bool bDense) { m_bDense = bDense; }
 

@@ -22,8 +22,8 @@ size_t EntryBytes(int iNum)
     return static_cast<size_t>(iNum) * sizeof(tag_LocalizerDetail);
 }
 
-// Counts each entry in the counter of its section, iSections of them from iFirst on, or in the
-// one behind them.
+// Counts each entry in the counter of its section, of which there are iSections from iFirst on, or
+// in the counter after them.
 void CountSections(const tag_LocalizerResult& set, int iFirst, int iSections, int* piCounts)
 {
     for (int i = 0; i < set.iResultNum; ++i)

@@ -8,7 +8,7 @@
 namespace
 {
 
-// A record beside those of a plan.
+// A key to compare with the records of a plan.
 class CKeyedPlan
 {
 public:
@@ -39,7 +39,7 @@ CSlotPlan::CSlotPlan(tag_ContactsStruct* pRecords, int iCount, const int* piRemo
 {
 }
 
-// How many of the joining records come to be before the slot.
+// How many of the inserted records will lie before the slot.
 int CSlotPlan::CountBefore(int iSlot) const
 {
     const tag_Inserted* pEnd = m_aInserted + m_iInserted;
@@ -56,7 +56,7 @@ tag_ContactsStruct* CSlotPlan::At(int iSlot) const
     {
         return m_aInserted[iBefore].pRecord;
     }
-    const int iStaying = iSlot - iBefore; // counted among the records that do not leave
+    const int iStaying = iSlot - iBefore; // counted among the records that stay
     const int* pFound = std::upper_bound(m_piRemoved, m_piRemoved + m_iRemoved, iStaying,
                                          [this](int iWanted, const int& iRemoved) {
                                              return iWanted < iRemoved - (&iRemoved - m_piRemoved);
@@ -77,7 +77,7 @@ void CSlotPlan::Insert(tag_ContactsStruct& record)
     record.iSortIndex = iSlot;
 }
 
-// Lists the staying records, first to last, and returns the number of runs.
+// Lists the records that stay as runs, first to last, and returns the number of runs.
 int CSlotPlan::ListRuns(tag_Run* pRuns) const
 {
     int iRuns = 0;
@@ -109,7 +109,7 @@ int CSlotPlan::ListRuns(tag_Run* pRuns) const
     return iRuns;
 }
 
-// Whole stretches that move.
+// Prepares each stretch of consecutive runs that move.
 void CSlotPlan::Prepare(const tag_Run* pRuns, int iRuns) const
 {
     int iEnd = 0;
@@ -128,8 +128,8 @@ void CSlotPlan::Prepare(const tag_Run* pRuns, int iRuns) const
     }
 }
 
-// A record only moves into the slot of one that leaves or moves the same way. So those that move
-// down go first to last and those that move up last to first, and none is lost.
+// A record only moves into the slot of one that is removed or moves in the same direction. So
+// those that move down go first to last and those that move up last to first, and none is lost.
 void CSlotPlan::Apply() const
 {
     tag_Run aRuns[MAX_RUNS];

@@ -4,30 +4,31 @@
 #include "Common/CommonQsort.h"
 #include "Core/Records/ContactRecords.h"
 
-// Where stored records go when some leave and others join them, found out before any is moved:
-// each then moves once, however many leave and join. Everything is as if one after the other had
-// been taken out and put in.
+// Plans where stored records go when some are removed and others inserted, before any is moved:
+// each then moves once, however many changes there are. The result is as if the records had been
+// removed and inserted one after another.
 class CSlotPlan
 {
 public:
-    // How many records can leave, and how many can join: as many as one notification lists.
+    // The most removals, and the most insertions, of a plan: as many as one notification lists.
     static constexpr int MAX_CHANGES = 200;
 
-    // For iCount records in a shared mapping of the store, in the order eOrder, of which those of
-    // iRemoved slots, listed in increasing order, leave. Both have to stay as they are until Apply.
+    // For iCount records in a shared mapping of the store, in the order eOrder. The records of the
+    // iRemoved slots at piRemoved, in increasing order, are removed. Neither array may change
+    // before Apply.
     CSlotPlan(tag_ContactsStruct* pRecords, int iCount, const int* piRemoved, int iRemoved,
               Common_Sort_enum eOrder);
 
-    // Records once the plan is carried out.
+    // The number of records after Apply.
     int Count() const { return m_iCount - m_iRemoved + m_iInserted; }
     bool IsFull() const { return m_iInserted == MAX_CHANGES; }
-    // Finds the slot of a record among those that are there by then, itself the latest, and makes
-    // that slot its iSortIndex. The record has to live until Apply; the plan is not full.
+    // Inserts a record into the plan as it is so far and stores its slot in its iSortIndex. The
+    // record has to live until Apply; the plan must not be full.
     void Insert(tag_ContactsStruct& record);
-    // The record that comes to be in the slot, which is below Count().
+    // The record that will be in the slot, which is below Count().
     tag_ContactsStruct* At(int iSlot) const;
 
-    // Moves the records and stores those that join.
+    // Moves the records and writes the inserted ones.
     void Apply() const;
 
 private:
@@ -42,7 +43,7 @@ private:
         int iTo;
         int iCount;
     };
-    static constexpr int MAX_RUNS = 2 * MAX_CHANGES + 1; // each change ends one
+    static constexpr int MAX_RUNS = 2 * MAX_CHANGES + 1; // each change ends at most one
 
     int CountBefore(int iSlot) const;
     int ListRuns(tag_Run* pRuns) const;

@@ -6,8 +6,8 @@
 
 constexpr int SPECIAL_NUMBER_COUNT = 7; // entries of g_specialNumberRecords
 
-// The fixed entries that a search for special numbers looks through in place of the store: the
-// keys of seven Chinese names, told apart by iContactID 0 to 6.
+// The fixed candidate set of a search for special numbers: the keys of seven Chinese names, whose
+// iContactID is 0 to 6.
 extern QV_EXPORT const tag_LocalizerDetail g_specialNumberRecords[SPECIAL_NUMBER_COUNT];
 
 #endif

@@ -25,8 +25,8 @@ bool TakeLockForBuild(CStoreLock* pLock)
     return bTaken;
 }
 
-// A good store is marked once its file is known to be large enough, so that a full disk changes
-// nothing. A damaged one is marked before that: the larger file could make its record look good.
+// A store that is not damaged is marked after its file is extended, so that a full disk changes
+// nothing. A damaged one is marked before: the larger file could make its record look valid.
 int WriteRecords(const tag_ContactsInfo& info, STORE_STATE eOldState)
 {
     if (eOldState == STORE_DAMAGED && CStoreRegister::MarkFile() != 0)
@@ -47,7 +47,7 @@ int WriteRecords(const tag_ContactsInfo& info, STORE_STATE eOldState)
     return 0;
 }
 
-// The record of a marked store; a new one counts as marked, too.
+// Writes sort type and count of a marked record; a new one, all zero, counts as marked.
 int WriteReg(int iTotalNum, STORE_STATE eOldState, int iSortedBy)
 {
     const CWriteMapping mapping(CDataPaths::ContactReg(), sizeof(tag_ContactReg));
@@ -64,7 +64,7 @@ int WriteReg(int iTotalNum, STORE_STATE eOldState, int iSortedBy)
     return 0;
 }
 
-// Under both locks: everything but lifting the mark. 0 or -1.
+// Everything but lifting the mark, under both locks. 0 or -1.
 int WriteMarked(const tag_ContactsInfo& info, const int* piSortedBy, int* piSortType)
 {
     tag_ContactReg regOld = {};

@@ -61,7 +61,7 @@ int CStorePatch::Match(CChangedIds& ids, tag_ContactsInfo& changed, int* piRemov
     return iRemoved;
 }
 
-// False when the contact is gone or has another name, so that it does not belong here any more.
+// False when the contact is gone or has another name, and so does not belong in this slot.
 bool CStorePatch::Renew(int iSlot, tag_ContactsInfo& changed)
 {
     tag_ContactsStruct& slot = m_pRecords[iSlot];
@@ -103,8 +103,8 @@ PATCH_RESULT CStorePatch::Insert(tag_ContactsInfo& inserted)
     return iInserted < inserted.RecordNum ? PATCH_FULL : PATCH_DONE;
 }
 
-// Carries out as much as one plan holds: the last removals, and when no other is left, the first
-// insertions. Returns the number of these.
+// Applies as much as one plan holds: the last removals and, if none is left, the first insertions.
+// Returns the number of insertions.
 int CStorePatch::InsertSome(tag_ContactsStruct* pRecords, int iNum)
 {
     const int iRemoved = std::min(m_iRemoved, CSlotPlan::MAX_CHANGES);
@@ -127,7 +127,7 @@ void CStorePatch::Cover(int iTotalNum)
     ClearSlots(m_pRecords + m_iCount, std::max(0, iEnd - m_iCount));
     for (int i = 0; m_bMoved && !IsTimeOrder() && i < iEnd; ++i)
     {
-        // Records before the first change have their number: their pages stay clean.
+        // Records before the first change keep their number, so their pages stay clean.
         if (m_pRecords[i].iSortIndex != i)
         {
             m_pRecords[i].iSortIndex = i;

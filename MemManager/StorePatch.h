@@ -1,21 +1,21 @@
 #ifndef QV_MEMMANAGER_STOREPATCH_H
 #define QV_MEMMANAGER_STOREPATCH_H
 
-// Changes to stored records where they lie, under the store lock that the caller holds.
+// Changes to stored records in place, under the store lock that the caller holds.
 
 #include "Core/Records/ContactRecords.h"
 
 #include <cstdint>
 
 // The ids of a notification that have not been found yet. The array stays the caller's and is
-// changed: an id that is taken out is replaced by the last one.
+// modified: the last id replaces one that is removed.
 class CChangedIds
 {
 public:
     CChangedIds(long long* pIds, int iNum);
 
     bool IsEmpty() const { return m_iNum == 0; }
-    // Takes out the first id that equals the contact's; false when there is none.
+    // Removes the first id that equals the contact's; false when there is none.
     bool Take(int iContactID);
 
 private:
@@ -24,8 +24,7 @@ private:
 
     long long* m_pIds;
     int m_iNum;
-    // A bit for the low bits of each id: most contacts of a store are told from the changed ones
-    // without a look at the list.
+    // A bit for the low bits of each id: most contacts are rejected without searching the list.
     uint64_t m_auFilter[FILTER_BITS / WORD_BITS] = {};
 };
 
@@ -33,16 +32,16 @@ enum PATCH_RESULT
 {
     PATCH_DONE,
     PATCH_FAILED, // the store holds what was changed so far
-    PATCH_FULL    // as PATCH_FAILED, for want of capacity
+    PATCH_FULL    // as PATCH_FAILED: the capacity is too small
 };
 
-// The stored records while contacts are renewed, removed and inserted among them. Their number is
-// kept here; the registration record is the caller's business.
+// Renews, removes and inserts contacts among the stored records and counts them; the caller
+// updates the registration record.
 class CStorePatch
 {
 public:
     // iCount records of iCapacity slots in the order of iSortType. pRecords is a shared mapping of
-    // the store, null only without capacity.
+    // the store, null only if iCapacity is 0.
     CStorePatch(tag_ContactsStruct* pRecords, int iCount, int iCapacity, int iSortType);
 
     int Count() const { return m_iCount; }
@@ -53,16 +52,16 @@ public:
     // other contacts found are listed in piRemoved, as long as the list of ids, in increasing
     // order; their number is returned.
     int Match(CChangedIds& ids, tag_ContactsInfo& changed, int* piRemoved);
-    // Notes iNum slots, listed in increasing order, whose records leave the store with the next
-    // Insert. The list has to live until then.
+    // Notes iNum slots, in increasing order, whose records the next Insert removes. The list has to
+    // live until then.
     void Remove(const int* piSlots, int iNum);
-    // Takes out what was noted and puts every record of inserted, whose names are converted, where
-    // it belongs, one after the other, its iSortIndex being its slot at that moment. Without room
-    // for all, the first ones are put in.
+    // Removes what Remove noted and inserts the records, whose names are converted, one after
+    // another in the store's order; iSortIndex becomes the slot that a record has at that moment.
+    // If there is no room for all, the first ones are inserted.
     PATCH_RESULT Insert(tag_ContactsInfo& inserted);
-    // Ends the patch of a store that is to count iTotalNum contacts: clears slots up to there, at
-    // most the capacity, that have no record, and in name order, if records were removed or were
-    // to be inserted, numbers all of them by their slots.
+    // Ends the patch of a store whose count will be iTotalNum: clears the slots without a record up
+    // to that count, at most to the capacity, and in name order, if records were removed or were to
+    // be inserted, numbers all of them by their slots.
     void Cover(int iTotalNum);
 
 private:

@@ -26,7 +26,7 @@ bool IsCount(int32_t iCount)
     return iCount >= 0 && iCount <= STORE_MAX_RECORDS;
 }
 
-// Bytes of a regular file, 0 when there is none, SIZE_UNKNOWN when that cannot be told.
+// Bytes of a regular file, 0 if it is missing, SIZE_UNKNOWN for anything else.
 int64_t FileSize(const char* szPath)
 {
     struct stat info = {};
@@ -39,8 +39,8 @@ int64_t FileSize(const char* szPath)
 
 STORE_STATE Classify(const tag_ContactReg& reg)
 {
-    // Records files never get shorter, so a record read before a writer extended its file passes
-    // all the same.
+    // Records files never get shorter, so a record that was read before a writer extended the file
+    // is still valid.
     const int64_t llFileSize = FileSize(CDataPaths::ContactRecords());
     if (llFileSize == SIZE_UNKNOWN)
     {
@@ -59,7 +59,7 @@ STORE_STATE Classify(const tag_ContactReg& reg)
     return reg.iMemSize == 0 || reg.iMemSize < reg.iTotalNum ? STORE_MARKED : STORE_WHOLE;
 }
 
-// Why the record could not be mapped. No writer leaves a file that ends within the record.
+// Why the record could not be mapped. No writer leaves a file that ends within it.
 STORE_STATE StateWithoutRecord()
 {
     const int64_t llSize = FileSize(CDataPaths::ContactReg());
@@ -83,7 +83,7 @@ void Store(int32_t& iField, int32_t iValue)
     __atomic_store_n(&iField, iValue, __ATOMIC_SEQ_CST);
 }
 
-// A sort type that is set meanwhile shows in the capacity, which is read behind it.
+// Reads the capacity last: if the sort type changes meanwhile, the capacity is 0 by then.
 tag_ContactReg Copy(const tag_ContactReg& mapped)
 {
     tag_ContactReg reg = {};
@@ -98,15 +98,15 @@ int Flush(tag_ContactReg& reg)
     return msync(&reg, sizeof(reg), MS_SYNC);
 }
 
-// Brings the records to the disk; false when that may have failed. A store that was empty from the
-// first has no file.
+// Flushes the records to the disk; false if that may have failed. A store that was always empty has
+// no file.
 bool FlushRecords()
 {
     const CDescriptor file(OpenStoreFile(CDataPaths::ContactRecords(), O_RDWR));
     return file.IsOpen() ? fdatasync(file.Get()) == 0 : errno == ENOENT;
 }
 
-// Puts the capacity back unless the sort type is not, or no longer, the one sorted by.
+// Restores the capacity unless the stored sort type is not, or no longer, iSortedBy.
 LIFT_RESULT SetCapacity(tag_ContactReg& reg, int iCapacity, int iSortedBy)
 {
     if (Load(reg.iSortType) != iSortedBy)
@@ -186,8 +186,8 @@ void CStoreRegister::StoreSortType(int iSortType)
     {
         return;
     }
-    // The mark is set on both sides of the sort type: before it, in case this process dies here,
-    // and after it, in case a writer lifted the mark before it could see the new sort type.
+    // The mark is set before the sort type, in case this process dies here, and after it, in case a
+    // writer lifted the mark before it could see the new sort type.
     auto& reg = *mapping.As<tag_ContactReg>();
     Store(reg.iMemSize, 0);
     Store(reg.iSortType, iSortType);

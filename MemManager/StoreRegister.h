@@ -4,13 +4,13 @@
 // The registration record and its dirty flag: a capacity of 0, called the mark.
 //
 // Protocol of every change to stored records, under the writer lock:
-//   1. Mark, under the store lock too: the capacity becomes 0, on the disk too, before the first
-//      record changes;
+//   1. Mark, under the store lock too: the capacity becomes 0 and is flushed to the disk before
+//      the first record changes;
 //   2. the records change, then the count; the store lock is released;
-//   3. Lift: the records are flushed to the disk, then the capacity is put back.
-// While the disk is waited for, searches find the new index. A writer that fails or dies before 3
-// is done, and a machine that loses power, leave the mark, and the next notification of contacts
-// or status (or MemInit) rebuilds the index.
+//   3. Lift: the records are flushed to the disk, then the capacity is restored.
+// While the writer waits for the disk, searches find the new index. A writer that fails or dies
+// before the end of 3, and a machine that loses power, leave the mark, and the next notification
+// of contacts or status (or MemInit) rebuilds the index.
 
 #include "Core/Records/ContactRecords.h"
 
@@ -28,9 +28,9 @@ constexpr size_t StoreBytes(int iCount)
 enum STORE_STATE
 {
     STORE_MISSING,    // no ContactsReg.bin, or an empty one
-    STORE_UNREADABLE, // there may be a record, but a system call failed: nothing is known of it
+    STORE_UNREADABLE, // there may be a record, but a system call failed to read it
     STORE_DAMAGED,    // counts that no build wrote or that the records file cannot hold
-    STORE_MARKED,     // a change is under way or was never completed, or a rebuild was asked for
+    STORE_MARKED,     // a change is under way or was never completed, or a sort type was set
     STORE_WHOLE
 };
 
@@ -50,27 +50,28 @@ public:
     static bool IsDamaged(const tag_ContactReg& reg, int64_t llFileSize);
 
     // Maps ContactsReg.bin, copies the record into *pReg and unmaps. *pReg is all zero unless the
-    // state is STORE_MARKED or STORE_WHOLE. An error line tells of a file that cannot be mapped, a
-    // missing one included, and of a damaged record. Without the lock the state may be that of a
-    // change under way. Inspect does the same, but a missing file is no error to it.
+    // state is STORE_MARKED or STORE_WHOLE. A file that cannot be mapped, a missing one included,
+    // and a damaged record give an error line. Without the lock the state may be that of a change
+    // under way. Inspect does the same, but writes no error line for a missing or empty file.
     static STORE_STATE Read(tag_ContactReg* pReg);
     static STORE_STATE Inspect(tag_ContactReg* pReg);
     // Whether the states that have a record: marked or whole.
     static bool HasRecord(STORE_STATE eState);
 
-    // Marks the record in the file, if there is one. 0, or -1 when that failed. Under both locks.
+    // Marks the record in the file, if there is one. 0, or -1 when that failed. Under both locks,
+    // or for a lost change without them: then a running writer may lift the mark.
     static int MarkFile();
 
     // Step 3, under the writer lock. iSortedBy is the sort type that the records are sorted by.
     static LIFT_RESULT Lift(int iCapacity, int iSortedBy);
 
-    // Sets the sort type of an existing record and marks it, on the disk too. Needs no lock: a
-    // writer that lifts its mark at the same time notices. Nothing is changed or created in any
-    // other state.
+    // Sets the sort type of an existing record, marks it and flushes both. Needs no lock: a writer
+    // that lifts its mark at the same time notices. Without a valid record nothing is changed or
+    // created.
     static void StoreSortType(int iSortType);
 
-    // A change that neither reached the store nor could be marked there; the process remembers it
-    // until a rebuild succeeds.
+    // Whether a change reached neither the store nor, for certain, its mark; the process remembers
+    // it until a rebuild succeeds.
     static bool IsChangeLost();
     static void SetChangeLost(bool bLost);
 

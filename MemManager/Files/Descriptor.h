@@ -4,7 +4,7 @@
 #include <cerrno>
 #include <unistd.h>
 
-// An open file of its own; closed with the scope, without a change to errno.
+// Owns an open file descriptor and closes it at the end of its scope, without changing errno.
 class CDescriptor
 {
 public:

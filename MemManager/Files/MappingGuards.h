@@ -1,8 +1,8 @@
 #ifndef QV_MEMMANAGER_FILES_MAPPINGGUARDS_H
 #define QV_MEMMANAGER_FILES_MAPPINGGUARDS_H
 
-// Scope guards over the mapping calls and the store lock: what a guard opened or took it closes
-// or releases when it goes out of scope, unless that was done earlier.
+// Scope guards of mappings and of the store lock: a guard closes or releases what it holds when it
+// goes out of scope.
 
 #include "MemManager/Files/ShareMemory.h"
 #include "MemManager/Files/SingleMutex.h"
@@ -66,7 +66,7 @@ public:
         m_uSize = uSize;
         return IsOpen();
     }
-    // Brings what was written to the disk; false when that failed.
+    // Flushes what was written to the disk; false when that failed.
     bool Flush() const { return msync(m_pAddr, m_uSize, MS_SYNC) == 0; }
     // Flushes and unmaps; bSync other than 0 waits for the disk.
     void Close(int bSync = 0)
@@ -94,7 +94,7 @@ private:
     size_t m_uSize = 0;
 };
 
-// The store lock, held through a holder of its own.
+// The store lock with a holder of its own (see CSingleMutex).
 class CStoreLock
 {
 public:
@@ -103,8 +103,8 @@ public:
     CStoreLock(const CStoreLock&) = delete;
     CStoreLock& operator=(const CStoreLock&) = delete;
 
-    // One attempt, without waiting; only called while the lock is not held. The quiet one writes
-    // no log line.
+    // One attempt, without waiting; call only while this object does not hold the lock. The quiet
+    // one writes no log line.
     LOCK_RESULT TryLock() { return CSingleMutex::TryLock(&m_iFd); }
     LOCK_RESULT TryLockQuietly() { return CSingleMutex::TryLockQuietly(&m_iFd); }
     bool IsHeld() const { return m_iFd != 0; }

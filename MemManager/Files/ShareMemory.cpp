@@ -25,8 +25,8 @@ constexpr off_t ZERO_PAGE_SIZE = 4096;
 constexpr char ZERO_PAGE[ZERO_PAGE_SIZE] = {};
 constexpr off_t SMALLEST_BLOCK = 1024; // of the file systems that cannot reserve space
 
-// What became of an open call. pAddr is MAP_FAILED on failure; iFd is then -1 when the file could
-// not be opened, else the number of the descriptor, which is closed by now.
+// The outcome of an open call. pAddr is MAP_FAILED on failure; iFd is then -1 if the file could not
+// be opened, else the number of the descriptor, which is already closed.
 struct tag_OpenOutcome
 {
     void* pAddr;
@@ -39,8 +39,8 @@ const char* PathOrEmpty(const char* szPath)
     return szPath == nullptr ? "" : szPath;
 }
 
-// Writing behind the process's file-size limit would raise a signal that ends the process, also
-// where the file is that long already.
+// A write past the process's file-size limit raises a signal that ends the process, even if the
+// file is already that long.
 bool IsAboveSizeLimit(size_t uSize)
 {
     if (uSize > static_cast<size_t>(std::numeric_limits<off_t>::max()))
@@ -51,13 +51,13 @@ bool IsAboveSizeLimit(size_t uSize)
     return getrlimit(RLIMIT_FSIZE, &limit) == 0 && uSize > limit.rlim_cur;
 }
 
-// Whether a refusal to reserve space means that this system never reserves any.
+// Whether the error means that the system cannot reserve space for this file at all.
 bool CannotReserve(int iError)
 {
     return iError == EOPNOTSUPP || iError == EINVAL || iError == ENOSYS || iError == EPERM;
 }
 
-// Asks the system to give every byte of the range its place on the disk; 0 or errno.
+// Has the system allocate disk space for the first iSize bytes; 0 or errno.
 int ReserveSpace(int iFd, off_t iSize)
 {
 #if defined(__ANDROID__) && __ANDROID_API__ < 21
@@ -75,11 +75,11 @@ int ReserveSpace(int iFd, off_t iSize)
 #endif
 }
 
-// Writes zeros at iFrom, up to the next whole page but not behind iEnd. Returns how many, or -1.
+// Writes zeros at iFrom, up to the next whole page but not past iEnd. Returns how many, or -1.
 ssize_t WriteZeros(int iFd, off_t iFrom, off_t iEnd)
 {
     const off_t iNum = std::min(iEnd - iFrom, ZERO_PAGE_SIZE - iFrom % ZERO_PAGE_SIZE);
-    errno = EIO; // in case that nothing is written without an error
+    errno = EIO; // for a write of 0 bytes, which sets no errno
     const ssize_t iWritten = pwrite(iFd, ZERO_PAGE, static_cast<size_t>(iNum), iFrom);
     return iWritten > 0 ? iWritten : -1;
 }
@@ -99,8 +99,8 @@ int FillWithZeros(int iFd, off_t iFrom, off_t iEnd)
     return 0;
 }
 
-// Gives the holes of the first iEnd bytes their place on the disk; 0 or errno. Not every file
-// system tells its holes, so every block that reads as zeros is written once more.
+// Fills the holes of the first iEnd bytes; 0 or errno. Not every file system reports its holes, so
+// every block that reads as zeros is written again.
 int FillHoles(int iFd, off_t iEnd)
 {
     char acBlock[SMALLEST_BLOCK];
@@ -141,8 +141,8 @@ off_t FileLength(int iFd)
     return fstat(iFd, &info) == 0 ? static_cast<off_t>(info.st_size) : -1;
 }
 
-// Gives back what a failed extension took, also behind the end that the file still has. A file that
-// is as long as it was to become stays: others may use it by now.
+// Frees what a failed extension allocated, also past the end that the file still has. A file that
+// reached its new length keeps it: others may use it already.
 void GiveBack(int iFd, off_t iLength, off_t iSize)
 {
     const off_t iReached = FileLength(iFd);
@@ -152,8 +152,8 @@ void GiveBack(int iFd, off_t iLength, off_t iSize)
     }
 }
 
-// Makes the file at least iSize bytes long, all of them on the disk; 0 or errno. Whoever extends a
-// file locks it, so that nobody gives back what another one has extended meanwhile.
+// Makes the file at least iSize bytes long, with disk space for all of them; 0 or errno. An
+// extension locks the file, so that a failing one does not truncate what another has extended.
 int ReserveFile(int iFd, off_t iSize)
 {
     const off_t iLength = FileLength(iFd);
@@ -207,7 +207,7 @@ void* MapShared(int iFd, size_t uSize, int* piError)
     return pAddr;
 }
 
-// Maps an open file that has to be long enough already.
+// Maps an open file, which has to be long enough.
 void* MapPrivate(int iFd, size_t uSize, int* piError)
 {
     struct stat info = {};

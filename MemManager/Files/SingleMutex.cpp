@@ -17,8 +17,8 @@ namespace
 constexpr mode_t LOCK_FILE_MODE = 0777;
 constexpr int FIRST_FREE_FD = STDERR_FILENO + 1;
 
-// Moves a descriptor above those of the standard streams: 0 means in a holder that nothing is
-// held. -1 when there is none left.
+// Moves a descriptor above those of the standard streams, since a holder of 0 holds nothing. -1 if
+// no descriptor is left.
 int MoveAboveStandard(int iFd)
 {
     if (iFd < 0 || iFd >= FIRST_FREE_FD)
@@ -36,7 +36,7 @@ int OpenLockFile()
         OpenStoreFile(CDataPaths::LockFile(), O_RDWR | O_CREAT, LOCK_FILE_MODE));
 }
 
-// Whether an open file is the lock file, or was until that was deleted.
+// Whether an open file is the lock file, or was before the lock file was deleted.
 bool IsLockFile(const struct stat& opened)
 {
     struct stat named = {};

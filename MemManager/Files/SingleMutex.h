@@ -3,23 +3,23 @@
 
 #include "Common/Export.h"
 
-// What an attempt at the lock came to.
+// The outcome of an attempt to take the lock.
 enum LOCK_RESULT
 {
     LOCK_TAKEN,
-    LOCK_REFUSED,    // somebody else holds it: it will be free again
-    LOCK_UNAVAILABLE // the lock file cannot be opened or locked, which waiting may not mend
+    LOCK_REFUSED,    // another holder has it and will release it
+    LOCK_UNAVAILABLE // the lock file cannot be opened or locked, which waiting may not fix
 };
 
 // The store lock: an exclusive advisory lock on the file memlock.ini. It belongs to one open of
 // that file, so it excludes other threads and other holders of the same process as well as other
-// processes, and it is free again as soon as its process dies. Programs that the process starts
+// processes, and the system releases it when its process dies. Programs that the process starts
 // do not inherit it; a child that was forked without starting a program shares it and keeps it
 // until it dies too.
 //
-// The lock's state lives in an int of the caller, its holder: the open descriptor while the lock
-// is held, 0 while nothing is. Holders start at 0. A descriptor is never 0 here, not even in a
-// process whose standard input is closed.
+// The caller keeps the lock's state in an int, the holder: the open descriptor while the lock is
+// held, else 0. Holders start at 0. The descriptor is never 0, not even in a process whose standard
+// input is closed.
 class QV_EXPORT CSingleMutex
 {
 public:
@@ -30,9 +30,9 @@ public:
     static int Lock(int* pFd);
 
     // Releases the lock: 1, also when nothing was held (*pFd 0); 0 on failure or when pFd is
-    // null. *pFd keeps its value: a caller that keeps the holder sets it to 0, and UnLock is
-    // called once for each Lock that returned 1. A descriptor that was closed by somebody else,
-    // and may be another file by now, is left alone: that is a failure.
+    // null. *pFd keeps its value: a caller that uses the holder again sets it to 0. Call UnLock
+    // once for each Lock that returned 1. It fails without touching a descriptor that somebody
+    // else closed, which may be another file by now.
     static int UnLock(int* pFd);
 
     // As Lock, telling the two failures apart; errno is that of the failing step after
@@ -40,8 +40,8 @@ public:
     QV_INTERNAL static LOCK_RESULT TryLock(int* pFd);
     QV_INTERNAL static LOCK_RESULT TryLockQuietly(int* pFd);
 
-    // Whether a holder's descriptor is still open and still the lock file. False after somebody
-    // closed it, which has released the lock.
+    // Whether a holder's descriptor is still open and still the lock file. False if somebody closed
+    // it, which released the lock.
     QV_INTERNAL static bool IsHeld(int iFd);
 };
 

@@ -11,8 +11,9 @@ import sys
 import tempfile
 import unittest
 
+import transcript
+
 TOOL, PYFILE = map(os.path.abspath, sys.argv[1:3])
-RECORD = "--record" in sys.argv  # what the tool shows, anew, for people to look through
 DONE, FAILED, USAGE, MISSING, PARTLY = range(5)
 SKIPPED = 77
 
@@ -57,25 +58,7 @@ class ToolCase(unittest.TestCase):
         return process
 
     def check_transcript(self, path):
-        """The calls of the file, behind dollar signs, print in a shell what stands below them: the
-        standard output, the error output behind exclamation marks, and an exit code that is not 0.
-        """
-        recorded, printed = path.read_text(encoding="utf-8"), ""
-        for line in re.findall(r"(?m)^\$ (.*)$", recorded):
-            process = subprocess.run(["bash", "-c", SHELL + line], cwd=self.root, check=False,
-                                     capture_output=True, encoding="utf-8",
-                                     env={**os.environ, "TOOL": TOOL, "PYFILE": PYFILE,
-                                          "TZ": "UTC", "LC_ALL": "C.UTF-8"})
-            errors = re.sub("(?m)^(?=.)", "! ", process.stderr)
-            code = f"exit code {process.returncode}\n" if process.returncode else ""
-            printed += f"$ {line}\n{process.stdout}{errors}{code}"
-        for varying, shown in ((re.escape(str(self.root)), "ROOT"), (r" +\d+ ms\n", " (time)\n"),
-                               (r"hFile=\d+", "hFile=N")):
-            printed = re.sub(varying, shown, printed)
-        if RECORD:
-            path.write_text(printed, encoding="utf-8")
-        else:
-            self.assertEqual(recorded, printed)
+        transcript.check(self, path, self.root, SHELL, TOOL=TOOL, PYFILE=PYFILE)
 
     def refused(self, code, text, *call, **options):
         """The error output, which holds the text, of a call that prints nothing else."""

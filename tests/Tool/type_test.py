@@ -17,7 +17,8 @@ import time
 sys.path.insert(0, str(pathlib.Path(__file__).parents[1] / "Support"))
 # pylint: disable=wrong-import-position
 import tool_case
-from tool_case import PYFILE, RECORD, SKIPPED, TOOL, USAGE, ToolCase
+from tool_case import PYFILE, SKIPPED, TOOL, USAGE, ToolCase
+from transcript import RECORD
 
 SCREENS = pathlib.Path(__file__).parent / "screens"
 SIZES = [(40, 12), (80, 24), (132, 43)]

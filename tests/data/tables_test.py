@@ -4,8 +4,6 @@ build them; and what those programs derive and refuse.
 tables_test.py PYFILE TestClass...
 """
 import bz2
-import contextlib
-import io
 import pathlib
 import re
 import sys
@@ -13,15 +11,15 @@ import tempfile
 import unittest
 
 ROOT = pathlib.Path(__file__).resolve().parents[2]
-sys.path.insert(0, str(ROOT / "data" / "derive"))
+sys.path[:0] = [str(ROOT / "data/derive"), str(ROOT / "tests/Support")]
 # pylint: disable=wrong-import-position
 import derive_folding
 import derive_pinyin
-import make_tables
+import transcript
 import unihan
 from syllables import SYLLABLES
 
-PYFILE = pathlib.Path(sys.argv[1])
+PYFILE = pathlib.Path(sys.argv[1]).resolve()
 UNIHAN = pathlib.Path("/usr/share/unicode")
 SKIPPED = 77
 RECORD_SIZE = 46
@@ -141,34 +139,12 @@ class DerivationTest(unittest.TestCase):
 class MakeTablesTest(unittest.TestCase):
     """make_tables.py names what is wrong with a table, writes nothing and ends with 1."""
 
-    FAULTS = [  # a kind of table, what becomes what in one that is right, and what is said of it
-        ("pyfile", "", "", ""),
-        ("folding", "", "", ""),
-        ("pyfile", "丁\ta\n", "", "expected 15422 characters, found 15421"),
-        ("pyfile", "丁\ta\n", "丂\ta\n", "丂 does not follow 丂"),
-        ("pyfile", "丁\ta\n", "丁\tv\n", ":2: 'v' is no syllable"),
-        ("pyfile", "丁\ta\n", "丁\ta a\n", "a reading stands twice"),
-        ("pyfile", "丁\ta\n", "\n", "expected two columns, found 1"),
-        ("pyfile", "丁\ta\n", "é\ta\n", "is not one character of U+4E00"),
-        ("pyfile", "LAST\ta\n", "LAST\ta", "the last line has no line end"),
-        ("folding", "丁\t丁\n", "", "expected 3755 rows, found 3754"),
-        ("folding", "丁\t丁\n", "丁丁\t丁\n", ":2: '丁丁' is not one character"),
-    ]
-
     def test_faults(self):
-        for kind, right, wrong, message in self.FAULTS:
-            count = {"pyfile": 15422, "folding": 3755}[kind]
-            chars = [chr(0x4E00 + index) for index in range(count)]
-            text = "".join(f"{char}\t{'a' if kind == 'pyfile' else char}\n" for char in chars)
-            text = text.replace(right.replace("LAST", chars[-1]), wrong.replace("LAST", chars[-1]))
-            with tempfile.TemporaryDirectory() as directory:
-                table, output = pathlib.Path(directory, "table"), pathlib.Path(directory, "output")
-                table.write_text(text, encoding="utf-8")
-                with contextlib.redirect_stderr(io.StringIO()) as errors:
-                    result = make_tables.main([kind, str(table), str(output)])
-                self.assertEqual((1, False) if message else (0, True), (result, output.exists()))
-            self.assertIn(message, errors.getvalue())
-            self.assertEqual(message == "", errors.getvalue() == "")
+        call = f'"{sys.executable}" -B "$DATA/derive/make_tables.py" "$@"'
+        with tempfile.TemporaryDirectory() as directory:
+            transcript.check(self, pathlib.Path(__file__).with_name("make_tables.txt"), directory,
+                             f"make_tables() {{ {call}; }}\n", DATA=str(ROOT / "data"),
+                             PYFILE=str(PYFILE))
 
 
 def unihan_versions():
@@ -182,4 +158,5 @@ if __name__ == "__main__":
     if "DerivationTest" in sys.argv and set(unihan_versions()) != {recorded}:
         print(f"skipped: {UNIHAN} has no Unihan {recorded}, from which the tables were derived")
         sys.exit(SKIPPED)
-    unittest.main(argv=[sys.argv[0], *sys.argv[2:]], verbosity=2)
+    names = [name for name in sys.argv[2:] if name != "--record"]
+    unittest.main(argv=[sys.argv[0], *names], verbosity=2)

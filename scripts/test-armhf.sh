@@ -88,9 +88,6 @@ if [ "$(cat "$root/contents" 2>/dev/null)" != "${armhf_packages[*]}" ]; then
     make_root
 fi
 
-# The files of both builds are compared.
-scripts/configure.sh
-cmake --build --preset release --target qvlocalize
 cmake --preset armhf
 cmake --build --preset armhf
 ctest --preset armhf --parallel "$(nproc)" "$@"

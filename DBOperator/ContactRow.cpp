@@ -36,13 +36,13 @@ constexpr int TEXT_BUFFER = 100;
 static_assert(NAME_LAST_BYTE + 1 < TEXT_BUFFER && KEY_LAST_BYTE + 1 < TEXT_BUFFER,
               "a byte gives one unit at most, and a terminator follows");
 
-// A flag column holds 0 or 1; what else it may hold spreads over the bits above.
+// A flag column holds 0 or 1; any other value also sets bits above the flag.
 uint32_t FlagBits(const CSqlStatement& clRow, int iColumn, uint32_t uFlag)
 {
     return static_cast<uint32_t>(clRow.Int(iColumn)) * uFlag;
 }
 
-// Text that is not valid to its end keeps what stands before the fault.
+// Of text that is not valid UTF-8, the part before the fault is kept.
 void CopyText(const CSqlStatement& clRow, int iColumn, int iLastByte, wchar_t* pField,
               int iMaxUnits)
 {

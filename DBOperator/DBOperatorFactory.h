@@ -3,7 +3,7 @@
 
 #include "DBOperator/DBOperator.h"
 
-// Kinds of operators; any other value may come in as well.
+// Kinds of operators; callers may pass any other value.
 enum DB_OPERATOR_TYPE : int
 {
     DB_OPERATOR_SQLITE = 0
@@ -13,8 +13,8 @@ enum DB_OPERATOR_TYPE : int
 class QV_EXPORT CDBOperatorFactory
 {
 public:
-    // A new operator, which the caller deletes; null for an unknown kind or without memory.
-    // Nothing is opened yet.
+    // A new operator, which the caller deletes; null for an unknown kind or if the allocation
+    // fails. Nothing is opened yet.
     static CDBOperator* CreateDBOperator(DB_OPERATOR_TYPE eType);
 };
 

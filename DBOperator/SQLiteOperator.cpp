@@ -61,7 +61,7 @@ private:
     char m_szText[LIST_STATEMENT_SIZE];
 };
 
-// What a count writes when something is in its way; SQLite's result follows the error texts.
+// The log lines of a count that is busy or fails; SQLite's result follows the error texts.
 struct tag_CountLines
 {
     const char* szBusy;
@@ -97,7 +97,7 @@ constexpr tag_CountLines GET_COUNT_LINES = {
     " QV_Contacts>>QV_ContactsLocalize_SO>> select contacts count ERROR result=",
     " QV_Contacts>>QV_ContactsLocalize_SO>> sqlite3_step error result="};
 
-// The number that the query gives; iCount keeps its value on failure.
+// Stores the number that the query returns in iCount, which keeps its value on failure.
 int QueryCount(sqlite3* pDB, const char* szSql, const tag_CountLines& lines, int& iCount)
 {
     CSqlStatement clRow(pDB);
@@ -130,8 +130,8 @@ int AllocateRecords(tag_ContactsInfo* pRecord)
     return -1;
 }
 
-// One record per row. Rows that came since the count find no record; records without a row,
-// because contacts went since the count, stay zero and find no name row later.
+// One record per row. Rows that were added since the count are dropped; if rows were removed since
+// the count, the last records stay zero and MergeLocalizer will not complete them.
 void FillContacts(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
 {
     int iFilled = 0;
@@ -152,8 +152,8 @@ void FillContacts(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
     }
 }
 
-// Completes the records, in order, from the rows that belong to them; rows of other contacts are
-// passed over. Returns the number of records completed.
+// Completes the records, in order, from their rows; rows of other contacts are skipped. Returns the
+// number of records completed.
 int MergeLocalizer(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
 {
     int iIndex = 0;
@@ -191,7 +191,7 @@ void ClearOnline(tag_ContactsInfo* pRecord)
     }
 }
 
-// Marks the contacts of the current row and of all rows behind it.
+// Marks the contacts of the current row and of all following rows.
 void MarkOnline(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
 {
     const CStatusIndex clIndex(pRecord->pContacts, RecordCount(pRecord));
@@ -410,7 +410,7 @@ int CSQLiteOperator::ReadLocalizer(const CSqlIdList& clIds, tag_ContactsInfo* pR
     return 0;
 }
 
-// A contact without a row is none; its name row may still be there.
+// A contact without a row is not found here, but may still have a name row.
 int CSQLiteOperator::ReadContactRow(int iContactID, tag_ContactsStruct* pContact, int& iFound)
 {
     char szSql[ID_STATEMENT_SIZE];

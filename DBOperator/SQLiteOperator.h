@@ -8,15 +8,16 @@ class CSqlIdList;
 
 // Reads the provider's database file, CDataPaths::Database(), and never writes to it.
 //
-// The connection opens with the first operation and stays open until close(), the destructor, or
-// the end of ReadAllLocalizer's last query or of ReadContactsByID; an operation that fails before
-// that leaves it open. A database that a writer keeps busy is tried again: the counts and the
-// online query four times 100 ms apart, the record queries of ReadAllLocalizer without limit.
+// The first operation opens the connection, which stays open until close(), the destructor, or the
+// end of ReadAllLocalizer's last query or of ReadContactsByID; an operation that fails before that
+// leaves it open. If a writer keeps the database busy, the queries are prepared again: the counts
+// and the online query four times in all, 100 ms apart, the record queries of ReadAllLocalizer
+// without limit. A count's step is retried three times, 20 ms apart.
 //
-// The two record queries carry no order of their own and are merged in one pass: the rows of
-// `localizer` must come in the order of `contacts`, which integer primary keys bring about.
-// ReadAllLocalizer is -1 when a visible contact finds no name row in that pass; names and keys
-// that are not valid UTF-8 keep what was decoded before the fault.
+// The two record queries have no ORDER BY and are merged in one pass: the rows of `localizer` must
+// come in the order of `contacts`, as they do with integer primary keys. ReadAllLocalizer returns
+// -1 if a visible contact has no name row in that pass; of names and keys that are not valid UTF-8
+// the part before the fault is kept.
 //
 // Lines go to the tag "QV_ContactsLocalize_SO": progress at debug priority; failures, and waits for
 // a busy database, at error priority. Only the wait of ReadAllSmsOnlineStatus is a debug line.
@@ -28,8 +29,8 @@ public:
     CSQLiteOperator(const CSQLiteOperator&) = delete;
     CSQLiteOperator& operator=(const CSQLiteOperator&) = delete;
 
-    // 0, also when the connection is open already; -1 with one line when the file is missing (it
-    // is not created) or cannot be opened. Whether it is a database shows in the first query.
+    // 0, also if the connection is already open; -1 with one line if the file is missing (it is not
+    // created) or cannot be opened. A file that is no database fails with the first query.
     int open();
     void close();
 
@@ -38,10 +39,12 @@ public:
     int ReadContactsByID(int iContactID, tag_ContactsStruct* pContact, int& iFound) override;
     int ReadAllSmsOnlineStatus(tag_ContactsInfo* pRecord, long lCount, long long* pIds) override;
 
-    // Stores the ids of a list like "3.12.40" in pIds, at most iMax, and leaves the elements
-    // behind them alone. An empty place between dots is a 0; a character that is neither digit
-    // nor dot ends the list and drops the number before it; too large a number wraps at 32 bits.
-    // Nothing happens for a null argument or an empty text.
+    // --- For callers outside: nothing in the library calls this, nor ReadContactsByID ---
+
+    // Stores the ids of a list like "3.12.40" in pIds, at most iMax, and leaves the elements after
+    // them alone. An empty place between dots is a 0; a character that is neither digit nor dot
+    // ends the list and drops the number before it; numbers wrap at 32 bits. Does nothing for a
+    // null argument or an empty text.
     void ParseIDString(const char* szText, QVLong32* pIds, int iMax);
 
 private:

@@ -11,7 +11,7 @@
 class CStatusIndex
 {
 public:
-    // Sorts the ids of iCount records. If the allocation fails, every First walks the records.
+    // Sorts the ids of iCount records. If the allocation fails, every First scans the records.
     CStatusIndex(tag_ContactsStruct* pContacts, int iCount);
 
     // The first record, in array order, whose iStatusUpdateID is the id; null when there is none.

@@ -9,7 +9,7 @@ namespace
 
 constexpr const char* TRACE_TAG = "Filter/AccountExpandFilterProcess";
 
-// The chain itself is searched: it is as short as a list of its ids, and needs no memory.
+// Searches the chain itself: it is as short as a list of its ids and needs no allocation.
 bool IsExcluded(QVLong32 lAccountID, CFilterChain& chain)
 {
     for (int k = 0; k < chain.GetFilterNum(); ++k)

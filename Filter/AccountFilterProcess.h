@@ -13,11 +13,13 @@ public:
     QV_INTERNAL static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
                                   CFilterChain& chain);
 
-    // 1 when iID stands among the iNum accounts at plList, else 0. The list ends at its first 0,
-    // which is itself compared: id 0 matches every list that has a 0. The list is only read.
-    int IsSameAccount(int iID, QVLong32* plList, int iNum);
-
     int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
+
+    // --- For callers outside: nothing in the library calls this ---
+
+    // 1 if iID is among the iNum accounts at plList, else 0. The list ends at its first 0, which is
+    // compared too: id 0 matches every list that has a 0. The list is only read.
+    int IsSameAccount(int iID, QVLong32* plList, int iNum);
 };
 
 #endif

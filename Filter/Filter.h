@@ -5,7 +5,7 @@
 
 #include "Common/Export.h"
 
-// Kinds of filter. 3 and 4 belong to no filter.
+// Kinds of filter. 3 and 4 are unused.
 constexpr int FILTER_GROUP = 0;              // members of a group
 constexpr int FILTER_ACCOUNT = 1;            // contacts with data in an account
 constexpr int FILTER_PHONE = 2;              // contacts with a phone number
@@ -17,9 +17,9 @@ constexpr int FILTER_ACCOUNT_EXPAND = 9;     // contacts not confined to the exc
 constexpr int FILTER_CONTACT_ID_EXPAND = 10; // all contacts but one
 constexpr int FILTER_ONLINE = 11;            // contacts that are online
 
-// Describes one condition on contacts; the filter processes apply it. A filter with one of the
-// kinds above must be of that kind's class, for the processes read its id through that class.
-// Filters of any other kind are ignored.
+// Describes one condition on contacts; the filter processes apply it. A filter of one of the kinds
+// above must be of that kind's class, because the processes read its id through that class. Filters
+// of any other kind are ignored.
 class QV_EXPORT CFilter
 {
 public:
@@ -38,9 +38,9 @@ static_assert(sizeof(void*) != 4 || sizeof(CFilter) == 8, "part of the interface
 class QV_EXPORT CGroupFilter : public CFilter
 {
 public:
-    // The group that the filter is about, by its id.
+    // Of the group with this id.
     explicit CGroupFilter(int iGroupID);
-    int GetGroupID();
+    int GetGroupID(); // for callers outside: nothing in the library calls this
     int32_t m_iID;
 };
 static_assert(sizeof(void*) != 4 || sizeof(CGroupFilter) == 12, "part of the interface");
@@ -49,9 +49,9 @@ static_assert(sizeof(void*) != 4 || sizeof(CGroupFilter) == 12, "part of the int
 class QV_EXPORT CGroupExpandFilter : public CFilter
 {
 public:
-    // The group that the filter is about, by its id.
+    // Of the group with this id.
     explicit CGroupExpandFilter(int iGroupID);
-    int GetGroupID();
+    int GetGroupID(); // for callers outside: nothing in the library calls this
     int32_t m_iID;
 };
 
@@ -59,19 +59,19 @@ public:
 class QV_EXPORT CAccountFilter : public CFilter
 {
 public:
-    // The account that the filter is about, by its id.
+    // Of the account with this id.
     explicit CAccountFilter(int iAccountID);
-    int GetAccountID();
+    int GetAccountID(); // for callers outside: nothing in the library calls this
     int32_t m_iID;
 };
 
-// All filters of this kind in a chain name the excluded accounts together.
+// Excludes an account: removes the contacts all of whose accounts the chain's filters exclude.
 class QV_EXPORT CAccountExpandFilter : public CFilter
 {
 public:
-    // The account that the filter is about, by its id.
+    // Of the account with this id.
     explicit CAccountExpandFilter(int iAccountID);
-    int GetAccountID();
+    int GetAccountID(); // for callers outside: nothing in the library calls this
     int32_t m_iID;
 };
 
@@ -79,9 +79,9 @@ public:
 class QV_EXPORT CContactIdExpandFilter : public CFilter
 {
 public:
-    // The contact that the filter is about, by its id.
+    // Of the contact with this id.
     explicit CContactIdExpandFilter(int iContactID);
-    int GetContactID();
+    int GetContactID(); // for callers outside: nothing in the library calls this
     int32_t m_iID;
 };
 
@@ -89,35 +89,35 @@ public:
 class QV_EXPORT CPhoneFilter : public CFilter
 {
 public:
-    CPhoneFilter(); // of that kind
+    CPhoneFilter(); // of kind FILTER_PHONE
 };
 
 // Keeps the contacts with a mail address.
 class QV_EXPORT CMailFilter : public CFilter
 {
 public:
-    CMailFilter(); // of that kind
+    CMailFilter(); // of kind FILTER_MAIL
 };
 
 // Keeps the starred contacts.
 class QV_EXPORT CFavouritesFilter : public CFilter
 {
 public:
-    CFavouritesFilter(); // of that kind
+    CFavouritesFilter(); // of kind FILTER_FAVOURITES
 };
 
 // Keeps the contacts with a postal address.
 class QV_EXPORT CPostalFilter : public CFilter
 {
 public:
-    CPostalFilter(); // of that kind
+    CPostalFilter(); // of kind FILTER_POSTAL
 };
 
 // Keeps the contacts that are online.
 class QV_EXPORT OnlineFilter : public CFilter
 {
 public:
-    OnlineFilter(); // of that kind
+    OnlineFilter(); // of kind FILTER_ONLINE
 };
 
 #endif

@@ -28,7 +28,7 @@ int CFilterChain::GetFilterNum()
 
 CFilter* CFilterChain::GetFilterByNo(int iNo)
 {
-    // As an unsigned number a negative index lies behind every place.
+    // As an unsigned number a negative index is above every valid one.
     const size_t uIndex = static_cast<unsigned int>(iNo);
     return uIndex < m_vFilters.size() ? m_vFilters[uIndex] : nullptr;
 }

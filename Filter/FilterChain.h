@@ -16,15 +16,15 @@ public:
     CFilterChain(const CFilterChain&) = delete;
     CFilterChain& operator=(const CFilterChain&) = delete;
 
-    // Appends the filter and owns it from then on, also when memory runs out: then the filter is
-    // deleted and GetFilterNum stays as it was. A null filter takes a place and is ignored.
+    // Appends the filter and takes ownership. If the allocation fails, the filter is deleted and
+    // GetFilterNum stays as it was. A null filter is appended too and is ignored.
     void SetFilter(CFilter* pFilter);
 
-    // The number of places, null filters included.
+    // The number of filters, null ones included.
     int GetFilterNum();
 
-    // The filter at iNo, from 0 in the order of appending, still owned by the chain; null when
-    // there is no such place.
+    // The filter at iNo, from 0 in the order of appending, still owned by the chain; null if iNo is
+    // out of range.
     CFilter* GetFilterByNo(int iNo);
 
 private:

@@ -9,7 +9,7 @@
 namespace
 {
 
-// Appends pFilter; false when there was no memory for it or for its place in the chain.
+// Appends pFilter; false if its allocation failed (null) or that of its place in the chain fails.
 bool Append(CFilterChain& chain, CFilter* pFilter)
 {
     if (pFilter == nullptr)

@@ -3,8 +3,7 @@
 
 #include "Filter/FilterProcess.h"
 
-// What there is for one kind of filter. The makers return objects of the caller's, null when the
-// allocation fails.
+// One kind of filter. The makers return objects that the caller owns, null if the allocation fails.
 struct tag_FilterKind
 {
     int iKind;

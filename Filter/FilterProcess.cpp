@@ -5,7 +5,7 @@
 namespace
 {
 
-// Moves the kept records to the front; their number.
+// Moves the kept records to the front and returns their number.
 int MoveKept(const tag_ContactsInfo& info, const CFilter& filter, CFilterChain& chain,
              RecordRuleFn pfnKeeps)
 {
@@ -30,7 +30,7 @@ int MoveKept(const tag_ContactsInfo& info, const CFilter& filter, CFilterChain& 
 
 FilterProcess::~FilterProcess()
 {
-    // Each process is cut from the pipeline before it goes, so that none deletes the rest.
+    // Each process is unlinked before it is deleted, so that none deletes the rest.
     while (m_pNext != nullptr)
     {
         FilterProcess* pGone = m_pNext;

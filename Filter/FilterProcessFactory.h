@@ -11,8 +11,8 @@ class QV_EXPORT FilterProcessFactory
 public:
     // The pipeline of all ten processes: account, account expand, group, group expand, phone,
     // mail, favourites, postal, contact id expand, online. Returns its first process, whose
-    // deletion deletes them all; null, with nothing kept, when one of them finds no memory, for a
-    // shorter pipeline would let through what the missing filter excludes.
+    // deletion deletes them all; null if an allocation fails, since a shorter pipeline would let
+    // through what the missing process excludes.
     static FilterProcess* CreateFilterProcess();
 };
 

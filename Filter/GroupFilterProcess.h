@@ -4,7 +4,7 @@
 #include "Filter/Filter.h"
 #include "Filter/FilterProcess.h"
 
-// Keeps the members of the filter's group; group SECRET_GROUP_ID has the secret contacts.
+// Keeps the members of the filter's group; the secret contacts are members of SECRET_GROUP_ID.
 class QV_EXPORT GroupFilterProcess : public FilterProcess
 {
 public:
@@ -13,11 +13,13 @@ public:
     QV_INTERNAL static bool Keeps(const tag_ContactsStruct& record, const CFilter& filter,
                                   CFilterChain& chain);
 
-    // 1 when iID stands among the iNum groups at plList, else 0. The list ends at its first 0,
-    // which is itself compared: id 0 matches every list that has a 0. The list is only read.
-    int IsSameGroup(int iID, QVLong32* plList, int iNum);
-
     int FilterRecord(tag_ContactsInfo* pInfo, CFilterChain& chain) override;
+
+    // --- For callers outside: nothing in the library calls this ---
+
+    // 1 if iID is among the iNum groups at plList, else 0. The list ends at its first 0, which is
+    // compared too: id 0 matches every list that has a 0. The list is only read.
+    int IsSameGroup(int iID, QVLong32* plList, int iNum);
 };
 
 #endif

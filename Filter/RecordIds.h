@@ -3,11 +3,11 @@
 
 #include "Core/Records/ContactRecords.h"
 
-// The id lists of contact records: iNum elements, ending early at the first 0. A list that a
-// damaged record leaves without a 0 is never read beyond iNum. A null list is empty.
+// The id lists of contact records: at most iNum ids, ending at the first 0. A damaged record's list
+// without a 0 is not read beyond iNum. A null list is empty.
 
-// Whether iID stands in the list. Each element is compared before it can end the list, so 0
-// stands in every list that ends at a 0.
+// Whether iID is in the list. Each element is compared before it can end the list, so 0 is in every
+// list that ends at a 0.
 inline bool IsInIdList(int iID, const QVLong32* plList, int iNum)
 {
     for (int i = 0; plList != nullptr && i < iNum; ++i)
@@ -24,7 +24,7 @@ inline bool IsInIdList(int iID, const QVLong32* plList, int iNum)
     return false;
 }
 
-// How many ids stand before the list's end.
+// How many ids the list has.
 inline int CountIds(const QVLong32* plList, int iNum)
 {
     int iCount = 0;

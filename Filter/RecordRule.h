@@ -5,18 +5,17 @@
 
 class CFilterChain;
 
-// Decides on one record at a time what the pipeline of filter processes decides on a set, with
-// the processes' own rules; nothing is copied or allocated, so records can be tested where they
-// lie in a mapped file, damaged ones too. The chain must outlive the object.
+// Applies a chain of filters to one record at a time, with the rules of the filter processes.
+// Nothing is copied or allocated, so records can be tested in a mapped file, damaged ones too. The
+// chain must outlive the object.
 class CRecordRule
 {
 public:
     explicit CRecordRule(CFilterChain& chain) : m_chain(chain) {}
 
-    // Whether the object can take the pipeline's place for this chain. False when a filter's
-    // process writes log lines (FILTER_ACCOUNT_EXPAND, FILTER_ONLINE), which come in another
-    // order and number record by record, and when a filter is of an unknown kind. Null filters
-    // do not matter.
+    // Whether the object can replace the pipeline for this chain. False if a filter's process
+    // writes log lines (FILTER_ACCOUNT_EXPAND, FILTER_ONLINE), whose order and number would differ
+    // record by record, or a filter is of an unknown kind. Null filters are ignored.
     static bool CanTest(CFilterChain& chain);
 
     // Whether the record passes every filter of the chain.

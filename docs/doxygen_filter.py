@@ -92,7 +92,7 @@ def filtered(lines):
         elif kind == "neutral":
             if block[0].startswith("#define") and (comment or TRAILING.match(block[0])):
                 block = documented(block, comment)
-            if not block[0].startswith("#"):
+            if not block[0].lstrip().startswith(("#", "template")):
                 comment = []  # another scope, or another access
             out += block
         elif "= delete" in block[-1] or block[0].lstrip().startswith("static_assert"):

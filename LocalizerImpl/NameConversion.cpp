@@ -421,22 +421,22 @@ void CQVLocalizerManager::GetFirstWord(PYOFWORDS* pMap, wchar_t code, wchar_t* s
     {
         return;
     }
-    szOut[0] = 0;
+    const bool bChinese = IsHanZiCode(CodeBits(code));
+    szOut[0] = IndexCharacter(code, bChinese ? pMap + HanZiRecord(code) : nullptr);
+}
+
+wchar_t CQVLocalizerManager::IndexCharacter(wchar_t code, const PYOFWORDS* pRecord)
+{
     if (IsAlphaCode(CodeBits(code)))
     {
-        szOut[0] = L'A' + static_cast<wchar_t>(CodeBits(code) - LOC_ALPHA_BASE);
-        return;
+        return L'A' + static_cast<wchar_t>(CodeBits(code) - LOC_ALPHA_BASE);
     }
-    if (!IsHanZiCode(CodeBits(code)))
+    if (pRecord == nullptr)
     {
-        szOut[0] = L'#';
-        return;
+        return L'#';
     }
-    const char cFirst = pMap[HanZiRecord(code)].szPinyin[0][0];
-    if (cFirst >= 'a' && cFirst <= 'z')
-    {
-        szOut[0] = L'A' + static_cast<wchar_t>(cFirst - 'a');
-    }
+    const char cFirst = pRecord->szPinyin[0][0];
+    return cFirst >= 'a' && cFirst <= 'z' ? L'A' + static_cast<wchar_t>(cFirst - 'a') : L'\0';
 }
 
 void CQVLocalizerManager::GetFirstWord(long long llTime, wchar_t* szOut)

@@ -17,10 +17,10 @@ CPieceTable::CPieceTable(CQVLocalizerManager& matcher, const CReadingSets& sets,
                          const wchar_t* szInput, int iInputLen)
     : m_matcher(matcher), m_sets(sets), m_szInput(szInput), m_iInputLen(iInputLen),
       m_pKeys(sets.Keys()),
-      m_pRows(new (std::nothrow) tag_PieceRow[static_cast<size_t>(KeyCount())]()),
-      m_pEnds(new (std::nothrow) uint16_t[static_cast<size_t>(iInputLen * KeyCount())])
+      m_pEnds(new (std::nothrow) uint16_t[static_cast<size_t>(iInputLen * KeyCount())]),
+      m_pFull(new (std::nothrow) uint16_t[static_cast<size_t>(iInputLen * KeyCount())])
 {
-    if (m_pRows != nullptr && m_pEnds != nullptr)
+    if (m_pEnds != nullptr && m_pFull != nullptr)
     {
         std::fill_n(m_pEnds.get(), iInputLen * KeyCount(), NOT_ASKED);
         m_bReady = AskLastPieces() && AddTypedKeys();
@@ -89,10 +89,10 @@ int CPieceTable::KeyOfWide(wchar_t code) const
                           : m_sets.KeyOf(code);
 }
 
-wchar_t CPieceTable::CompactCodeOf(int iKey) const
+tag_KeyMeaning CPieceTable::MeaningOf(int iKey) const
 {
     const bool bTyped = iKey >= m_sets.KeyCount();
-    return m_sets.CompactCodeOf(bTyped ? m_sets.KeyOf(TypedUnit(iKey)) : iKey);
+    return m_sets.MeaningOf(bTyped ? m_sets.KeyOf(TypedUnit(iKey)) : iKey);
 }
 
 wchar_t CPieceTable::TypedUnit(int iKey) const
@@ -116,18 +116,24 @@ unsigned CPieceTable::AskEnds(int iKey, int iOffset)
         uEnds |= static_cast<unsigned>(bTried) << iEnd;
         uFull |= static_cast<unsigned>(bTried && bFull) << iEnd;
     }
-    RowOf(iKey).auFull[iOffset] = static_cast<uint16_t>(uFull);
+    *FullOf(iKey, iOffset) = static_cast<uint16_t>(uFull);
     *EndsOf(iKey, iOffset) = static_cast<uint16_t>(uEnds);
     return uEnds;
 }
 
 bool CPieceTable::Fits(int iKey, wchar_t* szPiece, bool& bFull)
 {
-    const uint16_t uCode = CodeBits(CompactCodeOf(iKey));
-    if (IsHanZiCode(uCode))
+    const tag_KeyMeaning meaning = MeaningOf(iKey);
+    if (meaning.pRecord != nullptr)
     {
-        return FitsChinese(iKey, szPiece, bFull);
+        _mask_type unused = {};
+        int iFull = 0;
+        const int iFits = m_matcher.CmpChineseWord(m_sets.Records(), TypedUnit(iKey),
+                                                   *meaning.pRecord, szPiece, &unused, 0, iFull);
+        bFull = iFull != 0;
+        return iFits != 0;
     }
+    const uint16_t uCode = CodeBits(meaning.code);
     bFull = true; // only Chinese characters can take less than all of themselves
     if (IsAlphaCode(uCode))
     {
@@ -135,16 +141,4 @@ bool CPieceTable::Fits(int iKey, wchar_t* szPiece, bool& bFull)
     }
     return (IsDigitCode(uCode) ? m_matcher.CmpDigitalWord(uCode, szPiece)
                                : m_matcher.CmpOtherWords(uCode, szPiece)) != 0;
-}
-
-bool CPieceTable::FitsChinese(int iKey, wchar_t* szPiece, bool& bFull)
-{
-    PYOFWORDS* pRecords = m_sets.Records();
-    _mask_type unused = {};
-    int iFull = 0;
-    const int iFits = m_matcher.CmpChineseWord(pRecords, TypedUnit(iKey),
-                                               pRecords[HanZiRecord(CompactCodeOf(iKey))], szPiece,
-                                               &unused, 0, iFull);
-    bFull = iFull != 0;
-    return iFits != 0;
 }

@@ -21,14 +21,6 @@
 #include <cstdint>
 #include <memory>
 
-// What is known of a key besides its ends.
-struct tag_PieceRow
-{
-    uint16_t auFull[LOC_MAX_INPUT]; // by offset: ends that leave a run of whole readings
-    uint16_t uLastOffsets;          // offsets from which a character took the last piece
-    bool bBehindRun;                // a character stood behind a matched run
-};
-
 class CPieceTable
 {
 public:
@@ -50,8 +42,8 @@ public:
         const uint32_t uCode = static_cast<uint32_t>(code);
         return uCode < CReadingSets::CODE_COUNT ? m_pKeys[uCode] : KeyOfWide(code);
     }
-    // A code that stands for the key in the table of the sets.
-    wchar_t CompactCodeOf(int iKey) const;
+    // A typed character means what the characters of its readings mean.
+    tag_KeyMeaning MeaningOf(int iKey) const;
 
     // Where pieces from the offset on that fit the key end. Each offset has a table of its own:
     // the first one, which tells most names apart, stays in the nearest cache.
@@ -61,7 +53,12 @@ public:
         return uEnds != NOT_ASKED ? uEnds : AskEnds(iKey, iOffset);
     }
 
-    tag_PieceRow& RowOf(int iKey) { return m_pRows.get()[iKey]; }
+    // Whether the piece from iOffset to iEnd, one of its Ends, leaves a run of whole readings.
+    bool IsFull(int iKey, int iOffset, int iEnd) const
+    {
+        return ((unsigned{*FullOf(iKey, iOffset)} >> iEnd) & 1U) != 0;
+    }
+
     int InputLength() const { return m_iInputLen; }
     const CReadingSets& Sets() const { return m_sets; }
 
@@ -71,16 +68,19 @@ public:
 private:
     static constexpr uint16_t NOT_ASKED = UINT16_MAX;
 
-    uint16_t* EndsOf(int iKey, int iOffset)
+    uint16_t* EndsOf(int iKey, int iOffset) const
     {
         return m_pEnds.get() + (iOffset * KeyCount() + iKey);
+    }
+    uint16_t* FullOf(int iKey, int iOffset) const
+    {
+        return m_pFull.get() + (iOffset * KeyCount() + iKey);
     }
     bool AddTypedKeys();
     int KeyOfWide(wchar_t code) const;
     wchar_t TypedUnit(int iKey) const;
     unsigned AskEnds(int iKey, int iOffset);
     bool Fits(int iKey, wchar_t* szPiece, bool& bFull);
-    bool FitsChinese(int iKey, wchar_t* szPiece, bool& bFull);
     bool AskLastPieces();
 
     CQVLocalizerManager& m_matcher;
@@ -90,9 +90,9 @@ private:
     const uint16_t* m_pKeys; // of the codes below CReadingSets::CODE_COUNT
     bool m_bReady = false;
     uint16_t m_uValidLast = 0; // offsets whose last piece the matcher finds worth trying
-    std::unique_ptr<uint16_t[]> m_pOwnKeys; // where a Chinese character was typed
-    std::unique_ptr<tag_PieceRow[]> m_pRows;
+    std::unique_ptr<uint16_t[]> m_pOwnKeys;    // where a Chinese character was typed
     std::unique_ptr<uint16_t[]> m_pEnds;       // by offset, then by key
+    std::unique_ptr<uint16_t[]> m_pFull;       // the same: those Ends that take whole readings
     wchar_t m_aszUnits[LOC_MAX_INPUT][2] = {}; // the pieces of one character, asked for most
     wchar_t m_szPiece[LOC_PIECE_BUFFER] = {};
 };

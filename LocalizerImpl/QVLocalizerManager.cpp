@@ -13,6 +13,34 @@
 #include <algorithm>
 #include <iterator>
 
+namespace
+{
+
+const PYOFWORDS* RecordOrNull(const PYOFWORDS* pMap, wchar_t code)
+{
+    return IsHanZiCode(CodeBits(code)) ? pMap + HanZiRecord(code) : nullptr;
+}
+
+// The mask of the keys that type a character which is no letter.
+uint32_t InitialsOf(wchar_t code, const PYOFWORDS* pRecord)
+{
+    if (pRecord == nullptr)
+    {
+        return code == LOC_OTHER || IsDigitCode(CodeBits(code)) ? MASK_OTHER : 0;
+    }
+    uint32_t uMask = 0;
+    for (const auto& szReading : pRecord->szPinyin)
+    {
+        if (szReading[0] >= 'a' && szReading[0] <= 'z')
+        {
+            uMask |= 1U << (szReading[0] - 'a');
+        }
+    }
+    return uMask;
+}
+
+} // namespace
+
 CQVLocalizerManager::CQVLocalizerManager(int bMatchAnywhere)
     : m_stCNWords{}, m_iInputLen(0), m_stMask{}, m_bMatchAnywhere(bMatchAnywhere), m_llNowMs(0)
 {
@@ -160,41 +188,31 @@ int CQVLocalizerManager::CreateMaskWord(PYOFWORDS* pMap, wchar_t code)
     {
         return 0;
     }
+    AddNextKey(code, RecordOrNull(pMap, code));
+    return 1;
+}
+
+void CQVLocalizerManager::AddNextKey(wchar_t code, const PYOFWORDS* pRecord)
+{
     if (m_iInputLen == LOC_MAX_INPUT)
     {
         m_stMask = {}; // a full input takes no further key
-        return 1;
     }
-    if (IsAlphaCode(CodeBits(code)))
+    else if (IsAlphaCode(CodeBits(code)))
     {
         m_stMask.lMask |= 1U << (CodeBits(code) - LOC_ALPHA_BASE);
     }
     else
     {
-        CreateCNWordMask(pMap, code);
+        m_stMask.lMask |= InitialsOf(code, pRecord);
     }
-    return 1;
 }
 
 void CQVLocalizerManager::CreateCNWordMask(PYOFWORDS* pMap, wchar_t code)
 {
-    if (pMap == nullptr)
+    if (pMap != nullptr)
     {
-        return;
-    }
-    if (IsHanZiCode(CodeBits(code)))
-    {
-        for (const auto& szReading : pMap[HanZiRecord(code)].szPinyin)
-        {
-            if (szReading[0] >= 'a' && szReading[0] <= 'z')
-            {
-                m_stMask.lMask |= 1U << (szReading[0] - 'a');
-            }
-        }
-    }
-    else if (code == LOC_OTHER || IsDigitCode(CodeBits(code)))
-    {
-        m_stMask.lMask |= MASK_OTHER;
+        m_stMask.lMask |= InitialsOf(code, RecordOrNull(pMap, code));
     }
 }
 

@@ -136,6 +136,8 @@ public:
     // Index character of a contact whose first code is code into szOut[0]: 'A'..'Z' or '#'; 0 for
     // a character without reading. Null arguments: nothing.
     static void GetFirstWord(PYOFWORDS* pMap, wchar_t code, wchar_t* szOut);
+    // The same with the record of a Chinese code, null for the others.
+    QV_INTERNAL static wchar_t IndexCharacter(wchar_t code, const PYOFWORDS* pRecord);
     // Index character '1'..'5' of a contact last contacted at llTime: less than 30, 90, 180, 360
     // days before m_llNowMs, or longer ago. Null szOut: nothing.
     void GetFirstWord(long long llTime, wchar_t* szOut);
@@ -169,6 +171,8 @@ public:
     // Adds the keys that a name character behind the matched ones offers. An input of 10
     // characters clears the mask instead. 1, or 0 for a null table.
     int CreateMaskWord(PYOFWORDS* pMap, wchar_t code);
+    // The same with the record of a Chinese code, null for the others.
+    QV_INTERNAL void AddNextKey(wchar_t code, const PYOFWORDS* pRecord);
     void CreateCNWordMask(PYOFWORDS* pMap, wchar_t code);
 
     // Appends a candidate character unless it is listed already, the list is full or its

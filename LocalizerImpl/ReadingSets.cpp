@@ -206,6 +206,8 @@ void CReadingSets::FillOtherKeys()
     m_pKeyOf[LOC_NO_CODE] = static_cast<uint16_t>(EndKey());
 }
 
+// Codes of which only the low 16 bits are sound. They act by these, except that LOC_OTHER and
+// LOC_NO_CODE with upper bits are neither a key to type nor the end of a name.
 int CReadingSets::KeyOfWide(wchar_t code) const
 {
     const uint16_t uCode = CodeBits(code);
@@ -218,33 +220,34 @@ int CReadingSets::KeyOfWide(wchar_t code) const
 
 namespace
 {
+
+constexpr wchar_t LOC_WIDE_OTHER = LOC_OTHER | 0x10000; // any such code
+
 wchar_t CodeAt(wchar_t base, int iPlace)
 {
     return static_cast<wchar_t>(static_cast<int>(base) + iPlace);
 }
+
 } // namespace
 
-wchar_t CReadingSets::CompactCodeOf(int iKey) const
+tag_KeyMeaning CReadingSets::MeaningOf(int iKey) const
 {
-    constexpr wchar_t UPPER_BIT = 0x10000;
     const int iPlace = iKey - m_iCount;
     if (iPlace < PLACE_ALPHA)
     {
-        return CodeAt(LOC_HANZI_BASE, iKey);
+        return {LOC_HANZI_BASE, Records() + iKey};
     }
     if (iPlace < PLACE_DIGIT)
     {
-        return CodeAt(LOC_ALPHA_BASE, iPlace);
+        return {CodeAt(LOC_ALPHA_BASE, iPlace), nullptr};
     }
     if (iPlace < PLACE_OTHER)
     {
-        return CodeAt(LOC_DIGIT_BASE, iPlace - PLACE_DIGIT);
+        return {CodeAt(LOC_DIGIT_BASE, iPlace - PLACE_DIGIT), nullptr};
     }
-    if (iPlace == PLACE_UNKNOWN || iPlace == PLACE_END)
-    {
-        return LOC_NO_CODE;
-    }
-    return iPlace == PLACE_OTHER ? LOC_OTHER : LOC_OTHER | UPPER_BIT;
+    constexpr wchar_t OTHERS[] = {LOC_OTHER, LOC_WIDE_OTHER, LOC_NO_CODE, LOC_NO_CODE};
+    static_assert(sizeof(OTHERS) / sizeof(*OTHERS) == PLACE_COUNT - PLACE_OTHER, "a code a place");
+    return {OTHERS[iPlace - PLACE_OTHER], nullptr};
 }
 
 PYOFWORDS CReadingSets::RecordOf(wchar_t code) const

@@ -5,10 +5,7 @@
 //
 // 15,422 characters share about a thousand sets of readings, and what a typed piece does on a
 // character depends on its set alone. So every code has a key: characters with the same readings
-// share one, letters, digits and the rest have theirs behind. The sets form a table of their own,
-// in which a key has a compact code: LOC_HANZI_BASE + the set, or the code itself where it is no
-// Chinese one. What asks a table for the readings of a code takes this table and a compact code
-// too.
+// share one, letters, digits and the rest have theirs behind.
 
 #include "Core/Records/LocalizerCodes.h"
 #include "LocalizerImpl/FileStamp.h"
@@ -16,6 +13,13 @@
 #include <atomic>
 #include <cstdint>
 #include <memory>
+
+// What the characters of a key are.
+struct tag_KeyMeaning
+{
+    wchar_t code;       // theirs; for Chinese characters any Chinese code
+    PYOFWORDS* pRecord; // the readings of Chinese characters, without a character; null for others
+};
 
 class CReadingSets
 {
@@ -52,7 +56,7 @@ public:
     const uint16_t* Keys() const { return m_pKeyOf.get(); }
     // Up to the last code of all.
     static constexpr uint32_t CODE_COUNT = LOC_DIGIT_BASE + LOC_DIGIT_COUNT;
-    wchar_t CompactCodeOf(int iKey) const;
+    tag_KeyMeaning MeaningOf(int iKey) const;
     // The key of LOC_NO_CODE, which no other code has.
     int EndKey() const { return m_iCount + PLACE_END; }
 

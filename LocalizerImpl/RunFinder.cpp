@@ -13,8 +13,8 @@ int LowestBit(unsigned uBits)
 
 } // namespace
 
-CRunFinder::CRunFinder(CPieceTable& table, bool bAnywhere)
-    : m_table(table), m_states(table, bAnywhere), m_bAnywhere(bAnywhere),
+CRunFinder::CRunFinder(CPieceTable& table, CFindings& findings, bool bAnywhere)
+    : m_table(table), m_findings(findings), m_states(table, bAnywhere), m_bAnywhere(bAnywhere),
       m_iSplitWords(((1 << std::max(table.InputLength() - 1, 0)) + WORD_BITS - 1) / WORD_BITS)
 {
 }
@@ -51,8 +51,7 @@ void CRunFinder::Extend(int iPiece, int iOffset, uint32_t uSplit, bool bAllFull)
     for (unsigned uEnds = m_table.Ends(iKey, iOffset); uEnds != 0; uEnds &= uEnds - 1)
     {
         const int iEnd = LowestBit(uEnds);
-        const bool bFull =
-            bAllFull && ((unsigned{m_table.RowOf(iKey).auFull[iOffset]} >> iEnd) & 1U) != 0;
+        const bool bFull = bAllFull && m_table.IsFull(iKey, iOffset, iEnd);
         if (iEnd == iInputLen)
         {
             Record(iPiece + 1, iOffset, uExtended, bFull);
@@ -87,16 +86,15 @@ void CRunFinder::Record(int iPieces, int iLastOffset, uint32_t uSplit, bool bAll
 void CRunFinder::MarkFound(int iPieces, int iLastOffset, uint32_t uSplit)
 {
     const int iLast = m_iStart + iPieces - 1;
-    tag_PieceRow& lastRow = m_table.RowOf(m_aiKeys[iLast]);
-    lastRow.uLastOffsets = static_cast<uint16_t>(lastRow.uLastOffsets | (1U << iLastOffset));
+    m_findings.MarkLastPiece(m_aiKeys[iLast], iLastOffset);
     const uint16_t uLastCode = CodeBits(m_pCodes[iLast]);
-    if (m_firstFound.IsEarly(uSplit, m_iCandidate) && IsHanZiCode(uLastCode))
+    if (IsHanZiCode(uLastCode))
     {
-        m_firstFound.Add(uSplit, m_iCandidate, uLastCode, m_table.Sets());
+        m_findings.NoteCharacter(uSplit, m_iCandidate, uLastCode);
     }
     if (iLast + 1 < m_iLength)
     {
-        m_table.RowOf(m_aiKeys[iLast + 1]).bBehindRun = true;
+        m_findings.MarkBehindRun(m_aiKeys[iLast + 1]);
     }
 }
 

@@ -1,7 +1,7 @@
 #ifndef QV_LOCALIZERIMPL_RUNFINDER_H
 #define QV_LOCALIZERIMPL_RUNFINDER_H
 
-#include "LocalizerImpl/FirstFound.h"
+#include "LocalizerImpl/Findings.h"
 #include "LocalizerImpl/PieceTable.h"
 #include "LocalizerImpl/ReachStates.h"
 
@@ -25,8 +25,9 @@ struct tag_NameMatch
 class CRunFinder
 {
 public:
-    // bAnywhere false: runs begin at a name's first character only.
-    CRunFinder(CPieceTable& table, bool bAnywhere);
+    // bAnywhere false: runs begin at a name's first character only. The table and the findings
+    // outlive the object.
+    CRunFinder(CPieceTable& table, CFindings& findings, bool bAnywhere);
 
     // False for want of memory; then nothing else may be called.
     bool IsReady() const { return m_states.IsReady(); }
@@ -35,11 +36,9 @@ public:
     // from the first LOC_NO_CODE on do not count.
     bool CanMatch(const wchar_t* pCodes) { return m_states.Accept(pCodes); }
 
-    // How a name matches that CanMatch. The rows of the characters that took a last piece or stood
-    // behind a run are marked, and the former noted as found by candidate iCandidate.
+    // How a name matches that CanMatch. The findings get the characters that took a last piece, as
+    // those of candidate iCandidate, and those behind a run.
     tag_NameMatch Find(const wchar_t* pCodes, int32_t iCandidate);
-
-    const CFirstFound& FirstFound() const { return m_firstFound; }
 
 private:
     static constexpr int WORD_BITS = 64;
@@ -51,8 +50,8 @@ private:
     bool MarkSeen(uint32_t uSplit);
 
     CPieceTable& m_table;
+    CFindings& m_findings;
     CReachStates m_states;
-    CFirstFound m_firstFound;
     bool m_bAnywhere;
     int m_iSplitWords; // of m_auSeen that the text's splits need
     const wchar_t* m_pCodes = nullptr;

@@ -1,13 +1,11 @@
 // One search: the typed text against every candidate, the ranked result, the next keys and the
 // candidate characters.
 //
-// A text passes five classes: CReadingSets maps each character code to a key shared by all
+// A text passes these classes: CReadingSets maps each character code to a key shared by all
 // characters with the same readings; CPieceTable caches which pieces of the text fit which key;
 // CReachStates, a lazily built DFA over sets of reachable offsets, rejects the names that do not
-// match; CRunFinder works out split, kind and position of those that do; RankMatches sorts them.
-// What the last piece adds to the key mask depends on the key alone, so it is marked per key and
-// added once at the end, in any order. Candidate characters have an order, that of the first
-// split and contact that meets them: CFirstFound keeps it.
+// match; CRunFinder works out split, kind and position of those that do, and CFindings what they
+// offer next; RankMatches sorts them.
 
 #include "LocalizerImpl/SearchRun.h"
 
@@ -24,74 +22,6 @@ namespace
 {
 
 constexpr int64_t MS_PER_SECOND = 1000;
-
-// Feeds the mask and the candidate characters of a manager from what a search marked.
-class CFindingsWriter
-{
-public:
-    CFindingsWriter(CQVLocalizerManager& manager, const CReadingSets& sets, _mask_type& mask,
-                    CPieceTable& table)
-        : m_manager(manager), m_sets(sets), m_mask(mask), m_table(table)
-    {
-    }
-
-    void Write(const CFirstFound& firstFound)
-    {
-        for (int i = 0; i < firstFound.Count(); ++i)
-        {
-            TakeFirstPiece(firstFound.At(i));
-        }
-        for (int iKey = 0; iKey < m_table.KeyCount(); ++iKey)
-        {
-            const tag_PieceRow& row = m_table.RowOf(iKey);
-            if (row.uLastOffsets != 0 || row.bBehindRun)
-            {
-                TakeRow(row, m_table.CompactCodeOf(iKey));
-            }
-        }
-    }
-
-private:
-    void TakeFirstPiece(const CFirstFound::tag_Find& find)
-    {
-        PYOFWORDS record = m_sets.RecordOf(find.code);
-        TakeLastPiece(record, m_table.InputLength() - 1 - __builtin_ctz(find.Split()));
-    }
-
-    void TakeRow(const tag_PieceRow& row, wchar_t code)
-    {
-        if (row.uLastOffsets != 0 && IsHanZiCode(CodeBits(code)))
-        {
-            TakeLastPieces(m_sets.Records()[HanZiRecord(code)], row.uLastOffsets);
-        }
-        if (row.bBehindRun)
-        {
-            m_manager.CreateMaskWord(m_sets.Records(), code);
-        }
-    }
-
-    // The records of the sets have no character, so these add to the mask alone.
-    void TakeLastPieces(PYOFWORDS& record, unsigned uOffsets)
-    {
-        for (; uOffsets != 0; uOffsets &= uOffsets - 1)
-        {
-            TakeLastPiece(record, __builtin_ctz(uOffsets));
-        }
-    }
-
-    // Without a code: a typed character adds nothing as a last piece.
-    void TakeLastPiece(PYOFWORDS& record, int iOffset)
-    {
-        int iFull = 0;
-        m_manager.CmpChineseWord(m_sets.Records(), LOC_NO_CODE, record,
-                                 m_table.Piece(iOffset, m_table.InputLength()), &m_mask, 1, iFull);
-    }
-
-    CQVLocalizerManager& m_manager;
-    const CReadingSets& m_sets;
-    _mask_type& m_mask;
-    CPieceTable& m_table;
-};
 
 void LogMatches(size_t uMatches)
 {
@@ -131,8 +61,9 @@ int CSearchRun::Begin(wchar_t* szInput)
     {
         return LOC_ERR_MAP;
     }
-    m_finder.emplace(*m_pieces, m_manager.m_bMatchAnywhere != 0);
-    if (!m_finder->IsReady())
+    m_findings.emplace(*m_pieces);
+    m_finder.emplace(*m_pieces, *m_findings, m_manager.m_bMatchAnywhere != 0);
+    if (!m_findings->IsReady() || !m_finder->IsReady())
     {
         m_finder.reset();
         return LOC_ERR_MAP;
@@ -154,8 +85,7 @@ int CSearchRun::Find(const tag_LocalizerResult& candidates, int bTimeOrder)
         m_manager.m_vLocateArray.clear();
         return LOC_ERR_MAP;
     }
-    CFindingsWriter(m_manager, *m_sets, m_manager.m_stMask, *m_pieces)
-        .Write(m_finder->FirstFound());
+    m_findings->Report(m_manager, m_manager.m_stMask);
     return static_cast<int>(m_manager.m_vLocateArray.size());
 }
 
@@ -179,7 +109,7 @@ bool CSearchRun::ListAll(const tag_LocalizerResult& candidates, int bTimeOrder)
         const int iCodes = std::min(NameLength(detail.szLocalizerKey), iOffered);
         for (int iCode = 0; iCode < iCodes; ++iCode)
         {
-            m_pieces->RowOf(m_pieces->KeyOf(detail.szLocalizerKey[iCode])).bBehindRun = true;
+            m_findings->MarkBehindRun(m_pieces->KeyOf(detail.szLocalizerKey[iCode]));
         }
     }
     return true;
@@ -187,18 +117,14 @@ bool CSearchRun::ListAll(const tag_LocalizerResult& candidates, int bTimeOrder)
 
 wchar_t CSearchRun::IndexCharacter(const tag_LocalizerDetail& detail, int bTimeOrder)
 {
-    wchar_t szFirstWord[2] = {};
-    if (bTimeOrder != 0)
+    if (bTimeOrder == 0)
     {
-        m_manager.GetFirstWord(static_cast<long long>(detail.llLastTimeContacted), szFirstWord);
+        const tag_KeyMeaning first = m_sets->MeaningOf(m_sets->KeyOf(detail.szLocalizerKey[0]));
+        return CQVLocalizerManager::IndexCharacter(first.code, first.pRecord);
     }
-    else
-    {
-        CQVLocalizerManager::GetFirstWord(
-            m_sets->Records(), m_sets->CompactCodeOf(m_sets->KeyOf(detail.szLocalizerKey[0])),
-            szFirstWord);
-    }
-    return szFirstWord[0];
+    wchar_t bucket = 0;
+    m_manager.GetFirstWord(static_cast<long long>(detail.llLastTimeContacted), &bucket);
+    return bucket;
 }
 
 bool CSearchRun::FindMatches(const tag_LocalizerResult& candidates)

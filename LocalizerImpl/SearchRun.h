@@ -2,6 +2,7 @@
 #define QV_LOCALIZERIMPL_SEARCHRUN_H
 
 #include "Core/Records/CandidateFilter.h"
+#include "LocalizerImpl/Findings.h"
 #include "LocalizerImpl/PieceTable.h"
 #include "LocalizerImpl/PinyinTable.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
@@ -60,6 +61,7 @@ private:
     std::optional<CPinyinTable> m_table; // from Begin on
     CReadingSets::Ptr m_sets;
     std::optional<CPieceTable> m_pieces;
+    std::optional<CFindings> m_findings;
     std::optional<CRunFinder> m_finder; // from a successful Begin on
 };
 

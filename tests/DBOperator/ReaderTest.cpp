@@ -321,6 +321,7 @@ TEST_F(Reader, FailsOnWhatIsNoProviderDatabase)
 
     CDataDirectory::WriteBytes(CDataPaths::Database(), std::string(5000, 'x'));
     EXPECT_EQ(-1, ReadAll());
+    EXPECT_EQ(-1, m_reader.ReadContactsByID(1, &record, m_iCount));
     EXPECT_EQ(-1, Count());
     EXPECT_EQ(-1, ReadOnline());
     EXPECT_EQ(42, m_iCount);
@@ -332,6 +333,7 @@ TEST_F(Reader, FailsOnWhatIsNoProviderDatabase)
     provider.Execute("alter table localizer drop column hasMail");
     CSQLiteOperator reader;
     EXPECT_EQ(-1, ReadAll(reader));
+    EXPECT_EQ(-1, reader.ReadContactsByID(1, &record, m_iCount));
     EXPECT_EQ(2, m_set.RecordNum);
     provider.Execute("alter table contacts drop column photo_file_id");
     CSQLiteOperator another;

@@ -249,6 +249,8 @@ class IndexTest(TypeTest):
         self.wait_for(rf"^abc> zhangsa .* {before} contacts?$")
         self.run_tool("notify", "star", "6")
         self.wait_for(rf"^abc> zhangsa .* {before + 1} contacts?$")
+        self.press("Escape")
+        self.assert_left_as_it_was(0)
 
 
 class RefusalTest(TypeTest):

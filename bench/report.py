@@ -18,17 +18,18 @@ HEAD = """# Benchmarks
 
 Written by `scripts/bench.sh`; do not edit by hand. Realistic names with a fixed seed (80 % Chinese
 personal names with surnames in their real proportions, the rest Latin, mixed and companies), {queries}
-texts typed key by key, each keystroke the median of 9 runs. These machines are noisy: read the
-shares, each a time divided by what it may take at most on this machine in this run, rather than the
-microseconds. A share of 1 is the limit.
+texts typed key by key, each keystroke the median of 9 runs. Times vary with the machine: compare the
+shares rather than the microseconds. A share is a time divided by its limit on this machine in this
+run, so a share of 1 is the limit.
 
 Machine: {cpu}, {cores} cores; {date}.
 
-Floors, in the same run: `copy` maps the store file, copies its records into touched memory and
-unmaps; `copy-fresh` the same into memory fresh from the system; `scan` reads all result entries;
-`entries` copies them into fresh memory; `sql` steps through the statements of a full read;
-`rewrite` copies the records into a shared mapping of an existing file. A keystroke is held
-against a `scan` measured before its text was typed and `entries` measured right behind it.
+Lower bounds (floors), measured in the same run: `copy` maps the store file, copies its records into
+memory that was touched before and unmaps; `copy-fresh` copies into memory fresh from the system;
+`scan` reads all result entries; `entries` copies them into fresh memory; `sql` steps through the
+statements of a full read; `rewrite` copies the records into a shared mapping of an existing file.
+The limit of a keystroke uses a `scan` measured before its text was typed and `entries` measured
+right after it.
 """
 
 
@@ -81,51 +82,51 @@ def main() -> int:
     queries = pathlib.Path(__file__).with_name("Queries.h").read_text(encoding="utf-8").count("{IME_")
     text = HEAD.format(queries=queries, cpu=cpu, cores=report["context"]["num_cpus"],
                        date=report["context"]["date"][:10])
-    text += "\n## Floors (microseconds)\n\n" + by_size(
+    text += "\n## Lower bounds (microseconds)\n\n" + by_size(
         rows["floors"], {"copy_us": "copy", "copy_fresh_us": "copy-fresh", "scan_us": "scan",
                          "entries_us": "entries", "sql_us": "sql", "rewrite_us": "rewrite"}, {})
     times = {"p50_us": "p50 us", "p95_us": "p95 us", "max_us": "max us",
              "p50_ns_per_contact": "p50 ns per contact"}
-    text += ("\n## A keystroke against the whole store\n\nAllowed: p95 1.5 copy + 2 entries of the "
-             "result, max 2.5 copy + 2 entries; below 100,000 contacts p95 2 copy + 2 entries + 100 "
-             "us. `worst/median`: the slowest keystroke beside the median one, entries aside (limit "
-             "3). `memory`: what is held at the allocator beside contacts x 176 + matches x 136 + 1 "
-             "MiB.\n\n") + by_size(
+    text += ("\n## Whole-store search\n\nLimits: p95 1.5 copy + 2 entries of the result, max 2.5 "
+             "copy + 2 entries; below 100,000 contacts p95 2 copy + 2 entries + 100 us. "
+             "`worst/median`: the slowest keystroke divided by the median one, without entries "
+             "(limit 3). `memory share`: the allocated memory divided by contacts x 176 + matches x "
+             "136 + 1 MiB.\n\n") + by_size(
         rows["whole_store"], times, {"p95_share": "p95 share", "max_share": "max share",
                                      "worst_to_median": "worst/median",
                                      "memory_share": "memory share"}, ["max_share"])
-    text += ("\n## How long a keystroke may hold the store lock\n\nThe whole selection, text and "
-             "opening of files included, beside copying the records out, which is what the lock "
-             "would be held for otherwise.\n\n") + by_size(
+    text += ("\n## Store lock in a whole-store search\n\nThe time of the whole selection, with the "
+             "text and the opening of files, compared with copying the records, for which the lock "
+             "would be held otherwise.\n\n") + by_size(
         rows["lock_held"], {"held_p50_us": "p50 us", "held_max_us": "max us", "copy_us": "copy",
                             "copy_fresh_us": "copy-fresh"}, {"lock_share": "max / copy-fresh"})
-    text += ("\n## A keystroke that narrows the previous result\n\nAllowed: p95 6 scans of the "
-             "previous result + 2 entries of the new one + 50 us; the median keystroke of 100,000 "
-             "contacts copy / 20.\n\n") + by_size(
+    text += ("\n## Incremental search\n\nA keystroke that narrows the previous result. Limits: p95 6 "
+             "scans of the previous result + 2 entries of the new one + 50 us; the median keystroke "
+             "of 100,000 contacts copy / 20.\n\n") + by_size(
         rows["narrowed"], times, {"p95_share": "p95 share", "median_share": "median share"},
         ["median_share"])
-    text += ("\n## A full build onto an existing store\n\nAllowed at 100,000 contacts: 1.8 x (sql + "
+    text += ("\n## A full build onto an existing store\n\nLimit at 100,000 contacts: 1.8 x (sql + "
              "copy-fresh + rewrite).\n\n") + by_size(
         rows["build"], {"build_us": "build us", "floor_us": "floor us"}, {"build_share": "share"},
         ["build_share"])
-    text += ("\n## One changed contact\n\nAllowed at 100,000 contacts: the count query + 1.5 copy when "
-             "it is renewed in place, + 6 copy when it moves, comes or goes. In a small store most "
-             "of it is opening the database a second time.\n\n") + by_size(
+    text += ("\n## One changed contact\n\nLimits at 100,000 contacts: the count query + 1.5 copy when "
+             "it is renewed in place, + 6 copy when it moves, is inserted or removed. In a small "
+             "store most of the time is opening the database a second time.\n\n") + by_size(
         rows["changes"], {f"{kind}_us": f"{kind} us" for kind in CHANGES},
         {f"{kind}_share": f"{kind} share" for kind in CHANGES},
         [f"{kind}_share" for kind in CHANGES])
-    text += ("\n## 200 changed contacts in one notification\n\nHow long the store lock is held. Allowed "
-             "at 100,000 contacts: 4 copy, whatever changes.\n\n") + by_size(
+    text += ("\n## 200 changed contacts in one notification\n\nThe time for which the store lock is "
+             "held. Limit at 100,000 contacts: 4 copy for every kind of change.\n\n") + by_size(
         rows["many_changes"], {"copy_us": "copy", **{f"{kind}_us": f"{kind} us" for kind in CHANGES}},
         {f"{kind}_share": f"{kind} share" for kind in CHANGES},
         [f"{kind}_share" for kind in CHANGES])
-    text += ("\n## Two processes that type at once\n\nBoth press each key at the same moment. Allowed: "
-             "to wait 3 times as long as the other one holds the lock at most.\n\n") + by_size(
+    text += ("\n## Two processes that type at once\n\nBoth search at the same moment. Limit of the "
+             "wait: 3 times the longest that the other process holds the lock.\n\n") + by_size(
         rows["two_typists"], {"wait_us": "longest wait us", "held_us": "longest held us"},
         {"wait_share": "share"})
-    text += ("\n## Contacts of one surname, typed by its initial\n\nAll match and are ranked: in the "
-             "whole store, and among candidates in no order. `sort` sorts as many matches by one "
-             "number.\n\n") + by_size(
+    text += ("\n## Contacts of one surname, typed by its initial\n\nAll match and are ranked, in a "
+             "whole-store search and in a candidate set in random order. `sort` is the time of "
+             "sorting as many matches by one number.\n\n") + by_size(
         rows["one_surname"], {"whole_us": "whole store us", "shuffled_us": "in no order us",
                               "sort_us": "sort", "entries_us": "entries"}, {})
     pathlib.Path(__file__).with_name("README.md").write_text(text, encoding="utf-8")

@@ -17,16 +17,16 @@ static_assert(QV_PICK_SIZE == (QV_MAX_TYPED + MAX_PICKED) * UTF8_MAX_BYTES + 1, 
 constexpr size_t CODE_BYTES = 3; // no code needs more in UTF-8
 static_assert(QV_KEY_SIZE == CONTACT_MAX_KEY * CODE_BYTES + 1, "any key fits");
 
-// Names are converted before there is an index: the contacts database needs their keys.
+// The contacts database needs keys before the first build: the shared table may still be missing.
 void MakeMissingPinyinTable()
 {
     if (access(CDataPaths::PinyinMapping(), F_OK) != 0)
     {
-        CQVLocalizerManager::InitMapFile(); // a failure shows when the table is mapped
+        CQVLocalizerManager::InitMapFile(); // after a failure the table cannot be mapped
     }
 }
 
-// The key of a name, which is checked already, with the table mapped at pMap.
+// Writes the key of a name, already checked, with the table mapped at pMap.
 void WriteKey(PYOFWORDS* pMap, const char* szName, char (&szKey)[QV_KEY_SIZE])
 {
     wchar_t szCharacters[LOC_NAME_BUFFER] = {};

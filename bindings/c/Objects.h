@@ -1,7 +1,7 @@
 #ifndef QV_BINDINGS_OBJECTS_H
 #define QV_BINDINGS_OBJECTS_H
 
-// What the handles of the C interface stand for, and what its functions share.
+// The objects behind the handles of the C interface, and code that its functions share.
 
 #include "Core/LocalizerLogic.h"
 #include "LocalizerImpl/QVLocalizerManager.h"

@@ -1,5 +1,5 @@
-// Searches and their results. Results are handed out as they are: a match is the entry of a result
-// set under other names.
+// Searches and their results. Results are returned without a copy: qv_match has the layout of an
+// entry of a result set.
 
 #include "Filter/FilterChain.h"
 #include "bindings/c/Objects.h"
@@ -63,7 +63,7 @@ bool IsValid(const qv_query& query)
 
 int MakeChain(CLocalizerLogic& logic, const qv_query& query, std::unique_ptr<CFilterChain>& chain)
 {
-    // One more than filled: the library wants arrays even for no filter.
+    // One more than filled: the library requires arrays even for no filter.
     const std::unique_ptr<int[]> kinds(new (std::nothrow) int[query.filter_count + 1]);
     const std::unique_ptr<QVLong32[]> ids(new (std::nothrow) QVLong32[query.filter_count + 1]);
     if (kinds == nullptr || ids == nullptr)

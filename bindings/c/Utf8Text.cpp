@@ -16,7 +16,7 @@ constexpr uint32_t FIRST_SURROGATE = 0xD800;
 constexpr uint32_t LAST_SURROGATE = 0xDFFF;
 constexpr uint32_t LAST_CHARACTER = 0x10FFFF;
 
-// How characters of one length are written.
+// The encoding of characters of one length.
 struct tag_Form
 {
     uint32_t uFirst;    // smallest character that needs so many bytes
@@ -39,7 +39,7 @@ bool IsIn(uint32_t uCharacter, const tag_Form& form)
 }
 
 // Decodes the character at pBytes, which is not the terminator; the number of its bytes, or 0.
-// Reads no byte behind the terminator.
+// Reads no byte after the terminator.
 size_t DecodeCharacter(const unsigned char* pBytes, uint32_t& uCharacter)
 {
     for (size_t uLength = 1; uLength <= UTF8_MAX_BYTES; ++uLength)
@@ -63,7 +63,7 @@ size_t DecodeCharacter(const unsigned char* pBytes, uint32_t& uCharacter)
     return 0;
 }
 
-// Writes the character to pBytes; the number of its bytes, 0 for what is no character.
+// Writes the character to pBytes; the number of its bytes, 0 for an invalid character.
 size_t EncodeCharacter(uint32_t uCharacter, char (&szBytes)[UTF8_MAX_BYTES])
 {
     for (size_t uLength = 1; uLength <= UTF8_MAX_BYTES; ++uLength)
@@ -84,7 +84,7 @@ size_t EncodeCharacter(uint32_t uCharacter, char (&szBytes)[UTF8_MAX_BYTES])
     return 0;
 }
 
-// Encodes as far as szTarget, null to count only, is asked for; the number of bytes.
+// Encodes szText into szTarget, or only counts if that is null; the number of bytes.
 size_t Encode(const wchar_t* szText, char* szTarget)
 {
     size_t uWritten = 0;

@@ -1,5 +1,5 @@
-// The index behind the C interface: its directory, builds and notifications; the words of results
-// and the log.
+// The index behind the C interface: its directory, builds and notifications; the descriptions of
+// results and the log.
 
 #include "Common/DataPaths.h"
 #include "bindings/c/Objects.h"
@@ -29,7 +29,7 @@ constexpr const char* PROVIDER_ROOT = "/data/data/com.android.providers.contacts
 class CSharedRoot
 {
 public:
-    // Takes the directory for one more index.
+    // Registers one more index on the directory.
     static int Acquire(const char* szDirectory)
     {
         const std::unique_ptr<char, decltype(&std::free)> path(realpath(szDirectory, nullptr),
@@ -92,7 +92,7 @@ int StatusOfBuild(int iResult)
 }
 
 #ifndef __ANDROID__
-// The caller's log function, which the sink hands on to. Set with the same care as the sink.
+// The caller's log function, which the sink calls. Not synchronised, like the sink.
 qv_log_function g_pfnLog = nullptr;
 
 void HandOn(void* pContext, int iPriority, const char* szTag, const char* szText)
@@ -200,7 +200,7 @@ int qv_contacts_changed(qv_index* index, const int64_t* ids, size_t count)
     {
         return QV_ERROR_ARGUMENT;
     }
-    // The notification uses its list up.
+    // The notification modifies its list.
     const std::unique_ptr<long long[]> list(new (std::nothrow) long long[count]);
     if (list == nullptr)
     {
@@ -266,7 +266,7 @@ int qv_set_sort_type(qv_index* index, int sort_type)
     {
         return QV_ERROR_ARGUMENT;
     }
-    // Without an index there is nowhere to keep it, and nothing tells.
+    // Without an index the library does nothing and reports nothing.
     index->m_logic.SetSortType(sort_type);
     return IsReadable(CDataPaths::ContactReg()) && index->m_logic.GetSortType() == sort_type
                ? QV_OK

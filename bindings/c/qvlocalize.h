@@ -1,33 +1,34 @@
 #ifndef QVLOCALIZE_H
 #define QVLOCALIZE_H
 
-// Contact search by pinyin, initials and keypad digits, for C and for all that can call C: link
-// libqvlocalize.so.1, which exports the functions of this header and nothing else.
+// Contact search by pinyin, initials and keypad digits, for C and for all languages that can call
+// C: link libqvlocalize.so.1, which exports the functions of this header and nothing else.
 //
-// Order: qv_open; qv_build; then searches, keys and notifications as they come; qv_result_free for
+// Order: qv_open; qv_build; then searches, keys and notifications in any order; qv_result_free for
 // every result; qv_close. The index lies in files below the data directory, outlives the process
 // and is the same for every process that opens that directory:
 //   databases/contacts2.db  the contacts, read only
 //   files/pyfile.bin        the pinyin table that comes with the library; it is not changed, but
 //                           must be writable for the process that builds
-//   files/                  what the library writes; the directory must be there
+//   files/                  what the library writes; the directory must exist
 //
 // Text is UTF-8, zero-terminated, of any Unicode characters; sizes count bytes, positions in names
 // and texts count characters. Malformed, overlong and surrogate bytes are QV_ERROR_UTF8.
 //
-// Results are QV_OK or one of the negative codes, unless a function says otherwise; qv_strerror has
-// their words. A failed call leaves its out arguments as they were, except that the pointers that
-// would receive an index or a result become null.
+// Results are QV_OK or one of the negative codes, unless a function says otherwise; qv_strerror
+// describes them. A failed call leaves its out arguments as they were, except that the pointers
+// that would receive an index or a result become null.
 //
-// Threads: the library starts none and synchronises nothing but qv_open and qv_close. Calls on one
-// index come one at a time, as do those of one result while it is searched within or released;
-// reading a result takes no turn. Searches on indexes of their own may run side by side.
-// Processes, and indexes within one, exclude each other by a lock on files/memlock.ini. A function
-// that waits for it says how long.
+// Threads: the library starts none and synchronises only qv_open and qv_close. Calls on one index
+// must come one at a time, and so must calls that search within or release one result; any thread
+// may read a result meanwhile. Searches on different indexes may run concurrently. Processes, and
+// indexes within one, exclude each other by a lock on files/memlock.ini. A function that waits for
+// it says how long.
 //
-// Whenever the library opens a file for writing, or the lock, it sets the file-creation mask of the
-// process to 0 and leaves it so; its files have the permission bits 0777, and the mode of files/,
-// 0700 as a rule, protects them. A process with a need for its own mask sets it again after a call.
+// When the library opens a file for writing, or the lock, it sets the file-creation mask of the
+// process to 0 and does not restore it; its files have the permission bits 0777, and the mode of
+// files/, usually 0700, protects them. A process that needs its own mask sets it again after a
+// call.
 
 #include <stddef.h>
 #include <stdint.h>
@@ -49,18 +50,18 @@ extern "C"
     {
         QV_OK = 0,
         QV_ERROR_ARGUMENT = -1,        // null, or a value that has no meaning there
-        QV_ERROR_MEMORY = -2,          // none left
+        QV_ERROR_MEMORY = -2,          // an allocation failed
         QV_ERROR_UTF8 = -3,            // a text is not UTF-8
         QV_ERROR_TOO_LONG = -4,        // a text has too many characters
         QV_ERROR_BUFFER = -5,          // the caller's buffer is too small
-        QV_ERROR_DIRECTORY = -6,       // the data directory is not there or its path is too long
+        QV_ERROR_DIRECTORY = -6,       // the data directory is missing or its path is too long
         QV_ERROR_OTHER_DIRECTORY = -7, // the process has another data directory open
-        QV_ERROR_DATABASE = -8,        // the contacts database is not there or not readable
-        QV_ERROR_PINYIN = -9,          // the pinyin table is not there or cannot be mapped
+        QV_ERROR_DATABASE = -8,        // the contacts database is missing or not readable
+        QV_ERROR_PINYIN = -9,          // the pinyin table is missing or cannot be mapped
         QV_ERROR_STORE = -10,     // database or index files: locked, full, damaged, not writable
         QV_ERROR_CHARACTER = -11, // the pinyin table does not have the character
         QV_ERROR_NOT_BUILT = -12, // there is no index to search yet
-        QV_ERROR_PLATFORM = -13   // not to be had on this platform
+        QV_ERROR_PLATFORM = -13   // not available on this platform
     };
 
     // What the typed text is and where it is searched.
@@ -75,14 +76,14 @@ extern "C"
     // ignore it.
     enum qv_filter_kind
     {
-        QV_FILTER_GROUP = 0,        // members of the group; group -1 has the secret contacts
+        QV_FILTER_GROUP = 0,        // members of the group; group -1: secret contacts
         QV_FILTER_ACCOUNT = 1,      // contacts with data in the account
         QV_FILTER_PHONE = 2,        // contacts with a phone number
         QV_FILTER_STARRED = 5,      // favourites
         QV_FILTER_NOT_GROUP = 6,    // contacts outside the group
         QV_FILTER_MAIL = 7,         // contacts with a mail address
         QV_FILTER_POSTAL = 8,       // contacts with a postal address
-        QV_FILTER_NOT_ACCOUNT = 9,  // contacts not confined to the accounts named so
+        QV_FILTER_NOT_ACCOUNT = 9,  // contacts not confined to the accounts of these filters
         QV_FILTER_NOT_CONTACT = 10, // all contacts but the one with the id
         QV_FILTER_ONLINE = 11       // contacts that are online
     };
@@ -106,7 +107,7 @@ extern "C"
     // An open data directory.
     typedef struct qv_index qv_index;
 
-    // What a search found: a copy of its own, which later changes of the index do not reach.
+    // What a search found: a copy, which later changes of the index do not affect.
     typedef struct qv_result qv_result;
 
     // One condition on contacts.
@@ -116,11 +117,11 @@ extern "C"
         int32_t id;   // of a group, an account or a contact
     } qv_filter;
 
-    // What to search for. Every filter must hold; they are not looked at within a previous result
+    // What to search for. A match passes every filter; filters are ignored within a previous result
     // and for special numbers.
     typedef struct qv_query
     {
-        const char* text;         // at most QV_MAX_TYPED characters; empty lists everybody
+        const char* text;         // at most QV_MAX_TYPED characters; empty lists all
         int32_t kind;             // QV_KIND_*
         const qv_filter* filters; // may be null when there are none
         size_t filter_count;      // of filters
@@ -129,12 +130,12 @@ extern "C"
     // One found contact.
     typedef struct qv_match
     {
-        int32_t contact_id; // as in the database
-        int32_t name_order; // its place among all contacts in name order
-        uint32_t codes[11]; // the name as it is matched, one code per character, 0 behind the last
-        uint32_t reserved[5];    // always 0 in an index that this library wrote
-        uint16_t last;           // last matched character of the name; 0 for an empty text
-        uint16_t first;          // first matched character of the name, from 0
+        int32_t contact_id;   // as in the database
+        int32_t name_order;   // its place among all contacts in name order
+        uint32_t codes[11];   // the name as it is matched, one code per character, 0 after the last
+        uint32_t reserved[5]; // always 0 in an index that this library wrote
+        uint16_t last;        // last matched character of the name; 0 for an empty text
+        uint16_t first;       // first matched character of the name, from 0
         int32_t index_character; // for an empty text 'A' to 'Z' or '#', in time order '1' to '5'
                                  // (less than 30, 90, 180, 360 days ago, longer); else 0
         int64_t last_contacted;  // milliseconds since 1970, UTC; 0 for never
@@ -153,13 +154,12 @@ extern "C"
     typedef void (*qv_log_function)(void* userdata, int priority, const char* tag,
                                     const char* text);
 
-    // The words for a result, in English; for a number that is none, words that say so. Never null.
+    // Describes a result, in English; for an unknown number the text says so. Never null.
     QV_API const char* qv_strerror(int status);
 
-    // Sends the log lines of the whole process to callback, which is handed userdata; null brings
-    // back what stands at the beginning: errors go to standard error, progress nowhere. Called
-    // while no other call of the library runs. On Android the system's log has the lines:
-    // QV_ERROR_PLATFORM.
+    // Sends the log lines of the whole process to callback, with userdata; null restores the
+    // default: errors go to standard error, progress is dropped. Call it while no other call of the
+    // library runs. QV_ERROR_PLATFORM on Android, where the lines are in the system's log.
     QV_API int qv_set_log(qv_log_function callback, void* userdata);
 
     // Opens a data directory, which must exist, into *index; null means that of the contacts
@@ -172,9 +172,9 @@ extern "C"
 
     // 1 when there is no index to search, 0 when there is one; QV_ERROR_ARGUMENT for null.
     QV_API int qv_needs_build(qv_index* index);
-    // Builds the index from the database, unless force is 0 and there is one. The lock is tried for
-    // a second, then QV_ERROR_STORE. After a failure the old index stays. Builds, changes of the
-    // database and their notifications are the business of one process at a time.
+    // Builds the index from the database, unless force is 0 and the index is complete. The lock is
+    // tried for a second, then QV_ERROR_STORE. After a failure the old index stays. Only one
+    // process at a time may build, change the database and send notifications.
     QV_API int qv_build(qv_index* index, int force);
 
     // Searches into *result: within previous, which is only read and stays the caller's, or, when
@@ -191,7 +191,7 @@ extern "C"
     QV_API size_t qv_result_count(const qv_result* result);
     QV_API const qv_match* qv_result_matches(const qv_result* result);
     // Points *page at count matches from start on, without copying them. QV_ERROR_ARGUMENT for
-    // matches beyond the end; none may begin right at the end.
+    // matches beyond the end; with a count of 0, start may be the end.
     QV_API int qv_result_page(const qv_result* result, size_t start, size_t count,
                               const qv_match** page);
     // The place of a contact in the result, or -1.
@@ -201,14 +201,14 @@ extern "C"
     QV_API size_t qv_result_sections(const qv_result* result, qv_section sections[QV_MAX_SECTIONS]);
     // The keys that can usefully be typed next, QV_KEY_*. 0 for a null result.
     QV_API uint32_t qv_next_keys(const qv_result* result);
-    // The Chinese characters that the last typed letters may stand for, one behind the other, at
+    // The Chinese characters that the last typed letters may stand for, one after another, at
     // most 20; valid as long as the result. Empty for a null result.
     QV_API const char* qv_candidates(const qv_result* result);
 
     // Writes the localizer key of a name, which the contacts database keeps in
     // localizer.localizerkey: one code per character for its first ten characters. QV_KEY_SIZE
-    // bytes are enough. Where the index was never built, the shared copy of the pinyin table is
-    // made first.
+    // bytes are enough. If the index was never built, the shared copy of the pinyin table is
+    // written first.
     QV_API int qv_localizer_key(qv_index* index, const char* name, char* buffer, size_t size);
     // The same for count names with one mapping of the pinyin table. Nothing is written unless all
     // names are UTF-8.
@@ -219,17 +219,17 @@ extern "C"
     // for the letters that end before the character at position: the text up to the last letter
     // before position that begins a reading of word, in capitals, and word. Where no letter fits,
     // the text in small letters. A word of up to three letters or digits is appended. text has at
-    // most QV_MAX_TYPED characters; a position behind its end is the end. QV_PICK_SIZE bytes are
+    // most QV_MAX_TYPED characters; a position after its end is the end. QV_PICK_SIZE bytes are
     // enough. QV_ERROR_CHARACTER for a character that the pinyin table does not have.
     QV_API int qv_pick(qv_index* index, const char* text, int position, const char* word,
                        char* buffer, size_t size);
 
-    // Notifications, after the change is in the database. They wait for the lock as long as it
-    // takes, a rebuild for a second. What they cannot do is in the log, and the next notification
-    // of contacts or status rebuilds the index.
+    // Notifications, after the change is in the database. They wait for the lock without limit, a
+    // rebuild for a second. Their failures are in the log, and the next notification of contacts or
+    // status rebuilds the index.
 
-    // These contacts appeared, changed or went. Contacts that appear or go together are named in
-    // one call. For more than 200 the index is rebuilt.
+    // These contacts were added, changed or removed. Contacts that are added or removed together
+    // are named in one call. For more than 200 the index is rebuilt.
     QV_API int qv_contacts_changed(qv_index* index, const int64_t* ids, size_t count);
     // Any contacts may have changed: rebuilds the index.
     QV_API int qv_all_contacts_changed(qv_index* index);
@@ -240,11 +240,11 @@ extern "C"
     // The contact became a favourite, or with 0 ceased to be one.
     QV_API int qv_star_changed(qv_index* index, int32_t contact_id, int starred);
 
-    // The order of the index, QV_SORT_*; QV_SORT_NAME where there is no index. QV_ERROR_ARGUMENT
+    // The order of the index, QV_SORT_*; QV_SORT_NAME if there is no index. QV_ERROR_ARGUMENT
     // for null.
     QV_API int qv_get_sort_type(qv_index* index);
-    // Sets the order, which the next build or notification of contacts or status brings about.
-    // QV_ERROR_STORE where there is no index.
+    // Sets the order, which takes effect with the next build or notification of contacts or status.
+    // QV_ERROR_STORE if there is no index.
     QV_API int qv_set_sort_type(qv_index* index, int sort_type);
 
 #ifdef __cplusplus

@@ -1,5 +1,5 @@
-// The native half of org.qvlocalize: strings between UTF-16 and UTF-8, arrays, and exceptions for
-// results. Nothing is kept between calls.
+// The native half of org.qvlocalize: converts strings between UTF-16 and UTF-8, arrays, and results
+// to exceptions. It has no state between calls.
 
 #include "bindings/c/qvlocalize.h"
 
@@ -10,7 +10,7 @@
 #include <memory>
 #include <new>
 
-// An array of pairs of ints comes as it is.
+// A Java array of pairs of ints is used as an array of filters.
 static_assert(sizeof(qv_filter) == 2 * sizeof(jint), "kind and id");
 static_assert(sizeof(qv_section) == 3 * sizeof(jint), "label, first and count");
 static_assert(sizeof(jlong) == sizeof(int64_t), "ids are passed on as they are");
@@ -37,7 +37,7 @@ void ThrowNew(JNIEnv* pEnv, const char* szClass, const char* szWords)
     }
 }
 
-// True for QV_OK and above; else a QvException is on its way.
+// True for QV_OK and above; else false with a QvException pending.
 bool Check(JNIEnv* pEnv, int iStatus)
 {
     if (iStatus >= 0)
@@ -72,7 +72,7 @@ bool IsSurrogate(jchar unit)
     return unit >= FIRST_HIGH_SURROGATE && unit <= LAST_SURROGATE;
 }
 
-// Encodes a character; the place behind it.
+// Encodes a character; returns the place after it.
 char* Append(uint32_t uCharacter, char* pTarget)
 {
     const auto continuation = [uCharacter](int iShift)
@@ -135,7 +135,7 @@ bool Encode(const jchar* pUnits, jsize iUnits, char* pTarget)
 class CText
 {
 public:
-    // With an exception on its way where Get gives null.
+    // If Get returns null, an exception is pending.
     CText(JNIEnv* pEnv, jstring text)
     {
         if (text == nullptr)
@@ -181,8 +181,8 @@ private:
     std::unique_ptr<char[]> m_bytes;
 };
 
-// A Java string of what the library writes, which is short and well-formed; null with an exception
-// on its way.
+// A Java string of the library's text, which is short and well-formed; null with an exception
+// pending.
 jstring NewString(JNIEnv* pEnv, const char* szText)
 {
     jchar aUnits[SHORT_TEXT];
@@ -248,7 +248,7 @@ public:
     CFilters(const CFilters&) = delete;
     CFilters& operator=(const CFilters&) = delete;
 
-    // Null with an exception on its way.
+    // Null with an exception pending.
     const qv_filter* Get() const { return m_pFilters; }
     size_t Count() const { return static_cast<size_t>(m_iCount); }
 
@@ -259,7 +259,7 @@ private:
     qv_filter* m_pFilters = m_aFew;
 };
 
-// The names of a Java array in UTF-8; false with an exception on its way.
+// The names of a Java array in UTF-8; false with an exception pending.
 bool LoadNames(JNIEnv* pEnv, jobjectArray names, jsize iCount, std::unique_ptr<char[]>* pTexts,
                const char** pszTexts)
 {
@@ -453,7 +453,7 @@ jobject Java_org_qvlocalize_Result_matches(JNIEnv* pEnv, jclass /*type*/, jlong 
     {
         return nullptr;
     }
-    // The buffer only reads.
+    // The Java class only reads the buffer.
     return pEnv->NewDirectByteBuffer(
         const_cast<qv_match*>(pMatches),
         static_cast<jlong>(qv_result_count(ResultOf(result)) * sizeof(qv_match)));

@@ -12,10 +12,10 @@
             typing.type("h")
             print(len(typing.result), typing.result.next_keys, typing.result.candidates)
 
-A process has one data directory open at a time. Calls on one index, from whatever threads, wait for
-each other. Failures raise Error, whose words are the library's and whose code is a Status. The
-module finds libqvlocalize.so.1 where QVLOCALIZE_LIBRARY says, in the installation that it is part
-of, or where the system looks.
+A process has one data directory open at a time. Calls on one index, from any threads, wait for each
+other. Failures raise Error, with the library's description and a Status as its code. The module
+finds libqvlocalize.so.1 at QVLOCALIZE_LIBRARY, in its own installation, or in the system's library
+path.
 """
 
 from __future__ import annotations
@@ -36,7 +36,7 @@ __all__ = ["Error", "Index", "Kind", "Match", "Result", "Section", "SortType", "
 
 
 class Status(enum.IntEnum):
-    """What the library's functions return; qvlocalize.h tells more."""
+    """What the library's functions return; qvlocalize.h describes it."""
     OK = 0
     ERROR_ARGUMENT = -1
     ERROR_MEMORY = -2
@@ -165,7 +165,7 @@ _lib = _load()
 
 
 class Error(Exception):
-    """A failure of the library, in its words."""
+    """A failure of the library, with its description."""
 
     def __init__(self, code: int):
         super().__init__(_lib.qv_strerror(code).decode())
@@ -194,8 +194,8 @@ _log_function = _LogFunction(0)  # kept for as long as the library may call it
 
 
 def set_log(callback: Optional[Callable[[int, str, str], None]]) -> None:
-    """Hands each line of the library's log to callback(priority, tag, text), priority 3 for
-    progress and 6 for errors; None brings back standard error for the errors. No other call of the
+    """Sends each line of the library's log to callback(priority, tag, text), priority 3 for
+    progress and 6 for errors; None restores standard error for the errors. No other call of the
     library may run meanwhile, and the callback must not call it."""
     global _log_function
     function = _LogFunction(0)
@@ -231,8 +231,8 @@ def _match(entry: _Match) -> Match:
 
 
 class Result(Sequence):
-    """What a search found, the best match first. Later changes of the index do not reach it, and it
-    may outlive the index. It is released with the object, or by close, or at the end of a with."""
+    """What a search found, the best match first. Later changes of the index do not affect it. It may
+    outlive the index, and is released with the object, by close, or at the end of a with."""
 
     def __init__(self, pointer: ctypes.c_void_p, lock: threading.Lock):
         self._pointer = pointer
@@ -339,16 +339,16 @@ class Index:
         return self._call(_lib.qv_needs_build) != 0
 
     def build(self, force: bool = False) -> None:
-        """Builds the index from the database, unless force is False and there is one."""
+        """Builds the index from the database, unless force is False and it is complete."""
         self._call(_lib.qv_build, force)
 
     def search(self, text: str, kind: Kind = Kind.WORD, *, within: Optional[Result] = None,
                starred: bool = False, phone: bool = False, mail: bool = False,
                postal: bool = False, online: bool = False, group: Ids = None, account: Ids = None,
                not_group: Ids = None, not_account: Ids = None, not_contact: Ids = None) -> Result:
-        """Searches for at most ten characters, an empty text for everybody, among the contacts that
-        pass all filters, or within an earlier result, which is not changed and for which filters
-        are not looked at. Filters with an id take one or several; group -1 has the secret contacts.
+        """Searches for at most ten characters, or lists all for an empty text, among the contacts
+        that pass all filters, or within an earlier result, which is not changed and for which
+        filters are ignored. Filters with an id take one or several; group -1: secret contacts.
         """
         filters = _filters(starred=starred, phone=phone, mail=mail, postal=postal, online=online,
                            group=group, account=account, not_group=not_group,
@@ -360,7 +360,7 @@ class Index:
         return Result(found, self._lock)
 
     def typing(self, kind: Kind = Kind.WORD, **filters: Any) -> Typing:
-        """A session of somebody who types, with the filters of search."""
+        """A typing session with the filters of search."""
         return Typing(self, kind, **filters)
 
     def localizer_key(self, name: str) -> str:
@@ -382,7 +382,7 @@ class Index:
         return buffer.value.decode()
 
     def contacts_changed(self, ids: Iterable[int]) -> None:
-        """These contacts appeared, changed or went, and the database has the change."""
+        """These contacts were added, changed or removed, and the database has the change."""
         changed = list(ids)
         self._call(_lib.qv_contacts_changed, (ctypes.c_int64 * len(changed))(*changed),
                    len(changed))
@@ -427,8 +427,8 @@ def _filters(**wanted: Union[bool, Ids]) -> List[_Filter]:
 
 
 class Typing:
-    """A text that grows key by key, each search looking within the matches before it, and that can
-    be taken back."""
+    """A text that is typed key by key: each search narrows the matches before it, and keys can be
+    taken back."""
 
     def __init__(self, index: Index, kind: Kind, **filters: Any):
         self._index = index
@@ -463,20 +463,20 @@ class Typing:
         return self.result
 
     def back(self) -> Result:
-        """Takes the last key back; the empty text stays as it is."""
+        """Removes the last key; an empty text stays empty."""
         if len(self._steps) > 1:
             self._steps.pop()
         return self.result
 
     def pick(self, character: str) -> Result:
-        """Puts a candidate character in place of the last letters that it may stand for."""
+        """Replaces the last letters by a candidate character that they may stand for."""
         text = self._index.pick(self.text, len(self.text), character)
         kept = len(os.path.commonprefix([text.lower(), self.text.lower()]))
         del self._steps[kept + 1:]
         return self.type(text[kept:])
 
     def close(self) -> None:
-        """Ends the session; results that somebody still holds stay."""
+        """Ends the session; results that the caller still holds stay valid."""
         self._steps.clear()
 
     def __enter__(self) -> Typing:

@@ -51,7 +51,7 @@ public final class Index implements AutoCloseable {
             this.id = id;
         }
 
-        /** Members of the group; group -1 has the secret contacts. */
+        /** Members of the group; group -1: secret contacts. */
         public static Filter group(int id) {
             return new Filter(0, id);
         }
@@ -86,7 +86,7 @@ public final class Index implements AutoCloseable {
             return new Filter(8, 0);
         }
 
-        /** Contacts not confined to the accounts named so. */
+        /** Contacts not confined to the accounts of these filters. */
         public static Filter notAccount(int id) {
             return new Filter(9, id);
         }
@@ -133,14 +133,14 @@ public final class Index implements AutoCloseable {
         return needsBuild(handle());
     }
 
-    /** Builds the index from the database, unless force is false and there is one. */
+    /** Builds the index from the database, unless force is false and it is complete. */
     public synchronized void build(boolean force) {
         build(handle(), force);
     }
 
     /**
-     * Searches among all contacts that pass the filters for at most ten characters, an empty text
-     * for everybody. The best match comes first.
+     * Searches among all contacts that pass the filters for at most ten characters; an empty text
+     * lists all of them. The best match comes first.
      */
     public synchronized Result search(String text, Kind kind, Filter... filters) {
         final int[] pairs = new int[2 * filters.length];
@@ -176,7 +176,7 @@ public final class Index implements AutoCloseable {
         return pick(handle(), text, position, character);
     }
 
-    /** These contacts appeared, changed or went, and the database has the change. */
+    /** These contacts were added, changed or removed, and the database has the change. */
     public synchronized void contactsChanged(long... ids) {
         contactsChanged(handle(), ids);
     }
@@ -206,7 +206,7 @@ public final class Index implements AutoCloseable {
         return SortType.values()[sortType(handle())];
     }
 
-    /** Sets the order, which the next build or notification of contacts or status brings about. */
+    /** Sets the order for the next build or notification of contacts or status. */
     public synchronized void setSortType(SortType sortType) {
         setSortType(handle(), sortType.ordinal());
     }

@@ -1,10 +1,10 @@
 package org.qvlocalize;
 
-/** A failure of the library, in its words. */
+/** A failure of the library, with its description. */
 public final class QvException extends RuntimeException {
     private static final long serialVersionUID = 1;
 
-    /** What {@link #code} may be; qvlocalize.h tells more. */
+    /** The values of {@link #code}; qvlocalize.h describes them. */
     public static final int ARGUMENT = -1;
     public static final int MEMORY = -2;
     public static final int UTF8 = -3;

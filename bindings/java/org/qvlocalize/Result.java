@@ -7,9 +7,8 @@ import java.util.List;
 import java.util.Objects;
 
 /**
- * What a search found, the best match first. Later changes of the index do not reach it. The matches
- * are read where the library keeps them, which is why nothing but close releases them. Any thread
- * may call.
+ * What a search found, the best match first. Later changes of the index do not affect it. The
+ * matches are read in the library's memory, which only close releases. Any thread may call.
  */
 public final class Result implements AutoCloseable {
     /** The matches of an empty text with one index character. */
@@ -40,7 +39,7 @@ public final class Result implements AutoCloseable {
         }
     }
 
-    // A match as the library lays it out.
+    // The layout of a match in the library.
     private static final int MATCH_BYTES = 88;
     private static final int CONTACT_ID = 0;
     private static final int NAME_ORDER = 4;

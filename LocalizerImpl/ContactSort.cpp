@@ -12,6 +12,7 @@
 #include "Common/NameOrder.h"
 #include "Common/SortSteps.h"
 #include "Core/Records/LocalizerCodes.h"
+#include "LocalizerImpl/QVLocalizerManager.h"
 
 #include <cstring>
 #include <memory>
@@ -222,4 +223,19 @@ void SortContacts(tag_ContactsStruct* pRecords, int iCount, Common_Sort_enum typ
         Common_Qsort sorter;
         sorter.QuickSort(reinterpret_cast<char*>(pRecords), iCount, type);
     }
+}
+
+int CQVLocalizerManager::LocalizerQuickSort(tag_ContactsStruct* pRecords, int iCount, int iSortType)
+{
+    if (iSortType == STORE_ORDER_TIME)
+    {
+        SortContacts(pRecords, iCount, SORT_TIME);
+        return 0;
+    }
+    SortContacts(pRecords, iCount, SORT_NAME);
+    for (int i = 0; pRecords != nullptr && i < iCount; ++i)
+    {
+        pRecords[i].iSortIndex = i;
+    }
+    return 0;
 }

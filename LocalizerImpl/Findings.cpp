@@ -3,8 +3,7 @@
 #include <new>
 
 CFindings::CFindings(CPieceTable& table)
-    : m_table(table),
-      m_pMarks(new (std::nothrow) tag_Mark[static_cast<size_t>(table.KeyCount())]())
+    : m_table(table), m_pMarks(new (std::nothrow) tag_Mark[static_cast<size_t>(table.KeyCount())]())
 {
 }
 

@@ -1,8 +1,6 @@
-// The ranking of matches and the order of stored records.
+#include "LocalizerImpl/MatchRanking.h"
 
-#include "LocalizerImpl/ContactSort.h"
-#include "LocalizerImpl/QVLocalizerManager.h"
-#include "LocalizerImpl/RankingOrder.h"
+#include "LocalizerImpl/StepQuickSort.h"
 
 #include <algorithm>
 #include <iterator>
@@ -12,8 +10,6 @@
 
 namespace
 {
-
-constexpr int RANGE_STACK_DEPTH = 32;
 
 // Places in name order are sorted digit by digit.
 constexpr int DIGIT_BITS = 8;
@@ -54,85 +50,6 @@ int CompareFit(const _MatchResult& a, const _MatchResult& b)
         return EndOf(a) > EndOf(b) ? -1 : 1;
     }
     return 0;
-}
-
-// Negative when a comes before b in the ranking, positive when behind.
-int CompareMatches(const _MatchResult& a, const _MatchResult& b, const tag_LocalizerDetail* pDetail)
-{
-    const int iFit = CompareFit(a, b);
-    if (iFit != 0)
-    {
-        return iFit;
-    }
-    const int32_t iIndexA = pDetail[a.iIndex].iSortIndex;
-    const int32_t iIndexB = pDetail[b.iIndex].iSortIndex;
-    return static_cast<int>(iIndexA > iIndexB) - static_cast<int>(iIndexA < iIndexB);
-}
-
-// Moves the items around the first one as a hole travels between the ends; returns where the first
-// one came to stand.
-template <typename Item, typename Compare>
-int Partition(Item* pItems, int iLow, int iHigh, Compare compare)
-{
-    const Item pivot = pItems[iLow];
-    int i = iLow;
-    int j = iHigh;
-    while (i < j)
-    {
-        while (j > i && compare(pItems[j], pivot) >= 0)
-        {
-            --j;
-        }
-        if (j > i)
-        {
-            pItems[i++] = pItems[j];
-        }
-        while (i < j && compare(pItems[i], pivot) <= 0)
-        {
-            ++i;
-        }
-        if (i < j)
-        {
-            pItems[j--] = pItems[i];
-        }
-    }
-    pItems[i] = pivot;
-    return i;
-}
-
-// Quicksort of items iLow..iHigh whose pivot is the first item; which order equal items end in
-// depends on its steps alone. They leave a sorted range as it is, so it is not partitioned.
-template <typename Item, typename Compare>
-void QuickSort(Item* pItems, int iLow, int iHigh, Compare compare)
-{
-    // Ranges do not meet again once they are parted, so the longer one can wait on a small stack.
-    struct tag_Range
-    {
-        int iLow;
-        int iHigh;
-    };
-    tag_Range aWaiting[RANGE_STACK_DEPTH];
-    int iWaiting = 0;
-    const auto before = [compare](const Item& a, const Item& b) { return compare(a, b) < 0; };
-    for (;;)
-    {
-        while (iLow < iHigh && !std::is_sorted(pItems + iLow, pItems + iHigh + 1, before))
-        {
-            const int iPivot = Partition(pItems, iLow, iHigh, compare);
-            const bool bLeftLonger = iPivot - iLow > iHigh - iPivot;
-            aWaiting[iWaiting++] =
-                bLeftLonger ? tag_Range{iLow, iPivot - 1} : tag_Range{iPivot + 1, iHigh};
-            iLow = bLeftLonger ? iPivot + 1 : iLow;
-            iHigh = bLeftLonger ? iHigh : iPivot - 1;
-        }
-        if (iWaiting == 0)
-        {
-            return;
-        }
-        --iWaiting;
-        iLow = aWaiting[iWaiting].iLow;
-        iHigh = aWaiting[iWaiting].iHigh;
-    }
 }
 
 int BucketOf(const _MatchResult& match)
@@ -292,6 +209,18 @@ bool SortWithTies(const android::Vector<_MatchResult>& vMatches, const uint16_t*
 
 } // namespace
 
+int CompareMatches(const _MatchResult& a, const _MatchResult& b, const tag_LocalizerDetail* pDetail)
+{
+    const int iFit = CompareFit(a, b);
+    if (iFit != 0)
+    {
+        return iFit;
+    }
+    const int32_t iIndexA = pDetail[a.iIndex].iSortIndex;
+    const int32_t iIndexB = pDetail[b.iIndex].iSortIndex;
+    return static_cast<int>(iIndexA > iIndexB) - static_cast<int>(iIndexA < iIndexB);
+}
+
 int RankMatches(android::Vector<_MatchResult>& vMatches, const uint16_t* pFirstSplits,
                 tag_LocalizerDetail* pDetail)
 {
@@ -309,60 +238,5 @@ int RankMatches(android::Vector<_MatchResult>& vMatches, const uint16_t* pFirstS
         return -1;
     }
     std::copy_n(sorted.get(), uCount, vMatches.editArray());
-    return 0;
-}
-
-int CQVLocalizerManager::AddToVector(android::Vector<_MatchResult>& vMatches, _MatchResult match)
-{
-    for (size_t i = 0; i < vMatches.size(); ++i)
-    {
-        if (vMatches[i].iIndex == match.iIndex)
-        {
-            vMatches.replaceAt(match, i);
-            return 0;
-        }
-    }
-    vMatches.push(match);
-    return 0;
-}
-
-int CQVLocalizerManager::LocalResultQuickSort(android::Vector<_MatchResult>& vMatches, int iLow,
-                                              int iHigh, tag_LocalizerDetail* pDetail)
-{
-    QuickSort(vMatches.editArray(), iLow, iHigh,
-              [pDetail](const _MatchResult& a, const _MatchResult& b)
-              { return CompareMatches(a, b, pDetail); });
-    return 1;
-}
-
-void CQVLocalizerManager::LocalResultQuickSort(android::Vector<_MatchResult>& vMatches,
-                                               tag_LocalizerDetail* pDetail)
-{
-    for (size_t i = 0; i < vMatches.size(); ++i)
-    {
-        for (size_t j = i; j < vMatches.size(); ++j)
-        {
-            if (CompareMatches(vMatches[j], vMatches[i], pDetail) < 0)
-            {
-                const _MatchResult earlier = vMatches[j];
-                vMatches.replaceAt(_MatchResult(vMatches[i]), j);
-                vMatches.replaceAt(earlier, i);
-            }
-        }
-    }
-}
-
-int CQVLocalizerManager::LocalizerQuickSort(tag_ContactsStruct* pRecords, int iCount, int iSortType)
-{
-    if (iSortType == STORE_ORDER_TIME)
-    {
-        SortContacts(pRecords, iCount, SORT_TIME);
-        return 0;
-    }
-    SortContacts(pRecords, iCount, SORT_NAME);
-    for (int i = 0; pRecords != nullptr && i < iCount; ++i)
-    {
-        pRecords[i].iSortIndex = i;
-    }
     return 0;
 }

@@ -1,7 +1,7 @@
 #ifndef QV_LOCALIZERIMPL_MATCHERTEXT_H
 #define QV_LOCALIZERIMPL_MATCHERTEXT_H
 
-// What both matchers ask of pieces and spellings.
+// What matchers and searches ask of pieces, spellings and names.
 
 #include "Core/Records/LocalizerCodes.h"
 #include "LocalizerImpl/PinyinTable.h"
@@ -54,6 +54,17 @@ inline bool IsUnit(const wchar_t* szPiece, wchar_t unit)
 inline wchar_t* LastPiece(const android::Vector<wchar_t*>& vPieces)
 {
     return vPieces.isEmpty() ? nullptr : vPieces[0];
+}
+
+// Number of codes of a name, at most CONTACT_MAX_KEY.
+inline int NameLength(const wchar_t* pCodes)
+{
+    int iLength = 0;
+    while (iLength < CONTACT_MAX_KEY && pCodes[iLength] != 0)
+    {
+        ++iLength;
+    }
+    return iLength;
 }
 
 #endif

@@ -1,14 +1,9 @@
-// The object of one search: its state, and the comparisons it is made of, one by one. How they are
-// put together for a whole search is told in SearchRun.cpp.
+// The state of a search and what matchers add to it.
 
 #include "LocalizerImpl/QVLocalizerManager.h"
 
-#include "Common/CommonQsort.h"
 #include "Common/WideString.h"
 #include "LocalizerImpl/NameFolding.h"
-#include "LocalizerImpl/PinyinTable.h"
-#include "LocalizerImpl/RunFinder.h"
-#include "LocalizerImpl/SearchRun.h"
 
 #include <algorithm>
 #include <iterator>
@@ -56,107 +51,6 @@ void CQVLocalizerManager::ClearSearch()
     m_stMask = {};
     std::fill(std::begin(m_stCNWords), std::end(m_stCNWords), CNWORDOUTPUT{});
     m_vLocateArray.clear();
-}
-
-int CQVLocalizerManager::DoSearch(tag_LocalizerResult* pCandidates, wchar_t* szInput,
-                                  IME_SEARCH_TYPE /*eSearchType*/, int bTimeOrder,
-                                  tag_LocalizerResult* pResult, long* pMask, wchar_t* szWordOut)
-{
-    if (pCandidates == nullptr || szInput == nullptr || pResult == nullptr || pMask == nullptr ||
-        szWordOut == nullptr)
-    {
-        return LOC_ERR_PARAM;
-    }
-    CSearchRun run(*this);
-    const int iRet = run.Begin(szInput);
-    if (iRet != 0)
-    {
-        return iRet;
-    }
-    const int iFound = run.Find(*pCandidates, bTimeOrder);
-    if (iFound < 0)
-    {
-        return iFound;
-    }
-    run.Finish(*pCandidates, pResult, pMask, szWordOut);
-    return 0;
-}
-
-int CQVLocalizerManager::DoCompare(PYOFWORDS* pMap, tag_LocalizerDetail* pDetail,
-                                   android::Vector<wchar_t*>& vPieces, int& iKeyLen, int& bAllFull)
-{
-    if (pMap == nullptr || pDetail == nullptr)
-    {
-        return 0;
-    }
-    const int iLength = NameLength(pDetail->szLocalizerKey);
-    const int iPieces = static_cast<int>(vPieces.size());
-    for (int iStart = 0; iStart + iPieces <= iLength; ++iStart)
-    {
-        int bRunFull = 1;
-        if (CompareRun(pMap, pDetail->szLocalizerKey + iStart, vPieces, bRunFull))
-        {
-            if (iKeyLen == 0 || (bRunFull == 1 && bAllFull == 0))
-            {
-                iKeyLen = iLength - iStart;
-            }
-            if (bAllFull == 0 && bRunFull == 1)
-            {
-                bAllFull = 1;
-            }
-            if (iStart + iPieces < iLength)
-            {
-                CreateMaskWord(pMap, pDetail->szLocalizerKey[iStart + iPieces]);
-            }
-            return 1;
-        }
-        if (m_bMatchAnywhere == 0)
-        {
-            return 0;
-        }
-    }
-    return 0;
-}
-
-// Whether every piece fits its character of the run; bRunFull becomes 0 when a Chinese character
-// took less than a whole reading.
-bool CQVLocalizerManager::CompareRun(PYOFWORDS* pMap, const wchar_t* pCodes,
-                                     const android::Vector<wchar_t*>& vPieces, int& bRunFull)
-{
-    const size_t uPieces = vPieces.size();
-    for (size_t i = 0; i < uPieces; ++i)
-    {
-        const bool bLast = i + 1 == uPieces;
-        wchar_t* szPiece = vPieces[uPieces - 1 - i];
-        if (szPiece == nullptr || !ComparePiece(pMap, pCodes[i], szPiece, bLast, bRunFull))
-        {
-            return false;
-        }
-    }
-    return true;
-}
-
-bool CQVLocalizerManager::ComparePiece(PYOFWORDS* pMap, wchar_t code, wchar_t* szPiece, bool bLast,
-                                       int& bRunFull)
-{
-    const uint16_t uCode = CodeBits(code);
-    if (IsAlphaCode(uCode))
-    {
-        return CmpEnglishWords(uCode, szPiece) != 0;
-    }
-    if (IsHanZiCode(uCode))
-    {
-        int bFull = 0;
-        const int iFits = CmpChineseWord(pMap, code, pMap[HanZiRecord(code)], szPiece, &m_stMask,
-                                         bLast ? 1 : 0, bFull);
-        bRunFull = bRunFull != 0 ? bFull : 0;
-        return iFits != 0;
-    }
-    if (IsDigitCode(uCode))
-    {
-        return CmpDigitalWord(uCode, szPiece) != 0;
-    }
-    return CmpOtherWords(uCode, szPiece) != 0;
 }
 
 void CQVLocalizerManager::ProcessInputCNWord(PYOFWORDS* pMap, wchar_t* szInput)
@@ -234,44 +128,4 @@ void CQVLocalizerManager::InsertCNWord(CNWORDOUTPUT& entry)
             return;
         }
     }
-}
-
-int CQVLocalizerManager::JudgeAllEnglish(tag_LocalizerDetail* pDetail)
-{
-    if (pDetail == nullptr)
-    {
-        return 0;
-    }
-    const int iLast = std::min(MatchLast(pDetail->iMatchPos), CONTACT_MAX_KEY);
-    for (int i = MatchFirst(pDetail->iMatchPos); i <= iLast; ++i)
-    {
-        const wchar_t code = pDetail->szLocalizerKey[i];
-        if (!IsAlphaCode(CodeBits(code)) && code != LOC_OTHER)
-        {
-            return 0;
-        }
-    }
-    return 1;
-}
-
-int CQVLocalizerManager::LocalizerSearchPos(tag_ContactsStruct* pRecords, int iCount,
-                                            tag_ContactsStruct* pRecord, int iSortType)
-{
-    if (pRecords == nullptr || pRecord == nullptr)
-    {
-        return -1;
-    }
-    const bool bByTime = iSortType == STORE_ORDER_TIME;
-    Common_Qsort sorter;
-    if (!bByTime)
-    {
-        const CPinyinTable table;
-        if (!table.IsOpen())
-        {
-            return -1;
-        }
-        SpellName(table.Records(), *pRecord);
-    }
-    return sorter.Search_Bin(reinterpret_cast<char*>(pRecords), iCount,
-                             reinterpret_cast<char*>(pRecord), bByTime ? SORT_TIME : SORT_NAME, 1);
 }

@@ -56,10 +56,9 @@ public:
     // sets bFull to whether the piece is a whole reading; the codes of the other three are cut to
     // 16 bits. A search asks once for all characters with the same readings, with a code only
     // where the text itself has a Chinese character, then for those that it reports, with their
-    // own record. What a matcher answers depends on nothing but the code, the record's readings
-    // and the piece; where a piece fits, each of its beginnings fits too; and a letter or digit
-    // fits a Chinese character only if one of its spellings begins with it. The search relies on
-    // all three.
+    // own record. The search relies on two properties: what a matcher answers depends on nothing
+    // but the code, the record's readings and the piece; and where a piece fits, each of its
+    // beginnings fits too.
     virtual int CmpChineseWord(PYOFWORDS* pMap, wchar_t code, PYOFWORDS& record, wchar_t* szPiece,
                                _mask_type* pMask, int bLastPiece, int& bFull) = 0;
     virtual int CmpEnglishWords(unsigned short code, wchar_t* szPiece) = 0;
@@ -158,13 +157,6 @@ public:
     int DoSearch(tag_LocalizerResult* pCandidates, wchar_t* szInput, IME_SEARCH_TYPE eSearchType,
                  int bTimeOrder, tag_LocalizerResult* pResult, long* pMask, wchar_t* szWordOut);
 
-    // One split, its pieces last piece first, against one name: 1 when it fits from some
-    // character on, the leftmost counting. Then iKeyLen, 0 before, is the number of codes from
-    // there to the name's end, and bAllFull, 0 before, whether every Chinese character took a
-    // whole reading; the mask and the candidate characters of the object are fed.
-    int DoCompare(PYOFWORDS* pMap, tag_LocalizerDetail* pDetail, android::Vector<wchar_t*>& vPieces,
-                  int& iKeyLen, int& bAllFull);
-
     // Replaces the Chinese characters of the text by their codes, traditional ones folded.
     void ProcessInputCNWord(PYOFWORDS* pMap, wchar_t* szInput);
 
@@ -179,16 +171,18 @@ public:
     // nMatchLen is 0.
     void InsertCNWord(CNWORDOUTPUT& entry);
 
-    // 1 when every matched character of the entry is a letter or other character; 0 also for null.
-    static int JudgeAllEnglish(tag_LocalizerDetail* pDetail);
+    // Sorts records by name (numbering iSortIndex) or, for an iSortType of 1, by last contact.
+    // Any other value acts as 0. Always 0.
+    static int LocalizerQuickSort(tag_ContactsStruct* pRecords, int iCount, int iSortType);
 
-    // Where pRecord, whose szName is still the display name, belongs among iCount stored records:
-    // 0..iCount, -1 for a null pointer or a failed mapping. In name order (any iSortType but 1)
-    // the record's szName is replaced by its pinyin key.
-    static int LocalizerSearchPos(tag_ContactsStruct* pRecords, int iCount,
-                                  tag_ContactsStruct* pRecord, int iSortType);
+    // --- For callers outside: one step of a search at a time, see StepwiseSearch.cpp ---------
 
-    // --- Ranking (see MatchRanking.cpp) -----------------------------------------------------
+    // One split, its pieces last piece first, against one name: 1 when it fits from some
+    // character on, the leftmost counting. Then iKeyLen, 0 before, is the number of codes from
+    // there to the name's end, and bAllFull, 0 before, whether every Chinese character took a
+    // whole reading; the mask and the candidate characters of the object are fed.
+    int DoCompare(PYOFWORDS* pMap, tag_LocalizerDetail* pDetail, android::Vector<wchar_t*>& vPieces,
+                  int& iKeyLen, int& bAllFull);
 
     // Keeps one match per contact: overwrites the entry with the same iIndex, else appends. 0.
     static int AddToVector(android::Vector<_MatchResult>& vMatches, _MatchResult match);
@@ -198,9 +192,15 @@ public:
     // Sorts the whole vector by exchanges: quadratic, kept for callers outside.
     static void LocalResultQuickSort(android::Vector<_MatchResult>& vMatches,
                                      tag_LocalizerDetail* pDetail);
-    // Sorts records by name (numbering iSortIndex) or, for an iSortType of 1, by last contact.
-    // Any other value acts as 0. Always 0.
-    static int LocalizerQuickSort(tag_ContactsStruct* pRecords, int iCount, int iSortType);
+
+    // 1 when every matched character of the entry is a letter or other character; 0 also for null.
+    static int JudgeAllEnglish(tag_LocalizerDetail* pDetail);
+
+    // Where pRecord, whose szName is still the display name, belongs among iCount stored records:
+    // 0..iCount, -1 for a null pointer or a failed mapping. In name order (any iSortType but 1)
+    // the record's szName is replaced by its pinyin key.
+    static int LocalizerSearchPos(tag_ContactsStruct* pRecords, int iCount,
+                                  tag_ContactsStruct* pRecord, int iSortType);
 
 protected:
     // bMatchAnywhere 0: a match begins only at a name's first character.

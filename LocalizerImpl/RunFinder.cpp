@@ -1,5 +1,7 @@
 #include "LocalizerImpl/RunFinder.h"
 
+#include "LocalizerImpl/MatcherText.h"
+
 #include <algorithm>
 #include <iterator>
 

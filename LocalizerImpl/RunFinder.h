@@ -64,15 +64,4 @@ private:
     tag_NameMatch m_match = {};
 };
 
-// Number of codes of a name, at most CONTACT_MAX_KEY.
-inline int NameLength(const wchar_t* pCodes)
-{
-    int iLength = 0;
-    while (iLength < CONTACT_MAX_KEY && pCodes[iLength] != 0)
-    {
-        ++iLength;
-    }
-    return iLength;
-}
-
 #endif

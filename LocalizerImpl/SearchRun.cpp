@@ -12,7 +12,8 @@
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
 #include "Common/WideString.h"
-#include "LocalizerImpl/RankingOrder.h"
+#include "LocalizerImpl/MatchRanking.h"
+#include "LocalizerImpl/MatcherText.h"
 
 #include <algorithm>
 #include <climits>
@@ -227,4 +228,28 @@ void CSearchRun::WriteCandidateWords(wchar_t* szWordOut) const
         }
         *szWordOut++ = word.wszWord[0];
     }
+}
+
+int CQVLocalizerManager::DoSearch(tag_LocalizerResult* pCandidates, wchar_t* szInput,
+                                  IME_SEARCH_TYPE /*eSearchType*/, int bTimeOrder,
+                                  tag_LocalizerResult* pResult, long* pMask, wchar_t* szWordOut)
+{
+    if (pCandidates == nullptr || szInput == nullptr || pResult == nullptr || pMask == nullptr ||
+        szWordOut == nullptr)
+    {
+        return LOC_ERR_PARAM;
+    }
+    CSearchRun run(*this);
+    const int iRet = run.Begin(szInput);
+    if (iRet != 0)
+    {
+        return iRet;
+    }
+    const int iFound = run.Find(*pCandidates, bTimeOrder);
+    if (iFound < 0)
+    {
+        return iFound;
+    }
+    run.Finish(*pCandidates, pResult, pMask, szWordOut);
+    return 0;
 }

@@ -1,5 +1,5 @@
-#ifndef QV_LOCALIZERIMPL_RANKINGORDER_H
-#define QV_LOCALIZERIMPL_RANKINGORDER_H
+#ifndef QV_LOCALIZERIMPL_MATCHRANKING_H
+#define QV_LOCALIZERIMPL_MATCHRANKING_H
 
 #include "Core/Records/SearchRecords.h"
 
@@ -14,5 +14,9 @@
 // found each. 0, or -1 with the vector unsorted when memory ran out.
 int RankMatches(android::Vector<_MatchResult>& vMatches, const uint16_t* pFirstSplits,
                 tag_LocalizerDetail* pDetail);
+
+// Negative when a comes before b in the ranking, positive when behind; pDetail are the candidates.
+int CompareMatches(const _MatchResult& a, const _MatchResult& b,
+                   const tag_LocalizerDetail* pDetail);
 
 #endif

@@ -43,13 +43,12 @@ std::string Sorted(const std::string& strValues, Common_Sort_enum eOrder)
     Records vRecords = MakeRecords(strValues);
     const int iCount = static_cast<int>(vRecords.size());
     EXPECT_EQ(Common_Qsort().QuickSort(Bytes(vRecords), iCount, eOrder), iCount);
-    std::string strPlaces(vRecords.size(), '\0');
-    std::transform(vRecords.begin(), vRecords.end(), strPlaces.begin(),
-                   [](const auto& record)
-                   {
-                       const int iPlace = record.iContactID;
-                       return static_cast<char>(iPlace < 26 ? 'a' + iPlace : 'A' + iPlace - 26);
-                   });
+    std::string strPlaces;
+    for (const tag_ContactsStruct& record : vRecords)
+    {
+        const int iPlace = record.iContactID;
+        strPlaces += static_cast<char>(iPlace < 26 ? 'a' + iPlace : 'A' + iPlace - 26);
+    }
     return strPlaces;
 }
 
@@ -105,28 +104,23 @@ TEST(CommonQsort, MeetsOneOfTheEqualRecords)
     {
         Records vRecords = MakeRecords(szTimes);
         const int iCount = static_cast<int>(vRecords.size());
+        char* const pRecords = Bytes(vRecords);
         std::ostringstream found;
         std::ostringstream places;
         std::ostringstream marked;
-        for (const char* szKey : {"0", "1", "2", "3", "4", "5", "6", "7", "8", "9"})
+        for (const char cKey : std::string("0123456789"))
         {
-            Records vKey = MakeRecords(szKey);
-            const auto Search = [&](int bPlace, int* pbMarked)
-            {
-                Common_Qsort sorter;
-                return pbMarked == nullptr
-                           ? sorter.Search_Bin(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME,
-                                               bPlace)
-                           : sorter.Search_BinEx(Bytes(vRecords), iCount, Bytes(vKey), SORT_TIME,
-                                                 bPlace, pbMarked);
-            };
+            Records vKey = MakeRecords({cKey});
+            char* const pKey = Bytes(vKey);
+            Common_Qsort sorter;
             int bMarked = 0;
-            const int iFound = Search(0, nullptr);
-            EXPECT_EQ(Search(0, &bMarked), iFound);
+            const int iFound = sorter.Search_Bin(pRecords, iCount, pKey, SORT_TIME, 0);
+            EXPECT_EQ(sorter.Search_BinEx(pRecords, iCount, pKey, SORT_TIME, 0, &bMarked), iFound);
             EXPECT_EQ(bMarked, 0);
             found << (iFound < 0 ? "-" : std::to_string(iFound));
-            places << Search(1, nullptr);
-            marked << Search(1, &bMarked) << (bMarked == 1 ? "!" : "");
+            places << sorter.Search_Bin(pRecords, iCount, pKey, SORT_TIME, 1);
+            marked << sorter.Search_BinEx(pRecords, iCount, pKey, SORT_TIME, 1, &bMarked);
+            marked << (bMarked == 1 ? "!" : "");
         }
         EXPECT_EQ(found.str(), szFound);
         EXPECT_EQ(places.str(), szPlaces) << szTimes;

@@ -82,11 +82,10 @@ protected:
     // Stores contacts 1, 2, ... with these names and builds the index.
     void BuildNames(const std::vector<std::string>& vNames)
     {
-        std::vector<tag_ProviderContact> vContacts;
-        for (const std::string& strName : vNames)
-        {
-            vContacts.push_back(Contact(static_cast<int>(vContacts.size()) + 1, strName));
-        }
+        std::vector<tag_ProviderContact> vContacts(vNames.size());
+        std::transform(vNames.begin(), vNames.end(), vContacts.begin(),
+                       [iId = 0](const std::string& strName) mutable
+                       { return Contact(++iId, strName); });
         Store(vContacts);
         ASSERT_EQ(m_logic.MemInit(true), 0);
         m_log.Clear();

@@ -148,7 +148,7 @@ TEST_F(CSearchTest, FailsWithoutTouchingWhatItHandsOut)
     wchar_t szInput[] = L"zs";
     tag_LocalizerResult untouched = {};
     tag_LocalizerResult* pResult = &untouched;
-    CFilterChain* pChain = &m_everybody;
+    CFilterChain* const pChain = &m_everybody;
     long lMask = MASK_UNSET;
     wchar_t szWords[CN_WORD_MAX] = {};
     const auto Code =

@@ -177,18 +177,14 @@ extern "C"
     // Nothing here outlives the machine: the disk is not waited for.
     int fdatasync(int iFd)
     {
-        if (!IsOurs(iFd))
+        const bool bFails = IsOurs(iFd) && Fails(CALLS_FILES, "fdatasync");
+        if (IsOurs(iFd) && !bFails)
         {
-            return 0;
+            tag_Mapping mapping = {nullptr, 0, true, ""};
+            std::strcpy(mapping.szFile, g_aszFiles[iFd]);
+            Tell(MAP_FLUSHED, mapping);
         }
-        if (Fails(CALLS_FILES, "fdatasync"))
-        {
-            return -1;
-        }
-        tag_Mapping mapping = {nullptr, 0, true, ""};
-        std::strcpy(mapping.szFile, g_aszFiles[iFd]);
-        Tell(MAP_FLUSHED, mapping);
-        return 0;
+        return bFails ? -1 : 0;
     }
 
     int msync(void* pAddr, size_t /*uSize*/, int iFlags)

@@ -82,9 +82,6 @@ TEST_F(CMemInitTest, ReloadsWhenAFileIsMissingOrEmpty)
     m_provider.Remove(9); // the other process's index is there: nothing is read
     EXPECT_EQ(m_logic.MemInit(false), 0);
     EXPECT_EQ(Search("").Contacts(), (Ids{9, 6}));
-    m_provider.Execute("drop table status_updates");
-    EXPECT_EQ(CLocalizerLogic().MemInit(true), 0) << "without the online state";
-    EXPECT_TRUE(m_log.Has(DEBUG_LINE, "QV_Contacts: ReadAllSmsOnlineStatus  error = -1\n"));
 }
 
 // Every line, as log.txt tells them: without the milliseconds, which differ from run to run, and
@@ -106,6 +103,8 @@ TEST_F(CMemInitTest, TellsEachStepInOrder)
     m_logic.OnContactTimeChanged(999, 1);
     m_logic.OnContactStarChanged(999, 1);
     m_logic.OnContactsTableChanged();
+    m_provider.Execute("drop table status_updates");
+    EXPECT_EQ(CLocalizerLogic().MemInit(true), 0) << "without the online state";
     std::ostringstream told;
     for (const tag_LogLine& line : m_log.Lines())
     {

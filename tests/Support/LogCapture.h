@@ -3,7 +3,6 @@
 
 #include "Platform/LogSink.h"
 
-#include <algorithm>
 #include <functional>
 #include <ostream>
 #include <string>
@@ -51,11 +50,6 @@ public:
             vTexts.insert(vTexts.end(), line.iPriority == iPriority ? 1U : 0U, line.strText);
         }
         return vTexts;
-    }
-    bool Has(int iPriority, const std::string& strText) const
-    {
-        const std::vector<std::string> vTexts = Texts(iPriority);
-        return std::find(vTexts.begin(), vTexts.end(), strText) != vTexts.end();
     }
     void Clear() { m_vLines.clear(); }
     // Runs a function at every line, in the middle of the operation that logs it: this is how a

@@ -38,7 +38,7 @@ struct tag_ImportOptions
 {
     CDataDirectory directory;
     tag_ImportSource source;
-    std::string strPinyinTable; // empty: the directory's, or the default where it has none
+    std::string strPinyinTable; // empty: the directory's, or the default if it has none
 };
 
 struct tag_Refused
@@ -47,7 +47,7 @@ struct tag_Refused
     std::string strReason;
 };
 
-// What became of a file's entries.
+// The results of a file's entries.
 struct tag_ImportReport
 {
     std::array<long, 3> vCount = {}; // by IMPORT_RESULT
@@ -123,9 +123,9 @@ void PrintReport(const std::string& strFile, const tag_ImportReport& report)
     }
 }
 
-// All ids in one call: contacts that appear together are named together, and the library rebuilds
-// the index where there are more of them than it patches. A patch cannot be complete where the
-// database has changed before without a notification.
+// Passes all ids in one call: contacts that are added together are named together, and the library
+// rebuilds the index if there are more than it patches. A patch cannot be complete if the database
+// was changed before without a notification.
 void NotifyOfChanges(std::vector<long long>& vIds)
 {
     CLocalizerLogic logic;

@@ -69,7 +69,7 @@ void PrintHeading(bool bBuilt)
               << " contacts, room for " << iCapacity << "\n";
 }
 
-// Without a capacity the index is damaged, or waits for a build.
+// A capacity of 0 means that the index is damaged or marked for a rebuild.
 bool IsIndexUsable()
 {
     int iTotal = 0;

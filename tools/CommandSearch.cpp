@@ -48,7 +48,7 @@ struct tag_SearchOptions
     bool bJson = false;
     bool bPlain = false;
 
-    // Other programs read the plain form, which holds all matches unless told otherwise.
+    // The plain form is for other programs and holds all matches unless a limit is given.
     int Limit() const { return iLimit.value_or(bPlain ? 0 : DEFAULT_LIMIT); }
 };
 
@@ -87,7 +87,7 @@ void RequireFiles(const tag_SearchOptions& options, IME_SEARCH_TYPE eType)
     options.directory.RequireIndex();
 }
 
-// How much of the text the first search takes; each further one takes a key more.
+// The length of the text of the first search; each further search has one key more.
 size_t FirstLength(const tag_SearchOptions& options, const std::wstring& wstrText)
 {
     return options.bOnce || wstrText.empty() ? wstrText.size() : 1;
@@ -113,7 +113,7 @@ bool IsDigit(wchar_t unit)
     return unit >= L'0' && unit <= L'9';
 }
 
-// For a text that looks as if it was meant for the other kind of search.
+// Prints a hint if the text looks as if it was meant for the other kind of search.
 void PrintHint(IME_SEARCH_TYPE eType, const std::wstring& wstrText)
 {
     if (eType != IME_SEARCH_NUM && std::any_of(wstrText.begin(), wstrText.end(), IsDigit))

@@ -53,7 +53,7 @@ std::string OrderText(int iSortType)
     }
 }
 
-// The copy-out waits for the lock as long as it takes, which would look like a hang here.
+// GetContactsResult waits for the lock without limit, which would look like a hang here.
 void RequireUnlocked()
 {
     CMemManger store;

@@ -15,7 +15,7 @@
 namespace
 {
 
-// How often the index is looked at while no key comes.
+// How often the index is checked while no key is pressed.
 constexpr std::chrono::milliseconds INDEX_LOOK(250);
 constexpr int FIRST_FILTER_KEY = 2; // F2
 
@@ -34,7 +34,7 @@ struct tag_TypeOptions
     bool bDigits = false;
 };
 
-// How the typing ended.
+// How the session ended.
 struct tag_Outcome
 {
     int iSignal = 0;

@@ -21,7 +21,7 @@ constexpr const char* SCHEMA =
     " hasAddress INTEGER NOT NULL DEFAULT 0);"
     "CREATE TABLE status_updates (status_update_data_id INTEGER PRIMARY KEY, status TEXT);";
 
-// A journal left beside the old file would be played back into the new one.
+// SQLite would replay a journal left beside the old file into the new one.
 void RemoveWithJournals(const std::string& strPath)
 {
     for (const char* szEnd : {"", "-journal", "-wal", "-shm"})
@@ -46,7 +46,7 @@ CSqliteDatabase Open(const std::string& strPath, bool bNew)
     return CSqliteDatabase::Create(NewPath(strPath));
 }
 
-// Changed pages stay in memory until the end, since written ones would lock readers out.
+// Keeps changed pages in memory until the commit, since writing them out would exclude readers.
 bool Begin(CSqliteDatabase& database, bool bNew)
 {
     database.Execute("PRAGMA cache_spill = OFF; BEGIN IMMEDIATE");

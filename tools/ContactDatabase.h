@@ -6,12 +6,12 @@
 
 #include <string>
 
-// Writes a provider database in one transaction: what is written shows to others, whole, with
-// Commit, and never when the object goes without it. Every operation throws CToolError.
+// Writes a provider database in one transaction: Commit makes all changes visible to others at
+// once; an object destroyed without Commit changes nothing. Every operation throws CToolError.
 class CContactDatabase
 {
 public:
-    // A new database, which takes the place of what stands at strPath with Commit.
+    // A new database; Commit puts it in place of any file at strPath.
     static CContactDatabase Replace(const std::string& strPath);
     // The database at strPath, or a new one where there is none.
     static CContactDatabase Extend(const std::string& strPath);
@@ -19,7 +19,7 @@ public:
     CContactDatabase(const CContactDatabase&) = delete;
     CContactDatabase& operator=(const CContactDatabase&) = delete;
 
-    // Writes a contact whose id nothing in the database has yet.
+    // Writes a contact whose id the database does not have yet.
     void Add(const tag_DatabaseContact& contact);
     // Reads the name, key, groups, starred, phone, mail and address of contact.llID; false when
     // the database has no such contact.
@@ -36,7 +36,7 @@ private:
     std::string m_strPath;
     bool m_bNew; // lies beside m_strPath until Commit
     CSqliteDatabase m_database;
-    bool m_bBegun; // stands before the statements, which need the tables
+    bool m_bBegun; // declared before the statements, which need the tables
     CSqliteStatement m_addContact;
     CSqliteStatement m_addVisible;
     CSqliteStatement m_addLocalizer;

@@ -18,7 +18,7 @@ constexpr const char* LAST_ID =
     " SELECT max(_id) FROM visible_contacts UNION ALL SELECT max(contact_id) FROM localizer"
     " UNION ALL SELECT max(contact_id) FROM qv_imported_uids)";
 
-// The database, which has the table now.
+// Creates the table with its statement szTable; returns the database.
 const CSqliteDatabase& WithTable(const CSqliteDatabase& database, const char* szTable)
 {
     CSqliteStatement(database, szTable).Step();

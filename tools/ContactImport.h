@@ -14,17 +14,17 @@
 #include <unordered_set>
 #include <vector>
 
-// The groups that imported contacts are members of: every name keeps its id in a table of the
-// tool's own, apart from the ids that the database uses besides.
+// The groups of imported contacts: a table of the tool's own keeps the id of every name, distinct
+// from all other group ids in the database.
 class CImportedGroups
 {
 public:
     explicit CImportedGroups(const CSqliteDatabase& database);
 
-    // The list of ids with the named groups in place of those of the table; ids that the table
-    // does not have stay.
+    // The list of ids with the ids of the table replaced by those of the named groups; other ids
+    // stay.
     std::string Renewed(const std::string& strIds, const std::vector<std::string>& vNames);
-    // By name, those that this import named.
+    // The ids of the groups that this import named, by name.
     const std::map<std::string, int64_t>& Named() const { return m_named; }
 
 private:
@@ -38,19 +38,19 @@ private:
     CSqliteStatement m_add;
 };
 
-// Finds the contact that an entry means: the one that was imported under the entry's uid, else the
-// first visible one of the same name, those without a uid before the others, and others only for an
-// entry that has none. A name finds a contact once, so that two people of one name stay two.
+// Finds the contact of an entry: the one that was imported under the entry's uid, else the first
+// visible one of the same name; contacts without a uid come first, and contacts with one match only
+// an entry without. Each contact is found once by name, so that two people of one name stay two.
 class CImportedContacts
 {
 public:
     explicit CImportedContacts(const CSqliteDatabase& database);
 
-    // The contact's id, 0 when the entry is a new one.
+    // The contact's id, 0 when the entry is new.
     int64_t Find(const tag_ImportEntry& entry);
     // An id that no contact has or had in this database.
     int64_t NewId();
-    // The contact is from now on the one with the uid.
+    // Assigns the uid to the contact.
     void SetUid(int64_t llID, const std::string& strUid);
 
 private:
@@ -59,7 +59,7 @@ private:
     int64_t FindByName(Waiting& names, const std::string& strName);
 
     std::unordered_map<std::string, int64_t> m_uids;
-    Waiting m_withoutUid; // contacts by name, in order of their ids, that no entry meant yet
+    Waiting m_withoutUid; // contacts by name, in order of their ids, that no entry matched yet
     Waiting m_withUid;
     std::unordered_set<int64_t> m_foundByUid;
     int64_t m_llLast = 0;
@@ -73,7 +73,7 @@ enum IMPORT_RESULT
     IMPORT_UNCHANGED,
 };
 
-// Brings entries into a database. What an entry does not mention stays as it is.
+// Imports entries into a database. Fields that an entry does not mention stay as they are.
 class CContactImport
 {
 public:

@@ -9,8 +9,8 @@
 // The name, in UTF-8, to show for an entry of a result set, which carries only an id and codes.
 using ContactNameLookup = std::function<std::string(const tag_LocalizerDetail&)>;
 
-// Looks the contact up in the provider's database, since the store keeps spellings, not names.
-// The name is empty where the contact has none or is gone. Throws CToolError.
+// Looks the contact up in the provider's database, since the store keeps pinyin keys, not names.
+// The name is empty if the contact has none or was deleted. Throws CToolError.
 ContactNameLookup LookUpInDatabase();
 
 // Reads the name back from the codes of the entry; fits the special numbers, whose codes are all

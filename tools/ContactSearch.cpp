@@ -25,7 +25,7 @@ static_assert(WORD_BUFFER > CN_WORD_MAX, "the buffer's last zeros end the text")
                      "", log.Errors());
 }
 
-// A store that cannot be read gives an empty result and lines in the log, not a result code.
+// If the store cannot be read, the library returns an empty result and log lines, no result code.
 void RequireStoreRead(const tag_LocalizerResult& result, const CLibraryLog& log)
 {
     if (result.iResultNum == 0 && !log.Errors().empty())

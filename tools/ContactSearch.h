@@ -16,7 +16,7 @@ class CFilterChain;
 using SearchResultPtr =
     std::unique_ptr<tag_LocalizerResult, std::function<void(tag_LocalizerResult*)>>;
 
-// What one search answered.
+// The answer of one search.
 struct tag_SearchAnswer
 {
     SearchResultPtr pResult;              // null before the search
@@ -24,7 +24,7 @@ struct tag_SearchAnswer
     std::vector<std::string> vCandidates; // characters that the last letters may stand for
 };
 
-// The library's search as the tool uses it: failures are thrown as CToolError.
+// The library's search with failures thrown as CToolError.
 class CContactSearch
 {
 public:

@@ -25,7 +25,7 @@ namespace fs = std::filesystem;
 namespace
 {
 
-// Throws CToolError where the system does not let us look, which is no missing file.
+// Throws CToolError if the system refuses access, which is not the same as a missing file.
 bool IsFile(const std::string& strPath)
 {
     std::error_code error;
@@ -37,8 +37,8 @@ bool IsFile(const std::string& strPath)
     return fs::is_regular_file(status);
 }
 
-// For the owner alone: the library gives its files all permission bits. A directory that is there
-// stays as it is.
+// Creates the directory for the owner alone, since the library gives its files all permission bits.
+// An existing directory stays as it is.
 void CreateParent(const char* szPath)
 {
     const fs::path directory = fs::path(szPath).parent_path();
@@ -56,8 +56,8 @@ void CreateParent(const char* szPath)
     }
 }
 
-// As the library wants a root: absolute paths stay right wherever it looks from, and a slash at
-// the end would be doubled.
+// A root for the library: absolute, so that the working directory does not matter, and without a
+// slash at its end, which would be doubled.
 std::string RootOf(const std::string& strDirectory)
 {
     std::string strRoot = fs::absolute(strDirectory).lexically_normal().string();
@@ -74,7 +74,7 @@ bool IsPlain(char c)
            std::strchr("/._-+@%:=,", c) != nullptr;
 }
 
-// For a word that cannot be shown as it is: with escapes that bash and zsh read back.
+// Quotes a word with unprintable bytes by escapes that bash and zsh read back.
 std::string QuotedBytes(const std::string& strWord)
 {
     std::ostringstream quoted;
@@ -94,7 +94,7 @@ std::string QuotedBytes(const std::string& strWord)
     return quoted.str();
 }
 
-// A word that a shell reads as it stands.
+// Quotes a word for a shell if that is necessary.
 std::string Quoted(const std::string& strWord)
 {
     if (std::all_of(strWord.begin(), strWord.end(), IsPlain))

@@ -16,11 +16,11 @@ public:
     void AddOption(CLI::App& command);
     // Makes the library work in the directory; called before anything else of the library.
     void Use() const;
-    // Creates databases/ and files/ where they are missing.
+    // Creates databases/ and files/ if they are missing.
     void Create() const;
 
-    // Each throws CToolError unless the thing is there, the pinyin table whole; the advice names
-    // the subcommand that makes it.
+    // Each throws CToolError if the file is missing or the pinyin table is incomplete; the advice
+    // names the subcommand that makes it.
     void RequireDatabase() const;
     void RequirePinyinSource() const;
     void RequireIndex() const;
@@ -33,7 +33,7 @@ private:
 };
 
 // Throws CToolError with the advice unless strPath is a file of the pinyin table's size: the
-// library would take any file, and find no contact by a broken one.
+// library accepts any file, and searches with a broken one find no contact.
 void RequirePinyinTable(const std::string& strPath, const std::string& strAdvice);
 
 #endif

@@ -81,7 +81,7 @@ void CFilterOptions::AddOptions(CLI::App& command)
 std::unique_ptr<CFilterChain> MakeFilterChain(CLocalizerLogic& logic,
                                               const std::vector<tag_ChosenFilter>& vFilters)
 {
-    std::vector<int> vKinds(1); // never empty, since the library wants arrays even for no filter
+    std::vector<int> vKinds(1); // never empty, since the library requires arrays even for no filter
     std::vector<QVLong32> vIDs(1);
     for (const tag_ChosenFilter& filter : vFilters)
     {

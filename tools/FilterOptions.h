@@ -13,7 +13,7 @@ namespace CLI
 class App;
 }
 
-// One filter as it was asked for.
+// One filter of the command line.
 struct tag_ChosenFilter
 {
     std::string strName; // of the option, without dashes

@@ -40,7 +40,7 @@ std::string TextOf(const json& value, const char* szMember)
     return Trimmed(strText);
 }
 
-// Null stands for a member that is not there.
+// A null member counts as missing.
 const json* Member(const json& object, const char* szMember)
 {
     const auto found = object.find(szMember);

@@ -5,12 +5,12 @@
 #include <string>
 #include <vector>
 
-// One contact of a JSON line. What the line does not mention has no value.
+// One contact of a JSON line. Members that the line does not mention have no value.
 struct tag_ImportEntry
 {
-    long lLine = 0;        // where it stands in the file that people know
-    std::string strReason; // why it cannot be taken; empty when it can
-    std::string strName;   // UTF-8, never empty in an entry that can be taken
+    long lLine = 0;        // in the file that the user named
+    std::string strReason; // why it is refused; empty if it is valid
+    std::string strName;   // UTF-8, never empty in a valid entry
     std::string strUid;    // empty for none
     std::optional<bool> bPhone;
     std::optional<bool> bMail;
@@ -19,7 +19,7 @@ struct tag_ImportEntry
     std::optional<std::vector<std::string>> vGroups;
 };
 
-// Reads the line with this number; the manual page tells its form.
+// Reads the line with this number; the manual page describes its form.
 tag_ImportEntry ReadImportEntry(const std::string& strLine, long lLine);
 
 #endif

@@ -20,12 +20,12 @@ namespace fs = std::filesystem;
 namespace
 {
 
-constexpr size_t LOOKED_AT = 4096;                         // bytes that tell the format
-constexpr const char* DEBIANS_PYTHON = "/usr/bin/python3"; // the one that has Debian's packages
+constexpr size_t LOOKED_AT = 4096;                         // bytes that identify the format
+constexpr const char* DEBIANS_PYTHON = "/usr/bin/python3"; // the interpreter with Debian's packages
 constexpr const char* ANY_PYTHON = "python3";
 constexpr const char* BYTE_ORDER_MARK = "\xEF\xBB\xBF";
-constexpr int NO_VOBJECT = 3;   // how the converter ends without its package
-constexpr int NO_PROGRAM = 127; // how a child ends that cannot be run
+constexpr int NO_VOBJECT = 3;   // exit status of the converter without its package
+constexpr int NO_PROGRAM = 127; // exit status of a child whose program cannot be run
 
 struct tag_NamedFormat
 {
@@ -77,7 +77,7 @@ CImportSource::CImportSource(const tag_ImportSource& source)
 
 CImportSource::~CImportSource()
 {
-    m_lines.reset(); // a converter that still writes ends
+    m_lines.reset(); // ends a converter that is still writing
     WaitForConverter();
 }
 
@@ -189,7 +189,7 @@ void CImportSource::StartConverter(const tag_ImportSource& source, IMPORT_FORMAT
     }
 }
 
-// How the converter ended, 0 when none ran.
+// The exit status of the converter, 0 if none ran.
 int CImportSource::WaitForConverter()
 {
     int iStatus = 0;

@@ -20,12 +20,12 @@ struct tag_ImportSource
 {
     std::string strFile; // "-" for standard input
     IMPORT_FORMAT eFormat = IMPORT_AUTO;
-    std::string strCharset = "utf-8"; // of text that does not name its own
+    std::string strCharset = "utf-8"; // of text that does not declare its own
     std::string strConverter;         // the program that turns vCard and CSV into JSON lines
 };
 
-// Delivers a file's contacts as JSON lines: those of the file, or of the converter, which runs as
-// a process of its own and reads the file meanwhile. Every operation throws CToolError.
+// Reads a file's contacts as JSON lines, from the file itself or from the converter, a separate
+// process that reads the file at the same time. Every operation throws CToolError.
 class CImportSource
 {
 public:
@@ -34,8 +34,8 @@ public:
     CImportSource(const CImportSource&) = delete;
     CImportSource& operator=(const CImportSource&) = delete;
 
-    // The next line that is not blank, and its number; false behind the last one, once it is sure
-    // that nothing is missing.
+    // The next line that is not blank, and its number; false after the last one, when the file and
+    // the converter have ended without an error.
     bool NextLine(std::string& strLine, long& lLine);
     // Bytes of the file that have been read, and all of them.
     uint64_t Done() const;

@@ -28,7 +28,7 @@ constexpr tag_LoggedPhase PHASES[] = {
     {"MemInit InitContactRecord", "write the store"},
 };
 
-// Follows the phases of a build on the terminal.
+// Shows the phases of a build on the terminal.
 class CBuildProgress
 {
 public:

@@ -13,12 +13,12 @@ struct tag_IndexPhase
     int iMilliseconds;
 };
 
-// Builds the index of the directory's database, with a progress bar, and tells its phases. Throws
-// CToolError.
+// Builds the index of the directory's database, with a progress bar, and returns the build's
+// phases. Throws CToolError.
 std::vector<tag_IndexPhase> BuildIndex(const CDataDirectory& directory);
 
-// Whether the last handler left the index whole: the handlers report nothing, and what they could
-// not do shows in the registration record.
+// Whether the last handler left the index complete: handlers return no result, but after a failure
+// the registration record is marked.
 bool IsIndexComplete();
 
 // Shows how many contacts the index holds. Throws CToolError with the log's errors when it is not

@@ -54,7 +54,7 @@ CIndexWatch::States CIndexWatch::ReadStates()
     return {StateOf(CDataPaths::ContactReg()), StateOf(CDataPaths::ContactRecords())};
 }
 
-// A time in the future, of a clock that was set back, does not age.
+// A time in the future, after the clock was set back, counts as aged.
 bool CIndexWatch::IsYoung(const States& states)
 {
     timespec now = {};

@@ -7,14 +7,14 @@
 // Notices that another process changed the index, without the store lock and without reading
 // the records.
 //
-// Every change opens the files that it writes to, which writes their last byte: that moves the
-// time of the file on every file system, while the stores through the mapping need not. It does
-// so with the store lock held, which stays held until the change is complete. A search waits for
-// the lock. So a search that begins after Note either sees a change whose time Note saw, or the
-// change comes later and moves the time again.
+// Every change opens the files that it writes to, which writes their last byte and so updates the
+// time of the file on every file system; writes through the mapping need not update it. A change
+// does so with the store lock held, and releases it when records and count are written. A search
+// waits for the lock. So a search that begins after Note either sees a change whose time Note saw,
+// or the change comes later and updates the time again.
 //
 // Two changes within one step of the file system's clock leave the same time. Therefore a time
-// that was still young at Note is not relied on: Changed then tells a change once it has aged.
+// that was still young at Note is not relied on: Changed then reports a change once it has aged.
 class CIndexWatch
 {
 public:

@@ -12,7 +12,7 @@ namespace fs = std::filesystem;
 namespace
 {
 
-// Both paths are relative to the program's directory: an installed program knows nothing of the
+// Both paths are relative to the program's directory: an installed program has no path of the
 // machine that it was built on.
 std::string BuiltOrInstalled(const char* szBuilt, const char* szInstalled)
 {

@@ -36,7 +36,7 @@ std::string Trimmed(const std::string& strLine)
                : strLine.substr(uFirst, strLine.find_last_not_of(BLANKS) + 1 - uFirst);
 }
 
-// Whether the lock is refused for another reason than that somebody holds it.
+// Whether the lock file cannot be used, rather than being locked by another process.
 bool IsLockBroken()
 {
     const char* szPath = CDataPaths::LockFile();
@@ -45,7 +45,7 @@ bool IsLockBroken()
            (!fs::is_regular_file(szPath, error) || access(szPath, R_OK | W_OK) != 0);
 }
 
-// What a part of a line tells.
+// The reason that a part of a line stands for.
 struct tag_Reason
 {
     const char* szPart;

@@ -5,15 +5,15 @@
 #include <string>
 #include <vector>
 
-// Lets no line of the library's log reach the terminal: a subcommand reads the lines that it
-// wants and tells failures in its own words.
+// Drops the lines of the library's log: a subcommand collects the lines that it needs and reports
+// failures in its own words.
 void SilenceLibraryLog();
 
 // Collects the library's log for as long as the object lives; one object at a time.
 class CLibraryLog
 {
 public:
-    // fnPhase, when given, is told of the end of each phase of a build.
+    // fnPhase, if given, is called at the end of each phase of a build.
     explicit CLibraryLog(std::function<void()> fnPhase = nullptr);
     ~CLibraryLog();
     CLibraryLog(const CLibraryLog&) = delete;
@@ -25,7 +25,7 @@ public:
     const std::vector<std::string>& Errors() const { return m_vErrors; }
     // Why the store's lock was refused.
     static std::string LockReason();
-    // strWhat with the reason that the errors tell, as far as it is a usual one.
+    // strWhat with the reason that the errors contain, if it is one of the usual ones.
     std::string WithReason(const std::string& strWhat) const;
 
 private:

@@ -10,7 +10,7 @@
 class CLocalizerKeys
 {
 public:
-    // Makes the shared table of the shipped one first where it is missing, or when bRenew.
+    // First copies the shipped table to the shared one if that is missing or bRenew is true.
     explicit CLocalizerKeys(bool bRenew);
     ~CLocalizerKeys();
     CLocalizerKeys(const CLocalizerKeys&) = delete;

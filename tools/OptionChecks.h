@@ -9,11 +9,11 @@ namespace CLI
 class Validator;
 }
 
-// The end of the year 9999, in milliseconds since 1970: the last time that an option takes.
+// The end of the year 9999, in milliseconds since 1970: the last time that an option accepts.
 constexpr int64_t MAX_TIME_MS = 253402300799999;
 constexpr int64_t MAX_INT = std::numeric_limits<int>::max();
 
-// Lets an option take whole numbers from llMin to llMax, and says so when it gets something else.
+// Accepts whole numbers from llMin to llMax; the error message names the range.
 CLI::Validator WholeNumber(int64_t llMin, int64_t llMax);
 
 #endif

@@ -64,7 +64,7 @@ uint8_t ByteAt(const std::string& strText, size_t uAt)
     return static_cast<uint8_t>(strText[uAt]);
 }
 
-// Adds the uMore continuation bytes behind uAt to uCharacter; false where one is missing.
+// Adds the uMore continuation bytes after uAt to uCharacter; false if one is missing.
 bool Continue(const std::string& strText, size_t uAt, size_t uMore, uint32_t& uCharacter)
 {
     for (size_t i = uAt + 1; i <= uAt + uMore; ++i)
@@ -79,7 +79,7 @@ bool Continue(const std::string& strText, size_t uAt, size_t uMore, uint32_t& uC
     return true;
 }
 
-// The number of bytes of the well-formed character at uAt, 0 where there is none.
+// The number of bytes of the well-formed character at uAt, 0 if there is none.
 size_t Decode(const std::string& strText, size_t uAt, uint32_t& uCharacter)
 {
     size_t uMore = 0;

@@ -7,9 +7,8 @@
 #include <mutex>
 #include <thread>
 
-// A bar on the terminal that standard error is, for work that takes more than a second; it goes
-// with the object. Where standard error is no terminal, nothing is ever shown. Whatever else
-// writes to the terminal waits until the object is gone.
+// A progress bar on standard error, if that is a terminal, for work that takes more than a second.
+// The destructor removes it. Write nothing else to the terminal while the object exists.
 class CProgress
 {
 public:

@@ -10,8 +10,8 @@
 constexpr int SAMPLE_GROUPS = 6;
 constexpr int SAMPLE_ACCOUNTS = 4;
 
-// iCount contacts with names of every kind (simplified, traditional, polyphonic, Latin, mixed,
-// digits, none) and every attribute that a filter asks for. The same count and time always give
+// Makes iCount contacts with names of every kind (simplified, traditional, polyphonic, Latin,
+// mixed, digits, none) and every attribute that a filter tests. The same count and time always give
 // the same contacts; the times of last contact go back from llNow.
 std::vector<tag_DatabaseContact> MakeSampleContacts(int iCount, int64_t llNow);
 

@@ -6,7 +6,7 @@
 namespace
 {
 
-// Everything a name can be: simplified, traditional, polyphonic, Latin, mixed, digits, signs,
+// All kinds of names: simplified, traditional, polyphonic, Latin, mixed, digits, signs,
 // other scripts, too long, nothing at all.
 constexpr const char* PICKED_NAMES[] = {
     "张三",
@@ -153,7 +153,7 @@ constexpr const char* MIXED_PREFIXES[] = {"小", "老", "阿", "A", "B2", "VIP",
 constexpr const char* MIXED_SUFFIXES[] = {"总",      "老师", "医生", "经理",
                                           " (home)", "2",    "Jr",   "快递"};
 
-// Spreads the index, so that neighbours in the lists do not stay neighbours.
+// Scatters the index, so that consecutive names differ.
 uint32_t Scatter(int iIndex, uint32_t uSalt)
 {
     uint32_t uValue = static_cast<uint32_t>(iIndex) * 2654435761U + uSalt * 40503U;
@@ -180,7 +180,7 @@ std::string MixedName(int iIndex)
                            : strSurname + Pick(MIXED_SUFFIXES, iIndex, 5);
 }
 
-// Six of ten are plain; each other kind has its turn.
+// Six of ten are plain; the other kinds take turns.
 std::string ComposedName(int iIndex)
 {
     switch (iIndex % 10)

@@ -4,7 +4,7 @@
 #include <string>
 
 // Name number iIndex (from 0) of the sample contacts in UTF-8, always the same for an index.
-// The first ones are picked one by one to show a rule each; the others are put together.
+// The first ones show one rule each; the others are combined from lists.
 std::string SampleName(int iIndex);
 
 #endif

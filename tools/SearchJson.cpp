@@ -7,11 +7,11 @@
 namespace
 {
 
-// Keeps the members in the order in which they are written down here.
+// Keeps the members in the order of the code.
 using Json = nlohmann::ordered_json;
 
 constexpr int INDENT = 2;
-// Of the document's form; counts up when a member changes its meaning or goes.
+// The version of the document's form; rises when a member changes its meaning or is removed.
 constexpr int FORM_VERSION = 1;
 
 Json FilterJson(const tag_ChosenFilter& filter)

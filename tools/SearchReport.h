@@ -8,7 +8,7 @@
 #include <string>
 #include <vector>
 
-// What a whole search of the command line was and answered.
+// A whole search of the command line and its results.
 struct tag_SearchReport
 {
     std::string strType;  // "word", "num" or "special"
@@ -26,11 +26,11 @@ void PrintSearchText(std::ostream& stream, const tag_SearchReport& report, bool 
 // For pipes: the last step's matches, a line each, of the contact's id, a tab and its name.
 void PrintSearchPlain(std::ostream& stream, const tag_SearchReport& report);
 
-// One JSON document for programs; `qvlocalize search --help` describes it.
+// One JSON document for programs, which `qvlocalize search --help` describes.
 void PrintSearchJson(std::ostream& stream, const tag_SearchReport& report);
 
-// Parts of both forms. What stands around the matched characters of a name, and whether the name
-// is escaped for people.
+// Parts of both forms. The marks around the matched characters of a name, and whether the name is
+// escaped for people.
 struct tag_Marking
 {
     const char* szBegin;

@@ -7,7 +7,7 @@
 namespace
 {
 
-// Sections that the library counts: the index characters, then everybody else.
+// Sections that the library counts: the index characters, then all other contacts.
 constexpr int LETTER_SECTIONS = 27;
 constexpr int TIME_SECTIONS = 6;
 

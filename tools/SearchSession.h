@@ -24,7 +24,7 @@ struct tag_Section
     int iContacts;
 };
 
-// What one search answered.
+// The result of one search.
 struct tag_SearchStep
 {
     std::string strTyped;
@@ -35,16 +35,16 @@ struct tag_SearchStep
     std::vector<tag_Section> vSections;   // not empty for an empty text only
 };
 
-// The searches that follow each other while somebody types.
+// The searches of a text that is typed key by key.
 class CSearchSession
 {
 public:
-    // With bNarrow each search looks only among the matches of the one before. The chain must
-    // outlive the session.
+    // With bNarrow each search after the first is incremental, within the matches of the one
+    // before. The chain must outlive the session.
     CSearchSession(IME_SEARCH_TYPE eType, CFilterChain& chain, bool bNarrow,
                    ContactNameLookup fnNames);
 
-    // Searches for the whole text typed so far and gives the first iLimit matches, all for 0.
+    // Searches for the whole text typed so far and returns the first iLimit matches, all for 0.
     // Throws CToolError.
     tag_SearchStep Search(const std::wstring& wstrTyped, int iLimit);
 

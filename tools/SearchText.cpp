@@ -91,7 +91,7 @@ void PrintWords(std::ostream& stream, const char* szLabel, const std::vector<std
     stream << (vWords.empty() ? " none\n" : "\n");
 }
 
-// A digit search reports how the next character may begin, not how the last one may go on.
+// A digit search reports the first keys of a next character, not the next keys of the last one.
 void PrintNextKeys(std::ostream& stream, const tag_SearchStep& step, bool bKeypad)
 {
     PrintWords(stream,

@@ -64,7 +64,7 @@ CSqliteStatement::CSqliteStatement(const CSqliteDatabase& database, const char* 
 {
     if (sqlite3_prepare_v2(database.Handle(), szSql, -1, &m_pStatement, nullptr) != SQLITE_OK)
     {
-        // A query that cannot be prepared names what is not there, unless the file is the problem.
+        // A query that cannot be prepared names a missing table or column, unless the file is bad.
         const int iError = sqlite3_errcode(database.Handle());
         const bool bOther = iError == SQLITE_ERROR || iError == SQLITE_NOTADB;
         Fail(database.Handle(),

@@ -7,21 +7,21 @@
 struct sqlite3;
 struct sqlite3_stmt;
 
-// An open database file. Every operation that SQLite refuses throws CToolError with its message;
-// one that another process keeps from the file tries again for two seconds before it is refused.
+// An open database file. Every operation that SQLite refuses throws CToolError with its message. If
+// another process has locked the file, an operation retries for two seconds first.
 class CSqliteDatabase
 {
 public:
     static CSqliteDatabase OpenForReading(const std::string& strPath);
-    static CSqliteDatabase OpenForWriting(const std::string& strPath); // it must be there
-    static CSqliteDatabase Create(const std::string& strPath);         // unless it is there
+    static CSqliteDatabase OpenForWriting(const std::string& strPath); // which must exist
+    static CSqliteDatabase Create(const std::string& strPath);         // if it is missing
     ~CSqliteDatabase();
     CSqliteDatabase(const CSqliteDatabase&) = delete;
     CSqliteDatabase& operator=(const CSqliteDatabase&) = delete;
 
-    // Runs statements without parameters whose rows nobody wants.
+    // Runs statements without parameters and ignores their rows.
     void Execute(const char* szSql);
-    // How long an operation waits for another process.
+    // Sets how long an operation waits for another process.
     void SetBusyWait(int iMilliseconds);
     sqlite3* Handle() const { return m_pDatabase; }
 

@@ -14,7 +14,7 @@
 #include <sys/signalfd.h>
 #include <unistd.h>
 
-// The macros of curses are left out: their names are everyday words.
+// Without the macros of curses, whose names are common words.
 #define NCURSES_NOMACROS
 #define NCURSES_WIDECHAR 1
 #include <curses.h>

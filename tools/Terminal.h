@@ -8,7 +8,7 @@
 #include <cstdio>
 #include <memory>
 
-// What a person or the system asks for.
+// Keys of the user and events of the system.
 enum KEY_KIND
 {
     KEY_IDLE,      // nothing came in the time given
@@ -26,7 +26,7 @@ enum KEY_KIND
     KEY_FUNCTION, // iNumber: 2 for F2
     KEY_CHOOSE,
     KEY_ESCAPE,
-    KEY_REDRAW, // the screen has another size, or lost what it showed
+    KEY_REDRAW, // the screen has another size or has to be drawn again
     KEY_SIGNAL, // iNumber: the signal that asks the program to end
     KEY_OTHER,
 };
@@ -38,9 +38,9 @@ struct tag_Key
     int iNumber;
 };
 
-// Takes the signals that end, stop or resize as events in place of interruptions, so that the
-// terminal is never left in the middle of something. Those that the process was started to
-// ignore stay ignored. Everything is as it was when the object ends.
+// Receives the signals that end, stop or resize as events instead of interruptions, so that the
+// terminal is never left in an intermediate state. Signals that were ignored at the start stay
+// ignored. The destructor restores everything.
 class CSignalEvents
 {
 public:
@@ -50,7 +50,7 @@ public:
     CSignalEvents& operator=(const CSignalEvents&) = delete;
 
     int Descriptor() const { return m_iFd; }
-    // The signal that came first, 0 when there is none.
+    // The signal that arrived first, 0 if there is none.
     int Next();
 
 private:
@@ -59,8 +59,8 @@ private:
     int m_iFd;
 };
 
-// The terminal while a program draws on all of it. The destructor gives it back as it was, also
-// while an exception is on its way.
+// The terminal while a program draws on all of it. The destructor restores it, also during an
+// exception.
 class CTerminal
 {
 public:

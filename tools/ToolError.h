@@ -6,21 +6,21 @@
 #include <utility>
 #include <vector>
 
-// What the tool tells the program that called it.
+// The exit status of the tool.
 enum TOOL_EXIT : int
 {
     TOOL_EXIT_DONE = 0,    // also for a search without matches
     TOOL_EXIT_FAILED = 1,  // the library, SQLite or the system could not do it
-    TOOL_EXIT_USAGE = 2,   // the command line asks for something that cannot be done
-    TOOL_EXIT_MISSING = 3, // a file that another subcommand makes, or a package, is not there
+    TOOL_EXIT_USAGE = 2,   // the command line is wrong
+    TOOL_EXIT_MISSING = 3, // a file that another subcommand makes, or a package, is missing
     TOOL_EXIT_PARTLY = 4,  // something in an imported file was refused, the rest taken
 };
 
-// Advice where the files of the index are damaged.
+// Advice if the files of the index are damaged.
 constexpr const char* BUILD_ANEW = "Build the index anew with the subcommand index.";
 
-// Ends a subcommand: what is wrong, what to do about it (may be empty), and the log lines that tell
-// more. Control characters in them are escaped when the error is shown.
+// Ends a subcommand: what is wrong, what to do about it (may be empty), and log lines with details.
+// Control characters in them are escaped when the error is shown.
 class CToolError : public std::runtime_error
 {
 public:

@@ -30,7 +30,7 @@ bool IsDigit(wchar_t chKey)
     return chKey >= L'0' && chKey <= L'9';
 }
 
-// The key as it is typed into a text; 0 for one that no search takes. A name's blank is found
+// The key as it is typed into a text; 0 for one that no search accepts. A blank in a name matches
 // like every other sign.
 wchar_t TypedKey(wchar_t chKey, TYPING_KEYS eKeys)
 {
@@ -67,8 +67,8 @@ std::vector<tag_SectionRun> SectionRuns(const tag_LocalizerResult& result)
     return vRuns;
 }
 
-// The keys that the mask of a search names. A digit stands for itself only: no key of a keypad
-// is found in place of a sign.
+// The keys in the mask of a search. A digit stands for itself only: on a keypad no key matches a
+// sign.
 std::string KeysOfMask(uint32_t uMask, TYPING_KEYS eKeys)
 {
     std::string strKeys;
@@ -79,9 +79,9 @@ std::string KeysOfMask(uint32_t uMask, TYPING_KEYS eKeys)
     return strKeys;
 }
 
-// Whether the mask may lack a key. It tells all letters that begin a character, so all that an
-// empty text can be continued with, but not which digits; of other texts it lacks what continues
-// a reading typed in digits, and a second match in the same name.
+// Whether the mask may lack a key. It has all letters that begin a character, so all that can
+// follow an empty text, but does not say which digits; for other texts it lacks the keys that
+// continue a reading typed in digits, and those of a second match in the same name.
 bool MayMaskLack(const std::wstring& wstrText, TYPING_KEYS eKeys, uint32_t uMask)
 {
     return !wstrText.empty() || (eKeys == TYPING_DIGITS && (uMask & MASK_OTHER) != 0);
@@ -118,7 +118,7 @@ CTypingModel::CTypingModel(std::vector<tag_ChosenFilter> vFilters, TYPING_KEYS e
     SearchAnew(m_vFilters, m_eKeys, {L""});
 }
 
-// Runs what a key does; what fails is told.
+// Runs the action of a key and reports a failure as the message.
 template <typename Action>
 void CTypingModel::Try(const Action& action)
 {
@@ -215,9 +215,9 @@ void CTypingModel::Pick(int iShown)
 }
 
 // The texts that the library makes of the typed one and a picked character, the one with most
-// letters left first. It replaces from the last letter before a position that begins a reading:
-// in "nan" that is the second n, while 南 stands for all three letters. Earlier positions reach
-// the earlier letters.
+// letters left first. The library replaces the letters from the last one before a position that
+// begins a reading: in "nan" that is the second n, while 南 stands for all three letters. Earlier
+// positions reach the earlier letters.
 std::vector<std::wstring> CTypingModel::Replacements(const std::wstring& wstrWord)
 {
     std::vector<std::wstring> vTexts;
@@ -238,7 +238,7 @@ std::vector<std::wstring> CTypingModel::Replacements(const std::wstring& wstrWor
 
 void CTypingModel::SwitchKeys()
 {
-    // The texts typed so far are those of the other keys.
+    // The texts typed so far belong to the other kind of keys.
     const TYPING_KEYS eKeys = m_eKeys == TYPING_LETTERS ? TYPING_DIGITS : TYPING_LETTERS;
     Try([&] { SearchAnew(m_vFilters, eKeys, {L""}); });
 }
@@ -280,7 +280,7 @@ void CTypingModel::FollowIndex()
     }
     catch (const CToolError& error)
     {
-        m_strTrouble = error.what(); // tried again the next time
+        m_strTrouble = error.what(); // the next call tries again
     }
 }
 
@@ -308,8 +308,7 @@ std::vector<std::wstring> CTypingModel::Texts() const
 }
 
 // Searches for the texts, the first in the whole index and each further one in the result before
-// it, and keeps the contact that somebody went to. Either all is new afterwards or, when it
-// throws, nothing.
+// it, and keeps the selected contact if the user moved to it. If it throws, nothing has changed.
 void CTypingModel::SearchAnew(const std::vector<tag_ChosenFilter>& vFilters, TYPING_KEYS eKeys,
                               const std::vector<std::wstring>& vTexts)
 {
@@ -325,7 +324,7 @@ void CTypingModel::SearchAnew(const std::vector<tag_ChosenFilter>& vFilters, TYP
     }
     const int iSelectedID =
         m_vTyped.empty() || Current().iSelected == 0 ? 0 : Entry(Current().iSelected).iContactID;
-    m_vTyped = std::move(vTyped); // the old results go before the search that made them
+    m_vTyped = std::move(vTyped); // releases the old results before the search that made them
     m_pSearches = std::move(pSearches);
     m_vFilters = vFilters;
     m_eKeys = eKeys;
@@ -340,7 +339,7 @@ void CTypingModel::Select(int iEntry)
     tag_TypedText& typed = m_vTyped.back();
     typed.iSelected = std::max(0, std::min(iEntry, Total() - 1));
     const int iRow = RowOf(typed.iSelected);
-    // The first contact of a section is shown with the heading, where the list has room for both.
+    // The first contact of a section is shown with the heading if the list has room for both.
     const bool bFirst =
         !typed.vSections.empty() &&
         typed.vSections[static_cast<size_t>(SectionOf(typed.iSelected))].iFirst == typed.iSelected;
@@ -397,7 +396,7 @@ const tag_LocalizerDetail& CTypingModel::Entry(int iEntry) const
     return Current().answer.pResult->pDetail[iEntry];
 }
 
-// Names that were shown are kept: redrawing the screen reads nothing.
+// Caches the names that were shown, so that redrawing the screen does not read the database.
 std::string CTypingModel::NameOf(const tag_LocalizerDetail& detail)
 {
     std::map<int, std::string>& mapNames = m_pSearches->mapNames;

@@ -44,7 +44,7 @@ struct tag_ListRow
     tag_FoundContact contact;
 };
 
-// A text that was typed and what was found for it, as it was left when the next key came.
+// A typed text and its result, in the state in which the next key left it.
 struct tag_TypedText
 {
     std::wstring wstrText;
@@ -56,11 +56,11 @@ struct tag_TypedText
     int iFirstCandidate = 0;               // of those that are shown
 };
 
-// A contact search as it is typed: what the keys do, and all that there is to show. Knows
-// nothing of the terminal.
+// A contact search while it is typed: handles the keys and provides everything to show,
+// independently of the terminal.
 //
-// Each further key searches within the result before it, and the results stay, so that going
-// back needs no search. What fails leaves everything as it was, and Message tells.
+// Each further key searches within the result before it. The results are kept, so that going back
+// needs no search. A failure changes nothing, and Message reports it.
 class CTypingModel
 {
 public:
@@ -71,12 +71,12 @@ public:
 
     void Type(wchar_t chKey);
     void Back();
-    void SwitchKeys(); // the other kind of keys, from an empty text on
+    void SwitchKeys(); // to the other kind of keys, with an empty text
     void SwitchFilter(size_t uSwitch);
     void MoveBy(int iEntries);
     void MoveByPages(int iPages);
     void MoveToEnd(bool bLast);
-    void Turn(int iPages); // the candidates, or where there are none the sections
+    void Turn(int iPages); // the candidates, or the sections if there are none
     // Searches anew from the first key if another process changed the index.
     void FollowIndex();
     // The rows that the list has on the screen.
@@ -89,9 +89,9 @@ public:
     bool IsFiltered(int iKind) const;
     // The rows of the list that are on the screen.
     std::vector<tag_ListRow> ListRows();
-    // The contact that Enter takes; null where nothing was found.
+    // The contact that Enter selects; null if nothing was found.
     std::unique_ptr<tag_FoundContact> Selected();
-    // What to tell about the last key, or about an index that could not be followed; may be empty.
+    // A message on the last key, or on an index that could not be followed; may be empty.
     const std::string& Message() const
     {
         return m_strTrouble.empty() ? m_strMessage : m_strTrouble;

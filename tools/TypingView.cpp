@@ -83,7 +83,7 @@ public:
     {
         Add(std::string(static_cast<size_t>(std::max(0, iColumn - m_iColumn)), ' '));
     }
-    // At the right edge, where there is room.
+    // Adds the text at the right edge if it fits.
     void AddRight(const std::string& strText, unsigned uStyle = STYLE_PLAIN)
     {
         const int iBegin = m_iColumns - TextWidth(strText);
@@ -288,7 +288,7 @@ private:
         }
     }
 
-    // Every letter has its place, whether it is lit or not.
+    // Every letter keeps its place, lit or not.
     StyledLine Letters() const
     {
         CLineBuilder line(m_size.iColumns);

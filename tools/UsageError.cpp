@@ -19,8 +19,8 @@ std::string SubcommandNames(const CLI::App& app)
     return strNames;
 }
 
-// What stood where a subcommand or the options of app were expected; empty when nothing did. The
-// parser only tells that a subcommand is missing.
+// The word in the place of a subcommand or of the options of app; empty if there is none. The
+// parser only reports that a subcommand is missing.
 std::string Unexpected(const CLI::App& app)
 {
     const std::vector<std::string> vRest = app.remaining();

@@ -9,7 +9,7 @@ class App;
 class Error;
 } // namespace CLI
 
-// What to print when the command line cannot be taken, for CLI::App::failure_message.
+// The message for a wrong command line, for CLI::App::failure_message.
 std::string UsageError(const CLI::App* pApp, const CLI::Error& error);
 
 #endif

@@ -18,21 +18,21 @@ import sys
 
 NO_VOBJECT = 3
 STARRED = {"starred", "* starred"}
-EVERYBODY = {"mycontacts", "* mycontacts"}  # a group that holds all contacts tells nothing
+EVERYBODY = {"mycontacts", "* mycontacts"}  # groups that hold all contacts are ignored
 TRUE = {"1", "true", "yes", "y", "x", "是"}
 FALSE = {"0", "false", "no", "n", "否"}
 CHINESE = "\u2e80-\u303f\u3400-\u9fff\uf900-\ufaff\U00020000-\U0003ffff"
 
 
 class Refused(Exception):
-    """What keeps a card or a row from being taken, and the line where that shows."""
+    """Why a card or a row is refused, and the line of the fault."""
 
     def __init__(self, reason, line=None):
         super().__init__(reason)
         self.line = line
 
 
-# --- What cards and rows have in common -----------------------------------------------------------
+# --- For cards and rows ---------------------------------------------------------------------------
 
 def tidy(text):
     """The text on one line, with single blanks."""
@@ -40,7 +40,7 @@ def tidy(text):
 
 
 def joined_name(prefix, given, additional, family, suffix):
-    """A name of its parts: the family first and no blanks where the name is Chinese."""
+    """Joins the parts of a name: a Chinese name has the family first and no blanks."""
     parts = [prefix, given, additional, family, suffix]
     if re.search(f"[{CHINESE}]", family + given):
         parts = [prefix, family, additional, given, suffix]
@@ -49,13 +49,13 @@ def joined_name(prefix, given, additional, family, suffix):
 
 
 def flag(text):
-    """True or false, None for a text that says neither."""
+    """True or false, None for any other text."""
     text = text.strip().lower()
     return True if text in TRUE else False if text in FALSE else None
 
 
 def entry_of(line, names, uid="", phones=(), mails=(), addresses=(), starred=None, groups=None):
-    """The members of one contact; what is not known is left out, so that it stays as it was."""
+    """The members of one contact; unknown ones are left out, so that they stay as they were."""
     phones, mails, addresses = ([text for text in map(tidy, texts) if text]
                                 for texts in (phones, mails, addresses))
     names = [name for name in map(tidy, [*names, *mails, *phones]) if name]
@@ -87,7 +87,7 @@ def decoded(octets, charset):
 
 # --- vCard ----------------------------------------------------------------------------------------
 
-# A property up to its value. vobject's own pattern takes ages for some texts that do not fit it.
+# A property up to its value. vobject's own pattern is very slow on some texts that do not match.
 HEAD = re.compile(rb'(?:[\w-]+\.)?([\w-]+)'
                   rb'((?:;[\w-]+(?:=(?:"[^"]*"|[^";:,]*)(?:,(?:"[^"]*"|[^";:,]*))*)?)*);?:')
 QUOTED_PRINTABLE = re.compile(rb"\bquoted-printable\b", re.IGNORECASE)
@@ -112,13 +112,13 @@ def lines_of(octets):
     for number, line in enumerate(lines, 1):
         if number == 1 and line.startswith(codecs.BOM_UTF8):
             line = line[len(codecs.BOM_UTF8):]
-        for part in line.rstrip(b"\r\n").split(b"\r"):  # some old programs end lines so
+        for part in line.rstrip(b"\r\n").split(b"\r"):  # the line end of some old programs
             yield number, part
 
 
 def cards_of(lines):
-    """The cards as lists of numbered lines. A card that another one cuts off, or the end of the
-    file, stands with a Refused at its end; lines outside of cards stand so by themselves."""
+    """The cards as lists of numbered lines. The list of a card that is cut off, by another one or by
+    the end of the file, ends with a Refused; a line outside of cards gives a Refused alone."""
     card, depth, outside = [], 0, False
     for number, line in lines:
         word = line.strip().upper()
@@ -200,7 +200,7 @@ class CardReader:
         return plain + name + b":" + line[len(head):]
 
     def text(self, value):
-        """A text with its escapes undone; what separates nothing in it stays."""
+        """A text with its escapes decoded; separators that separate nothing stay."""
         return self.texts(escaped(value), listSeparator="\0")[0]
 
     def list(self, value):
@@ -212,7 +212,7 @@ class CardReader:
 
 
 def escaped(value):
-    """The value without an escape that escapes nothing at its end."""
+    """The value without an incomplete escape at its end."""
     backslashes = len(value) - len(value.rstrip("\\"))
     return value[:-1] if backslashes % 2 else value
 
@@ -264,13 +264,13 @@ def entries_of_cards(octets, charset):
             yield entry_of_card(reader, card)
         except Refused as refused:
             yield {"line": refused.line or card[0][0], "error": str(refused)}
-        except Exception as error:  # whatever vobject stumbles over costs one card
+        except Exception as error:  # a failure of vobject costs only this card
             yield {"line": card[0][0], "error": f"the card cannot be read: {error!r}"}
 
 
 # --- CSV ------------------------------------------------------------------------------------------
 
-# What a column holds, by its header in lower case with single blanks. The first that fits counts.
+# The content of a column by its header, in lower case with single blanks. The first match counts.
 COLUMNS = [(meaning, re.compile(pattern)) for meaning, pattern in (
     (None, r".*\b(type|label|display name \d|yomi|phonetic)( .*)?|e-?mail( \d+)? display name"),
     ("uid", r"uid|id|uuid"),
@@ -295,7 +295,7 @@ LABELS = "labels"
 
 
 def columns_of(header):
-    """The meaning of each column, None for one that is not wanted."""
+    """The meaning of each column, None for one that is ignored."""
     meanings = []
     for title in header:
         title = tidy(title).lower()
@@ -338,7 +338,7 @@ class Rows:
             try:
                 yield decoded(line, self.charset) + "\n"
             except Refused:
-                self.bad = True  # the row is refused once it is whole
+                self.bad = True  # the row is refused when it is complete
                 yield line.decode("ascii", "replace") + "\n"
 
     def rows(self):

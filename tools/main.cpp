@@ -75,8 +75,9 @@ int RunCommandLine(CLI::App& app, int argc, char** argv)
     return eExit;
 }
 
-// Of a stream that the caller closed, the descriptor would go to the next file that is opened, and
-// the output into that file. It is taken in a way that reading and writing fail.
+// If the caller closed a standard stream, the next file that is opened would get its descriptor,
+// and the output would go into that file. Occupies such descriptors so that reading and writing
+// fail.
 void TakeClosedStreams()
 {
     for (const int iFd : {STDIN_FILENO, STDOUT_FILENO, STDERR_FILENO})

@@ -231,8 +231,8 @@ def _match(entry: _Match) -> Match:
 
 
 class Result(Sequence):
-    """What a search found, the best match first. Later changes of the index do not affect it. It may
-    outlive the index, and is released with the object, by close, or at the end of a with."""
+    """What a search found, the best match first. Later changes of the index do not affect it, and
+    it may outlive the index. It is released with the object, by close, or at the end of a with."""
 
     def __init__(self, pointer: ctypes.c_void_p, lock: threading.Lock):
         self._pointer = pointer

@@ -1,4 +1,4 @@
-# Completion for bash. It reads the program's own --help, and so knows what the program knows.
+# Completion for bash. It reads the program's --help, so it needs no list of its own.
 
 _qvlocalize_subcommands() {
     sed -n '/^S[Uu][Bb]/,$s/^  \([a-z-]\{1,\}\)  .*/\1/p'
@@ -8,7 +8,7 @@ _qvlocalize_options() {
     sed -n 's/^  *\(-[a-z], *\)\{0,1\}\(--[a-z-]*\).*/\2/p'
 }
 
-# What the option $1 takes, such as DIR, FILE or TEXT:{a,b}; nothing for a flag.
+# The argument of the option $1, such as DIR, FILE or TEXT:{a,b}; nothing for a flag.
 _qvlocalize_value() {
     sed -n "s/^  *$1 \([A-Z]\{1,\}\(:{[^}]*}\)\{0,1\}\)\([= ].*\)\{0,1\}$/\1/p"
 }

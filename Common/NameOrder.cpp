@@ -8,14 +8,14 @@
 namespace
 {
 
-constexpr int COMPARE_EQUAL = 2; // of _CompareString: 1 before, 2 equal, 3 behind
+constexpr int COMPARE_EQUAL = 2; // of _CompareString: 1 before, 2 equal, 3 after
 
 int BoundedLength(const wchar_t (&szName)[CONTACT_MAX_NAME + 1])
 {
     return static_cast<int>(wcsnlen(szName, CONTACT_MAX_NAME + 1));
 }
 
-// 1 if only a has a property that sorts behind, -1 if only b has it, else 0.
+// 1 if only a has a property that sorts after others, -1 if only b has it, else 0.
 int BehindByProperty(bool bHasA, bool bHasB)
 {
     return static_cast<int>(bHasA) - static_cast<int>(bHasB);

@@ -13,7 +13,7 @@
 // The keys alone: negative, 0 or positive.
 int CompareNameText(const tag_ContactsStruct& a, const tag_ContactsStruct& b);
 
-// Whether a belongs behind b.
+// Whether a sorts after b.
 bool NameSortsBehind(const tag_ContactsStruct& a, const tag_ContactsStruct& b);
 
 #endif

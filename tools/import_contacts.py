@@ -117,7 +117,7 @@ def lines_of(octets):
 
 
 def cards_of(lines):
-    """The cards as lists of numbered lines. The list of a card that is cut off, by another one or by
+    """The cards as lists of numbered lines. The list of a card that is cut off by another one or by
     the end of the file, ends with a Refused; a line outside of cards gives a Refused alone."""
     card, depth, outside = [], 0, False
     for number, line in lines:

@@ -42,7 +42,7 @@ constexpr int STORE_SPARE_RECORDS = 1000;
 constexpr int STORE_ORDER_NAME = 0;
 constexpr int STORE_ORDER_TIME = 1; // last contacted first
 
-// One contact. Whoever creates a record zero-fills it; the reader ORs flag bits into it.
+// One contact. A record is created zero-filled; the reader ORs flag bits into it.
 struct tag_ContactsStruct
 {
     int32_t iContactID;                          // the provider's _id
@@ -71,7 +71,7 @@ static_assert(offsetof(tag_ContactsStruct, szLocalizerKey) == 636, "file layout"
 static_assert(offsetof(tag_ContactsStruct, szReserved) == 680, "file layout");
 static_assert(std::is_trivially_copyable<tag_ContactsStruct>::value, "copied whole");
 
-// An array of records with its count. Whoever holds it releases pContacts with array delete;
+// An array of records with its count. The holder releases pContacts with array delete;
 // null when nothing was read. Filters lower RecordNum and leave the allocation as it is.
 struct tag_ContactsInfo
 {

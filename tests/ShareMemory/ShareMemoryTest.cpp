@@ -20,6 +20,7 @@
 #include <linux/seccomp.h>
 #include <regex>
 #include <sched.h>
+#include <sstream>
 #include <sys/mman.h>
 #include <sys/mount.h>
 #include <sys/prctl.h>
@@ -126,9 +127,11 @@ TEST_F(ShareMemory, TellsWhyNothingIsMappedOrClosed)
         EXPECT_EQ(OpenShareMemory(strPath.c_str(), 12), MAP_FAILED);
         EXPECT_EQ(OpenWriteShareMemory(strPath.c_str(), 12), MAP_FAILED);
         EXPECT_EQ(OpenReadShareMemory(strPath.c_str(), 12), MAP_FAILED);
-        EXPECT_EQ(Errors(), "QV_Contacts: OpenShareMemory" + strError +
-                                "QV_Contacts: OpenWriteShareMemory " + strPath + strError +
-                                "QV_Contacts: OpenReadShareMemory:" + strPath + strError);
+        std::ostringstream expected;
+        expected << "QV_Contacts: OpenShareMemory" << strError
+                 << "QV_Contacts: OpenWriteShareMemory " << strPath << strError
+                 << "QV_Contacts: OpenReadShareMemory:" << strPath << strError;
+        EXPECT_EQ(Errors(), expected.str());
     }
 }
 

@@ -5,6 +5,7 @@
 #include <cstdlib>
 #include <filesystem>
 #include <fstream>
+#include <sstream>
 #include <stdexcept>
 
 namespace fs = std::filesystem;
@@ -41,13 +42,9 @@ bool CDataDirectory::Exists(const std::string& strPath)
 
 std::string CDataDirectory::ReadBytes(const std::string& strPath)
 {
-    std::error_code error;
-    const uintmax_t uSize = fs::file_size(strPath, error);
-    std::string strBytes(error ? 0 : static_cast<size_t>(uSize), '\0');
-    std::ifstream stream(strPath, std::ios::binary);
-    stream.read(strBytes.data(), static_cast<std::streamsize>(strBytes.size()));
-    strBytes.resize(static_cast<size_t>(stream.gcount()));
-    return strBytes;
+    std::ostringstream bytes;
+    bytes << std::ifstream(strPath, std::ios::binary).rdbuf();
+    return bytes.str();
 }
 
 void CDataDirectory::WriteBytes(const std::string& strPath, const std::string& strBytes)

@@ -48,7 +48,7 @@ int IdOf(const wchar_t* szKey)
     int iId = 0;
     for (size_t i = std::wcslen(szKey); i > 1; --i)
     {
-        iId = iId * 10 + static_cast<int>(szKey[i - 1]) - (LOC_ALPHA_BASE + 1);
+        iId = iId * 10 + static_cast<int>(szKey[i - 1] - LOC_ALPHA_BASE) - 1; // 'b' for 0
     }
     return iId;
 }

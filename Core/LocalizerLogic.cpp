@@ -10,7 +10,7 @@
 #include "LocalizerImpl/QVWordLocalizerManager.h"
 #include "LocalizerImpl/SearchRun.h"
 #include "MemManager/ContactSelection.h"
-#include "MemManager/LockAttempts.h"
+#include "MemManager/HeldStore.h"
 #include "MemManager/MemManger.h"
 #include "MemManager/ResultSet.h"
 #include "MemManager/StoreBuild.h"
@@ -37,22 +37,6 @@ int FileSize(const char* szPath)
         return 0;
     }
     return static_cast<int>(info.st_size);
-}
-
-// Whether the store is complete. Waits for a change that is under way, as long as a build would.
-bool IsStoreWhole()
-{
-    if (CStoreRegister::IsChangeLost())
-    {
-        return false;
-    }
-    tag_ContactReg reg = {};
-    if (CStoreRegister::Inspect(&reg) == STORE_WHOLE)
-    {
-        return true;
-    }
-    CStoreLock lock;
-    return TryStoreLock(&lock, [](int) {}) && CStoreRegister::Inspect(&reg) == STORE_WHOLE;
 }
 
 // The matcher for a kind of input; null if the allocation fails.

@@ -1,7 +1,6 @@
 #include "LocalizerImpl/LowMapping.h"
 
 #include "MemManager/Files/Descriptor.h"
-#include "MemManager/Files/StoreFile.h"
 
 #include <fcntl.h>
 #include <sys/mman.h>

@@ -9,7 +9,6 @@
 #include "MemManager/Files/Descriptor.h"
 #include "MemManager/Files/MappingGuards.h"
 #include "MemManager/Files/ShareMemory.h"
-#include "MemManager/Files/StoreFile.h"
 
 #include <fcntl.h>
 #include <sys/mman.h>

@@ -6,7 +6,8 @@
 #include "Filter/FilterProcess.h"
 #include "Filter/FilterProcessFactory.h"
 #include "Filter/RecordRule.h"
-#include "MemManager/LockAttempts.h"
+#include "MemManager/Files/MappingGuards.h"
+#include "MemManager/Files/StoreLock.h"
 #include "MemManager/StoreRegister.h"
 
 #include <algorithm>

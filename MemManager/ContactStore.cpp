@@ -1,6 +1,7 @@
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
-#include "MemManager/LockAttempts.h"
+#include "MemManager/Files/MappingGuards.h"
+#include "MemManager/Files/StoreLock.h"
 #include "MemManager/MemManger.h"
 #include "MemManager/StoreBuild.h"
 #include "MemManager/StoreRegister.h"

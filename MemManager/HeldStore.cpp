@@ -2,7 +2,7 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
-#include "MemManager/LockAttempts.h"
+#include "MemManager/Files/StoreLock.h"
 #include "MemManager/MemManger.h"
 
 namespace
@@ -49,6 +49,23 @@ void MarkForLostChange()
     {
         MarkWithoutLock();
     }
+}
+
+bool IsStoreWhole()
+{
+    if (CStoreRegister::IsChangeLost())
+    {
+        return false;
+    }
+    tag_ContactReg reg = {};
+    if (CStoreRegister::Inspect(&reg) == STORE_WHOLE)
+    {
+        return true;
+    }
+    CWriterLock writer;
+    CStoreLock lock;
+    return TryStoreLock(&lock, [](int) {}) && writer.Take() &&
+           CStoreRegister::Inspect(&reg) == STORE_WHOLE;
 }
 
 CHeldStore::CHeldStore(CMemManger& manager)

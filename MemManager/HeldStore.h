@@ -7,7 +7,7 @@
 // marked, so that the next notification of contacts or status makes up for it.
 
 #include "MemManager/Files/MappingGuards.h"
-#include "MemManager/Files/WriterLock.h"
+#include "MemManager/Files/StoreLock.h"
 #include "MemManager/StoreRegister.h"
 
 class CMemManger;
@@ -22,6 +22,10 @@ enum HOLD_RESULT
 // Marks the store for a change that did not reach it. Tries the lock like a build; without it a
 // running writer may lift the mark, so the process remembers the change as well.
 void MarkForLostChange();
+
+// Whether the store is whole and no change was lost. Waits for a change that is under way, until it
+// is on the disk, as long as a build would.
+bool IsStoreWhole();
 
 // The store during a patch: the manager owns the store lock and the mappings.
 class CHeldStore

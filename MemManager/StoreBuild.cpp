@@ -2,8 +2,8 @@
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
-#include "MemManager/Files/WriterLock.h"
-#include "MemManager/LockAttempts.h"
+#include "MemManager/Files/MappingGuards.h"
+#include "MemManager/Files/StoreLock.h"
 #include "MemManager/RecordSlots.h"
 #include "MemManager/StoreRegister.h"
 

@@ -4,7 +4,6 @@
 #include "Common/Log.h"
 #include "MemManager/Files/Descriptor.h"
 #include "MemManager/Files/MappingGuards.h"
-#include "MemManager/Files/StoreFile.h"
 
 #include <algorithm>
 #include <atomic>

@@ -5,7 +5,6 @@
 // goes out of scope.
 
 #include "MemManager/Files/ShareMemory.h"
-#include "MemManager/Files/SingleMutex.h"
 
 #include <sys/mman.h>
 
@@ -92,34 +91,6 @@ public:
 private:
     void* m_pAddr = nullptr;
     size_t m_uSize = 0;
-};
-
-// The store lock with a holder of its own (see CSingleMutex).
-class CStoreLock
-{
-public:
-    CStoreLock() = default;
-    ~CStoreLock() { Release(); }
-    CStoreLock(const CStoreLock&) = delete;
-    CStoreLock& operator=(const CStoreLock&) = delete;
-
-    // One attempt, without waiting; call only while this object does not hold the lock. The quiet
-    // one writes no log line.
-    LOCK_RESULT TryLock() { return CSingleMutex::TryLock(&m_iFd); }
-    LOCK_RESULT TryLockQuietly() { return CSingleMutex::TryLockQuietly(&m_iFd); }
-    bool IsHeld() const { return m_iFd != 0; }
-    // Releases the lock if it is held.
-    void Release()
-    {
-        if (IsHeld())
-        {
-            CSingleMutex::UnLock(&m_iFd);
-            m_iFd = 0;
-        }
-    }
-
-private:
-    int m_iFd = 0;
 };
 
 #endif

@@ -2,7 +2,6 @@
 
 #include "Common/Log.h"
 #include "MemManager/Files/Descriptor.h"
-#include "MemManager/Files/StoreFile.h"
 
 #include <algorithm>
 #include <cerrno>

@@ -3,7 +3,6 @@
 #include "Common/DataPaths.h"
 #include "Common/Log.h"
 #include "MemManager/Files/Descriptor.h"
-#include "MemManager/Files/StoreFile.h"
 
 #include <cerrno>
 #include <fcntl.h>

@@ -4,7 +4,7 @@
 #include "Filter/Filter.h"
 #include "Filter/FilterChain.h"
 #include "MemManager/ContactSelection.h"
-#include "MemManager/Files/WriterLock.h"
+#include "MemManager/Files/StoreLock.h"
 #include "MemManager/MemManger.h"
 #include "MemManager/StoreRegister.h"
 #include "tests/Support/ChildProcess.h"

@@ -4,7 +4,7 @@
 
 #include "Common/DataPaths.h"
 #include "MemManager/Files/SingleMutex.h"
-#include "MemManager/LockAttempts.h"
+#include "MemManager/Files/StoreLock.h"
 #include "tests/Support/ChildProcess.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"

@@ -1,4 +1,4 @@
-#include "MemManager/Files/WriterLock.h"
+#include "MemManager/Files/StoreLock.h"
 
 #include "Common/DataPaths.h"
 

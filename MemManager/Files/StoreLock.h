@@ -1,11 +1,56 @@
-#ifndef QV_MEMMANAGER_LOCKATTEMPTS_H
-#define QV_MEMMANAGER_LOCKATTEMPTS_H
+#ifndef QV_MEMMANAGER_FILES_STORELOCK_H
+#define QV_MEMMANAGER_FILES_STORELOCK_H
 
 #include "Common/Log.h"
 #include "Common/SystemTime.h"
-#include "MemManager/Files/MappingGuards.h"
+#include "MemManager/Files/Descriptor.h"
+#include "MemManager/Files/SingleMutex.h"
 
 #include <chrono>
+
+// The store lock with a holder of its own (see CSingleMutex).
+class CStoreLock
+{
+public:
+    CStoreLock() = default;
+    ~CStoreLock() { Release(); }
+    CStoreLock(const CStoreLock&) = delete;
+    CStoreLock& operator=(const CStoreLock&) = delete;
+
+    // One attempt, without waiting; call only while this object does not hold the lock. The quiet
+    // one writes no log line.
+    LOCK_RESULT TryLock() { return CSingleMutex::TryLock(&m_iFd); }
+    LOCK_RESULT TryLockQuietly() { return CSingleMutex::TryLockQuietly(&m_iFd); }
+    bool IsHeld() const { return m_iFd != 0; }
+    // Releases the lock if it is held.
+    void Release()
+    {
+        if (IsHeld())
+        {
+            CSingleMutex::UnLock(&m_iFd);
+            m_iFd = 0;
+        }
+    }
+
+private:
+    int m_iFd = 0;
+};
+
+// A writer of the store takes this lock after the store lock and keeps it longer: until its records
+// are on the disk and its mark is lifted. Searches take the store lock alone, so they do not wait
+// for the disk. It is an advisory lock on the directory of the store files; like the store lock it
+// excludes every other holder, and the system releases it when its process dies.
+class CWriterLock
+{
+public:
+    // Call with the store lock held. Waits for a writer that has released the store lock but not
+    // yet this one. False if the directory cannot be opened or locked.
+    bool Take();
+    void Release() { m_directory.Reset(); }
+
+private:
+    CDescriptor m_directory;
+};
 
 constexpr int STORE_LOCK_ATTEMPTS = 5;
 constexpr std::chrono::milliseconds STORE_LOCK_PAUSE(200);

@@ -1,5 +1,3 @@
-#include "MemManager/Files/StoreFile.h"
-
 #include "MemManager/Files/Descriptor.h"
 
 #include <cerrno>

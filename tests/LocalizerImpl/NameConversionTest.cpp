@@ -116,6 +116,7 @@ TEST_F(NameConversion, PutsAPickedCharacterInPlaceOfItsLetters)
     EXPECT_EQ(Pick(L"liz", 3, L"长"), L"0 LI长") << "the second reading";
     EXPECT_EQ(Pick(L"Zhangs", 5, L"三"), L"0 zhangs") << "no letter fits";
     EXPECT_EQ(Pick(L"Li", 2, L"한"), L"-1000 li") << "not in the table";
+    EXPECT_EQ(Pick(L"Li", 2, L"三三"), L"-1000 li") << "two characters";
     EXPECT_EQ(Pick(L"Li", 1, L"abc"), L"0 LIABC") << "no Chinese character";
     EXPECT_EQ(Pick(L"Li", 1, L"abcdefghijk"), L"0 LIABCDEFGHI") << "nine bytes of it";
 }

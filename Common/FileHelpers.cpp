@@ -176,8 +176,8 @@ void RunCommand(const char* szWords, const char* const* pPaths, int iPaths)
 
 int GetModuleFileName(void* /*hModule*/, wchar_t* szPath, int iLastByte)
 {
-    CTextFile clMaps(MAPS_FILE);
-    if (szPath == nullptr || !clMaps.IsOpen())
+    CTextFile maps(MAPS_FILE);
+    if (szPath == nullptr || !maps.IsOpen())
     {
         return -1;
     }
@@ -186,7 +186,7 @@ int GetModuleFileName(void* /*hModule*/, wchar_t* szPath, int iLastByte)
     const uintptr_t uOwnText = reinterpret_cast<uintptr_t>(&PathOfMapping);
     int iResult = -1;
     char szLine[MAX_MAPS_READ];
-    while (clMaps.ReadLine(szLine, MAX_MAPS_READ))
+    while (maps.ReadLine(szLine, MAX_MAPS_READ))
     {
         const char* szFound = PathOfMapping(szLine, uOwnText);
         if (szFound != nullptr)

@@ -1,9 +1,8 @@
 #include "Common/SystemTime.h"
 
-#include <sys/time.h>
-
 #include <chrono>
 #include <ctime>
+#include <sys/time.h>
 #include <thread>
 
 namespace

@@ -16,11 +16,10 @@
 #include "MemManager/StoreBuild.h"
 #include "MemManager/StoreRegister.h"
 
-#include <sys/stat.h>
-#include <unistd.h>
-
 #include <memory>
 #include <new>
+#include <sys/stat.h>
+#include <unistd.h>
 
 namespace
 {

@@ -37,22 +37,21 @@ static_assert(NAME_LAST_BYTE + 1 < TEXT_BUFFER && KEY_LAST_BYTE + 1 < TEXT_BUFFE
               "a byte gives one unit at most, and a terminator follows");
 
 // A flag column holds 0 or 1; any other value also sets bits above the flag.
-uint32_t FlagBits(const CSqlStatement& clRow, int iColumn, uint32_t uFlag)
+uint32_t FlagBits(const CSqlStatement& row, int iColumn, uint32_t uFlag)
 {
-    return static_cast<uint32_t>(clRow.Int(iColumn)) * uFlag;
+    return static_cast<uint32_t>(row.Int(iColumn)) * uFlag;
 }
 
 // Of text that is not valid UTF-8, the part before the fault is kept.
-void CopyText(const CSqlStatement& clRow, int iColumn, int iLastByte, wchar_t* pField,
-              int iMaxUnits)
+void CopyText(const CSqlStatement& row, int iColumn, int iLastByte, wchar_t* pField, int iMaxUnits)
 {
-    const char* szText = clRow.Text(iColumn);
+    const char* szText = row.Text(iColumn);
     if (szText == nullptr || szText[0] == '\0')
     {
         return;
     }
     wchar_t szUnits[TEXT_BUFFER] = {};
-    _mbstowcs(szUnits, szText, std::min(clRow.Bytes(iColumn), iLastByte));
+    _mbstowcs(szUnits, szText, std::min(row.Bytes(iColumn), iLastByte));
     std::copy_n(szUnits, iMaxUnits, pField);
     pField[iMaxUnits] = 0;
 }
@@ -74,29 +73,29 @@ bool IsDigit(char c)
 
 } // namespace
 
-void FillFromContactsRow(const CSqlStatement& clRow, tag_ContactsStruct* pContact)
+void FillFromContactsRow(const CSqlStatement& row, tag_ContactsStruct* pContact)
 {
-    pContact->iContactID = clRow.Int(CONTACTS_ID);
-    pContact->iTimesContacted = clRow.Int(CONTACTS_TIMES);
-    pContact->iFlags |= FlagBits(clRow, CONTACTS_STARRED, CONTACT_FLAG_STARRED);
-    pContact->iFlags |= FlagBits(clRow, CONTACTS_PHONE, CONTACT_FLAG_PHONE);
-    pContact->llLastTimeContacted = clRow.Int64(CONTACTS_LAST_TIME);
-    pContact->iFlags |= FlagBits(clRow, CONTACTS_SECRET, CONTACT_FLAG_SECRET);
+    pContact->iContactID = row.Int(CONTACTS_ID);
+    pContact->iTimesContacted = row.Int(CONTACTS_TIMES);
+    pContact->iFlags |= FlagBits(row, CONTACTS_STARRED, CONTACT_FLAG_STARRED);
+    pContact->iFlags |= FlagBits(row, CONTACTS_PHONE, CONTACT_FLAG_PHONE);
+    pContact->llLastTimeContacted = row.Int64(CONTACTS_LAST_TIME);
+    pContact->iFlags |= FlagBits(row, CONTACTS_SECRET, CONTACT_FLAG_SECRET);
 }
 
-bool FillFromLocalizerRow(const CSqlStatement& clRow, int iMaxGroups, tag_ContactsStruct* pContact)
+bool FillFromLocalizerRow(const CSqlStatement& row, int iMaxGroups, tag_ContactsStruct* pContact)
 {
-    CopyText(clRow, LOCALIZER_NAME, NAME_LAST_BYTE, pContact->szName, CONTACT_MAX_NAME);
-    CopyText(clRow, LOCALIZER_KEY, KEY_LAST_BYTE, pContact->szLocalizerKey, CONTACT_MAX_KEY);
-    ParseIdText(clRow.Text(LOCALIZER_GROUPS), pContact->lGroupID, iMaxGroups);
+    CopyText(row, LOCALIZER_NAME, NAME_LAST_BYTE, pContact->szName, CONTACT_MAX_NAME);
+    CopyText(row, LOCALIZER_KEY, KEY_LAST_BYTE, pContact->szLocalizerKey, CONTACT_MAX_KEY);
+    ParseIdText(row.Text(LOCALIZER_GROUPS), pContact->lGroupID, iMaxGroups);
     if ((pContact->iFlags & CONTACT_FLAG_SECRET) != 0)
     {
         AddSecretGroup(pContact);
     }
-    ParseIdText(clRow.Text(LOCALIZER_ACCOUNTS), pContact->lAccountID, CONTACT_MAX_ACCOUNTS);
-    pContact->iFlags |= FlagBits(clRow, LOCALIZER_MAIL, CONTACT_FLAG_MAIL);
-    pContact->iFlags |= FlagBits(clRow, LOCALIZER_ADDRESS, CONTACT_FLAG_ADDRESS);
-    return !clRow.IsOutOfMemory();
+    ParseIdText(row.Text(LOCALIZER_ACCOUNTS), pContact->lAccountID, CONTACT_MAX_ACCOUNTS);
+    pContact->iFlags |= FlagBits(row, LOCALIZER_MAIL, CONTACT_FLAG_MAIL);
+    pContact->iFlags |= FlagBits(row, LOCALIZER_ADDRESS, CONTACT_FLAG_ADDRESS);
+    return !row.IsOutOfMemory();
 }
 
 void ParseIdText(const char* szText, QVLong32* pIds, int iMax)

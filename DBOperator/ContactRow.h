@@ -18,12 +18,12 @@ constexpr int SINGLE_ROW_GROUPS = CONTACT_MAX_GROUPS;
 
 // Columns: _id, times_contacted, starred, has_phone_number, last_time_contacted,
 // single_is_secret, photo_file_id (not kept).
-void FillFromContactsRow(const CSqlStatement& clRow, tag_ContactsStruct* pContact);
+void FillFromContactsRow(const CSqlStatement& row, tag_ContactsStruct* pContact);
 
 // Columns: contact_id (ignored), display_name, localizerkey, group_id, account_id, hasMail,
 // hasAddress. Call it after FillFromContactsRow, which sets the secret flag. False if SQLite failed
 // to allocate a text, which is then missing.
-bool FillFromLocalizerRow(const CSqlStatement& clRow, int iMaxGroups, tag_ContactsStruct* pContact);
+bool FillFromLocalizerRow(const CSqlStatement& row, int iMaxGroups, tag_ContactsStruct* pContact);
 
 // As CSQLiteOperator::ParseIDString.
 void ParseIdText(const char* szText, QVLong32* pIds, int iMax);

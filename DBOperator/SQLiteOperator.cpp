@@ -50,10 +50,10 @@ static_assert(sizeof(SELECT_CONTACT_BY_ID) + sizeof("-2147483648") <= ID_STATEME
 class CListStatement
 {
 public:
-    CListStatement(const char* szQuery, const char* szJoin, const CSqlIdList& clIds)
+    CListStatement(const char* szQuery, const char* szJoin, const CSqlIdList& ids)
     {
-        std::snprintf(m_szText, sizeof(m_szText), "%s%s%s", szQuery, clIds.IsEmpty() ? "" : szJoin,
-                      clIds.Text());
+        std::snprintf(m_szText, sizeof(m_szText), "%s%s%s", szQuery, ids.IsEmpty() ? "" : szJoin,
+                      ids.Text());
     }
     const char* Text() const { return m_szText; }
 
@@ -100,20 +100,20 @@ constexpr tag_CountLines GET_COUNT_LINES = {
 // Stores the number that the query returns in iCount, which keeps its value on failure.
 int QueryCount(sqlite3* pDB, const char* szSql, const tag_CountLines& lines, int& iCount)
 {
-    CSqlStatement clRow(pDB);
-    int iRetCode = clRow.PrepareBounded(szSql, QV_LOG_ERROR, lines.szBusy);
+    CSqlStatement row(pDB);
+    int iRetCode = row.PrepareBounded(szSql, QV_LOG_ERROR, lines.szBusy);
     if (iRetCode != SQLITE_OK)
     {
         QV_LOGE(DB_LOG_TAG, "%s%d", lines.szPrepareError, iRetCode);
         return -1;
     }
-    iRetCode = clRow.StepBounded(lines.pfnLogTry);
+    iRetCode = row.StepBounded(lines.pfnLogTry);
     if (iRetCode != SQLITE_ROW)
     {
         QV_LOGE(DB_LOG_TAG, "%s%d", lines.szStepError, iRetCode);
         return -1;
     }
-    iCount = clRow.Int(0);
+    iCount = row.Int(0);
     return 0;
 }
 
@@ -132,16 +132,16 @@ int AllocateRecords(tag_ContactsInfo* pRecord)
 
 // One record per row. Rows that were added since the count are dropped; if rows were removed since
 // the count, the last records stay zero and MergeLocalizer will not complete them.
-void FillContacts(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
+void FillContacts(CSqlStatement& rows, tag_ContactsInfo* pRecord)
 {
     int iFilled = 0;
-    int iRetCode = clRows.Step();
+    int iRetCode = rows.Step();
     while (iRetCode == SQLITE_ROW && iFilled < pRecord->RecordNum)
     {
         tag_ContactsStruct* pContact = &pRecord->pContacts[iFilled++];
-        FillFromContactsRow(clRows, pContact);
-        pContact->iStatusUpdateID = clRows.Int(CONTACTS_STATUS_COLUMN);
-        iRetCode = clRows.Step();
+        FillFromContactsRow(rows, pContact);
+        pContact->iStatusUpdateID = rows.Int(CONTACTS_STATUS_COLUMN);
+        iRetCode = rows.Step();
     }
     if (iRetCode != SQLITE_DONE)
     {
@@ -154,21 +154,21 @@ void FillContacts(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
 
 // Completes the records, in order, from their rows; rows of other contacts are skipped. Returns the
 // number of records completed.
-int MergeLocalizer(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
+int MergeLocalizer(CSqlStatement& rows, tag_ContactsInfo* pRecord)
 {
     int iIndex = 0;
-    int iRetCode = clRows.Step();
+    int iRetCode = rows.Step();
     while (iRetCode == SQLITE_ROW && iIndex < pRecord->RecordNum)
     {
-        if (clRows.Int(LOCALIZER_ID_COLUMN) == pRecord->pContacts[iIndex].iContactID)
+        if (rows.Int(LOCALIZER_ID_COLUMN) == pRecord->pContacts[iIndex].iContactID)
         {
-            if (!FillFromLocalizerRow(clRows, ROW_GROUPS, &pRecord->pContacts[iIndex]))
+            if (!FillFromLocalizerRow(rows, ROW_GROUPS, &pRecord->pContacts[iIndex]))
             {
                 break;
             }
             ++iIndex;
         }
-        iRetCode = clRows.Step();
+        iRetCode = rows.Step();
     }
     if (iRetCode != SQLITE_DONE)
     {
@@ -192,20 +192,20 @@ void ClearOnline(tag_ContactsInfo* pRecord)
 }
 
 // Marks the contacts of the current row and of all following rows.
-void MarkOnline(CSqlStatement& clRows, tag_ContactsInfo* pRecord)
+void MarkOnline(CSqlStatement& rows, tag_ContactsInfo* pRecord)
 {
-    const CStatusIndex clIndex(pRecord->pContacts, RecordCount(pRecord));
+    const CStatusIndex index(pRecord->pContacts, RecordCount(pRecord));
     do
     {
-        const int iStatusId = clRows.Int(0);
-        tag_ContactsStruct* pContact = clIndex.First(iStatusId);
+        const int iStatusId = rows.Int(0);
+        tag_ContactsStruct* pContact = index.First(iStatusId);
         if (pContact != nullptr)
         {
             QV_LOGD(DB_LOG_TAG, "CSQLiteOperator:Find one contact is sms online:statusid:%d\n",
                     iStatusId);
             pContact->iFlags |= CONTACT_FLAG_ONLINE;
         }
-    } while (clRows.Step() == SQLITE_ROW);
+    } while (rows.Step() == SQLITE_ROW);
 }
 
 } // namespace
@@ -270,8 +270,8 @@ int CSQLiteOperator::ReadAllLocalizer(tag_ContactsInfo* pRecord, long lCount, lo
     {
         return -1;
     }
-    const CSqlIdList clIds(lCount, pIds);
-    if (CountContacts(clIds, pRecord) != 0)
+    const CSqlIdList ids(lCount, pIds);
+    if (CountContacts(ids, pRecord) != 0)
     {
         return -1;
     }
@@ -279,11 +279,11 @@ int CSQLiteOperator::ReadAllLocalizer(tag_ContactsInfo* pRecord, long lCount, lo
     {
         return 0;
     }
-    if (AllocateRecords(pRecord) != 0 || ReadContacts(clIds, pRecord) != 0)
+    if (AllocateRecords(pRecord) != 0 || ReadContacts(ids, pRecord) != 0)
     {
         return -1;
     }
-    return ReadLocalizer(clIds, pRecord);
+    return ReadLocalizer(ids, pRecord);
 }
 
 int CSQLiteOperator::ReadContactsByID(int iContactID, tag_ContactsStruct* pContact, int& iFound)
@@ -309,9 +309,9 @@ int CSQLiteOperator::ReadAllSmsOnlineStatus(tag_ContactsInfo* pRecord, long /*lC
     {
         return -1;
     }
-    CSqlStatement clRows(m_pDB);
+    CSqlStatement rows(m_pDB);
     int iRetCode =
-        clRows.PrepareBounded(SELECT_ONLINE, QV_LOG_DEBUG, "!!! SQLITE_BUSY: select count");
+        rows.PrepareBounded(SELECT_ONLINE, QV_LOG_DEBUG, "!!! SQLITE_BUSY: select count");
     if (iRetCode != SQLITE_OK)
     {
         if (iRetCode != SQLITE_BUSY)
@@ -320,7 +320,7 @@ int CSQLiteOperator::ReadAllSmsOnlineStatus(tag_ContactsInfo* pRecord, long /*lC
         }
         return -1;
     }
-    iRetCode = clRows.Step();
+    iRetCode = rows.Step();
     if (iRetCode != SQLITE_ROW && iRetCode != SQLITE_DONE)
     {
         return -1;
@@ -328,7 +328,7 @@ int CSQLiteOperator::ReadAllSmsOnlineStatus(tag_ContactsInfo* pRecord, long /*lC
     ClearOnline(pRecord);
     if (iRetCode == SQLITE_ROW)
     {
-        MarkOnline(clRows, pRecord);
+        MarkOnline(rows, pRecord);
     }
     return 0;
 }
@@ -344,15 +344,15 @@ int CSQLiteOperator::EnsureOpen()
 }
 
 // RecordNum becomes the number of contacts that the two record queries are expected to give.
-int CSQLiteOperator::CountContacts(const CSqlIdList& clIds, tag_ContactsInfo* pRecord)
+int CSQLiteOperator::CountContacts(const CSqlIdList& ids, tag_ContactsInfo* pRecord)
 {
-    const CListStatement clSql(SELECT_COUNT, AND_ID, clIds);
+    const CListStatement sql(SELECT_COUNT, AND_ID, ids);
     QV_LOGD(DB_LOG_TAG,
             "QV_Contacts>>QV_ContactsLocalize_SO>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_3 = "
             "%s\n",
-            clSql.Text());
+            sql.Text());
     int iCount = 0;
-    if (QueryCount(m_pDB, clSql.Text(), READ_COUNT_LINES, iCount) != 0)
+    if (QueryCount(m_pDB, sql.Text(), READ_COUNT_LINES, iCount) != 0)
     {
         return -1;
     }
@@ -368,14 +368,14 @@ int CSQLiteOperator::CountContacts(const CSqlIdList& clIds, tag_ContactsInfo* pR
     return 0;
 }
 
-int CSQLiteOperator::ReadContacts(const CSqlIdList& clIds, tag_ContactsInfo* pRecord)
+int CSQLiteOperator::ReadContacts(const CSqlIdList& ids, tag_ContactsInfo* pRecord)
 {
-    const CListStatement clSql(SELECT_CONTACTS, AND_ID, clIds);
+    const CListStatement sql(SELECT_CONTACTS, AND_ID, ids);
     QV_LOGD(DB_LOG_TAG, "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_4 = %s\n",
-            clSql.Text());
-    CSqlStatement clRows(m_pDB);
-    const int iRetCode = clRows.PrepareUnbounded(
-        clSql.Text(), "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: select from contacts");
+            sql.Text());
+    CSqlStatement rows(m_pDB);
+    const int iRetCode = rows.PrepareUnbounded(
+        sql.Text(), "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: select from contacts");
     if (iRetCode != SQLITE_OK)
     {
         QV_LOGE(DB_LOG_TAG,
@@ -383,23 +383,23 @@ int CSQLiteOperator::ReadContacts(const CSqlIdList& clIds, tag_ContactsInfo* pRe
                 iRetCode);
         return -1;
     }
-    FillContacts(clRows, pRecord);
+    FillContacts(rows, pRecord);
     return 0;
 }
 
-int CSQLiteOperator::ReadLocalizer(const CSqlIdList& clIds, tag_ContactsInfo* pRecord)
+int CSQLiteOperator::ReadLocalizer(const CSqlIdList& ids, tag_ContactsInfo* pRecord)
 {
-    const CListStatement clSql(SELECT_LOCALIZER, WHERE_CONTACT_ID, clIds);
+    const CListStatement sql(SELECT_LOCALIZER, WHERE_CONTACT_ID, ids);
     QV_LOGD(DB_LOG_TAG, "QV_Contacts>>C>>SQLiteOperator>> ReadAllLocalizer>> sqlstat_5 = %s\n",
-            clSql.Text());
-    CSqlStatement clRows(m_pDB);
-    if (clRows.PrepareUnbounded(clSql.Text(), "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: "
-                                              "select from localizer") != SQLITE_OK)
+            sql.Text());
+    CSqlStatement rows(m_pDB);
+    if (rows.PrepareUnbounded(sql.Text(), "QV_Contacts>>QV_ContactsLocalize_SO>> SQLITE_BUSY: "
+                                          "select from localizer") != SQLITE_OK)
     {
         return -1;
     }
-    const int iCompleted = MergeLocalizer(clRows, pRecord);
-    clRows.Finalize();
+    const int iCompleted = MergeLocalizer(rows, pRecord);
+    rows.Finalize();
     close();
     if (iCompleted < pRecord->RecordNum)
     {
@@ -415,15 +415,15 @@ int CSQLiteOperator::ReadContactRow(int iContactID, tag_ContactsStruct* pContact
 {
     char szSql[ID_STATEMENT_SIZE];
     std::snprintf(szSql, sizeof(szSql), SELECT_CONTACT_BY_ID, iContactID);
-    CSqlStatement clRow(m_pDB);
-    if (clRow.Prepare(szSql) != SQLITE_OK)
+    CSqlStatement row(m_pDB);
+    if (row.Prepare(szSql) != SQLITE_OK)
     {
         return -1;
     }
-    iFound = clRow.Step() == SQLITE_ROW ? 1 : 0;
+    iFound = row.Step() == SQLITE_ROW ? 1 : 0;
     if (iFound == 1)
     {
-        FillFromContactsRow(clRow, pContact);
+        FillFromContactsRow(row, pContact);
     }
     return 0;
 }
@@ -432,12 +432,12 @@ int CSQLiteOperator::ReadLocalizerRow(int iContactID, tag_ContactsStruct* pConta
 {
     char szSql[ID_STATEMENT_SIZE];
     std::snprintf(szSql, sizeof(szSql), SELECT_LOCALIZER_BY_ID, iContactID);
-    CSqlStatement clRow(m_pDB);
-    if (clRow.Prepare(szSql) != SQLITE_OK)
+    CSqlStatement row(m_pDB);
+    if (row.Prepare(szSql) != SQLITE_OK)
     {
         return -1;
     }
-    iFound = clRow.Step() == SQLITE_ROW ? 1 : 0;
-    const bool bHasName = iFound == 1 && clRow.Int(LOCALIZER_ID_COLUMN) == pContact->iContactID;
-    return !bHasName || FillFromLocalizerRow(clRow, SINGLE_ROW_GROUPS, pContact) ? 0 : -1;
+    iFound = row.Step() == SQLITE_ROW ? 1 : 0;
+    const bool bHasName = iFound == 1 && row.Int(LOCALIZER_ID_COLUMN) == pContact->iContactID;
+    return !bHasName || FillFromLocalizerRow(row, SINGLE_ROW_GROUPS, pContact) ? 0 : -1;
 }

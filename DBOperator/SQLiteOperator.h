@@ -49,9 +49,9 @@ public:
 
 private:
     QV_INTERNAL int EnsureOpen();
-    QV_INTERNAL int CountContacts(const CSqlIdList& clIds, tag_ContactsInfo* pRecord);
-    QV_INTERNAL int ReadContacts(const CSqlIdList& clIds, tag_ContactsInfo* pRecord);
-    QV_INTERNAL int ReadLocalizer(const CSqlIdList& clIds, tag_ContactsInfo* pRecord);
+    QV_INTERNAL int CountContacts(const CSqlIdList& ids, tag_ContactsInfo* pRecord);
+    QV_INTERNAL int ReadContacts(const CSqlIdList& ids, tag_ContactsInfo* pRecord);
+    QV_INTERNAL int ReadLocalizer(const CSqlIdList& ids, tag_ContactsInfo* pRecord);
     QV_INTERNAL int ReadContactRow(int iContactID, tag_ContactsStruct* pContact, int& iFound);
     QV_INTERNAL int ReadLocalizerRow(int iContactID, tag_ContactsStruct* pContact, int& iFound);
 

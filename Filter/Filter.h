@@ -1,9 +1,9 @@
 #ifndef QV_FILTER_FILTER_H
 #define QV_FILTER_FILTER_H
 
-#include <cstdint>
-
 #include "Common/Export.h"
+
+#include <cstdint>
 
 // Kinds of filter. 3 and 4 are unused.
 constexpr int FILTER_GROUP = 0;              // members of a group

@@ -1,10 +1,10 @@
 #ifndef QV_FILTER_FILTERCHAIN_H
 #define QV_FILTER_FILTERCHAIN_H
 
-#include <utils/Vector.h>
-
 #include "Common/Export.h"
 #include "Filter/Filter.h"
+
+#include <utils/Vector.h>
 
 // An ordered list of filters that must all hold at once; an empty one lets every contact pass.
 // The chain owns its filters and cannot be copied. Reading it takes no lock.

@@ -1,10 +1,10 @@
 #include "Filter/FilterChainBuilder.h"
 
-#include <new>
-
 #include "Filter/Filter.h"
 #include "Filter/FilterChain.h"
 #include "Filter/FilterKinds.h"
+
+#include <new>
 
 namespace
 {

@@ -1,8 +1,5 @@
 #include "Filter/FilterKinds.h"
 
-#include <algorithm>
-#include <new>
-
 #include "Filter/AccountExpandFilterProcess.h"
 #include "Filter/AccountFilterProcess.h"
 #include "Filter/ContactIdExpandFilterProcess.h"
@@ -13,6 +10,9 @@
 #include "Filter/OnlineFilterProcess.h"
 #include "Filter/PhoneFilterProcess.h"
 #include "Filter/PostalFilterProcess.h"
+
+#include <algorithm>
+#include <new>
 
 namespace
 {

@@ -1,9 +1,8 @@
 #include "LocalizerImpl/FileStamp.h"
 
-#include <sys/stat.h>
-
 #include <algorithm>
 #include <ctime>
+#include <sys/stat.h>
 
 namespace
 {

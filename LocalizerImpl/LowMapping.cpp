@@ -2,11 +2,10 @@
 
 #include "MemManager/Files/Descriptor.h"
 
+#include <climits>
 #include <fcntl.h>
 #include <sys/mman.h>
 #include <unistd.h>
-
-#include <climits>
 
 namespace
 {

@@ -3,9 +3,8 @@
 
 #include "Core/Records/SearchRecords.h"
 
-#include <utils/Vector.h>
-
 #include <cstdint>
+#include <utils/Vector.h>
 
 // Brings the matches of one search, which stand in the order of their candidates, into ranking
 // order, in time proportional to their number unless some are equal in every key.

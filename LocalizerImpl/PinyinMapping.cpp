@@ -10,16 +10,15 @@
 #include "MemManager/Files/MappingGuards.h"
 #include "MemManager/Files/ShareMemory.h"
 
-#include <fcntl.h>
-#include <sys/mman.h>
-#include <sys/time.h>
-#include <unistd.h>
-
 #include <algorithm>
 #include <cstring>
+#include <fcntl.h>
 #include <iterator>
 #include <memory>
 #include <new>
+#include <sys/mman.h>
+#include <sys/time.h>
+#include <unistd.h>
 
 namespace
 {

@@ -6,9 +6,8 @@
 #include "Core/Records/LocalizerCodes.h"
 #include "Core/Records/SearchRecords.h"
 
-#include <utils/Vector.h>
-
 #include <cstdint>
+#include <utils/Vector.h>
 
 class Common_Qsort;
 

@@ -1,7 +1,6 @@
 #include "Platform/LogSink.h"
 
 #include <android/log.h>
-
 #include <cstdarg>
 #include <cstdio>
 

@@ -5,16 +5,15 @@
 #include "Core/Records/SearchRecords.h"
 #include "MemManager/Files/MappingGuards.h"
 
-#include <sqlite3.h>
-#include <sys/mman.h>
-
 #include <algorithm>
 #include <chrono>
 #include <cstdint>
 #include <cstring>
 #include <random>
+#include <sqlite3.h>
 #include <stdexcept>
 #include <string>
+#include <sys/mman.h>
 #include <vector>
 
 namespace

@@ -1,8 +1,7 @@
 #include "bench/PeakMemory.h"
 
-#include <malloc.h>
-
 #include <cstdlib>
+#include <malloc.h>
 
 // The C library's own allocator, under which the counting one stands.
 extern "C"

@@ -19,17 +19,16 @@
 #include "tests/Support/ProviderDatabase.h"
 #include "tests/Support/WideText.h"
 
+#include <algorithm>
 #include <benchmark/benchmark.h>
+#include <map>
+#include <memory>
 #include <pthread.h>
+#include <random>
+#include <string>
 #include <sys/mman.h>
 #include <sys/wait.h>
 #include <unistd.h>
-
-#include <algorithm>
-#include <map>
-#include <memory>
-#include <random>
-#include <string>
 #include <utility>
 #include <vector>
 

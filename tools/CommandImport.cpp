@@ -1,7 +1,6 @@
-#include "tools/Commands.h"
-
 #include "Common/DataPaths.h"
 #include "Core/LocalizerLogic.h"
+#include "tools/Commands.h"
 #include "tools/ContactDatabase.h"
 #include "tools/ContactImport.h"
 #include "tools/DataDirectory.h"
@@ -16,7 +15,6 @@
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
-
 #include <array>
 #include <filesystem>
 #include <iostream>

@@ -1,14 +1,12 @@
-#include "tools/Commands.h"
-
 #include "Common/DataPaths.h"
 #include "Core/LocalizerLogic.h"
 #include "MemManager/MemManger.h"
+#include "tools/Commands.h"
 #include "tools/DataDirectory.h"
 #include "tools/IndexUpdate.h"
 #include "tools/PrintableText.h"
 
 #include <CLI/CLI.hpp>
-
 #include <filesystem>
 #include <iomanip>
 #include <iostream>

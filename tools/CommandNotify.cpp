@@ -1,13 +1,11 @@
-#include "tools/Commands.h"
-
 #include "Core/LocalizerLogic.h"
+#include "tools/Commands.h"
 #include "tools/DataDirectory.h"
 #include "tools/IndexUpdate.h"
 #include "tools/LibraryLog.h"
 #include "tools/OptionChecks.h"
 
 #include <CLI/CLI.hpp>
-
 #include <functional>
 #include <memory>
 #include <string>

@@ -1,6 +1,5 @@
-#include "tools/Commands.h"
-
 #include "Common/DataPaths.h"
+#include "tools/Commands.h"
 #include "tools/ContactDatabase.h"
 #include "tools/DataDirectory.h"
 #include "tools/InstalledFiles.h"
@@ -12,7 +11,6 @@
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
-
 #include <algorithm>
 #include <filesystem>
 #include <iostream>

@@ -1,6 +1,5 @@
-#include "tools/Commands.h"
-
 #include "LocalizerImpl/QVLocalizerManager.h"
+#include "tools/Commands.h"
 #include "tools/ContactNames.h"
 #include "tools/DataDirectory.h"
 #include "tools/FilterOptions.h"
@@ -11,15 +10,13 @@
 #include "tools/Utf8Text.h"
 
 #include <CLI/CLI.hpp>
-
-#include <unistd.h>
-
 #include <algorithm>
 #include <cstdlib>
 #include <iostream>
 #include <map>
 #include <memory>
 #include <optional>
+#include <unistd.h>
 
 namespace
 {

@@ -1,8 +1,7 @@
-#include "tools/Commands.h"
-
 #include "Core/LocalizerLogic.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "MemManager/MemManger.h"
+#include "tools/Commands.h"
 #include "tools/DataDirectory.h"
 #include "tools/LibraryLog.h"
 #include "tools/OptionChecks.h"
@@ -10,7 +9,6 @@
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
-
 #include <algorithm>
 #include <chrono>
 #include <iostream>

@@ -1,5 +1,4 @@
 #include "tools/Commands.h"
-
 #include "tools/DataDirectory.h"
 #include "tools/FilterOptions.h"
 #include "tools/PrintableText.h"
@@ -8,7 +7,6 @@
 #include "tools/TypingView.h"
 
 #include <CLI/CLI.hpp>
-
 #include <iostream>
 #include <memory>
 

@@ -7,10 +7,6 @@
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
-
-#include <sys/stat.h>
-#include <unistd.h>
-
 #include <algorithm>
 #include <cctype>
 #include <cerrno>
@@ -18,7 +14,9 @@
 #include <filesystem>
 #include <iomanip>
 #include <sstream>
+#include <sys/stat.h>
 #include <system_error>
+#include <unistd.h>
 
 namespace fs = std::filesystem;
 

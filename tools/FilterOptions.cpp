@@ -6,7 +6,6 @@
 #include "tools/ToolError.h"
 
 #include <CLI/CLI.hpp>
-
 #include <limits>
 
 namespace

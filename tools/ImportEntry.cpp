@@ -1,7 +1,6 @@
 #include "tools/ImportEntry.h"
 
 #include <nlohmann/json.hpp>
-
 #include <stdexcept>
 
 using nlohmann::json;

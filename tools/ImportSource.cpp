@@ -2,18 +2,17 @@
 
 #include "tools/ToolError.h"
 
+#include <array>
+#include <cerrno>
+#include <cstdlib>
+#include <cstring>
 #include <fcntl.h>
+#include <filesystem>
 #include <spawn.h>
 #include <strings.h>
 #include <sys/stat.h>
 #include <sys/wait.h>
 #include <unistd.h>
-
-#include <array>
-#include <cerrno>
-#include <cstdlib>
-#include <cstring>
-#include <filesystem>
 
 namespace fs = std::filesystem;
 

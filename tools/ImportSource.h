@@ -1,12 +1,11 @@
 #ifndef QV_TOOLS_IMPORTSOURCE_H
 #define QV_TOOLS_IMPORTSOURCE_H
 
-#include <sys/types.h>
-
 #include <cstdint>
 #include <cstdio>
 #include <memory>
 #include <string>
+#include <sys/types.h>
 
 enum IMPORT_FORMAT
 {

@@ -4,12 +4,11 @@
 #include "Common/Log.h"
 #include "Platform/LogSink.h"
 
-#include <unistd.h>
-
 #include <algorithm>
 #include <cstdlib>
 #include <filesystem>
 #include <system_error>
+#include <unistd.h>
 #include <utility>
 
 namespace fs = std::filesystem;

@@ -1,7 +1,6 @@
 #include "tools/OptionChecks.h"
 
 #include <CLI/CLI.hpp>
-
 #include <charconv>
 #include <string>
 #include <system_error>

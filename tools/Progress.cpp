@@ -1,11 +1,10 @@
 #include "tools/Progress.h"
 
-#include <unistd.h>
-
 #include <algorithm>
 #include <chrono>
 #include <cstdio>
 #include <string>
+#include <unistd.h>
 
 namespace
 {

@@ -1,7 +1,6 @@
 #include "tools/SearchReport.h"
 
 #include <nlohmann/json.hpp>
-
 #include <ostream>
 
 namespace

@@ -3,7 +3,6 @@
 #include "tools/PrintableText.h"
 
 #include <CLI/CLI.hpp>
-
 #include <vector>
 
 namespace

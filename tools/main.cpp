@@ -5,14 +5,12 @@
 #include "tools/UsageError.h"
 
 #include <CLI/CLI.hpp>
-
-#include <fcntl.h>
-#include <unistd.h>
-
 #include <cstdlib>
 #include <exception>
+#include <fcntl.h>
 #include <iostream>
 #include <string>
+#include <unistd.h>
 
 namespace
 {

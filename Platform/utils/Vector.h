@@ -1,12 +1,11 @@
 #ifndef QV_PLATFORM_UTILS_VECTOR_H
 #define QV_PLATFORM_UTILS_VECTOR_H
 
-#include <sys/types.h>
-
 #include <cstddef>
 #include <cstdint>
 #include <cstdlib>
 #include <cstring>
+#include <sys/types.h>
 #include <type_traits>
 
 namespace android

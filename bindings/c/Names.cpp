@@ -5,9 +5,8 @@
 #include "LocalizerImpl/PinyinTable.h"
 #include "bindings/c/Objects.h"
 
-#include <unistd.h>
-
 #include <cstring>
+#include <unistd.h>
 
 namespace
 {

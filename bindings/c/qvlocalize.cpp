@@ -7,8 +7,6 @@
 #include "Platform/LogSink.h"
 #endif
 
-#include <unistd.h>
-
 #include <algorithm>
 #include <climits>
 #include <cstdlib>
@@ -16,6 +14,7 @@
 #include <memory>
 #include <mutex>
 #include <new>
+#include <unistd.h>
 
 static_assert(QV_SORT_NAME == STORE_ORDER_NAME && QV_SORT_TIME == STORE_ORDER_TIME,
               "passed on as they are");

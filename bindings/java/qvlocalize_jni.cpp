@@ -2,7 +2,6 @@
 // to exceptions. It has no state between calls.
 
 #include "bindings/c/qvlocalize.h"
-
 #include "org_qvlocalize_Index.h"
 #include "org_qvlocalize_Result.h"
 

@@ -4,8 +4,8 @@
 //   group    three bits: nameless, first code other, first code a digit
 //   script   whether the first code is a Chinese character or a letter
 //   prefix   the first 24 units of the name, 16 bits each, cut at the first unit that needs more
-//   iRecord  the record, asked when prefixes are equal and do not hold the whole name or cannot
-//   tell
+//   iRecord  the record, compared when equal prefixes do not hold the whole name or do not
+//            tell
 
 #include "LocalizerImpl/ContactSort.h"
 

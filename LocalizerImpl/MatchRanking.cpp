@@ -92,7 +92,7 @@ void SortByDigit(const tag_NamePlace* pFrom, tag_NamePlace* pTo, size_t uCount, 
 }
 
 // The candidates of a search in the whole store come in name order; those of a narrowed one are
-// ranked, and those of a store ordered by last contact in any order. False without memory.
+// ranked, and those of a store ordered by last contact in any order. False if the allocation fails.
 bool SortByName(NamePlaces& places, size_t uCount)
 {
     const auto before = [](const tag_NamePlace& a, const tag_NamePlace& b)

@@ -10,7 +10,7 @@
 // order, in time proportional to their number unless some are equal in every key.
 // Matches equal in every key keep the order that LocalResultQuickSort leaves when it starts from
 // the order in which they were first found; pFirstSplits, one per match, is the split that first
-// found each. 0, or -1 with the vector unsorted when memory ran out.
+// found each. 0, or -1 with the vector unsorted if the allocation fails.
 int RankMatches(android::Vector<_MatchResult>& vMatches, const uint16_t* pFirstSplits,
                 tag_LocalizerDetail* pDetail);
 

@@ -27,7 +27,7 @@ CPieceTable::CPieceTable(CQVLocalizerManager& matcher, const CReadingSets& sets,
     }
 }
 
-// Finds out which offsets have a last piece that is worth trying. False without memory.
+// Finds out which offsets have a last piece that is worth trying. False if the allocation fails.
 bool CPieceTable::AskLastPieces()
 {
     for (int iOffset = 0; iOffset < m_iInputLen; ++iOffset)
@@ -45,7 +45,7 @@ bool CPieceTable::AskLastPieces()
 }
 
 // A typed Chinese character fits its own code alone, all 32 bits of it, and no other code of the
-// set. False without memory.
+// set. False if the allocation fails.
 bool CPieceTable::AddTypedKeys()
 {
     if (std::none_of(m_szInput, m_szInput + m_iInputLen, IsChineseUnit))

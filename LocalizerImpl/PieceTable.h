@@ -4,16 +4,16 @@
 // What the pieces of one typed text do on the characters of names.
 //
 // Whether a piece fits a character depends on the piece and the character's readings alone, not
-// on the contact. So characters that act alike share a key, and the matcher is asked once per key,
-// offset in the text and length. Its answers are sets of ends: bit e stands for a piece that ends
-// before character e of the text.
+// on the contact. So characters that act alike share a key, and the matcher is called once per key,
+// offset in the text and length; its answers are cached as sets of ends: bit e stands for a piece
+// that ends before character e of the text.
 //
 //   text    z h a n g s          offset 0, key of the reading zhang:
 //   offset  0 1 2 3 4 5          ends  1 2 3 4 5   (z, zh, zha, zhan, zhang)
 //                                full          5   (zhang)
 //
 // A name then matches when its characters lead from offset 0 to the end of the text. The matcher
-// is asked when a name first needs the answer.
+// is called when a name first needs the answer.
 
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "LocalizerImpl/ReadingSets.h"
@@ -31,7 +31,7 @@ public:
     CPieceTable(const CPieceTable&) = delete;
     CPieceTable& operator=(const CPieceTable&) = delete;
 
-    // False for want of memory; then nothing else may be called.
+    // False if the allocation failed; then nothing else may be called.
     bool IsReady() const { return m_bReady; }
 
     // The keys of the sets, and behind them one for each typed character. Whatever a damaged
@@ -93,7 +93,7 @@ private:
     std::unique_ptr<uint16_t[]> m_pOwnKeys;    // where a Chinese character was typed
     std::unique_ptr<uint16_t[]> m_pEnds;       // by offset, then by key
     std::unique_ptr<uint16_t[]> m_pFull;       // the same: those Ends that take whole readings
-    wchar_t m_aszUnits[LOC_MAX_INPUT][2] = {}; // the pieces of one character, asked for most
+    wchar_t m_aszUnits[LOC_MAX_INPUT][2] = {}; // the pieces of one character, the most frequent
     wchar_t m_szPiece[LOC_PIECE_BUFFER] = {};
 };
 

@@ -1,4 +1,4 @@
-// The pinyin table: its shared file, its mapping, and what is asked of it.
+// The pinyin table: its shared file, its mapping, and lookups in it.
 
 #include "Common/DataPaths.h"
 #include "Common/Log.h"

@@ -37,7 +37,7 @@ struct CNWORDOUTPUT
 
 // Pinyin table, name conversion, search and ranking. The static members need no object; an
 // object is one search, made by a matcher class (CQVWordLocalizerManager for letters,
-// CQVNumLocalizerManager for digits), used by one thread and thrown away.
+// CQVNumLocalizerManager for digits), used by one thread and then deleted.
 //
 // Results: 0, LOC_ERR_PARAM for a null argument, LOC_ERR_MAP when the pinyin table cannot be
 // mapped or a search finds no memory for its own tables, unless an operation says otherwise.
@@ -102,7 +102,7 @@ public:
     // --- Name conversion (see NameConversion.cpp for the classes of characters) -------------
 
     // Codes of a name into szOut, 10 slots, cleared first and not terminated beyond them; only
-    // the first 30 characters are looked at. Always 1.
+    // the first 30 characters count. Always 1.
     static int TranslateNameToLocal(PYOFWORDS* pMap, wchar_t* szDisplayName, wchar_t* szOut);
     // Pinyin key of a name into szOut, LOC_SPELLING_BUFFER wide characters, zeroed by the caller;
     // ends with the item that passes 30 characters. Lowercases szDisplayName in place. pSorter may

@@ -6,10 +6,10 @@
 #include <cstdint>
 #include <memory>
 
-// Whether a typed text spells a run of a name, all starts and splits at once: which offsets of the
-// text are reached behind each character. Few such sets of offsets ever come up, so they are the
-// states of an automaton whose steps are worked out when a name first takes them. Four characters
-// are followed without a branch, which is the whole of most names and what is behind them.
+// Decides whether a typed text spells a run of a name: a lazily built DFA over sets of reachable
+// offsets, for all starts and splits at once. A state is the set of offsets of the text that are
+// reached behind a character; few sets ever occur, and a transition is computed when a name first
+// takes it. The first four characters are followed without a branch that could be mispredicted.
 class CReachStates
 {
 public:
@@ -18,7 +18,7 @@ public:
     CReachStates(const CReachStates&) = delete;
     CReachStates& operator=(const CReachStates&) = delete;
 
-    // False for want of memory; then nothing else may be called.
+    // False if the allocation failed; then nothing else may be called.
     bool IsReady() const { return m_pNext != nullptr; }
 
     // pCodes: CONTACT_MAX_KEY codes, of which those from the first LOC_NO_CODE on do not count. The
@@ -40,7 +40,7 @@ private:
     // The first states; from the first three there is no way on.
     static constexpr int ACCEPTED = 0;
     static constexpr int REFUSED = 1; // the name is over
-    static constexpr int UNKNOWN = 2; // a step not worked out yet
+    static constexpr int UNKNOWN = 2; // a transition not computed yet
     static constexpr int START = 3;
     static constexpr int FEWEST_STATES = START + 2; // the start and the one a step leads to
     static constexpr int MOST_STATES = 64;

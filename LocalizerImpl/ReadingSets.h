@@ -30,10 +30,10 @@ public:
     };
     using Ptr = std::unique_ptr<const CReadingSets, tag_Release>;
 
-    // The sets of a mapped table whose stamp was read before it was mapped; null for want of
-    // memory. They are a copy: no mapping is kept. The process keeps the last ones whose stamp was
-    // settled, about 150 KB, and gives them out again as long as the stamp is the same, so that a
-    // keystroke does not go through the table's 170 pages again. Any thread may call.
+    // The sets of a mapped table whose stamp was read before it was mapped; null if the
+    // allocation fails. They are a copy: no mapping is kept. The process keeps the last ones whose
+    // stamp was settled, about 150 KB, and gives them out again as long as the stamp is the same,
+    // so that a keystroke does not go through the table's 170 pages again. Any thread may call.
     static Ptr Of(const PYOFWORDS* pMap, const tag_FileStamp& stamp);
 
     CReadingSets(const CReadingSets&) = delete;

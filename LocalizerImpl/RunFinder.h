@@ -29,7 +29,7 @@ public:
     // outlive the object.
     CRunFinder(CPieceTable& table, CFindings& findings, bool bAnywhere);
 
-    // False for want of memory; then nothing else may be called.
+    // False if the allocation failed; then nothing else may be called.
     bool IsReady() const { return m_states.IsReady(); }
 
     // Whether the text spells a run of the name with these CONTACT_MAX_KEY codes, of which those

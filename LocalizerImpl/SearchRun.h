@@ -28,7 +28,7 @@ public:
     CSearchRun& operator=(const CSearchRun&) = delete;
 
     // Lowercases szInput and puts codes in place of its Chinese characters. 0; LOC_ERR_PARAM for
-    // null or more than 10 characters; LOC_ERR_MAP, also for want of memory. After a failure
+    // null or more than 10 characters; LOC_ERR_MAP, also if an allocation fails. After a failure
     // nothing may match.
     int Begin(wchar_t* szInput);
 
@@ -36,7 +36,7 @@ public:
 
     // After Begin returned 0. An empty text lists all candidates in their order, with time
     // buckets as index characters when bTimeOrder is not 0. Returns the number of matches, or
-    // LOC_ERR_MAP without memory to note them; then the run is over.
+    // LOC_ERR_MAP if the allocation of the list fails; then the run is over.
     int Find(const tag_LocalizerResult& candidates, int bTimeOrder);
 
     // Writes the matches of Find into *pResult (null: nowhere; without an array: none), which has

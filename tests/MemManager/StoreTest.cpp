@@ -264,6 +264,7 @@ TEST_F(Store, MakesSetsAndPages)
         EXPECT_EQ(m_store.GetSearchRecord(&source, iStart, iCount, &page), -1) << iStart;
         EXPECT_EQ(page.pDetail, aEntries + 9) << "a view, untouched";
     }
+    EXPECT_TRUE(m_log.Lines().empty());
 }
 
 TEST_F(Store, KnowsDamagedRegistrationRecords)

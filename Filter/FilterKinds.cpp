@@ -40,7 +40,7 @@ FilterProcess* MakeProcess()
 template <typename Process>
 constexpr tag_FilterKind RowOf(CFilter* (*pfnMakeFilter)(const QVLong32*), bool bLogs = false)
 {
-    return {Process::KIND, pfnMakeFilter, MakeProcess<Process>, Process::Keeps, bLogs};
+    return {pfnMakeFilter, MakeProcess<Process>, Process::Keeps, Process::KIND, bLogs};
 }
 
 } // namespace

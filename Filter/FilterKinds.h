@@ -6,11 +6,11 @@
 // One kind of filter. The makers return objects that the caller owns, null if the allocation fails.
 struct tag_FilterKind
 {
-    int iKind;
     CFilter* (*pfnMakeFilter)(const QVLong32* plID); // reads the id if the kind has one
     FilterProcess* (*pfnMakeProcess)();
     RecordRuleFn pfnKeeps; // the rule of the process
-    bool bLogs;            // the rule writes log lines
+    int iKind;
+    bool bLogs; // the rule writes log lines
 };
 
 // The table of all kinds in the order of the pipeline. A new kind is a row here and a file with

@@ -5,10 +5,9 @@
 
 #include "Core/Records/ContactRecords.h"
 
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <climits>
+#include <gtest/gtest.h>
 #include <sstream>
 #include <string>
 #include <tuple>

@@ -5,15 +5,14 @@
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/WideText.h"
 
-#include <gtest/gtest.h>
-#include <sys/time.h>
-
 #include <chrono>
 #include <csignal>
 #include <cstring>
 #include <filesystem>
+#include <gtest/gtest.h>
 #include <iterator>
 #include <string>
+#include <sys/time.h>
 
 namespace fs = std::filesystem;
 

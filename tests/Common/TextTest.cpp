@@ -4,11 +4,10 @@
 #include "Common/Utf8.h"
 #include "Common/WideString.h"
 
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <climits>
 #include <cstdlib>
+#include <gtest/gtest.h>
 #include <string>
 #include <tuple>
 

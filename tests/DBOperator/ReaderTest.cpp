@@ -11,11 +11,10 @@
 #include "tests/Support/ProviderDatabase.h"
 #include "tests/Support/WideText.h"
 
-#include <gtest/gtest.h>
-#include <sqlite3.h>
-
 #include <algorithm>
 #include <filesystem>
+#include <gtest/gtest.h>
+#include <sqlite3.h>
 #include <sstream>
 #include <tuple>
 

@@ -1,16 +1,6 @@
 // Which records each kind of filter keeps, by the pipeline and by the test of single records; the
 // chain that holds the filters.
 
-#include <gtest/gtest.h>
-
-#include <algorithm>
-#include <iterator>
-#include <memory>
-#include <string>
-#include <type_traits>
-#include <utility>
-#include <vector>
-
 #include "Filter/AccountExpandFilterProcess.h"
 #include "Filter/AccountFilterProcess.h"
 #include "Filter/FilterChain.h"
@@ -20,6 +10,15 @@
 #include "Filter/RecordRule.h"
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/MemoryFailure.h"
+
+#include <algorithm>
+#include <gtest/gtest.h>
+#include <iterator>
+#include <memory>
+#include <string>
+#include <type_traits>
+#include <utility>
+#include <vector>
 
 namespace
 {

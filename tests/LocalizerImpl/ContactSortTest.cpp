@@ -5,10 +5,9 @@
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "tests/Support/MemoryFailure.h"
 
-#include <gtest/gtest.h>
-
 #include <algorithm>
 #include <cstring>
+#include <gtest/gtest.h>
 #include <random>
 #include <vector>
 

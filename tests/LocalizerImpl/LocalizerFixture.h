@@ -5,9 +5,8 @@
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
 
-#include <gtest/gtest.h>
-
 #include <cstring>
+#include <gtest/gtest.h>
 #include <string>
 
 // The built pinyin table, installed and mapped, in a data directory of its own.

@@ -1,9 +1,8 @@
 // Names into codes, pinyin keys and index characters, with the built table.
 
-#include "tests/LocalizerImpl/LocalizerFixture.h"
-
 #include "LocalizerImpl/NameFolding.h"
 #include "LocalizerImpl/QVNumLocalizerManager.h"
+#include "tests/LocalizerImpl/LocalizerFixture.h"
 
 #include <algorithm>
 #include <tuple>

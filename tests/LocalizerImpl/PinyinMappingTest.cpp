@@ -1,21 +1,19 @@
 // The pinyin table: its shared copy, its mappings and handles, codes and syllables.
 
-#include "tests/LocalizerImpl/LocalizerFixture.h"
-
 #include "Common/DataPaths.h"
 #include "LocalizerImpl/FileStamp.h"
 #include "LocalizerImpl/LowMapping.h"
 #include "LocalizerImpl/ReadingSets.h"
 #include "LocalizerImpl/Syllables.h"
+#include "tests/LocalizerImpl/LocalizerFixture.h"
 #include "tests/Support/MemoryFailure.h"
-
-#include <sys/mman.h>
-#include <sys/time.h>
 
 #include <ctime>
 #include <filesystem>
 #include <fstream>
 #include <set>
+#include <sys/mman.h>
+#include <sys/time.h>
 #include <vector>
 
 namespace

@@ -8,10 +8,9 @@
 #include "tests/LocalizerImpl/LocalizerFixture.h"
 #include "tests/Support/WideText.h"
 
-#include <pthread.h>
-
 #include <algorithm>
 #include <functional>
+#include <pthread.h>
 #include <random>
 #include <sstream>
 #include <tuple>

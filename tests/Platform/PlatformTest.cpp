@@ -1,9 +1,7 @@
 #include <android/log.h>
-#include <utils/Vector.h>
-
-#include <gtest/gtest.h>
-
 #include <cstdint>
+#include <gtest/gtest.h>
+#include <utils/Vector.h>
 
 TEST(Log, WithoutASinkOnlyErrorsAreSeen)
 {

@@ -1,9 +1,8 @@
 #include "tests/Support/MemoryFailure.h"
 
-#include <dlfcn.h>
-
 #include <climits>
 #include <cstddef>
+#include <dlfcn.h>
 #include <new>
 
 namespace

@@ -8,9 +8,8 @@
 #include "tests/Support/StoreImage.h"
 #include "tests/Support/WideText.h"
 
-#include <gtest/gtest.h>
-
 #include <filesystem>
+#include <gtest/gtest.h>
 #include <memory>
 #include <set>
 #include <string>

@@ -3,6 +3,7 @@
 // right or that the next notification makes right.
 
 #include "tests/faults/CallFaults.h"
+
 #include "tests/Support/ChildProcess.h"
 #include "tests/faults/StoreCase.h"
 

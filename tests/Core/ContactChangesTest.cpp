@@ -245,6 +245,7 @@ TEST_F(CContactChangesTest, WaitForTheLock)
                 }
             });
         row.second();
+        m_log.AtEachLine(nullptr);
         EXPECT_EQ(iRefusals, 7) << row.first;
     }
     ExpectFresh();

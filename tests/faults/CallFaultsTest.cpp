@@ -38,7 +38,7 @@ std::string RunFailing(const tag_Operation& operation, const tag_Failures& failu
         }
         strCall = CCallFault::Failed();
         EXPECT_TRUE(CLockHolder().IsHeld()) << "the operation has kept the lock";
-        EXPECT_EQ(strCall.empty() ? "" : fnExamine(logic, answer), "");
+        EXPECT_EQ(fnExamine(logic, answer), "");
     }
     EXPECT_EQ(OpenDescriptors(), iDescriptors);
     return strCall;

@@ -129,6 +129,25 @@ double CopyFloor(int iContacts)
     return MedianSeconds(MEASURE_RUNS, [&] { CopyStore(iContacts, vTarget.data()); });
 }
 
+double TouchFloor(int iContacts)
+{
+    return MedianSeconds(MEASURE_RUNS,
+                         [&]
+                         {
+                             const CReadMapping store(CDataPaths::ContactRecords(),
+                                                      RecordBytes(iContacts));
+                             const auto* pRecords = store.As<tag_ContactsStruct>();
+                             uint64_t uSum = 0;
+                             for (int i = 0; i < iContacts; ++i)
+                             {
+                                 uint64_t uBytes = 0;
+                                 std::memcpy(&uBytes, pRecords[i].szLocalizerKey, sizeof(uBytes));
+                                 uSum += uBytes;
+                             }
+                             g_uSink = uSum;
+                         });
+}
+
 double CopyFreshFloor(int iContacts)
 {
     return MedianSeconds(MEASURE_RUNS,

@@ -13,7 +13,9 @@ double MedianSeconds(int iRuns, const std::function<void()>& fnWork,
 
 // Map the store file, copy the records of iContacts into memory that was touched before, unmap.
 double CopyFloor(int iContacts);
-// The same into memory fresh from the system.
+// Map the store file, read 8 bytes of the localizer key of each of iContacts records, unmap.
+double TouchFloor(int iContacts);
+// As CopyFloor, into memory fresh from the system.
 double CopyFreshFloor(int iContacts);
 // Read every byte of iEntries result entries.
 double ScanFloor(int iEntries);

@@ -39,6 +39,8 @@ namespace
 
 constexpr int SIZES[] = {1000, 10000, 100000};
 constexpr int LARGEST = 100000;
+constexpr int HUGE_SIZE = 1000000; // measured on request
+constexpr int HUGE_RUNS = 3;       // of each of its keystrokes
 constexpr double MICROSECONDS = 1e6;
 constexpr double MIB = 1024.0 * 1024.0;
 constexpr int WORD_BUFFER = 64;
@@ -104,7 +106,10 @@ tag_LocalizerResult* SearchAll(CLocalizerLogic& logic, IME_SEARCH_TYPE eType,
 class CTypist
 {
 public:
-    explicit CTypist(bool bNarrow) : m_bNarrow(bNarrow) {}
+    CTypist(bool bNarrow, int iContacts)
+        : m_bNarrow(bNarrow), m_iRuns(iContacts > LARGEST ? HUGE_RUNS : MEASURE_RUNS)
+    {
+    }
 
     std::vector<tag_Keystroke> TypeAll()
     {
@@ -147,7 +152,7 @@ private:
         int iFound = 0;
         CPeakMemory::Restart();
         const double dSeconds = MedianSeconds(
-            MEASURE_RUNS, [&] { pResult = Search(query.eType, strTyped, pPrevious); },
+            m_iRuns, [&] { pResult = Search(query.eType, strTyped, pPrevious); },
             [&]
             {
                 iFound = pResult->iResultNum;
@@ -166,6 +171,7 @@ private:
     }
 
     bool m_bNarrow;
+    int m_iRuns;
     double m_dScan = 0;
     CLocalizerLogic m_logic;
 };
@@ -227,7 +233,7 @@ void CountTouchShares(benchmark::State& state, const std::vector<tag_Keystroke>&
                       int iContacts)
 {
     const double dTouch = TouchFloor(iContacts);
-    const bool bLargest = iContacts == LARGEST;
+    const bool bLargest = iContacts >= LARGEST;
     std::vector<double> vMedian;
     std::vector<double> vMost;
     for (const tag_Keystroke& key : vKeystrokes)
@@ -251,8 +257,8 @@ void WholeStore(benchmark::State& state)
     for (auto _ : state)
     {
         const double dCopy = CopyFloor(iContacts);
-        const double dBase = iContacts == LARGEST ? 1.5 * dCopy : 2 * dCopy + 100e-6;
-        std::vector<tag_Keystroke> vKeystrokes = CTypist(false).TypeAll();
+        const double dBase = iContacts >= LARGEST ? 1.5 * dCopy : 2 * dCopy + 100e-6;
+        std::vector<tag_Keystroke> vKeystrokes = CTypist(false, iContacts).TypeAll();
         double dMemory = 0;
         for (tag_Keystroke& key : vKeystrokes)
         {
@@ -303,7 +309,7 @@ void Narrowed(benchmark::State& state)
     WorkloadOf(iContacts);
     for (auto _ : state)
     {
-        std::vector<tag_Keystroke> vKeystrokes = CTypist(true).TypeAll();
+        std::vector<tag_Keystroke> vKeystrokes = CTypist(true, iContacts).TypeAll();
         for (tag_Keystroke& key : vKeystrokes)
         {
             key.dAllowed = 6 * key.dScan * key.iBefore + 2 * key.dEntries + 50e-6;
@@ -311,11 +317,17 @@ void Narrowed(benchmark::State& state)
         }
         CountKeystrokes(state, vKeystrokes, iContacts);
         std::vector<double> vTight;
+        double dSlowText = 0; // of the text with the most splits per name
         for (const tag_Keystroke& key : vKeystrokes)
         {
             const double dAllowed = 4 * key.dScan * key.iBefore + 1.5 * key.dEntries + 40e-6;
             vTight.push_back(key.dSeconds / dAllowed);
+            if (std::wstring(key.pQuery->szText) == L"9494949494")
+            {
+                dSlowText = std::max(dSlowText, vTight.back());
+            }
         }
+        state.counters["slow_text_share"] = dSlowText;
         state.counters["tight_p95_share"] = Percentile(vTight, 95);
         const double dCopy = CopyFloor(iContacts) * MICROSECONDS;
         state.counters["copy_us"] = dCopy;
@@ -606,40 +618,67 @@ void Floors(benchmark::State& state)
     }
 }
 
-void RegisterAll()
+struct tag_Benchmark
 {
-    const auto add = [](int iSize, const char* szName, void (*pfnBench)(benchmark::State&))
+    const char* szName;
+    void (*pfnRun)(benchmark::State&);
+};
+
+void Register(int iSize, std::initializer_list<tag_Benchmark> benchmarks)
+{
+    for (const tag_Benchmark& row : benchmarks)
     {
-        benchmark::RegisterBenchmark(szName, pfnBench)
+        benchmark::RegisterBenchmark(row.szName, row.pfnRun)
             ->Arg(iSize)
             ->Iterations(1)
             ->Unit(benchmark::kMillisecond);
-    };
+    }
+}
+
+void RegisterAll()
+{
     for (const int iSize : SIZES)
     {
-        add(iSize, "floors", Floors);
-        add(iSize, "whole_store", WholeStore);
-        add(iSize, "lock_held", LockHeld);
-        add(iSize, "narrowed", Narrowed);
-        add(iSize, "build", Build);
-        add(iSize, "changes", Changes);
-        add(iSize, "many_changes", ManyChanges);
-        add(iSize, "two_typists", TwoTypists);
-        add(iSize, "cold", ColdSearch);
-        add(iSize, "filtered", Filtered);
+        Register(iSize, {{"floors", Floors},
+                         {"whole_store", WholeStore},
+                         {"lock_held", LockHeld},
+                         {"narrowed", Narrowed},
+                         {"build", Build},
+                         {"changes", Changes},
+                         {"many_changes", ManyChanges},
+                         {"two_typists", TwoTypists},
+                         {"cold", ColdSearch},
+                         {"filtered", Filtered}});
     }
     for (const int iSize : SIZES)
     {
-        add(iSize, "one_surname", OneSurname);
+        Register(iSize, {{"one_surname", OneSurname}});
+    }
+}
+
+void RegisterLarge()
+{
+    for (const int iSize : {LARGEST, HUGE_SIZE})
+    {
+        Register(iSize, {{"floors", Floors},
+                         {"whole_store", WholeStore},
+                         {"lock_held", LockHeld},
+                         {"narrowed", Narrowed},
+                         {"build", Build},
+                         {"changes", Changes}});
     }
 }
 
 } // namespace
 
+// --large: 1,000,000 contacts beside 100,000.
 int main(int argc, char** argv)
 {
+    const bool bLarge = argc > 1 && std::string(argv[1]) == "--large";
+    argc -= bLarge ? 1 : 0;
+    argv += bLarge ? 1 : 0;
     benchmark::Initialize(&argc, argv);
-    RegisterAll();
+    bLarge ? RegisterLarge() : RegisterAll();
     benchmark::RunSpecifiedBenchmarks();
     return 0;
 }

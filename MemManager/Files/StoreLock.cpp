@@ -41,3 +41,12 @@ bool CWriterLock::Take()
     }
     return m_directory.IsOpen();
 }
+
+void CWriterLock::Release()
+{
+    if (m_directory.IsOpen())
+    {
+        flock(m_directory.Get(), LOCK_UN);
+    }
+    m_directory.Reset();
+}

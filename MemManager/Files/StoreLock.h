@@ -43,10 +43,16 @@ private:
 class CWriterLock
 {
 public:
+    CWriterLock() = default;
+    ~CWriterLock() { Release(); }
+    CWriterLock(const CWriterLock&) = delete;
+    CWriterLock& operator=(const CWriterLock&) = delete;
+
     // Call with the store lock held. Waits for a writer that has released the store lock but not
     // yet this one. False if the directory cannot be opened or locked.
     bool Take();
-    void Release() { m_directory.Reset(); }
+    // Releases the lock if it is held, also where a forked child still has the descriptor.
+    void Release();
 
 private:
     CDescriptor m_directory;

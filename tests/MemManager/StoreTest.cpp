@@ -12,9 +12,11 @@
 #include "tests/Support/MemoryFailure.h"
 #include "tests/Support/StoreImage.h"
 
+#include <fcntl.h>
 #include <filesystem>
 #include <gtest/gtest.h>
 #include <memory>
+#include <sys/file.h>
 #include <thread>
 
 namespace
@@ -166,6 +168,17 @@ TEST_F(Store, WaitsForAWriterThatWaitsForTheDisk)
     EXPECT_EQ(Build(MakeRecords(2)), 0);
     flusher.join();
     EXPECT_EQ(Reg(), (tag_ContactReg{2, 0, 1002}));
+}
+
+// A child that was forked meanwhile has the lock's descriptor, too.
+TEST_F(Store, ReleasesTheWriterLockOfForkedChildren)
+{
+    CWriterLock lock;
+    ASSERT_TRUE(lock.Take());
+    const CChild child([] { return std::to_string(pause()); }, 60);
+    lock.Release();
+    const CDescriptor directory(open(m_directory.File("").c_str(), O_RDONLY));
+    EXPECT_EQ(flock(directory.Get(), LOCK_EX | LOCK_NB), 0);
 }
 
 TEST_F(Store, HoldsTheLockUntilItIsReleased)

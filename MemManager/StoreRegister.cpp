@@ -222,7 +222,8 @@ void CStoreRegister::SetCount(int iTotalNum)
 
 LIFT_RESULT CStoreRegister::Lift(int iCapacity, int iSortedBy)
 {
-    if (iCapacity == 0 || !FlushRecords())
+    // If the files were deleted meanwhile, mapping the record would create an empty whole store.
+    if (iCapacity == 0 || FileSize(CDataPaths::ContactReg()) <= 0 || !FlushRecords())
     {
         return LIFT_FAILED;
     }

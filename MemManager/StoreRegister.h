@@ -37,7 +37,7 @@ enum STORE_STATE
 enum LIFT_RESULT
 {
     LIFT_DONE,
-    LIFT_FAILED,      // the mark stays: there was no capacity, or the disk may lack records
+    LIFT_FAILED,      // the mark stays: no capacity, no record, or the disk may lack records
     LIFT_OUT_OF_ORDER // the mark stays: the sort type was set meanwhile
 };
 

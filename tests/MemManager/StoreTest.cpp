@@ -335,6 +335,8 @@ TEST_F(Store, TellsItsStates)
     EXPECT_EQ(Build(MakeRecords(3)), -1) << "its sort type would be lost";
     // A sort type that is set while records are written in another order leaves the mark.
     fs::remove(CDataPaths::ContactReg());
+    EXPECT_EQ(CStoreRegister::Lift(1003, STORE_ORDER_NAME), LIFT_FAILED);
+    EXPECT_FALSE(fs::exists(CDataPaths::ContactReg()));
     SetReg({3, 1, 0});
     EXPECT_EQ(CStoreRegister::Lift(1003, STORE_ORDER_NAME), LIFT_OUT_OF_ORDER);
     EXPECT_EQ(CStoreRegister::Lift(0, STORE_ORDER_TIME), LIFT_FAILED);

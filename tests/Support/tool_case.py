@@ -3,7 +3,6 @@ import contextlib
 import json
 import os
 import pathlib
-import re
 import shutil
 import sqlite3
 import subprocess
@@ -14,17 +13,36 @@ import unittest
 import transcript
 
 TOOL, PYFILE = map(os.path.abspath, sys.argv[1:3])
-DONE, FAILED, USAGE, MISSING, PARTLY = range(5)
 SKIPPED = 77
 
 
-# The tool as transcripts call it: subcommands in the directory data.
-SHELL = """qvlocalize() {
+# What transcripts call: the tool, whose subcommands work in the directory data; its database, which
+# answers a statement and holds its transaction while a command behind it runs; a command on a
+# terminal of its own.
+SHELL = r"""
+qvlocalize() {
     local command=${1-}
     case $command in
         [a-z]*) shift; "$TOOL" "$command" --data-dir data "$@" ;;
         *) "$TOOL" "$@" ;;
     esac
+}
+export -f qvlocalize
+sql() {
+    "$PYTHON" -c '
+import sqlite3, subprocess, sys
+database = sqlite3.connect("data/databases/contacts2.db")
+for row in database.execute(sys.argv[1]):
+    print(*row, sep="|")
+code = subprocess.run(["bash", "-c", "\"$@\"", "bash", *sys.argv[2:]]).returncode
+database.commit()
+sys.exit(code)' "$@"
+}
+on_terminal() {
+    "$PYTHON" -c '
+import pty, sys
+pty.spawn(["bash", "-c", "\"$@\"; echo exit code $?", "bash", *sys.argv[1:]])' "$@" |
+        sed 's/\r$//; s/\x1b/\\e/g'
 }
 """
 
@@ -50,28 +68,17 @@ class ToolCase(unittest.TestCase):
     def call(self, command, *arguments):
         return [TOOL, command, "--data-dir", str(self.data), *map(str, arguments)]
 
-    def run_tool(self, command, *arguments, code=DONE, **options):
-        process = subprocess.run(self.call(command, *arguments), capture_output=True, check=False,
-                                 **options)
-        process.stdout, process.stderr = process.stdout.decode(), process.stderr.decode()
-        self.assertEqual(code, process.returncode, (arguments, process.stdout, process.stderr))
-        return process
+    def run_tool(self, command, *arguments):
+        subprocess.run(self.call(command, *arguments), stdout=subprocess.DEVNULL, check=True)
 
-    def check_transcript(self, path):
-        transcript.check(self, path, self.root, SHELL, TOOL=TOOL, PYFILE=PYFILE)
-
-    def refused(self, code, text, *call, **options):
-        """The error output, which holds the text, of a call that prints nothing else."""
-        process = self.run_tool(*call, code=code, **options)
-        self.assertEqual("", process.stdout)
-        self.assertIn(text, process.stderr)
-        return process.stderr
+    def check_transcript(self, path, shell="", **variables):
+        transcript.check(self, path, self.root, SHELL + shell, TOOL=TOOL, PYFILE=PYFILE,
+                         PYTHON=sys.executable, **variables)
 
     def steps(self, text, *arguments):
         """The steps of a search, with all their matches."""
-        process = self.run_tool("search", text, "--json", "--limit", "0", *arguments)
-        self.assertEqual("", process.stderr)
-        return json.loads(process.stdout)["steps"]
+        call = self.call("search", text, "--json", "--limit", "0", *arguments)
+        return json.loads(subprocess.check_output(call))["steps"]
 
     def search(self, text, *arguments):
         return self.steps(text, *arguments)[-1]
@@ -82,12 +89,6 @@ class ToolCase(unittest.TestCase):
     def sql(self, statement, *values):
         with contextlib.closing(sqlite3.connect(self.database)) as database, database:
             return database.execute(statement, values).fetchall()
-
-
-def sections(path):
-    """The texts of a file by their names, each of which stands in a line behind five signs."""
-    parts = re.split(r"(?m)^===== (.*)\n", path.read_text(encoding="utf-8"))
-    return dict(zip(parts[1::2], parts[2::2]))
 
 
 def main():

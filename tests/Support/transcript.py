@@ -12,9 +12,10 @@ def check(case, path, directory, shell, **variables):
     """The calls of the file print in the directory what the file says. In front of each the shell's
     definitions are run."""
     recorded, printed = path.read_text(encoding="utf-8"), ""
-    environment = {**os.environ, "TZ": "UTC", "LC_ALL": "C.UTF-8", **variables}
+    environment = {**os.environ, "TZ": "UTC", "LC_ALL": "C.UTF-8", "TERM": "xterm", "NO_COLOR": "",
+                   **variables}
     for line in re.findall(r"(?m)^\$ (.*)$", recorded):
-        process = subprocess.run(["bash", "-c", shell + line], cwd=directory, env=environment,
+        process = subprocess.run(["bash", "-c", f"{shell}\n{line}"], cwd=directory, env=environment,
                                  capture_output=True, encoding="utf-8", check=False)
         errors = re.sub("(?m)^(?=.)", "! ", process.stderr)
         code = f"exit code {process.returncode}\n" if process.returncode else ""

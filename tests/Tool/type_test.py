@@ -17,7 +17,7 @@ import time
 sys.path.insert(0, str(pathlib.Path(__file__).parents[1] / "Support"))
 # pylint: disable=wrong-import-position
 import tool_case
-from tool_case import PYFILE, SKIPPED, TOOL, USAGE, ToolCase
+from tool_case import PYFILE, SKIPPED, TOOL, ToolCase
 from transcript import RECORD
 
 SCREENS = pathlib.Path(__file__).parent / "screens"
@@ -126,9 +126,9 @@ def file_of(columns, rows):
 
 
 def recorded(columns, rows):
-    """The recorded screens of a size by name."""
-    return {name: screen.rstrip()
-            for name, screen in tool_case.sections(file_of(columns, rows)).items()}
+    """The recorded screens of a size by their names, which stand in lines behind five signs."""
+    parts = re.split(r"(?m)^===== (.*)\n", file_of(columns, rows).read_text(encoding="utf-8"))
+    return {name: screen.rstrip() for name, screen in zip(parts[1::2], parts[2::2])}
 
 
 class ScreenTest(TypeTest):
@@ -251,15 +251,6 @@ class IndexTest(TypeTest):
         self.wait_for(rf"^abc> zhangsa .* {before + 1} contacts?$")
         self.press("Escape")
         self.assert_left_as_it_was(0)
-
-
-class RefusalTest(TypeTest):
-    def test_where_it_cannot_run(self):
-        self.refused(USAGE, "no terminal", "type", stdin=subprocess.DEVNULL)
-        for setting, text in (("LC_ALL=C", "UTF-8"), ("TERM=dumb", "dumb"), ("TERM=", "TERM"),
-                              ("TERM=none", "none")):
-            self.enter(f"clear; {setting} {shlex.join(self.call('type'))}; echo status $?")
-            self.wait_for(rf"{text}.*\n(.*\n)*status {USAGE}$")
 
 
 if __name__ == "__main__":

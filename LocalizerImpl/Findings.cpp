@@ -19,6 +19,10 @@ void CFindings::Report(CQVLocalizerManager& matcher, _mask_type& mask)
     for (int iKey = 0; iKey < m_table.KeyCount(); ++iKey)
     {
         const tag_Mark& mark = m_pMarks[static_cast<size_t>(iKey)];
+        if (mark.uLastOffsets == 0 && !mark.bBehindRun)
+        {
+            continue;
+        }
         const tag_KeyMeaning meaning = m_table.MeaningOf(iKey);
         // The records of the sets have no character, so these add to the mask alone.
         for (unsigned uOffsets = meaning.pRecord != nullptr ? mark.uLastOffsets : 0; uOffsets != 0;

@@ -12,8 +12,8 @@ namespace
 {
 
 // Places in name order are sorted digit by digit.
-constexpr int DIGIT_BITS = 8;
-constexpr int DIGITS = 4;
+constexpr int DIGIT_BITS = 11;
+constexpr int DIGITS = 3;
 constexpr size_t DIGIT_VALUES = 1U << DIGIT_BITS;
 constexpr uint32_t DIGIT_MASK = DIGIT_VALUES - 1;
 constexpr uint32_t SIGN_BIT = 0x80000000;

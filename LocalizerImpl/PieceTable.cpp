@@ -16,15 +16,9 @@ bool IsChineseUnit(wchar_t unit)
 CPieceTable::CPieceTable(CQVLocalizerManager& matcher, const CReadingSets& sets,
                          const wchar_t* szInput, int iInputLen)
     : m_matcher(matcher), m_sets(sets), m_szInput(szInput), m_iInputLen(iInputLen),
-      m_pKeys(sets.Keys()),
-      m_pEnds(new (std::nothrow) uint16_t[static_cast<size_t>(iInputLen * KeyCount())]),
-      m_pFull(new (std::nothrow) uint16_t[static_cast<size_t>(iInputLen * KeyCount())])
+      m_pKeys(sets.Keys()), m_pRows(new (std::nothrow) tag_Row[static_cast<size_t>(KeyCount())]())
 {
-    if (m_pEnds != nullptr && m_pFull != nullptr)
-    {
-        std::fill_n(m_pEnds.get(), iInputLen * KeyCount(), NOT_ASKED);
-        m_bReady = AskLastPieces() && AddTypedKeys();
-    }
+    m_bReady = m_pRows != nullptr && AskLastPieces() && AddTypedKeys();
 }
 
 // Finds out which offsets have a last piece that is worth trying. False if the allocation fails.
@@ -103,6 +97,7 @@ wchar_t CPieceTable::TypedUnit(int iKey) const
 
 unsigned CPieceTable::AskEnds(int iKey, int iOffset)
 {
+    tag_Row& row = m_pRows[static_cast<size_t>(iKey)];
     unsigned uEnds = 0;
     unsigned uFull = 0;
     for (int iEnd = iOffset + 1; iEnd <= m_iInputLen; ++iEnd)
@@ -116,8 +111,9 @@ unsigned CPieceTable::AskEnds(int iKey, int iOffset)
         uEnds |= static_cast<unsigned>(bTried) << iEnd;
         uFull |= static_cast<unsigned>(bTried && bFull) << iEnd;
     }
-    *FullOf(iKey, iOffset) = static_cast<uint16_t>(uFull);
-    *EndsOf(iKey, iOffset) = static_cast<uint16_t>(uEnds);
+    row.auEnds[iOffset] = static_cast<uint16_t>(uEnds | ASKED);
+    row.auFull[iOffset] = static_cast<uint16_t>(uFull);
+    row.uDead = static_cast<uint16_t>(row.uDead | (unsigned{uEnds == 0} << iOffset));
     return uEnds;
 }
 

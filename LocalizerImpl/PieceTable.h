@@ -45,19 +45,16 @@ public:
     // A typed character means what the characters of its readings mean.
     tag_KeyMeaning MeaningOf(int iKey) const;
 
-    // Where pieces from the offset on that fit the key end. Each offset has a table of its own:
-    // the first one, which tells most names apart, stays in the nearest cache.
+    // Where pieces from the offset on that fit the key end.
     unsigned Ends(int iKey, int iOffset)
     {
-        const uint16_t uEnds = *EndsOf(iKey, iOffset);
-        return uEnds != NOT_ASKED ? uEnds : AskEnds(iKey, iOffset);
+        const unsigned uEnds = RowOf(iKey).auEnds[iOffset];
+        return uEnds != NOT_ASKED ? uEnds & ~ASKED : AskEnds(iKey, iOffset);
     }
-
-    // Whether the piece from iOffset to iEnd, one of its Ends, leaves a run of whole readings.
-    bool IsFull(int iKey, int iOffset, int iEnd) const
-    {
-        return ((unsigned{*FullOf(iKey, iOffset)} >> iEnd) & 1U) != 0;
-    }
+    // Those of the Ends asked for that leave a run of whole readings.
+    unsigned FullEnds(int iKey, int iOffset) const { return RowOf(iKey).auFull[iOffset]; }
+    // Offsets from which no piece fits the key, as far as they were asked for.
+    unsigned DeadOffsets(int iKey) const { return RowOf(iKey).uDead; }
 
     int InputLength() const { return m_iInputLen; }
     const CReadingSets& Sets() const { return m_sets; }
@@ -66,16 +63,18 @@ public:
     wchar_t* Piece(int iOffset, int iEnd);
 
 private:
-    static constexpr uint16_t NOT_ASKED = UINT16_MAX;
+    static constexpr uint16_t NOT_ASKED = 0;
+    static constexpr unsigned ASKED = 1; // no piece ends at offset 0
 
-    uint16_t* EndsOf(int iKey, int iOffset) const
+    // What the pieces do on one key.
+    struct tag_Row
     {
-        return m_pEnds.get() + (iOffset * KeyCount() + iKey);
-    }
-    uint16_t* FullOf(int iKey, int iOffset) const
-    {
-        return m_pFull.get() + (iOffset * KeyCount() + iKey);
-    }
+        uint16_t uDead;                 // offsets
+        uint16_t auEnds[LOC_MAX_INPUT]; // by offset; NOT_ASKED, or with ASKED
+        uint16_t auFull[LOC_MAX_INPUT]; // by offset
+    };
+
+    const tag_Row& RowOf(int iKey) const { return m_pRows.get()[iKey]; }
     bool AddTypedKeys();
     int KeyOfWide(wchar_t code) const;
     wchar_t TypedUnit(int iKey) const;
@@ -91,8 +90,7 @@ private:
     bool m_bReady = false;
     uint16_t m_uValidLast = 0; // offsets whose last piece the matcher finds worth trying
     std::unique_ptr<uint16_t[]> m_pOwnKeys;    // where a Chinese character was typed
-    std::unique_ptr<uint16_t[]> m_pEnds;       // by offset, then by key
-    std::unique_ptr<uint16_t[]> m_pFull;       // the same: those Ends that take whole readings
+    std::unique_ptr<tag_Row[]> m_pRows;        // by key
     wchar_t m_aszUnits[LOC_MAX_INPUT][2] = {}; // the pieces of one character, the most frequent
     wchar_t m_szPiece[LOC_PIECE_BUFFER] = {};
 };

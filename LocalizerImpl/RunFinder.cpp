@@ -8,9 +8,16 @@
 namespace
 {
 
+constexpr unsigned FIRST_OFFSET = 1;
+
 int LowestBit(unsigned uBits)
 {
     return __builtin_ctz(uBits);
+}
+
+bool HasBit(unsigned uBits, int iBit)
+{
+    return ((uBits >> iBit) & 1U) != 0;
 }
 
 } // namespace
@@ -36,7 +43,7 @@ tag_NameMatch CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate)
     const int iStarts = m_bAnywhere ? m_iLength : 1;
     for (m_iStart = 0; m_iStart < iStarts; ++m_iStart)
     {
-        if (m_table.Ends(m_aiKeys[m_iStart], 0) != 0)
+        if ((m_table.DeadOffsets(m_aiKeys[m_iStart]) & FIRST_OFFSET) == 0)
         {
             Extend(0, 0, 0, true);
         }
@@ -47,21 +54,25 @@ tag_NameMatch CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate)
 // Lays one more piece, from iOffset on, on the run's character number iPiece.
 void CRunFinder::Extend(int iPiece, int iOffset, uint32_t uSplit, bool bAllFull)
 {
-    const int iKey = m_aiKeys[m_iStart + iPiece];
     const int iInputLen = m_table.InputLength();
+    const int iPlace = m_iStart + iPiece;
+    const unsigned uEnds = m_table.Ends(m_aiKeys[iPlace], iOffset);
+    const unsigned uFull = bAllFull ? m_table.FullEnds(m_aiKeys[iPlace], iOffset) : 0;
     const uint32_t uExtended = uSplit | (1U << (iInputLen - 1 - iOffset));
-    for (unsigned uEnds = m_table.Ends(iKey, iOffset); uEnds != 0; uEnds &= uEnds - 1)
+    if (HasBit(uEnds, iInputLen))
     {
-        const int iEnd = LowestBit(uEnds);
-        const bool bFull = bAllFull && m_table.IsFull(iKey, iOffset, iEnd);
-        if (iEnd == iInputLen)
-        {
-            Record(iPiece + 1, iOffset, uExtended, bFull);
-        }
-        else if (m_iStart + iPiece + 1 < m_iLength)
-        {
-            Extend(iPiece + 1, iEnd, uExtended, bFull);
-        }
+        Record(iPiece + 1, iOffset, uExtended, HasBit(uFull, iInputLen));
+    }
+    if (iPlace + 1 == m_iLength)
+    {
+        return;
+    }
+    const unsigned uInner = uEnds & ((1U << iInputLen) - 1);
+    for (unsigned uGoOn = uInner & ~m_table.DeadOffsets(m_aiKeys[iPlace + 1]); uGoOn != 0;
+         uGoOn &= uGoOn - 1)
+    {
+        const int iEnd = LowestBit(uGoOn);
+        Extend(iPiece + 1, iEnd, uExtended, HasBit(uFull, iEnd));
     }
 }
 

@@ -176,6 +176,10 @@ void CSearchRun::RankInPlace(tag_LocalizerDetail* pDetail)
     const int32_t iCount = static_cast<int32_t>(vMatches.size());
     for (int32_t iStart = 0; iStart < iCount; ++iStart)
     {
+        if (vMatches[static_cast<size_t>(iStart)].iIndex == iStart)
+        {
+            continue;
+        }
         const tag_LocalizerDetail first = pDetail[iStart];
         int32_t iPlace = iStart;
         while (vMatches[static_cast<size_t>(iPlace)].iIndex != iPlace)

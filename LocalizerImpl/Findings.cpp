@@ -7,14 +7,13 @@ CFindings::CFindings(CPieceTable& table)
 {
 }
 
-void CFindings::Report(CQVLocalizerManager& matcher, _mask_type& mask)
+void CFindings::Report(CQVLocalizerManager& matcher)
 {
     for (int i = 0; i < m_firstFound.Count(); ++i)
     {
         const CFirstFound::tag_Find& find = m_firstFound.At(i);
         PYOFWORDS record = m_table.Sets().RecordOf(find.code);
-        OfferLastPiece(matcher, mask, record,
-                       m_table.InputLength() - 1 - __builtin_ctz(find.Split()));
+        OfferLastPiece(matcher, record, m_table.InputLength() - 1 - __builtin_ctz(find.Split()));
     }
     for (int iKey = 0; iKey < m_table.KeyCount(); ++iKey)
     {
@@ -28,7 +27,7 @@ void CFindings::Report(CQVLocalizerManager& matcher, _mask_type& mask)
         for (unsigned uOffsets = meaning.pRecord != nullptr ? mark.uLastOffsets : 0; uOffsets != 0;
              uOffsets &= uOffsets - 1)
         {
-            OfferLastPiece(matcher, mask, *meaning.pRecord, __builtin_ctz(uOffsets));
+            OfferLastPiece(matcher, *meaning.pRecord, __builtin_ctz(uOffsets));
         }
         if (mark.bBehindRun)
         {
@@ -37,11 +36,8 @@ void CFindings::Report(CQVLocalizerManager& matcher, _mask_type& mask)
     }
 }
 
-// Without a code: a typed character adds nothing as a last piece.
-void CFindings::OfferLastPiece(CQVLocalizerManager& matcher, _mask_type& mask, PYOFWORDS& record,
-                               int iOffset)
+void CFindings::OfferLastPiece(CQVLocalizerManager& matcher, PYOFWORDS& record, int iOffset)
 {
-    int iFull = 0;
-    matcher.CmpChineseWord(m_table.Sets().Records(), LOC_NO_CODE, record,
-                           m_table.Piece(iOffset, m_table.InputLength()), &mask, 1, iFull);
+    matcher.OfferLastPiece(m_table.Sets().Records(), record,
+                           m_table.Piece(iOffset, m_table.InputLength()));
 }

@@ -40,8 +40,8 @@ public:
         }
     }
 
-    // Feeds the mask and the candidate characters of the matcher, mask being its own.
-    void Report(CQVLocalizerManager& matcher, _mask_type& mask);
+    // Feeds the mask and the candidate characters of the matcher.
+    void Report(CQVLocalizerManager& matcher);
 
 private:
     struct tag_Mark
@@ -50,8 +50,7 @@ private:
         bool bBehindRun;
     };
 
-    void OfferLastPiece(CQVLocalizerManager& matcher, _mask_type& mask, PYOFWORDS& record,
-                        int iOffset);
+    void OfferLastPiece(CQVLocalizerManager& matcher, PYOFWORDS& record, int iOffset);
 
     CPieceTable& m_table;
     std::unique_ptr<tag_Mark[]> m_pMarks; // by key

@@ -2,14 +2,19 @@
 
 #include "LocalizerImpl/QVLocalizerManager.h"
 
+#include "Common/Log.h"
 #include "Common/WideString.h"
 #include "LocalizerImpl/NameFolding.h"
 
 #include <algorithm>
+#include <climits>
+#include <ctime>
 #include <iterator>
 
 namespace
 {
+
+constexpr int64_t MS_PER_SECOND = 1000;
 
 const PYOFWORDS* RecordOrNull(const PYOFWORDS* pMap, wchar_t code)
 {
@@ -46,10 +51,37 @@ CQVLocalizerManager::~CQVLocalizerManager()
     m_vLocateArray.clear();
 }
 
-void CQVLocalizerManager::ClearSearch()
+int CQVLocalizerManager::BeginSearch(wchar_t* szInput)
 {
+    _wcslwr(szInput);
     m_stMask = {};
     std::fill(std::begin(m_stCNWords), std::end(m_stCNWords), CNWORDOUTPUT{});
+    m_vLocateArray.clear();
+    m_iInputLen = static_cast<int>(std::min<size_t>(_wcslen(szInput), INT_MAX));
+    return m_iInputLen <= LOC_MAX_INPUT ? m_iInputLen : LOC_ERR_PARAM;
+}
+
+// Without a code: a typed character adds nothing as a last piece.
+void CQVLocalizerManager::OfferLastPiece(PYOFWORDS* pMap, PYOFWORDS& record, wchar_t* szPiece)
+{
+    int iFull = 0;
+    CmpChineseWord(pMap, LOC_NO_CODE, record, szPiece, &m_stMask, 1, iFull);
+}
+
+void CQVLocalizerManager::ReadClock()
+{
+    m_llNowMs = static_cast<int64_t>(std::time(nullptr)) * MS_PER_SECOND;
+}
+
+void CQVLocalizerManager::EndSearch(long* pMask, wchar_t* szWordOut)
+{
+    *pMask = static_cast<long>(m_stMask.lMask);
+    QV_LOGD(QV_LOG_TAG, "QV_Contacts:DoSearch QVLocalizerManger pMask = %x\n", m_stMask.lMask);
+    const CNWORDOUTPUT* pWord = std::begin(m_stCNWords);
+    for (; pWord != std::end(m_stCNWords) && pWord->wszWord[0] != 0; ++pWord)
+    {
+        *szWordOut++ = pWord->wszWord[0];
+    }
     m_vLocateArray.clear();
 }
 

@@ -206,9 +206,17 @@ protected:
     explicit CQVLocalizerManager(int bMatchAnywhere);
 
 private:
+    friend class CFindings;
     friend class CSearchRun;
 
-    QV_INTERNAL void ClearSearch();
+    // One search by CSearchRun, which keeps its matches in m_vLocateArray. Begin lowercases the
+    // text and clears what the last search left; the text's length, or LOC_ERR_PARAM.
+    QV_INTERNAL int BeginSearch(wchar_t* szInput);
+    // Reports that characters with the record's readings took the last piece.
+    QV_INTERNAL void OfferLastPiece(PYOFWORDS* pMap, PYOFWORDS& record, wchar_t* szPiece);
+    QV_INTERNAL void ReadClock();
+    QV_INTERNAL void EndSearch(long* pMask, wchar_t* szWordOut);
+
     QV_INTERNAL bool CompareRun(PYOFWORDS* pMap, const wchar_t* pCodes,
                                 const android::Vector<wchar_t*>& vPieces, int& bRunFull);
     QV_INTERNAL bool ComparePiece(PYOFWORDS* pMap, wchar_t code, wchar_t* szPiece, bool bLast,

@@ -16,13 +16,9 @@
 #include "LocalizerImpl/MatcherText.h"
 
 #include <algorithm>
-#include <climits>
-#include <ctime>
 
 namespace
 {
-
-constexpr int64_t MS_PER_SECOND = 1000;
 
 void LogMatches(size_t uMatches)
 {
@@ -32,18 +28,21 @@ void LogMatches(size_t uMatches)
 
 } // namespace
 
+CSearchRun::CSearchRun(CQVLocalizerManager& manager)
+    : m_manager(manager), m_vMatches(manager.m_vLocateArray)
+{
+}
+
 int CSearchRun::Begin(wchar_t* szInput)
 {
     if (szInput == nullptr)
     {
         return LOC_ERR_PARAM;
     }
-    _wcslwr(szInput);
-    m_manager.ClearSearch();
-    m_manager.m_iInputLen = static_cast<int>(std::min<size_t>(_wcslen(szInput), INT_MAX));
-    if (m_manager.m_iInputLen > LOC_MAX_INPUT)
+    m_iInputLen = m_manager.BeginSearch(szInput);
+    if (m_iInputLen < 0)
     {
-        return LOC_ERR_PARAM;
+        return m_iInputLen;
     }
     const tag_FileStamp stamp = ReadFileStamp(CDataPaths::PinyinMapping());
     m_table.emplace();
@@ -57,7 +56,7 @@ int CSearchRun::Begin(wchar_t* szInput)
     {
         return LOC_ERR_MAP;
     }
-    m_pieces.emplace(m_manager, *m_sets, szInput, m_manager.m_iInputLen);
+    m_pieces.emplace(m_manager, *m_sets, szInput, m_iInputLen);
     if (!m_pieces->IsReady())
     {
         return LOC_ERR_MAP;
@@ -74,31 +73,31 @@ int CSearchRun::Begin(wchar_t* szInput)
 
 bool CSearchRun::MayMatch(const wchar_t* pCodes)
 {
-    return m_finder && (m_manager.m_iInputLen == 0 || m_finder->CanMatch(pCodes));
+    return m_finder && (m_iInputLen == 0 || m_finder->CanMatch(pCodes));
 }
 
 int CSearchRun::Find(const tag_LocalizerResult& candidates, int bTimeOrder)
 {
     const bool bFound =
-        m_manager.m_iInputLen == 0 ? ListAll(candidates, bTimeOrder) : FindMatches(candidates);
+        m_iInputLen == 0 ? ListAll(candidates, bTimeOrder) : FindMatches(candidates);
     if (!bFound)
     {
-        m_manager.m_vLocateArray.clear();
+        m_vMatches.clear();
         return LOC_ERR_MAP;
     }
-    m_findings->Report(m_manager, m_manager.m_stMask);
-    return static_cast<int>(m_manager.m_vLocateArray.size());
+    m_findings->Report(m_manager);
+    return static_cast<int>(m_vMatches.size());
 }
 
 bool CSearchRun::ListAll(const tag_LocalizerResult& candidates, int bTimeOrder)
 {
     if (bTimeOrder != 0)
     {
-        m_manager.m_llNowMs = static_cast<int64_t>(std::time(nullptr)) * MS_PER_SECOND;
+        m_manager.ReadClock();
     }
     const int iOffered = m_manager.m_bMatchAnywhere != 0 ? CONTACT_MAX_KEY : 1;
     const int iCount = candidates.pDetail == nullptr ? 0 : candidates.iResultNum;
-    if (m_manager.m_vLocateArray.setCapacity(static_cast<size_t>(std::max(iCount, 0))) < 0)
+    if (m_vMatches.setCapacity(static_cast<size_t>(std::max(iCount, 0))) < 0)
     {
         return false;
     }
@@ -106,7 +105,7 @@ bool CSearchRun::ListAll(const tag_LocalizerResult& candidates, int bTimeOrder)
     {
         const tag_LocalizerDetail& detail = candidates.pDetail[i];
         const wchar_t firstWord = IndexCharacter(detail, bTimeOrder);
-        m_manager.m_vLocateArray.push({i, MATCH_LIST, 0, static_cast<int32_t>(firstWord)});
+        m_vMatches.push({i, MATCH_LIST, 0, static_cast<int32_t>(firstWord)});
         const int iCodes = std::min(NameLength(detail.szLocalizerKey), iOffered);
         for (int iCode = 0; iCode < iCodes; ++iCode)
         {
@@ -130,7 +129,6 @@ wchar_t CSearchRun::IndexCharacter(const tag_LocalizerDetail& detail, int bTimeO
 
 bool CSearchRun::FindMatches(const tag_LocalizerResult& candidates)
 {
-    android::Vector<_MatchResult>& vMatches = m_manager.m_vLocateArray;
     android::Vector<uint16_t> vFirstSplits; // when each match was first found
     for (int32_t i = 0; candidates.pDetail != nullptr && i < candidates.iResultNum; ++i)
     {
@@ -141,50 +139,49 @@ bool CSearchRun::FindMatches(const tag_LocalizerResult& candidates)
         }
         const tag_NameMatch match = m_finder->Find(pCodes, i);
         if (vFirstSplits.add(match.uFirstSplit) < 0 ||
-            vMatches.add({i, match.iMatchType, match.iMatchPos, 0}) < 0)
+            m_vMatches.add({i, match.iMatchType, match.iMatchPos, 0}) < 0)
         {
             return false;
         }
     }
-    return vMatches.size() < 2 ||
-           RankMatches(vMatches, vFirstSplits.array(), candidates.pDetail) == 0;
+    return m_vMatches.size() < 2 ||
+           RankMatches(m_vMatches, vFirstSplits.array(), candidates.pDetail) == 0;
 }
 
 void CSearchRun::Finish(const tag_LocalizerResult& candidates, tag_LocalizerResult* pResult,
                         long* pMask, wchar_t* szWordOut)
 {
-    LogMatches(m_manager.m_vLocateArray.size());
+    LogMatches(m_vMatches.size());
     if (pResult != nullptr)
     {
         WriteEntries(candidates, *pResult);
     }
-    WriteKeys(pMask, szWordOut);
+    m_manager.EndSearch(pMask, szWordOut);
 }
 
 void CSearchRun::FinishInPlace(tag_LocalizerResult& candidates, long* pMask, wchar_t* szWordOut)
 {
-    LogMatches(m_manager.m_vLocateArray.size());
+    LogMatches(m_vMatches.size());
     RankInPlace(candidates.pDetail);
-    WriteKeys(pMask, szWordOut);
+    m_manager.EndSearch(pMask, szWordOut);
 }
 
 // Brings entries into the order of their matches along the cycles of the permutation; place k gets
 // the entry that match k points to.
 void CSearchRun::RankInPlace(tag_LocalizerDetail* pDetail)
 {
-    android::Vector<_MatchResult>& vMatches = m_manager.m_vLocateArray;
-    const int32_t iCount = static_cast<int32_t>(vMatches.size());
+    const int32_t iCount = static_cast<int32_t>(m_vMatches.size());
     for (int32_t iStart = 0; iStart < iCount; ++iStart)
     {
-        if (vMatches[static_cast<size_t>(iStart)].iIndex == iStart)
+        if (m_vMatches[static_cast<size_t>(iStart)].iIndex == iStart)
         {
             continue;
         }
         const tag_LocalizerDetail first = pDetail[iStart];
         int32_t iPlace = iStart;
-        while (vMatches[static_cast<size_t>(iPlace)].iIndex != iPlace)
+        while (m_vMatches[static_cast<size_t>(iPlace)].iIndex != iPlace)
         {
-            _MatchResult& match = vMatches.editItemAt(static_cast<size_t>(iPlace));
+            _MatchResult& match = m_vMatches.editItemAt(static_cast<size_t>(iPlace));
             const int32_t iFrom = match.iIndex;
             pDetail[iPlace] = iFrom == iStart ? first : pDetail[iFrom];
             match.iIndex = iPlace;
@@ -193,44 +190,22 @@ void CSearchRun::RankInPlace(tag_LocalizerDetail* pDetail)
     }
     for (int32_t i = 0; i < iCount; ++i)
     {
-        pDetail[i].iMatchPos = vMatches[static_cast<size_t>(i)].iMatchPos;
-        pDetail[i].iFirstWord = vMatches[static_cast<size_t>(i)].iFirstWord;
+        pDetail[i].iMatchPos = m_vMatches[static_cast<size_t>(i)].iMatchPos;
+        pDetail[i].iFirstWord = m_vMatches[static_cast<size_t>(i)].iFirstWord;
     }
-}
-
-void CSearchRun::WriteKeys(long* pMask, wchar_t* szWordOut)
-{
-    *pMask = static_cast<long>(m_manager.m_stMask.lMask);
-    QV_LOGD(QV_LOG_TAG, "QV_Contacts:DoSearch QVLocalizerManger pMask = %x\n",
-            m_manager.m_stMask.lMask);
-    WriteCandidateWords(szWordOut);
-    m_manager.m_vLocateArray.clear();
 }
 
 void CSearchRun::WriteEntries(const tag_LocalizerResult& candidates,
                               tag_LocalizerResult& result) const
 {
-    const android::Vector<_MatchResult>& vMatches = m_manager.m_vLocateArray;
-    result.iResultNum = result.pDetail == nullptr ? 0 : static_cast<int32_t>(vMatches.size());
+    result.iResultNum = result.pDetail == nullptr ? 0 : static_cast<int32_t>(m_vMatches.size());
     for (int i = 0; i < result.iResultNum; ++i)
     {
-        const _MatchResult& match = vMatches[static_cast<size_t>(i)];
+        const _MatchResult& match = m_vMatches[static_cast<size_t>(i)];
         tag_LocalizerDetail& entry = result.pDetail[i];
         entry = candidates.pDetail[match.iIndex];
         entry.iMatchPos = match.iMatchPos;
         entry.iFirstWord = match.iFirstWord;
-    }
-}
-
-void CSearchRun::WriteCandidateWords(wchar_t* szWordOut) const
-{
-    for (const CNWORDOUTPUT& word : m_manager.m_stCNWords)
-    {
-        if (word.wszWord[0] == 0)
-        {
-            return;
-        }
-        *szWordOut++ = word.wszWord[0];
     }
 }
 

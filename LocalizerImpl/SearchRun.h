@@ -22,7 +22,7 @@ class CSearchRun : public CCandidateFilter
 {
 public:
     // The matcher outlives the run.
-    explicit CSearchRun(CQVLocalizerManager& manager) : m_manager(manager) {}
+    explicit CSearchRun(CQVLocalizerManager& manager);
     ~CSearchRun() override = default;
     CSearchRun(const CSearchRun&) = delete;
     CSearchRun& operator=(const CSearchRun&) = delete;
@@ -49,15 +49,15 @@ public:
     void FinishInPlace(tag_LocalizerResult& candidates, long* pMask, wchar_t* szWordOut);
 
 private:
-    void WriteKeys(long* pMask, wchar_t* szWordOut);
     void RankInPlace(tag_LocalizerDetail* pDetail);
     bool ListAll(const tag_LocalizerResult& candidates, int bTimeOrder);
     bool FindMatches(const tag_LocalizerResult& candidates);
     wchar_t IndexCharacter(const tag_LocalizerDetail& detail, int bTimeOrder);
     void WriteEntries(const tag_LocalizerResult& candidates, tag_LocalizerResult& result) const;
-    void WriteCandidateWords(wchar_t* szWordOut) const;
 
     CQVLocalizerManager& m_manager;
+    android::Vector<_MatchResult>& m_vMatches; // the matcher's m_vLocateArray
+    int m_iInputLen = 0;
     std::optional<CPinyinTable> m_table; // from Begin on
     CReadingSets::Ptr m_sets;
     std::optional<CPieceTable> m_pieces;

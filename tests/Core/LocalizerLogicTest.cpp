@@ -16,47 +16,10 @@ protected:
     // Two contacts whose order differs by id and by name.
     void StoreTwo()
     {
-        std::vector<tag_ProviderContact> vContacts = {{6}, {9, "張三"}};
-        vContacts[0].bPhone = vContacts[0].bStarred = true;
-        vContacts[1].strGroups = "7.9";
-        vContacts[1].strAccounts = "2.40";
-        vContacts[1].bSecret = vContacts[1].bMail = vContacts[1].bAddress = true;
-        vContacts[1].llLastTime = 5'000'000'000'123;
-        vContacts[1].iTimes = 3;
-        vContacts[1].iStatusId = 70;
-        vContacts[1].bOnline = true;
-        Store(vContacts);
+        Store({{6}, {9, "張三", "", "", "", 0, 0, 70}});
+        m_provider.SetOnline(70, true);
     }
 };
-
-TEST_F(CMemInitTest, WritesTheFilesByteForByte)
-{
-    StoreTwo();
-    ASSERT_EQ(m_logic.MemInit(true), 0);
-    Records vRecords(2 + STORE_SPARE_RECORDS, tag_ContactsStruct{});
-    tag_ContactsStruct& named = vRecords[0];
-    named.iContactID = 9;
-    named.lGroupID[0] = 7;
-    named.lGroupID[1] = 9;
-    named.lGroupID[2] = SECRET_GROUP_ID;
-    named.lAccountID[0] = 2;
-    named.lAccountID[1] = 40;
-    named.iFlags =
-        CONTACT_FLAG_SECRET | CONTACT_FLAG_MAIL | CONTACT_FLAG_ADDRESS | CONTACT_FLAG_ONLINE;
-    named.llLastTimeContacted = 5'000'000'000'123;
-    named.iTimesContacted = 3;
-    named.iStatusUpdateID = 70;
-    std::wcscpy(named.szName, L"zhang 张san 三");
-    Wide(LocalizerKeyOf("張三")).copy(named.szLocalizerKey, CONTACT_MAX_KEY);
-    vRecords[1].iContactID = 6;
-    vRecords[1].iFlags = CONTACT_FLAG_PHONE | CONTACT_FLAG_STARRED;
-    vRecords[1].iSortIndex = 1;
-    vRecords[1].szName[0] = NAME_EMPTY_MARK;
-    EXPECT_TRUE(ReadFiles().strRecords == BytesOf(vRecords));
-    EXPECT_EQ(Reg(), (tag_ContactReg{2, 0, 2 + STORE_SPARE_RECORDS}));
-    EXPECT_TRUE(CDataDirectory::ReadBytes(CDataPaths::PinyinMapping()) ==
-                CDataDirectory::ReadBytes(CDataPaths::PinyinSource()));
-}
 
 TEST_F(CMemInitTest, ReloadsWhenAFileIsMissingOrEmpty)
 {

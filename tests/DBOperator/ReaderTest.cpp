@@ -4,7 +4,6 @@
 #include "Common/DataPaths.h"
 #include "DBOperator/SQLiteOperator.h"
 #include "DBOperator/SqlIdList.h"
-#include "DBOperator/StatusIndex.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/MemoryFailure.h"
@@ -172,62 +171,47 @@ TEST(IdTexts, HoldWhatFits)
     EXPECT_EQ(strFull, ListText(vIds));
 }
 
-// The rows of a database and their records; those of a single contact may have one group more.
+// The rows of a database and their records, read with all others and then alone, where there may be
+// one group more and the status is not read.
 TEST_F(Reader, MakesRecordsOfRows)
 {
     const std::string strZhang = "张张张张张张张张张张";
-    const std::string strTen(10, 'x');
     tag_ProviderContact full = {-4, "安", "k", IdText(101), "6", 1'700'000'000'123, 2, 8};
     full.bSecret = full.bMail = full.bPhone = true;
     tag_ProviderContact secret = {1, "", "", "7.x.9", IdText(21)};
     secret.bSecret = secret.bStarred = secret.bAddress = true;
-    const std::string strFull =
-        std::to_string(CONTACT_FLAG_SECRET | CONTACT_FLAG_MAIL | CONTACT_FLAG_PHONE);
-    const std::string strSecret =
-        std::to_string(CONTACT_FLAG_SECRET | CONTACT_FLAG_STARRED | CONTACT_FLAG_ADDRESS);
-    const std::pair<tag_ProviderContact, std::string> ROWS[] = {
-        {full, "-4 " + strFull + " 1700000000123 2 8 安 k " + IdText(99) + ".-1 1 accounts"},
-        {secret, "1 " + strSecret + " 0 0 0   7.-1 20 accounts"},
-        {{2, std::string(40, 'x'), std::string(40, 'x')},
-         "2 0 0 0 0 " + strTen + strTen + strTen + " " + strTen + "  0 accounts"},
-        {{3, strZhang + strZhang, strZhang + strZhang},
-         "3 0 0 0 0 " + strZhang + " " + strZhang + "  0 accounts"},
-        // The last character would end behind the limit.
-        {{4, "x" + strZhang, "x" + strZhang},
-         "4 0 0 0 0 x张张张张张张张张张 x张张张张张张张张张  0 accounts"},
-        // Not UTF-8 from some byte on.
-        {{5, "ab\xF0\x9F\x98\x80zz", std::string("ab\0cd", 5)}, "5 0 0 0 0 ab ab  0 accounts"},
-    };
-    for (const auto& [contact, expected] : ROWS)
-    {
-        m_provider.Put(contact);
-    }
+    m_provider.PutAll({full,
+                       secret,
+                       {2, std::string(40, 'x'), std::string(40, 'x')},
+                       {3, strZhang + strZhang, strZhang + strZhang},
+                       // The last character would end behind the limit.
+                       {4, "x" + strZhang, "x" + strZhang},
+                       // Not UTF-8 from some byte on.
+                       {5, "ab\xF0\x9F\x98\x80zz", std::string("ab\0cd", 5)}});
     ASSERT_EQ(0, ReadAll());
     ASSERT_EQ(6, m_set.RecordNum);
-    for (int i = 0; i < 6; ++i)
+    std::ostringstream read;
+    const auto ReadAlone = [&](int iId)
     {
-        tag_ContactsStruct expected = m_set.pContacts[i];
-        EXPECT_EQ(TextOf(expected), ROWS[i].second);
         tag_ContactsStruct record = {};
-        expected.lGroupID[99] = i == 0 ? 100 : 0;
-        record.iStatusUpdateID = expected.iStatusUpdateID = 77; // not read
+        record.iStatusUpdateID = 77;
         int iFound = 5;
-        EXPECT_EQ(0, m_reader.ReadContactsByID(expected.iContactID, &record, iFound));
-        EXPECT_EQ(1, iFound);
-        EXPECT_EQ(TextOf(expected), TextOf(record));
+        EXPECT_EQ(0, m_reader.ReadContactsByID(iId, &record, iFound));
+        read << "found " << iFound << ": " << TextOf(record) << '\n';
+    };
+    for (int i = 0; i < m_set.RecordNum; ++i)
+    {
+        read << TextOf(m_set.pContacts[i]) << '\n';
+        ReadAlone(m_set.pContacts[i].iContactID);
     }
     // Found tells of the name row; a hidden contact is read alone.
     m_provider.Execute("delete from contacts where _id=1; delete from localizer where "
                        "contact_id=2; delete from visible_contacts");
-    const int FOUND[][3] = {{1, 1, 0}, {2, 0, 2}, {3, 1, 3}, {99, 0, 0}};
-    for (const auto& [iId, iExpected, iFilledId] : FOUND)
+    for (const int iId : {1, 2, 3, 99})
     {
-        tag_ContactsStruct record = {};
-        int iFound = -1;
-        EXPECT_EQ(0, m_reader.ReadContactsByID(iId, &record, iFound));
-        EXPECT_EQ(iExpected, iFound) << iId;
-        EXPECT_EQ(iFilledId, record.iContactID) << iId;
+        ReadAlone(iId);
     }
+    EXPECT_EQ(read.str(), Recorded("records"));
 }
 
 TEST_F(Reader, ReadsTheListedVisibleContactsOnly)
@@ -247,22 +231,6 @@ TEST_F(Reader, ReadsTheListedVisibleContactsOnly)
     EXPECT_EQ(Told(), Recorded("one listed contact"));
 }
 
-TEST(StatusIndex, FindsTheSameWithoutItsTable)
-{
-    std::vector<tag_ContactsStruct> vRecords(256);
-    for (int i = 0; i < 256; ++i)
-    {
-        vRecords[static_cast<size_t>(i)].iStatusUpdateID = i * 7 - 500;
-    }
-    const CStatusIndex withTable(vRecords.data(), 256);
-    const CMemoryFailure failure(0);
-    const CStatusIndex withoutTable(vRecords.data(), 256);
-    for (int iStatusId = -600; iStatusId < 1500; ++iStatusId)
-    {
-        EXPECT_EQ(withTable.First(iStatusId), withoutTable.First(iStatusId)) << iStatusId;
-    }
-}
-
 // With its table and, without memory, without it.
 TEST_F(Reader, MarksTheFirstRecordOfEachOnlineStatus)
 {
@@ -272,7 +240,7 @@ TEST_F(Reader, MarksTheFirstRecordOfEachOnlineStatus)
         m_provider.Put({++iId, "", "", "", "", 0, 0, iStatusId});
     }
     m_provider.Execute("insert into status_updates values(-5,'online'),(0,'online'),(7,'away'),"
-                       "(8,null),(9,'online'),(11,'online'),(12,'Online')");
+                       "(8,null),(9,'online'),(11,'online'),(12,'Online'),(13,'online')");
     ASSERT_EQ(0, ReadAll());
     for (const int iGranted : {1000, 0})
     {
@@ -310,33 +278,34 @@ TEST_F(Reader, FailsWhereSqliteHasNoMemoryForATextOfTheLastRow)
 
 TEST_F(Reader, FailsOnWhatIsNoProviderDatabase)
 {
-    tag_ContactsStruct record = {};
+    const auto TryAll = [this]
+    {
+        CSQLiteOperator reader;
+        tag_ContactsStruct record = {};
+        int iFound = 0;
+        return Ids{ReadAll(reader), reader.ReadContactsByID(1, &record, iFound),
+                   reader.GetContactsCount(&m_iCount),
+                   reader.ReadAllSmsOnlineStatus(&m_set, 0, nullptr)};
+    };
+    const Ids vAllFail(4, -1);
     fs::remove(CDataPaths::Database());
-    EXPECT_EQ(-1, ReadAll());
-    EXPECT_EQ(-1, Count());
-    EXPECT_EQ(-1, m_reader.ReadContactsByID(1, &record, m_iCount));
-    EXPECT_EQ(-1, ReadOnline());
+    EXPECT_EQ(TryAll(), vAllFail);
     EXPECT_FALSE(fs::exists(CDataPaths::Database()));
-
     CDataDirectory::WriteBytes(CDataPaths::Database(), std::string(5000, 'x'));
-    EXPECT_EQ(-1, ReadAll());
-    EXPECT_EQ(-1, m_reader.ReadContactsByID(1, &record, m_iCount));
-    EXPECT_EQ(-1, Count());
-    EXPECT_EQ(-1, ReadOnline());
+    EXPECT_EQ(TryAll(), vAllFail);
     EXPECT_EQ(42, m_iCount);
     EXPECT_EQ(nullptr, m_set.pContacts);
 
     fs::remove(CDataPaths::Database());
     CProviderDatabase provider;
     provider.PutAll({{1}, {2}});
-    provider.Execute("alter table localizer drop column hasMail");
-    CSQLiteOperator reader;
-    EXPECT_EQ(-1, ReadAll(reader));
-    EXPECT_EQ(-1, reader.ReadContactsByID(1, &record, m_iCount));
+    for (const char* szMissing :
+         {"localizer drop column hasMail", "contacts drop column photo_file_id"})
+    {
+        provider.Execute(std::string("alter table ") + szMissing);
+        EXPECT_EQ(TryAll(), (Ids{-1, -1, 0, 0}));
+    }
     EXPECT_EQ(2, m_set.RecordNum);
-    provider.Execute("alter table contacts drop column photo_file_id");
-    CSQLiteOperator another;
-    EXPECT_EQ(-1, ReadAll(another));
     EXPECT_EQ(Told(), Recorded("no provider database"));
 }
 

@@ -205,10 +205,7 @@ TEST(FilterChain, DeletesEachFilterOnceAlsoOneThatFindsNoPlace)
     chain = std::make_unique<CFilterChain>();
     EXPECT_EQ(iDeleted, 40);
     CFilter* pFilter = new CCountedFilter(&iDeleted);
-    {
-        const CMemoryFailure failure(0);
-        chain->SetFilter(pFilter);
-    }
+    WithMemoryFor(0, [&] { chain->SetFilter(pFilter); });
     EXPECT_EQ(iDeleted, 41);
 }
 
@@ -230,16 +227,10 @@ TEST(FilterChain, IsRefusedOrCutWithoutArgumentsOrMemory)
     {
         SCOPED_TRACE(iGranted);
         pChain = &untouched;
-        int iResult = 0;
-        std::unique_ptr<FilterProcess> first;
-        {
-            const CMemoryFailure failure(iGranted);
-            iResult = BuildFilterChain(aiType, alID, 3, &pChain);
-        }
-        {
-            const CMemoryFailure failure(iGranted);
-            first.reset(FilterProcessFactory::CreateFilterProcess());
-        }
+        const int iResult =
+            WithMemoryFor(iGranted, [&] { return BuildFilterChain(aiType, alID, 3, &pChain); });
+        const std::unique_ptr<FilterProcess> first(
+            WithMemoryFor(iGranted, &FilterProcessFactory::CreateFilterProcess));
         ASSERT_NE(pChain, &untouched);
         const Chain chain(pChain);
         EXPECT_EQ(iResult, iGranted < 4 ? -1 : 0);

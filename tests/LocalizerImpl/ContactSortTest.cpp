@@ -4,17 +4,14 @@
 
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "tests/Support/MemoryFailure.h"
+#include "tests/Support/StoreImage.h"
 
 #include <algorithm>
-#include <cstring>
 #include <gtest/gtest.h>
 #include <random>
-#include <vector>
 
 namespace
 {
-
-using Records = std::vector<tag_ContactsStruct>;
 
 // Few different units and codes, so that many records are equal and many differ late.
 tag_ContactsStruct MakeRecord(std::mt19937& rng)
@@ -32,11 +29,6 @@ tag_ContactsStruct MakeRecord(std::mt19937& rng)
     return record;
 }
 
-bool SameBytes(const Records& a, const Records& b)
-{
-    return std::memcmp(a.data(), b.data(), a.size() * sizeof(a[0])) == 0;
-}
-
 } // namespace
 
 TEST(ContactSort, LeavesAndNumbersWhatTheSorterLeaves)
@@ -52,18 +44,15 @@ TEST(ContactSort, LeavesAndNumbersWhatTheSorterLeaves)
             Records vExpected = vRecords;
             Common_Qsort().QuickSort(reinterpret_cast<char*>(vExpected.data()), iCount, type);
             Records vWithoutMemory = vRecords;
-            {
-                const CMemoryFailure noMemory(0);
-                SortContacts(vWithoutMemory.data(), iCount, type);
-            }
-            ASSERT_TRUE(SameBytes(vWithoutMemory, vExpected)) << "round " << iRound;
+            WithMemoryFor(0, [&] { SortContacts(vWithoutMemory.data(), iCount, type); });
+            ASSERT_TRUE(BytesOf(vWithoutMemory) == BytesOf(vExpected)) << "round " << iRound;
             for (int i = 0; type == SORT_NAME && i < iCount; ++i)
             {
                 vExpected[static_cast<size_t>(i)].iSortIndex = i;
             }
             CQVLocalizerManager::LocalizerQuickSort(vRecords.data(), iCount,
                                                     type == SORT_NAME ? 0 : 1);
-            ASSERT_TRUE(SameBytes(vRecords, vExpected)) << "round " << iRound;
+            ASSERT_TRUE(BytesOf(vRecords) == BytesOf(vExpected)) << "round " << iRound;
         }
     }
 }

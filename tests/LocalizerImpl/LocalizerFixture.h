@@ -4,6 +4,7 @@
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
+#include "tests/Support/WideText.h"
 
 #include <cstring>
 #include <gtest/gtest.h>
@@ -32,12 +33,10 @@ protected:
     // The code of a three-byte character, found by looking at every record; 0 without a record.
     wchar_t HanZi(wchar_t character) const
     {
-        const char szKey[] = {static_cast<char>(0xE0 | (character >> 12)),
-                              static_cast<char>(0x80 | ((character >> 6) & 0x3F)),
-                              static_cast<char>(0x80 | (character & 0x3F)), 0};
+        const std::string strKey = Narrow({character});
         for (int i = 0; i < 15422; ++i)
         {
-            if (std::strcmp(m_pMap[i].szWord, szKey) == 0)
+            if (strKey == m_pMap[i].szWord)
             {
                 return static_cast<wchar_t>(0x1000 + i);
             }

@@ -6,13 +6,13 @@
 #include "LocalizerImpl/QVNumLocalizerManager.h"
 #include "LocalizerImpl/QVWordLocalizerManager.h"
 #include "tests/LocalizerImpl/LocalizerFixture.h"
-#include "tests/Support/WideText.h"
+#include "tests/Support/StoreImage.h"
 
 #include <algorithm>
-#include <functional>
 #include <pthread.h>
 #include <random>
 #include <sstream>
+#include <thread>
 #include <tuple>
 
 namespace
@@ -71,12 +71,8 @@ public:
             TrySplit(pMap, vPieces, vPieces.size() == n, vNames);
         }
         // The mask is shown to comparisons with Chinese characters alone.
-        wchar_t szNothing[] = L"$";
-        int bFull = 0;
-        tag_LocalizerDetail probe = MakeDetail(0, 0, {LOC_HANZI_BASE});
-        android::Vector<wchar_t*> vProbe;
-        vProbe.push(szNothing);
-        this->DoCompare(pMap, &probe, vProbe, bFull, bFull);
+        Details vProbe = {MakeDetail(0, 0, {LOC_HANZI_BASE})};
+        TrySplit(pMap, {L"$"}, true, vProbe);
         const int iCount = static_cast<int>(m_vMatches.size());
         Manager::LocalResultQuickSort(m_vMatches, 0, iCount - 1, vNames.data());
         tag_Answer answer = {{}, n == LOC_MAX_INPUT ? 0 : m_uMask, m_strWords};
@@ -89,7 +85,7 @@ public:
     }
 
 private:
-    void TrySplit(PYOFWORDS* pMap, Pieces& vPieces, bool bInitials, Details& vNames)
+    void TrySplit(PYOFWORDS* pMap, Pieces vPieces, bool bInitials, Details& vNames)
     {
         android::Vector<wchar_t*> vLastFirst;
         FillLastFirst(vPieces, vLastFirst);
@@ -104,8 +100,7 @@ private:
                                   : bAllFull != 0 ? MATCH_FULL
                                                   : MATCH_PARTIAL;
                 const std::wstring strCodes(vNames[i].szLocalizerKey, 10);
-                const int iLength = static_cast<int>(std::wcslen(strCodes.c_str()));
-                const int iStart = iLength - iKeyLen;
+                const int iStart = static_cast<int>(std::wcslen(strCodes.c_str())) - iKeyLen;
                 // Adds nothing that the comparison has not added.
                 this->CreateCNWordMask(pMap, strCodes[static_cast<size_t>(iStart + iPieces)]);
                 Manager::AddToVector(m_vMatches, {static_cast<int>(i), iType,
@@ -180,11 +175,7 @@ protected:
         const tag_Answer expected = stepwise.Search(m_pMap, vNames, strInput);
         EXPECT_EQ(answer.uMask, expected.uMask);
         EXPECT_EQ(Narrow(answer.strWords), Narrow(expected.strWords));
-        EXPECT_TRUE(std::equal(answer.vEntries.begin(), answer.vEntries.end(),
-                               expected.vEntries.begin(), expected.vEntries.end(),
-                               [](const auto& a, const auto& b)
-                               { return std::memcmp(&a, &b, sizeof(a)) == 0; }))
-            << "entries differ";
+        EXPECT_TRUE(BytesOf(answer.vEntries) == BytesOf(expected.vEntries)) << "entries differ";
         return answer.vEntries;
     }
     Details Check(const Details& vNames, const std::wstring& strInput, bool bAnywhere = true)
@@ -206,11 +197,9 @@ protected:
 
     // One comparison of pieces with a name, as Codes takes it.
     Compared Do(bool bDigits, const wchar_t* szName, Pieces vPieces, int iKeyLen = 0,
-                int bAllFull = 0) const
+                int bAllFull = 0)
     {
-        CQVNumLocalizerManager digits(1);
-        CQVWordLocalizerManager letters(1);
-        Manager& matcher = bDigits ? static_cast<Manager&>(digits) : letters;
+        Manager& matcher = bDigits ? static_cast<Manager&>(m_digits) : m_letters;
         for (std::wstring& strPiece : vPieces)
         {
             matcher.ProcessInputCNWord(m_pMap, strPiece.data());
@@ -223,24 +212,9 @@ protected:
     }
 
     std::mt19937 m_random{20240229};
+    CQVNumLocalizerManager m_digits{1};
+    CQVWordLocalizerManager m_letters{1};
 };
-
-// Runs the body in a thread with so many bytes of stack.
-void RunWithStack(size_t uBytes, std::function<void()> fnBody)
-{
-    pthread_attr_t attributes;
-    pthread_t thread;
-    pthread_attr_init(&attributes);
-    ASSERT_EQ(0, pthread_attr_setstacksize(&attributes, uBytes));
-    const auto pfnRun = [](void* pBody) -> void*
-    {
-        (*static_cast<std::function<void()>*>(pBody))();
-        return nullptr;
-    };
-    ASSERT_EQ(0, pthread_create(&thread, &attributes, pfnRun, &fnBody));
-    pthread_join(thread, nullptr);
-    pthread_attr_destroy(&attributes);
-}
 
 } // namespace
 
@@ -373,21 +347,21 @@ TEST_F(Search, FitsPiecesToCharacters)
     // An empty slot is no end of the readings, and nothing begins it.
     PYOFWORDS reading = {"张", {"chang", "", "zhang"}, {"24264", "", "94264"}};
     PYOFWORDS noReading = {"张", {}, {}};
-    wchar_t szPieces[][6] = {L"zhang", L"94264", L"", L"#", L"7"};
-    CQVWordLocalizerManager letters(1);
-    CQVNumLocalizerManager digits(1);
-    const auto fnFits = [](Manager& matcher, PYOFWORDS& record, wchar_t* szPiece)
+    wchar_t szAnyKey[] = L"#";
+    wchar_t szSeven[] = L"7";
+    const auto Fits = [](Manager& matcher, PYOFWORDS& record, std::wstring strPiece)
     {
         int bFull = 0;
-        const int iFits = matcher.CmpChineseWord(nullptr, 1, record, szPiece, nullptr, 0, bFull);
+        const int iFits =
+            matcher.CmpChineseWord(nullptr, 1, record, strPiece.data(), nullptr, 0, bFull);
         return std::pair(iFits, bFull);
     };
-    EXPECT_EQ(fnFits(letters, reading, szPieces[0]), std::pair(1, 1));
-    EXPECT_EQ(fnFits(digits, reading, szPieces[1]), std::pair(1, 1));
-    EXPECT_EQ(fnFits(digits, noReading, szPieces[2]), std::pair(0, 0));
-    EXPECT_EQ(letters.CmpOtherWords(DAMAGED_CODE, szPieces[3]), 0);
+    EXPECT_EQ(Fits(m_letters, reading, L"zhang"), std::pair(1, 1));
+    EXPECT_EQ(Fits(m_digits, reading, L"94264"), std::pair(1, 1));
+    EXPECT_EQ(Fits(m_digits, noReading, L""), std::pair(0, 0));
+    EXPECT_EQ(m_letters.CmpOtherWords(DAMAGED_CODE, szAnyKey), 0);
     const CLogCapture log;
-    EXPECT_EQ(digits.CmpDigitalWord(LOC_DIGIT_BASE + 7, szPieces[4]), 1);
+    EXPECT_EQ(m_digits.CmpDigitalWord(LOC_DIGIT_BASE + 7, szSeven), 1);
     EXPECT_EQ(log.Lines(), (std::vector<tag_LogLine>{
                                {DEBUG_LINE, "LocalizerImpl/QVNumLocalizerManager",
                                 "QV_Contacts:CQVNumLocalizerManager::CmpDigitalWord r == 1"}}));
@@ -404,8 +378,8 @@ TEST_F(Search, TriesOnlyWhatCanEndAText)
         Pieces vPieces = {L"!", szPiece};
         android::Vector<wchar_t*> vLastFirst;
         FillLastFirst(vPieces, vLastFirst);
-        EXPECT_EQ(CQVWordLocalizerManager(1).IsValid(vLastFirst), bAsLetters) << Narrow(szPiece);
-        EXPECT_EQ(CQVNumLocalizerManager(1).IsValid(vLastFirst), bAsDigits) << Narrow(szPiece);
+        EXPECT_EQ(m_letters.IsValid(vLastFirst), bAsLetters) << Narrow(szPiece);
+        EXPECT_EQ(m_digits.IsValid(vLastFirst), bAsDigits) << Narrow(szPiece);
     }
 }
 
@@ -499,12 +473,17 @@ TEST_F(Search, NeedsNoMoreStackForManyNames)
     }
     Details vFound;
     std::wstring strInput = L"z";
-    RunWithStack(SMALL_STACK,
-                 [&]
-                 {
-                     vFound = DoSearch<CQVWordLocalizerManager>(vNames, strInput, true).vEntries;
-                     Manager::LocalResultQuickSort(vTies, 0, TIED - 1, vNames.data());
-                 });
+    pthread_attr_t attributes;
+    pthread_attr_init(&attributes);
+    pthread_attr_setstacksize(&attributes, SMALL_STACK);
+    ASSERT_EQ(pthread_setattr_default_np(&attributes), 0);
+    std::thread(
+        [&]
+        {
+            vFound = DoSearch<CQVWordLocalizerManager>(vNames, strInput, true).vEntries;
+            Manager::LocalResultQuickSort(vTies, 0, TIED - 1, vNames.data());
+        })
+        .join();
     ASSERT_EQ(vFound.size(), vNames.size());
     for (int i = 0; i < MANY; ++i)
     {

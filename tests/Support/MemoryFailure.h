@@ -13,4 +13,12 @@ public:
     CMemoryFailure& operator=(const CMemoryFailure&) = delete;
 };
 
+// What a call returns when memory runs out after so many allocations.
+template <typename Fn>
+auto WithMemoryFor(int iGranted, const Fn& fnCall)
+{
+    const CMemoryFailure failure(iGranted);
+    return fnCall();
+}
+
 #endif

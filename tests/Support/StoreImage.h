@@ -25,10 +25,10 @@ inline bool IsMarked(const tag_ContactReg& reg)
     return reg.iTotalNum > reg.iMemSize || reg.iMemSize == 0;
 }
 
-inline std::string BytesOf(const Records& vRecords)
+template <typename Item = tag_ContactsStruct>
+std::string BytesOf(const std::vector<Item>& vItems)
 {
-    return {reinterpret_cast<const char*>(vRecords.data()),
-            vRecords.size() * sizeof(tag_ContactsStruct)};
+    return {reinterpret_cast<const char*>(vItems.data()), vItems.size() * sizeof(Item)};
 }
 
 // The two files of a store.

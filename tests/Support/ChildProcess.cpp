@@ -78,18 +78,9 @@ std::string CChild::Text()
 }
 
 CLockHolder::CLockHolder()
-    : m_iFd(open(CDataPaths::LockFile(), O_RDWR | O_CREAT, 0777)),
-      m_bHeld(flock(m_iFd, LOCK_EX | LOCK_NB) == 0)
+    : m_file(open(CDataPaths::LockFile(), O_RDWR | O_CREAT, 0777)),
+      m_bHeld(flock(m_file.Get(), LOCK_EX | LOCK_NB) == 0)
 {
-}
-
-void CLockHolder::Release()
-{
-    if (m_iFd >= 0)
-    {
-        close(m_iFd);
-        m_iFd = -1;
-    }
 }
 
 std::ptrdiff_t OpenDescriptors()

@@ -1,9 +1,10 @@
 #ifndef QV_TESTS_SUPPORT_CHILDPROCESS_H
 #define QV_TESTS_SUPPORT_CHILDPROCESS_H
 
+#include "MemManager/Files/Descriptor.h"
+
 #include <functional>
 #include <string>
-#include <sys/mman.h>
 #include <sys/types.h>
 
 // Runs the body in a forked child and waits for it. True when the body came to its end and all
@@ -30,30 +31,18 @@ private:
     pid_t m_iPid = -1;
 };
 
-// Memory, zero at first, that this process has in common with children started later. It is never
-// released.
-template <typename T>
-T& NewShared()
-{
-    constexpr int FLAGS = MAP_SHARED | MAP_ANONYMOUS;
-    return *static_cast<T*>(mmap(nullptr, sizeof(T), PROT_READ | PROT_WRITE, FLAGS, -1, 0));
-}
-
 // Holds the store lock until Release, if nobody else does: taken without the code under test, as
 // any other program would. An open file of its own excludes this process, too.
 class CLockHolder
 {
 public:
     CLockHolder();
-    ~CLockHolder() { Release(); }
-    CLockHolder(const CLockHolder&) = delete;
-    CLockHolder& operator=(const CLockHolder&) = delete;
 
     bool IsHeld() const { return m_bHeld; }
-    void Release();
+    void Release() { m_file.Reset(); }
 
 private:
-    int m_iFd;
+    CDescriptor m_file;
     bool m_bHeld;
 };
 

@@ -10,6 +10,7 @@
 #include <cerrno>
 #include <functional>
 #include <gtest/gtest.h>
+#include <memory>
 
 namespace
 {
@@ -23,38 +24,28 @@ constexpr tag_Failures FAILURES[] = {
 // What is wrong after an operation that met a failure.
 using FnExamine = std::function<std::string(CLocalizerLogic& logic, const tag_Answer& answer)>;
 
-// Runs an operation, of whose calls so many succeed. The call that failed, "" for none.
-std::string RunFailing(const tag_Operation& operation, const tag_Failures& failures, int iGranted,
-                       const FnExamine& fnExamine)
+// Lets one call after another fail, each time in the store as it was.
+void FailEachCall(const CStoreCase& store, const tag_Operation& operation,
+                  const tag_Failures& failures, const FnExamine& fnExamine)
 {
-    const std::ptrdiff_t iDescriptors = OpenDescriptors();
-    std::string strCall;
+    const char* szFailed = "none yet";
+    for (int iCall = 0; *szFailed != 0 && !testing::Test::HasFailure(); ++iCall)
     {
-        CLocalizerLogic logic;
+        store.Restore();
+        const std::ptrdiff_t iDescriptors = OpenDescriptors();
+        auto pLogic = std::make_unique<CLocalizerLogic>();
         tag_Answer answer;
         {
-            const CCallFault fault(failures, iGranted);
-            operation.pfnRun(logic, answer);
+            const CCallFault fault(failures, iCall);
+            operation.pfnRun(*pLogic, answer);
         }
-        strCall = CCallFault::Failed();
+        szFailed = CCallFault::Failed();
         EXPECT_TRUE(CLockHolder().IsHeld()) << "the operation has kept the lock";
-        EXPECT_EQ(fnExamine(logic, answer), "");
-    }
-    EXPECT_EQ(OpenDescriptors(), iDescriptors);
-    return strCall;
-}
-
-// Lets one call after another fail.
-void RunAll(const tag_Operation& operation, const tag_Failures& failures,
-            const FnExamine& fnExamine, const std::function<void()>& fnPrepare)
-{
-    std::string strCall = "none yet";
-    for (int iCall = 0; !strCall.empty() && !testing::Test::HasFailure(); ++iCall)
-    {
-        fnPrepare();
-        strCall = RunFailing(operation, failures, iCall, fnExamine);
+        EXPECT_EQ(fnExamine(*pLogic, answer), "");
+        pLogic.reset();
+        EXPECT_EQ(OpenDescriptors(), iDescriptors);
         EXPECT_FALSE(testing::Test::HasFailure())
-            << operation << '/' << failures.szName << ", call " << iCall << ": " << strCall;
+            << operation << '/' << failures.szName << ", call " << iCall << ": " << szFailed;
     }
 }
 
@@ -97,11 +88,9 @@ TEST_P(CEveryCallFails, Changing)
         // Each of the two of memory in one order: most allocations are the same.
         if (failures.eGroup != CALLS_MEMORY || failures.bOnce == (iSortType == STORE_ORDER_TIME))
         {
-            RunAll(
-                change, failures,
-                [&](CLocalizerLogic& logic, const tag_Answer& answer)
-                { return FaultAfter(store, bReports, logic, answer.iRet); },
-                [&] { store.Restore(); });
+            FailEachCall(store, change, failures,
+                         [&](CLocalizerLogic& logic, const tag_Answer& answer)
+                         { return FaultAfter(store, bReports, logic, answer.iRet); });
         }
     }
 }
@@ -133,19 +122,9 @@ TEST(Faults, EveryCallFailsReading)
         };
         for (const tag_Failures& failures : FAILURES)
         {
-            RunAll(reading, failures, fnExamine, [] {});
+            FailEachCall(store, reading, failures, fnExamine);
         }
     }
-}
-
-// The lock is refused five times: nobody's store is read.
-TEST(Faults, SearchesNobodyWithoutTheLock)
-{
-    const CStoreCase store(AllChanges().back(), STORE_ORDER_NAME);
-    store.Restore();
-    const auto fnExamine = [](CLocalizerLogic& logic, const tag_Answer& answer)
-    { return TextOf(logic, answer) == "0 nobody" ? "" : "found somebody"; };
-    RunFailing(AllReadings()[0], {"NoLock", CALLS_LOCK, EWOULDBLOCK, false}, 0, fnExamine);
 }
 
 } // namespace

@@ -50,7 +50,7 @@ tag_ContactReg AnyReg()
 
 TEST(Faults, DamagedFilesHarmNobody)
 {
-    const CStoreCase store(AllChanges()[1], STORE_ORDER_NAME);
+    const CStoreCase store(AllChanges()[0], STORE_ORDER_NAME);
     const char* const PATHS[] = {CDataPaths::ContactReg(), CDataPaths::ContactRecords(),
                                  CDataPaths::PinyinMapping(), CDataPaths::PinyinSource()};
     store.Restore();

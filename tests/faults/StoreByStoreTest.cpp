@@ -7,7 +7,6 @@
 
 #include <gtest/gtest.h>
 #include <iostream>
-#include <map>
 #include <set>
 
 namespace
@@ -34,8 +33,8 @@ std::string OutsideOf(const tag_StoreFiles& files)
     return strOutside;
 }
 
-// What a disk may hold of the files when the power goes: of each page what it held at the last
-// flush, or anything that it was since. The registration record lies in one page.
+// What a disk may hold of the files when the power goes: what it held at the last flush with any of
+// the stores since; of the registration record, which lies in one page, any version since.
 class CDisk
 {
 public:
@@ -59,64 +58,52 @@ public:
         else if (step.eKind == STEP_FLUSH)
         {
             m_strRecords = files.strRecords;
-            m_mapPages.clear();
+            m_vStores.clear();
         }
         else
         {
-            for (size_t i = step.uOffset / PAGE; i * PAGE < step.uOffset + step.strBytes.size();
-                 ++i)
-            {
-                m_mapPages[i].push_back(files.strRecords.substr(i * PAGE, PAGE));
-            }
+            m_vStores.push_back(step);
         }
     }
 
-    // Looks at each state in which the registration record asks for no rebuild. Too many of them
-    // mean that records have changed under such a record.
+    // Looks at each state in which the registration record asks for no rebuild. Many stores mean
+    // that records have changed under such a record.
     std::string Fault(const CStoreCase& store) const
     {
-        size_t uStates = 1;
-        for (const auto& [uPage, vVersions] : m_mapPages)
-        {
-            uStates = std::min(MAX_STATES, uStates * (vVersions.size() + 1));
-        }
         std::string strFault;
         for (const std::string& strReg : m_vRegs)
         {
             const bool bMarked = IsMarked(tag_StoreImage({strReg, ""}).reg);
-            for (size_t i = 0; i < uStates && !bMarked && strFault.empty(); ++i)
+            strFault += !bMarked && m_vStores.size() > MAX_STORES ? "changes without a mark" : "";
+            for (size_t i = 0; !bMarked && strFault.empty() && i >> m_vStores.size() == 0; ++i)
             {
                 store.KindOf(tag_StoreImage({strReg, Records(i)}), &strFault);
-                strFault += uStates == MAX_STATES ? "changes without a mark" : "";
             }
         }
         return strFault;
     }
 
 private:
-    static constexpr size_t PAGE = 4096;
-    static constexpr size_t MAX_STATES = 1000;
+    static constexpr size_t MAX_STORES = 10;
 
-    // The uState-th choice of what is on each page of the records.
-    std::string Records(size_t uState) const
+    // With those stores whose bits are set.
+    std::string Records(size_t uStores) const
     {
         std::string strRecords = m_strRecords;
-        for (const auto& [uPage, vVersions] : m_mapPages)
+        for (size_t i = 0; i < m_vStores.size(); ++i)
         {
-            const size_t uVersion = uState % (vVersions.size() + 1);
-            uState /= vVersions.size() + 1;
-            if (uVersion > 0)
+            if ((uStores >> i & 1) != 0)
             {
-                strRecords.replace(uPage * PAGE, PAGE, vVersions[uVersion - 1]);
+                Apply(m_vStores[i], strRecords);
             }
         }
         return strRecords;
     }
 
-    // As they were flushed and, behind that, each version since.
+    // As they were flushed and, behind that, each version or store since.
     std::vector<std::string> m_vRegs;
     std::string m_strRecords;
-    std::map<size_t, std::vector<std::string>> m_mapPages{};
+    std::vector<tag_Step> m_vStores{};
 };
 
 // What a search of everybody shows in a marked store.

@@ -14,52 +14,23 @@ namespace
 
 constexpr long long FIRST_TIME = 1'600'000'000'000;
 constexpr int FIRST_STATUS = 1000;
+constexpr int SINGLE_CHANGES = 4; // at the start of the list
 constexpr const char* NAMES[] = {"张安", "Tom", "王小明", "", "李四"};
 
 tag_ProviderContact Contact(int iId, const std::string& strName)
 {
-    tag_ProviderContact contact;
-    contact.iId = iId;
-    contact.strName = strName;
-    contact.strKey = LocalizerKeyOf(strName);
+    tag_ProviderContact contact = {iId, strName, LocalizerKeyOf(strName)};
     contact.llLastTime = FIRST_TIME + iId % 3 * 1000LL + iId;
     contact.iStatusId = FIRST_STATUS + iId;
     contact.bOnline = iId == 1 || iId == 5;
     return contact;
 }
 
-void Insert(CProviderDatabase& provider)
-{
-    provider.Put(Contact(6, "明7"));
-}
-
-void Rename(CProviderDatabase& provider)
-{
-    provider.SetName(3, "Anna", LocalizerKeyOf("Anna"));
-}
-
-void Remove(CProviderDatabase& provider)
-{
-    provider.Remove(2);
-}
-
-void Renew(CProviderDatabase& provider)
-{
-    provider.Execute("update contacts set has_phone_number=1 where _id=4");
-}
-
+// The changes of single contacts, one after the other.
 void ChangeMuch(CProviderDatabase& provider)
 {
-    Insert(provider);
-    Rename(provider);
-    Remove(provider);
-    Renew(provider);
-}
-
-void ChangeStatus(CProviderDatabase& provider)
-{
-    provider.Execute("update status_updates set status_update_data_id=1002 where "
-                     "status_update_data_id=1001");
+    std::for_each(AllChanges().begin(), AllChanges().begin() + SINGLE_CHANGES,
+                  [&provider](const auto& change) { change.pfnChange(provider); });
 }
 
 template <long long... IDS>
@@ -140,16 +111,23 @@ void Search(CLocalizerLogic& logic, tag_Answer& answer, const wchar_t* szTyped,
 const std::vector<tag_Operation>& AllChanges()
 {
     static const std::vector<tag_Operation> vChanges = {
+        {"Insert", Tell<6>, [](auto& provider) { provider.Put(Contact(6, "明7")); }},
+        {"Rename", Tell<3>,
+         [](auto& provider) { provider.SetName(3, "Anna", LocalizerKeyOf("Anna")); }},
+        {"Remove", Tell<2>, [](auto& provider) { provider.Remove(2); }},
+        {"Renew", Tell<4>,
+         [](auto& provider)
+         { provider.Execute("update contacts set has_phone_number=1 where _id=4"); }},
+        {"Many", Tell<6, 3, 2, 4, 777>, ChangeMuch},
         {"FirstBuild", [](auto& logic, auto& answer) { answer.iRet = logic.MemInit(false); }},
         {"Build", [](auto& logic, auto& answer) { answer.iRet = logic.MemInit(true); }, ChangeMuch},
         {"Rebuild", [](auto& logic, auto&) { logic.OnContactsTableChanged(); }, ChangeMuch},
-        {"Insert", Tell<6>, Insert},
-        {"Rename", Tell<3>, Rename},
-        {"Remove", Tell<2>, Remove},
-        {"Renew", Tell<4>, Renew},
-        {"Many", Tell<6, 3, 2, 4, 777>, ChangeMuch},
         {"Status", [](auto& logic, auto&) { logic.OnStatusUpdatesTableChanged(0, nullptr); },
-         ChangeStatus},
+         [](auto& provider)
+         {
+             provider.Execute("update status_updates set status_update_data_id=1002 where "
+                              "status_update_data_id=1001");
+         }},
         {"Time", [](auto& logic, auto&) { logic.OnContactTimeChanged(3, FIRST_TIME + 60'000); },
          [](auto& provider) { provider.SetLastTime(3, FIRST_TIME + 60'000); }},
         {"Star", [](auto& logic, auto&) { logic.OnContactStarChanged(4, 1); },

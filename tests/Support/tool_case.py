@@ -83,9 +83,6 @@ class ToolCase(unittest.TestCase):
     def search(self, text, *arguments):
         return self.steps(text, *arguments)[-1]
 
-    def found(self, text, *arguments):
-        return {match["contact_id"] for match in self.search(text, "--once", *arguments)["matches"]}
-
     def sql(self, statement, *values):
         with contextlib.closing(sqlite3.connect(self.database)) as database, database:
             return database.execute(statement, values).fetchall()

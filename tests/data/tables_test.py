@@ -22,19 +22,6 @@ from syllables import SYLLABLES
 PYFILE = pathlib.Path(sys.argv[1]).resolve()
 UNIHAN = pathlib.Path("/usr/share/unicode")
 SKIPPED = 77
-RECORD_SIZE = 46
-KEYPAD = dict(zip("abcdefghijklmnopqrstuvwxyz", "22233344455566677778889999"))
-# The fixed codes of the special numbers pin the records of 27 characters.
-CODE_BASE = 0x1000
-SPECIAL_NUMBERS = {
-    "匪警": (0x1398, 0x3D2B),
-    "障碍申告": (0x45E3, 0x2EF6, 0x2C8C, 0x146A),
-    "本地电话查号": (0x2219, 0x1684, 0x2C8D, 0x3D89, 0x22A9, 0x1424),
-    "火警": (0x291E, 0x3D2B),
-    "急救中心": (0x1CD9, 0x20CA, 0x1021, 0x1C90),
-    "天气预报": (0x17D6, 0x25A8, 0x4741, 0x1EB9),
-    "道路交通事故报警": (0x4115, 0x3F3D, 0x1066, 0x40EE, 0x1054, 0x20C3, 0x1EB9, 0x3D2B),
-}
 # Forms of simplified characters with several readings: those of another form's word are not
 # theirs, those that are alive are, though the Unihan files may lack them.
 READINGS = {"纖": "xian", "縴": "qian", "噓": "xu", "說": "shuo shui", "賈": "jia gu",
@@ -77,19 +64,7 @@ class TablesTest(unittest.TestCase):
         source = (ROOT / "LocalizerImpl/Syllables.cpp").read_text(encoding="utf-8")
         self.assertEqual(list(SYLLABLES), re.findall(r'L"([a-z]+)"', source))
 
-    def test_pyfile(self):
-        content = PYFILE.read_bytes()
-        self.assertEqual(15422 * RECORD_SIZE, len(content))
-        self.assertEqual(15422, len(self.PINYIN))
-        records = [content[at:at + RECORD_SIZE] for at in range(0, len(content), RECORD_SIZE)]
-        for record, (char, text) in zip(records, self.PINYIN):
-            slots = text.split(" ") + [""] * (3 - text.count(" ") - 1)
-            digits = ["".join(KEYPAD[letter] for letter in slot) for slot in slots]
-            fields = [slot.encode().ljust(7, b"\0") for slot in slots + digits]
-            self.assertEqual(char.encode() + b"\0" + b"".join(fields), record)
-        for name, codes in SPECIAL_NUMBERS.items():
-            words = b"".join(records[code - CODE_BASE][:3] for code in codes)
-            self.assertEqual(name, words.decode())
+    def test_readings_of_simplified_forms(self):
         self.assertLessEqual(READINGS.items(), dict(self.PINYIN).items())
 
     def test_folding_rows_are_in_the_order_of_gb_2312(self):

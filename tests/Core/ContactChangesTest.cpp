@@ -5,6 +5,7 @@
 #include "tests/Core/FacadeFixture.h"
 #include "tests/Support/ChildProcess.h"
 
+#include <filesystem>
 #include <functional>
 #include <random>
 
@@ -162,7 +163,7 @@ TEST_F(CContactChangesTest, RebuildsWhereAPatchCannotDo)
 TEST_F(CContactChangesTest, KnowTheSmallestStores)
 {
     m_logic.OnStatusUpdatesTableChanged(0, nullptr);
-    EXPECT_FALSE(CDataDirectory::Exists(CDataPaths::ContactReg())) << "nobody to build for";
+    EXPECT_FALSE(std::filesystem::exists(CDataPaths::ContactReg())) << "nobody to build for";
     BuildNames({"张"});
     SetReg({1, 0, 1});
     m_logic.OnStatusUpdatesTableChanged(0, nullptr);

@@ -35,11 +35,6 @@ void CDataDirectory::InstallPinyinTable() const
     fs::copy_file(QV_PYFILE, CDataPaths::PinyinSource(), fs::copy_options::overwrite_existing);
 }
 
-bool CDataDirectory::Exists(const std::string& strPath)
-{
-    return fs::exists(strPath);
-}
-
 std::string CDataDirectory::ReadBytes(const std::string& strPath)
 {
     std::ostringstream bytes;

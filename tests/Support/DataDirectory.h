@@ -19,7 +19,6 @@ public:
 
     // Path of files/szName.
     std::string File(const char* szName) const { return m_strRoot + "/files/" + szName; }
-    static bool Exists(const std::string& strPath);
     static std::string ReadBytes(const std::string& strPath);
     static void WriteBytes(const std::string& strPath, const std::string& strBytes);
 

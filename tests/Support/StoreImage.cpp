@@ -12,12 +12,13 @@ namespace fs = std::filesystem;
 namespace
 {
 
-// By contact, without their places.
-Records ById(Records vRecords)
+// By contact, without their places and with some of their flags.
+Records ById(Records vRecords, uint32_t uFlags)
 {
     for (tag_ContactsStruct& record : vRecords)
     {
         record.iSortIndex = 0;
+        record.iFlags &= uFlags;
     }
     std::sort(vRecords.begin(), vRecords.end(),
               [](const auto& a, const auto& b) { return a.iContactID < b.iContactID; });
@@ -61,14 +62,14 @@ tag_StoreImage FreshBuild(const std::string& strRoot, int iSortType)
     return image;
 }
 
-std::string DifferenceOf(const tag_StoreImage& store, const tag_StoreImage& fresh)
+std::string DifferenceOf(const tag_StoreImage& store, const tag_StoreImage& fresh, uint32_t uFlags)
 {
     if (KindOf(store) != KindOf(fresh))
     {
         return KindOf(store) + " instead of " + KindOf(fresh);
     }
-    const Records vStore = ById(store.vRecords);
-    const Records vFresh = ById(fresh.vRecords);
+    const Records vStore = ById(store.vRecords, uFlags);
+    const Records vFresh = ById(fresh.vRecords, uFlags);
     for (size_t i = 0; i < vFresh.size(); ++i)
     {
         if (BytesOf({vStore[i]}) != BytesOf({vFresh[i]}))

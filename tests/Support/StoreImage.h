@@ -88,9 +88,11 @@ inline tag_ContactReg Reg()
 tag_StoreImage FreshBuild(const std::string& strRoot, int iSortType);
 
 // What makes the store another one than the fresh build, empty when nothing does: the counts and
-// sort type, the bytes of every record but its iSortIndex, the order and in name order iSortIndex.
-// The capacity is not compared, nor the order of records with equal sort keys.
-std::string DifferenceOf(const tag_StoreImage& store, const tag_StoreImage& fresh);
+// sort type, the bytes of every record but its iSortIndex and all but the given flags, the order
+// and in name order iSortIndex. The capacity is not compared, nor the order of records with equal
+// sort keys.
+std::string DifferenceOf(const tag_StoreImage& store, const tag_StoreImage& fresh,
+                         uint32_t uFlags = ~0U);
 
 // The localizer codes of a display name, as the provider stores them; both in UTF-8. The pinyin
 // mapping has to be there.

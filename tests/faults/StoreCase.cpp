@@ -15,6 +15,8 @@ namespace
 constexpr long long FIRST_TIME = 1'600'000'000'000;
 constexpr int FIRST_STATUS = 1000;
 constexpr int SINGLE_CHANGES = 4; // at the start of the list
+// A patch and a failed read of the status leave the others to the next status notification.
+constexpr uint32_t DURABLE = ~CONTACT_FLAG_ONLINE;
 constexpr const char* NAMES[] = {"张安", "Tom", "王小明", "", "李四"};
 
 tag_ProviderContact Contact(int iId, const std::string& strName)
@@ -76,19 +78,6 @@ void ConvertByMapping(CLocalizerLogic& logic, tag_Answer& answer)
     wchar_t szName[] = L"重庆";
     answer.iRet = hMap == -1 ? -1 : logic.GetLocalizerString(hMap, szName, answer.szText);
     logic.ReleasePinYinFileMapping(hMap);
-}
-
-// Without what a patch or a failed read of the status leaves to the next status notification.
-std::string Difference(tag_StoreImage store, tag_StoreImage fresh)
-{
-    for (Records* pRecords : {&store.vRecords, &fresh.vRecords})
-    {
-        for (tag_ContactsStruct& record : *pRecords)
-        {
-            record.iFlags &= ~CONTACT_FLAG_ONLINE;
-        }
-    }
-    return DifferenceOf(store, fresh);
 }
 
 } // namespace
@@ -249,8 +238,8 @@ STORE_KIND CStoreCase::KindOf(tag_StoreImage image, std::string* pstrWhy) const
         return pstrWhy->empty() ? KIND_MARKED : KIND_WRONG;
     }
     const tag_StoreImage& after = After(image.reg.iSortType);
-    if (!Difference(image, after).empty() && !Is("FirstBuild") &&
-        Difference(image, m_before).empty())
+    if (!DifferenceOf(image, after, DURABLE).empty() && !Is("FirstBuild") &&
+        DifferenceOf(image, m_before, DURABLE).empty())
     {
         return KIND_BEFORE;
     }
@@ -261,7 +250,7 @@ STORE_KIND CStoreCase::KindOf(tag_StoreImage image, std::string* pstrWhy) const
         image.vRecords[i].llLastTimeContacted = after.vRecords[i].llLastTimeContacted;
         image.vRecords[i].iTimesContacted = after.vRecords[i].iTimesContacted;
     }
-    *pstrWhy = Difference(image, after);
+    *pstrWhy = DifferenceOf(image, after, DURABLE);
     return pstrWhy->empty() ? KIND_AFTER : KIND_WRONG;
 }
 

@@ -5,12 +5,12 @@ import os
 import pathlib
 import shutil
 import sqlite3
-import subprocess
 import sys
 import tempfile
 import unittest
 
 import transcript
+from programs import run
 
 TOOL, PYFILE = map(os.path.abspath, sys.argv[1:3])
 SKIPPED = 77
@@ -69,7 +69,7 @@ class ToolCase(unittest.TestCase):
         return [TOOL, command, "--data-dir", str(self.data), *map(str, arguments)]
 
     def run_tool(self, command, *arguments):
-        subprocess.run(self.call(command, *arguments), stdout=subprocess.DEVNULL, check=True)
+        return run(*self.call(command, *arguments))
 
     def check_transcript(self, path, shell="", **variables):
         transcript.check(self, path, self.root, SHELL + shell, TOOL=TOOL, PYFILE=PYFILE,
@@ -77,8 +77,8 @@ class ToolCase(unittest.TestCase):
 
     def steps(self, text, *arguments):
         """The steps of a search, with all their matches."""
-        call = self.call("search", text, "--json", "--limit", "0", *arguments)
-        return json.loads(subprocess.check_output(call))["steps"]
+        return json.loads(
+            self.run_tool("search", text, "--json", "--limit", "0", *arguments))["steps"]
 
     def search(self, text, *arguments):
         return self.steps(text, *arguments)[-1]

@@ -10,13 +10,13 @@ import re
 import shlex
 import shutil
 import signal
-import subprocess
 import sys
 import time
 
 sys.path.insert(0, str(pathlib.Path(__file__).parents[1] / "Support"))
 # pylint: disable=wrong-import-position
 import tool_case
+from programs import run
 from tool_case import SKIPPED, ToolCase
 from transcript import RECORD
 
@@ -49,9 +49,8 @@ class TypeTest(ToolCase):
         self.clear()
 
     def tmux(self, *arguments):
-        call = ["tmux", "-u", "-f", "/dev/null", "-S", str(self.root / "tmux"), *arguments]
-        return subprocess.run(call, env=ENVIRONMENT, capture_output=True, encoding="utf-8",
-                              check=True).stdout
+        return run("tmux", "-u", "-f", "/dev/null", "-S", self.root / "tmux", *arguments,
+                   env=ENVIRONMENT)
 
     def resize(self, columns, rows):
         self.tmux("resize-window", "-x", str(columns), "-y", str(rows))

@@ -12,10 +12,13 @@ import pathlib
 import re
 import shlex
 import shutil
-import subprocess
 import sys
 import tempfile
 import unittest
+
+sys.path.insert(0, str(pathlib.Path(__file__).parents[1] / "Support"))
+# pylint: disable=wrong-import-position
+from programs import run
 
 CMAKE, GENERATOR, BUILD, SOURCE, COMPILER, C_COMPILER = sys.argv[2:8]
 TOOLCHAIN, EMULATOR, LIBRARIES = sys.argv[8:] or ("", "", "")
@@ -37,13 +40,6 @@ endif()
 add_executable(consumer main.{language})
 target_link_libraries(consumer PRIVATE QV_Localize::{target})
 """
-
-
-def run(*command, **options):
-    process = subprocess.run([str(word) for word in command], capture_output=True,
-                             encoding="utf-8", check=False, **options)
-    assert process.returncode == 0, f"{command}\n{process.stdout}{process.stderr}"
-    return process.stdout
 
 
 def run_built(program, *arguments, **options):

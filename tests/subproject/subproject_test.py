@@ -8,9 +8,12 @@ names the sources relative to the checkout, so that it is the same everywhere.
 import pathlib
 import re
 import shutil
-import subprocess
 import sys
 import unittest
+
+sys.path.insert(0, str(pathlib.Path(__file__).parents[1] / "Support"))
+# pylint: disable=wrong-import-position
+from programs import run
 
 CMAKE, GENERATOR, COMPILER, SOURCE, BUILD = sys.argv[1:6]
 PROJECT = """\
@@ -25,13 +28,6 @@ endif()
 file(WRITE "${{CMAKE_BINARY_DIR}}/pyfile" "${{QV_Localize_PYFILE}}")
 """
 FLAGS = f"-Wall -Wextra -Weffc++ -Wold-style-cast -Werror -g -ffile-prefix-map={SOURCE}=."
-
-
-def run(*command):
-    process = subprocess.run([str(word) for word in command], capture_output=True,
-                             encoding="utf-8", check=False)
-    assert process.returncode == 0, f"{command}\n{process.stdout}{process.stderr}"
-    return process.stdout
 
 
 class SubprojectTest(unittest.TestCase):

@@ -8,6 +8,7 @@ writes the list; look at its difference before it goes into the repository.
 """
 import difflib
 import pathlib
+import re
 import subprocess
 import sys
 
@@ -20,37 +21,19 @@ def output(*command, **options):
                           **options).stdout.splitlines()
 
 
-def defined_symbols():
-    lines = output(NM, "--dynamic", "--defined-only", "--format=posix", LIBRARY)
-    return sorted(line.split()[0] for line in lines)
-
-
-def with_readable_names(symbols):
-    readable = output(CXXFILT, input="\n".join(symbols))
-    return [f"{symbol}\t{name}" for symbol, name in zip(symbols, readable)]
-
-
-def named_by_relocations():
-    """The symbols that the dynamic linker looks up for the library."""
-    names = set()
-    for line in output(READELF, "--relocs", "--wide", LIBRARY):
-        fields = line.split()
-        if len(fields) >= 5 and fields[2].startswith("R_"):
-            names.add(fields[4].split("@")[0])
-    return names
-
-
 def main():
-    symbols = defined_symbols()
-    lines = with_readable_names(symbols)
+    symbols = sorted(line.split()[0] for line in output(NM, "--dynamic", "--defined-only",
+                                                        "--format=posix", LIBRARY))
+    readable = output(CXXFILT, input="\n".join(symbols))
+    lines = [f"{symbol}\t{name}" for symbol, name in zip(symbols, readable)]
     if "--update" in sys.argv:
         LIST.write_text("\n".join(lines) + "\n", encoding="utf-8")
         return 0
     reviewed = LIST.read_text(encoding="utf-8").splitlines()
-    faults = [line for line in difflib.unified_diff(reviewed, lines, "reviewed", "exported",
-                                                    lineterm="", n=0)]
-    faults += [f"bound by the dynamic linker: {name}"
-               for name in sorted(named_by_relocations() & set(symbols))]
+    faults = list(difflib.unified_diff(reviewed, lines, "reviewed", "exported", lineterm="", n=0))
+    relocations = "\n".join(output(READELF, "--relocs", "--wide", LIBRARY))
+    looked_up = set(re.findall(r"(?m)^\S+ +\S+ +R_\S+ +\S+ +([^\s@]+)", relocations))
+    faults += [f"bound by the dynamic linker: {name}" for name in sorted(looked_up & set(symbols))]
     print("\n".join(faults))
     if faults:
         print("Update the list with --update if the difference is meant; see docs/embedding.md.")

@@ -51,11 +51,7 @@ protected:
     static constexpr long MASK_UNSET = -77;
     static constexpr long long FIRST_TIME = 1'600'000'000'000;
 
-    CFacadeTest()
-    {
-        m_directory.InstallPinyinTable();
-        m_log.Clear();
-    }
+    CFacadeTest() { m_directory.InstallPinyinTable(); }
 
     // Last contacted in the order of their ids, as far as these are below 20.
     static tag_ProviderContact Contact(int iId, const std::string& strName)
@@ -88,7 +84,6 @@ protected:
                        { return Contact(++iId, strName); });
         Store(vContacts);
         ASSERT_EQ(m_logic.MemInit(true), 0);
-        m_log.Clear();
     }
 
     std::unique_ptr<CFilterChain> Chain(int iKind, QVLong32 lId)

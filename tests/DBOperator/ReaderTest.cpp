@@ -113,19 +113,6 @@ protected:
     }
     int Count() { return m_reader.GetContactsCount(&m_iCount); }
     int ReadOnline() { return m_reader.ReadAllSmsOnlineStatus(&m_set, 0, nullptr); }
-    // What was logged since the last call: errors behind an exclamation mark, line ends as \n.
-    std::string Told()
-    {
-        std::string strTold;
-        for (const tag_LogLine& line : m_log.Lines())
-        {
-            strTold += (line.iPriority == ERROR_LINE ? "! " : "") + line.strText;
-            const bool bEnds = strTold.back() == '\n';
-            strTold.replace(strTold.size() - (bEnds ? 1 : 0), 1, bEnds ? "\\n\n" : "\n");
-        }
-        m_log.Clear();
-        return strTold;
-    }
 
     CDataDirectory m_directory;
     CProviderDatabase m_provider;
@@ -228,7 +215,7 @@ TEST_F(Reader, ReadsTheListedVisibleContactsOnly)
         ASSERT_EQ(0, ReadAll(m_reader, lCount, vIds.data()));
         EXPECT_EQ(vRead, IdsRead()) << lCount;
     }
-    EXPECT_EQ(Told(), Recorded("one listed contact"));
+    EXPECT_EQ(m_log.Take(), Recorded("one listed contact"));
 }
 
 // With its table and, without memory, without it.
@@ -254,11 +241,11 @@ TEST_F(Reader, MarksTheFirstRecordOfEachOnlineStatus)
                       m_set.pContacts[i].iFlags);
             m_set.pContacts[i].iFlags = CONTACT_FLAG_ONLINE;
         }
-        EXPECT_EQ(Told(), Recorded("online"));
+        EXPECT_EQ(m_log.Take(), Recorded("online"));
     }
     const CMemoryFailure failure(0);
     EXPECT_EQ(-1, ReadAll());
-    EXPECT_EQ(Told(), Recorded("no memory"));
+    EXPECT_EQ(m_log.Take(), Recorded("no memory"));
 }
 
 // A refused allocation must not pass for an empty text.
@@ -306,7 +293,7 @@ TEST_F(Reader, FailsOnWhatIsNoProviderDatabase)
         EXPECT_EQ(TryAll(), (Ids{-1, -1, 0, 0}));
     }
     EXPECT_EQ(2, m_set.RecordNum);
-    EXPECT_EQ(Told(), Recorded("no provider database"));
+    EXPECT_EQ(m_log.Take(), Recorded("no provider database"));
 }
 
 TEST_F(Reader, FailsWithoutContactsGoneSinceTheCountAndLeavesNewOnesOut)
@@ -327,7 +314,7 @@ TEST_F(Reader, FailsWithoutContactsGoneSinceTheCountAndLeavesNewOnesOut)
     bRemoves = false;
     EXPECT_EQ(0, ReadAll());
     EXPECT_EQ((Ids{1, 3}), IdsRead());
-    EXPECT_EQ(Told(), Recorded("contacts come and go"));
+    EXPECT_EQ(m_log.Take(), Recorded("contacts come and go"));
 }
 
 // A fresh connection must read the tables' definitions first, and the prepare is busy; one that
@@ -346,7 +333,7 @@ TEST_F(Reader, TriesALockedDatabaseForAWhile)
     EXPECT_EQ(-1, ReadAll());
     EXPECT_EQ(-1, Count());
     m_provider.Unlock();
-    EXPECT_EQ(Told(), Recorded("locked"));
+    EXPECT_EQ(m_log.Take(), Recorded("locked"));
 }
 
 // The reader's connection forgets the tables' definitions before the query, so that its prepare

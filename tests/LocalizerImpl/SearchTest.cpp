@@ -360,11 +360,10 @@ TEST_F(Search, FitsPiecesToCharacters)
     EXPECT_EQ(Fits(m_digits, reading, L"94264"), std::pair(1, 1));
     EXPECT_EQ(Fits(m_digits, noReading, L""), std::pair(0, 0));
     EXPECT_EQ(m_letters.CmpOtherWords(DAMAGED_CODE, szAnyKey), 0);
-    const CLogCapture log;
+    CLogCapture log;
     EXPECT_EQ(m_digits.CmpDigitalWord(LOC_DIGIT_BASE + 7, szSeven), 1);
-    EXPECT_EQ(log.Lines(), (std::vector<tag_LogLine>{
-                               {DEBUG_LINE, "LocalizerImpl/QVNumLocalizerManager",
-                                "QV_Contacts:CQVNumLocalizerManager::CmpDigitalWord r == 1"}}));
+    EXPECT_EQ(log.Take(), "[3 LocalizerImpl/QVNumLocalizerManager] "
+                          "QV_Contacts:CQVNumLocalizerManager::CmpDigitalWord r == 1$\n");
 }
 
 TEST_F(Search, TriesOnlyWhatCanEndAText)

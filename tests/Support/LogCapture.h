@@ -4,7 +4,6 @@
 #include "Platform/LogSink.h"
 
 #include <functional>
-#include <ostream>
 #include <string>
 #include <utility>
 #include <vector>
@@ -20,15 +19,6 @@ struct tag_LogLine
     int iPriority;
     std::string strTag;
     std::string strText;
-
-    bool operator==(const tag_LogLine& other) const
-    {
-        return iPriority == other.iPriority && strTag == other.strTag && strText == other.strText;
-    }
-    friend std::ostream& operator<<(std::ostream& stream, const tag_LogLine& line)
-    {
-        return stream << '[' << line.iPriority << ' ' << line.strTag << "] " << line.strText;
-    }
 };
 
 // Collects every log line for as long as the object lives, one object at a time.
@@ -50,6 +40,18 @@ public:
             vTexts.insert(vTexts.end(), line.iPriority == iPriority ? 1U : 0U, line.strText);
         }
         return vTexts;
+    }
+    // All lines since the last Take or Clear, with a dollar sign behind each: some texts end with a
+    // line end of their own.
+    std::string Take()
+    {
+        std::string strTaken;
+        for (const auto& [iPriority, strTag, strText] : m_vLines)
+        {
+            strTaken += "[" + std::to_string(iPriority) + " " + strTag + "] " + strText + "$\n";
+        }
+        Clear();
+        return strTaken;
     }
     void Clear() { m_vLines.clear(); }
     // Runs a function at every line, in the middle of the operation that logs it: this is how a

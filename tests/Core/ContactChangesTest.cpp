@@ -220,15 +220,14 @@ TEST_F(CContactChangesTest, WaitForTheLock)
     {
         CLockHolder holder;
         int iRefusals = 0;
-        m_log.AtEachLine(
-            [&](const std::string& strText)
-            {
-                iRefusals += strText == "QV_Contacts: " + row.first + " Lock share mem false";
-                if (iRefusals == 7)
-                {
-                    holder.Release();
-                }
-            });
+        m_log.AtLinesWith("QV_Contacts: " + row.first + " Lock share mem false",
+                          [&]
+                          {
+                              if (++iRefusals == 7)
+                              {
+                                  holder.Release();
+                              }
+                          });
         row.second();
         m_log.AtEachLine(nullptr);
         EXPECT_EQ(iRefusals, 7) << row.first;
@@ -256,14 +255,7 @@ TEST_F(CContactChangesTest, NoticesASortTypeThatIsSetMeanwhile)
         const int iSortType = i % 2;
         BuildStore(1 - iSortType);
         Store({Contact(3, "Zoe")});
-        m_log.AtEachLine(
-            [&](const std::string& strText)
-            {
-                if (strText.find(row.szLine) != std::string::npos)
-                {
-                    CMemManger().SetSortType(iSortType);
-                }
-            });
+        m_log.AtLinesWith(row.szLine, [&] { CMemManger().SetSortType(iSortType); });
         row.fnCall();
         m_log.AtEachLine(nullptr);
         EXPECT_EQ(Reg().iSortType, iSortType) << row.szLine;

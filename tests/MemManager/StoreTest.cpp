@@ -139,14 +139,8 @@ TEST_F(Store, GivesUpAfterFiveRefusals)
     ASSERT_NE(set, nullptr);
     EXPECT_EQ(set->pDetail, nullptr);
     // A copy of all waits until the lock is free.
-    m_log.AtEachLine(
-        [&](const std::string& strText)
-        {
-            if (strText == "QV_Contacts: GetContactsResult Lock share mem false")
-            {
-                holder.Release();
-            }
-        });
+    m_log.AtLinesWith("QV_Contacts: GetContactsResult Lock share mem false",
+                      [&] { holder.Release(); });
     Records vCopy;
     ASSERT_EQ(GetContacts(&vCopy), 2);
     EXPECT_EQ(BytesOf(vCopy), BytesOf(MakeRecords(2)));

@@ -245,14 +245,7 @@ TEST_F(SingleMutex, TellsAHeldLockFromNone)
     EXPECT_EQ(iFd, 0);
     CStoreLock lock;
     EXPECT_EQ(lock.TryLock(), LOCK_REFUSED);
-    m_log.AtEachLine(
-        [&](const std::string& strText)
-        {
-            if (strText == "QV_Contacts:LOCK RET = 0 ")
-            {
-                holder.Release();
-            }
-        });
+    m_log.AtLinesWith("QV_Contacts:LOCK RET = 0 ", [&] { holder.Release(); });
     EXPECT_TRUE(TryStoreLock(&lock, [](int iAttempt) { ADD_FAILURE() << iAttempt; }));
     lock.Release();
     std::filesystem::remove(CDataPaths::LockFile());

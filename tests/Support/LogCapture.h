@@ -60,6 +60,18 @@ public:
     {
         m_fnAtLine = std::move(fnAtLine);
     }
+    // The same at the lines that hold a text.
+    void AtLinesWith(const std::string& strPart, const std::function<void()>& fnAtLine)
+    {
+        AtEachLine(
+            [strPart, fnAtLine](const std::string& strText)
+            {
+                if (strText.find(strPart) != std::string::npos)
+                {
+                    fnAtLine();
+                }
+            });
+    }
 
 private:
     static void Collect(void* pContext, int iPriority, const char* szTag, const char* szText)

@@ -73,9 +73,7 @@ std::string FaultAfter(const CStoreCase& store, bool bReports, CLocalizerLogic& 
     return strFault.empty() && eKind == KIND_NONE ? store.RepairFault() : strFault;
 }
 
-class CEveryCallFails : public testing::TestWithParam<std::tuple<tag_Operation, int>>
-{
-};
+using CEveryCallFails = testing::TestWithParam<std::tuple<tag_Operation, int>>;
 
 TEST_P(CEveryCallFails, Changing)
 {

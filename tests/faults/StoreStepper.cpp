@@ -17,22 +17,21 @@ namespace
 {
 
 constexpr size_t PAGE = 4096;
-constexpr size_t WINDOW = 2 * PAGE; // a store may cross a page's end
+constexpr size_t WIDEST_STORE = 64;
 constexpr char REG_FILE[] = "ContactsReg.bin";
 constexpr char RECORDS_FILE[] = "ContactsLocalizer.bin";
 
 struct tag_Region
 {
-    char* pAddr;
-    size_t uSize; // whole pages; 0 while nothing is mapped
+    char* pAddr = nullptr;
+    size_t uSize = 0; // whole pages; 0 while nothing is mapped
+    std::string strLast{};
 };
 
 std::vector<tag_Step> g_vSteps;
 std::string g_strFault;
 tag_Region g_aRegions[2]; // of the records and of the registration record
-tag_Region g_window;      // that is writable for one instruction
-bool g_bWindowOfReg;
-char g_acBefore[WINDOW];
+tag_Region* g_pWritable;  // for one instruction
 
 // Not where there is no such file.
 bool IsLocked(const std::string& strPath)
@@ -59,15 +58,12 @@ void SetTrap(void* /*pContext*/, bool /*bOn*/) {}
 void OnRefusedStore(int iSignal, siginfo_t* pInfo, void* pContext)
 {
     char* pStore = static_cast<char*>(pInfo->si_addr);
-    for (const tag_Region& region : g_aRegions)
+    for (tag_Region& region : g_aRegions)
     {
         if (pStore >= region.pAddr && pStore < region.pAddr + region.uSize)
         {
-            const auto uAt = static_cast<size_t>(pStore - region.pAddr) / PAGE * PAGE;
-            g_window = {region.pAddr + uAt, std::min(WINDOW, region.uSize - uAt)};
-            g_bWindowOfReg = &region == &g_aRegions[1];
-            std::memcpy(g_acBefore, g_window.pAddr, g_window.uSize);
-            mprotect(g_window.pAddr, g_window.uSize, PROT_READ | PROT_WRITE);
+            g_pWritable = &region;
+            mprotect(region.pAddr, region.uSize, PROT_READ | PROT_WRITE);
             SetTrap(pContext, true);
             return;
         }
@@ -79,18 +75,20 @@ void OnRefusedStore(int iSignal, siginfo_t* pInfo, void* pContext)
 void OnStep(int /*iSignal*/, siginfo_t* /*pInfo*/, void* pContext)
 {
     SetTrap(pContext, false);
-    mprotect(g_window.pAddr, g_window.uSize, PROT_READ);
-    const char* pEnd = g_window.pAddr + g_window.uSize;
-    const char* pFirst = std::mismatch<const char*>(g_window.pAddr, pEnd, g_acBefore).first;
-    while (pEnd > pFirst && *(pEnd - 1) == g_acBefore[pEnd - 1 - g_window.pAddr])
+    auto& [pAddr, uSize, strLast] = *g_pWritable;
+    mprotect(pAddr, uSize, PROT_READ);
+    const auto uFirst = static_cast<size_t>(
+        std::mismatch(strLast.begin(), strLast.end(), pAddr).first - strLast.begin());
+    size_t uEnd = std::min(uSize, uFirst + WIDEST_STORE);
+    while (uEnd > uFirst && pAddr[uEnd - 1] == strLast[uEnd - 1])
     {
-        --pEnd;
+        --uEnd;
     }
-    if (pFirst < pEnd)
+    if (uFirst < uEnd)
     {
-        const char* pFile = g_aRegions[g_bWindowOfReg ? 1 : 0].pAddr;
-        const auto uOffset = static_cast<size_t>(pFirst - pFile);
-        g_vSteps.push_back({STEP_STORE, g_bWindowOfReg, uOffset, {pFirst, pEnd}});
+        const std::string strBytes(pAddr + uFirst, uEnd - uFirst);
+        strLast.replace(uFirst, strBytes.size(), strBytes);
+        g_vSteps.push_back({STEP_STORE, g_pWritable == &g_aRegions[1], uFirst, strBytes});
     }
 }
 
@@ -133,7 +131,9 @@ void OnMapping(MAP_EVENT eEvent, const tag_Mapping& mapping)
         const tag_StoreFiles files = ReadFiles();
         g_vSteps.push_back(
             {STEP_LENGTH, bReg, (bReg ? files.strReg : files.strRecords).size(), ""});
-        region = {static_cast<char*>(mapping.pAddr), (mapping.uSize + PAGE - 1) / PAGE * PAGE};
+        region.pAddr = static_cast<char*>(mapping.pAddr);
+        region.uSize = (mapping.uSize + PAGE - 1) / PAGE * PAGE;
+        region.strLast.assign(region.pAddr, region.uSize);
         mprotect(mapping.pAddr, mapping.uSize, PROT_READ);
     }
     else if (eEvent == MAP_FLUSHED)

@@ -126,14 +126,14 @@ class PythonTest(ModuleTest):
     def test_result_is_a_sequence_until_it_is_closed(self):
         result = self.index.search("z")
         matches = list(result)
-        self.assertEqual((matches[-1], matches[2:9:3]), (result[-1], result[2:9:3]))
-        self.assertEqual((3, None), (result.find(matches[3].contact_id), result.find(-1)))
-        self.assertRaises(IndexError, lambda: result[len(matches)])
+        with result:
+            self.assertEqual((matches[-1], matches[2:9:3]), (result[-1], result[2:9:3]))
+            self.assertEqual((3, None), (result.find(matches[3].contact_id), result.find(-1)))
+            self.assertRaises(IndexError, lambda: result[len(matches)])
         nobody = self.index.search("z", group=99)
         self.assertEqual([], list(self.index.search("z", within=nobody)), "an empty result counts")
-        result.close()
-        result.close()
         self.assertRaises(ValueError, len, result)
+        result.close()
         self.assertRaises(ValueError, self.index.search, "zs", within=result)
 
     def test_typing_narrows_takes_back_and_picks(self):

@@ -2,6 +2,7 @@
 
 import_test.py TOOL PYFILE [--record] [TestClass...]
 """
+import contextlib
 import importlib.util
 import os
 import pathlib
@@ -55,21 +56,19 @@ class BarTest(ImportTest):
         cards.write_text("x" * 100)
         terminal, other_end = pty.openpty()
         self.addCleanup(os.close, terminal)
-        process = subprocess.Popen(
-            self.call("import", cards, "--pyfile", PYFILE, "--converter", converter),
-            stdout=subprocess.PIPE, stderr=other_end)
-        self.addCleanup(process.wait)
-        shown = ""
-        while "%" not in shown:
-            shown += os.read(terminal, 1000).decode()
-        gate.write_text("")
-        self.assertRegex(shown, r"\rImporting contacts +\[[#.]{30}\] +\d+%")
-        self.assertIn(b"1 added", process.communicate()[0])
-        os.write(other_end, b"$")
-        while "$" not in shown:
-            shown += os.read(terminal, 1000).decode()
-        os.close(other_end)
-        self.assertRegex(shown, r"%\r +\r\$$")
+        with subprocess.Popen(
+                self.call("import", cards, "--pyfile", PYFILE, "--converter", converter),
+                stdout=subprocess.PIPE, stderr=other_end) as process:
+            os.close(other_end)
+            shown = ""
+            while "%" not in shown:
+                shown += os.read(terminal, 1000).decode()
+            gate.write_text("")
+            with contextlib.suppress(OSError):  # the terminal's end
+                while True:
+                    shown += os.read(terminal, 1000).decode()
+            self.assertIn(b"1 added", process.stdout.read())
+        self.assertRegex(shown, r"^(\rImporting contacts +\[[#.]{30}\] +\d+%)+\r +\r$")
 
 
 class SamplesTest(ImportTest):

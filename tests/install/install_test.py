@@ -43,9 +43,7 @@ target_link_libraries(consumer PRIVATE QV_Localize::{target})
 
 
 def run_built(program, *arguments, **options):
-    emulator = shlex.split(EMULATOR)
-    if emulator:
-        emulator += ["-E", f"LD_LIBRARY_PATH={LIBRARIES}"]
+    emulator = [*shlex.split(EMULATOR), "-E", f"LD_LIBRARY_PATH={LIBRARIES}"] if EMULATOR else []
     return run(*emulator, program, *arguments, **options)
 
 

@@ -105,12 +105,8 @@ TEST_F(ShareMemory, TellsWhyNothingIsMappedOrClosed)
     EXPECT_EQ(readFromFile(m_directory.File("missing").c_str(), &cRead, &iLen), 0);
     EXPECT_EQ(iLen, 1);
     EXPECT_EQ(writeToFile("/dev/full", "abc", 3), 0);
-    std::string strTold;
-    for (const std::string& strText : m_log.Texts(ERROR_LINE))
-    {
-        strTold += strText + "$\n"; // some lines end with a line end of their own
-    }
-    strTold = std::regex_replace(strTold, std::regex("hFile=[0-9]+"), "hFile=#");
+    const std::string strTold =
+        std::regex_replace(m_log.Take(), std::regex("hFile=[0-9]+"), "hFile=#");
     EXPECT_EQ(std::regex_replace(strTold, std::regex(m_directory.Root()), "ROOT"),
               CDataDirectory::ReadBytes(QV_TEST_DATA "/ShareMemory/log.txt"));
 }

@@ -2,6 +2,7 @@
 
 #include "Common/DataPaths.h"
 
+#include <algorithm>
 #include <cerrno>
 #include <cstdarg>
 #include <cstdio>
@@ -62,12 +63,8 @@ Fn Next(Fn /*own*/, const char* szName)
 
 tag_Mapping* FindMapping(const void* pAddr)
 {
-    tag_Mapping* pMapping = g_aMappings;
-    while (pMapping != std::end(g_aMappings) && pMapping->pAddr != pAddr)
-    {
-        ++pMapping;
-    }
-    return pMapping;
+    return std::find_if(std::begin(g_aMappings), std::end(g_aMappings),
+                        [pAddr](const tag_Mapping& mapping) { return mapping.pAddr == pAddr; });
 }
 
 void Tell(MAP_EVENT eEvent, const tag_Mapping& mapping)

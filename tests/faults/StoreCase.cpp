@@ -258,15 +258,13 @@ STORE_KIND CStoreCase::KindOf(tag_StoreImage image, std::string* pstrWhy) const
 std::string CStoreCase::MixedContact(int iContactID, const wchar_t* szName,
                                      const wchar_t* szKey) const
 {
-    const auto [first, end] = m_mapTexts.equal_range(iContactID);
-    const bool bKnown =
-        std::any_of(first, end,
-                    [szName, szKey](const auto& entry)
-                    {
-                        const auto& [strName, strKey] = entry.second;
-                        return (szName == nullptr || strName == szName) && strKey == szKey;
-                    });
-    return iContactID == 0 || bKnown ? "" : "a contact beside another's name";
+    bool bKnown = iContactID == 0;
+    for (auto [it, end] = m_mapTexts.equal_range(iContactID); it != end; ++it)
+    {
+        const auto& [strName, strKey] = it->second;
+        bKnown |= (szName == nullptr || strName == szName) && strKey == szKey;
+    }
+    return bKnown ? "" : "a contact beside another's name";
 }
 
 std::string CStoreCase::RepairFault() const

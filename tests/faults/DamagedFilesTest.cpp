@@ -77,8 +77,11 @@ TEST(Faults, DamagedFilesHarmNobody)
             EXPECT_TRUE(answer.iRet == 0 || answer.pResult == nullptr);
             TextOf(logic, answer);
         }
-        CDataDirectory::WriteBytes(PATHS[2], vWhole[2]);
-        CDataDirectory::WriteBytes(PATHS[3], vWhole[3]);
+        if (uFile > 1)
+        {
+            CDataDirectory::WriteBytes(PATHS[2], vWhole[2]);
+            CDataDirectory::WriteBytes(PATHS[3], vWhole[3]);
+        }
         if (iRound % REPAIR_EVERY == 0)
         {
             logic.SetSortType(STORE_ORDER_NAME);

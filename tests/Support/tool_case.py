@@ -14,6 +14,8 @@ from programs import run
 
 TOOL, PYFILE = map(os.path.abspath, sys.argv[1:3])
 SKIPPED = 77
+LEAKS = pathlib.Path(__file__).resolve().parents[1] / "Tool/ncurses.supp"
+os.environ["LSAN_OPTIONS"] = f"suppressions={LEAKS}:print_suppressions=0"
 
 
 # What transcripts call: the tool, whose subcommands work in the directory data; its database, which

@@ -25,9 +25,7 @@ SIZES = [(40, 12), (80, 24), (132, 43)]
 ZHANGS = "Home z h a n g s"
 PROMPT = "shell>"
 PATIENCE = 60  # seconds until a screen that does not come is a failure
-ENVIRONMENT = {**os.environ, "LC_ALL": "C.UTF-8",
-               "LSAN_OPTIONS": f"suppressions={SCREENS.with_name('ncurses.supp')}:"
-                               "print_suppressions=0"}
+ENVIRONMENT = {**os.environ, "LC_ALL": "C.UTF-8"}
 ENVIRONMENT.pop("TMUX", None)
 
 

@@ -55,9 +55,7 @@ TEST(Utf8, DecodesUpToTheBound)
 {
     const std::tuple<const char*, int, int, std::wstring> ROWS[] = {
         // bytes, last byte, result, text
-        {"\xE5\xBC\xA0", 2, 1, L"张"},
         {"\xE5\xBC\xA0", 1, -201, L""},
-        {"\xC3\xA4", 1, 1, L"ä"},
         {"zhang", 1, 2, L"zh"},
         {"zhang", -1, 0, L""},
         {"zhang", INT32_MAX, 5, L"zhang"},

@@ -180,11 +180,6 @@ TEST_F(Store, CopiesNothingWithoutMemory)
     tag_LocalizerDetail entry = {};
     tag_LocalizerResult source = {1, &entry};
     tag_LocalizerResult* pSet = &source;
-    const auto WithMemoryFor = [](int iGranted, const auto& fnCall)
-    {
-        const CMemoryFailure failure(iGranted);
-        return fnCall();
-    };
     EXPECT_EQ(WithMemoryFor(0, [&] { return CopyContacts(); }), nullptr);
     EXPECT_EQ(WithMemoryFor(1, [&] { return CopyContacts(); })->iResultNum, 0);
     EXPECT_EQ(BytesOf(WithMemoryFor(1, [&] { return GetContacts(); })), "");

@@ -222,7 +222,7 @@ TEST_F(Reader, ReadsTheListedVisibleContactsOnly)
 TEST_F(Reader, MarksTheFirstRecordOfEachOnlineStatus)
 {
     int iId = 0;
-    for (const int iStatusId : {7, 9, 0, 8, 9, 0, -5, 12})
+    for (const int iStatusId : {9, 7, 0, 8, 9, 0, -5, 12})
     {
         m_provider.Put({++iId, "", "", "", "", 0, 0, iStatusId});
     }
@@ -237,7 +237,7 @@ TEST_F(Reader, MarksTheFirstRecordOfEachOnlineStatus)
         EXPECT_EQ(0, ReadOnline()) << iGranted;
         for (int i = 0; i < 8; ++i)
         {
-            EXPECT_EQ(i == 1 || i == 2 || i == 6 ? CONTACT_FLAG_ONLINE : 0,
+            EXPECT_EQ(i == 0 || i == 2 || i == 6 ? CONTACT_FLAG_ONLINE : 0,
                       m_set.pContacts[i].iFlags);
             m_set.pContacts[i].iFlags = CONTACT_FLAG_ONLINE;
         }

@@ -102,7 +102,7 @@ private:
                 const std::wstring strCodes(vNames[i].szLocalizerKey, 10);
                 const int iStart = static_cast<int>(std::wcslen(strCodes.c_str())) - iKeyLen;
                 // Adds nothing that the comparison has not added.
-                this->CreateCNWordMask(pMap, strCodes[static_cast<size_t>(iStart + iPieces)]);
+                this->CreateCNWordMask(pMap, strCodes.c_str()[iStart + iPieces]);
                 Manager::AddToVector(m_vMatches, {static_cast<int>(i), iType,
                                                   MatchPosition(iStart, iStart + iPieces - 1), 0});
             }

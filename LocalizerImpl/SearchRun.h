@@ -44,8 +44,8 @@ public:
     void Finish(const tag_LocalizerResult& candidates, tag_LocalizerResult* pResult, long* pMask,
                 wchar_t* szWordOut);
 
-    // The same for a caller whose candidates are its own and all of them matches: they become the
-    // result where they are.
+    // The same for a caller whose candidates are its own and all of them matches, as after a
+    // whole-store search: they become the result where they are, which saves a copy of it.
     void FinishInPlace(tag_LocalizerResult& candidates, long* pMask, wchar_t* szWordOut);
 
 private:

@@ -34,13 +34,13 @@ tag_NameMatch CRunFinder::Find(const wchar_t* pCodes, int32_t iCandidate)
     m_iCandidate = iCandidate;
     m_uLastSplit = 0;
     std::fill_n(m_auSeen, m_iSplitWords, 0);
-    m_match = {MATCH_LIST, 0, UINT16_MAX};
+    m_match = {MATCH_LIST, 0, tag_NameMatch::NO_SPLIT};
     m_iLength = NameLength(pCodes);
     for (int i = 0; i < m_iLength; ++i)
     {
         m_aiKeys[i] = m_table.KeyOf(pCodes[i]);
     }
-    const int iStarts = m_bAnywhere ? m_iLength : 1;
+    const int iStarts = m_bAnywhere ? m_iLength : std::min(m_iLength, 1);
     for (m_iStart = 0; m_iStart < iStarts; ++m_iStart)
     {
         if ((m_table.DeadOffsets(m_aiKeys[m_iStart]) & FIRST_OFFSET) == 0)

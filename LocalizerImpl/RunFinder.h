@@ -17,9 +17,11 @@
 // How a name matches.
 struct tag_NameMatch
 {
+    static constexpr uint16_t NO_SPLIT = UINT16_MAX;
+
     int32_t iMatchType;
     int32_t iMatchPos;
-    uint16_t uFirstSplit; // the smallest split that fits: when the name was first found
+    uint16_t uFirstSplit; // the smallest split that fits: when the name was found; or NO_SPLIT
 };
 
 class CRunFinder
@@ -36,7 +38,7 @@ public:
     // from the first LOC_NO_CODE on do not count.
     bool CanMatch(const wchar_t* pCodes) { return m_states.Accept(pCodes); }
 
-    // How a name matches that CanMatch. The findings get the characters that took a last piece, as
+    // How a name matches, if it does. The findings get the characters that took a last piece, as
     // those of candidate iCandidate, and those behind a run.
     tag_NameMatch Find(const wchar_t* pCodes, int32_t iCandidate);
 

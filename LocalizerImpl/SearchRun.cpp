@@ -133,11 +133,18 @@ bool CSearchRun::FindMatches(const tag_LocalizerResult& candidates)
     for (int32_t i = 0; candidates.pDetail != nullptr && i < candidates.iResultNum; ++i)
     {
         const wchar_t* pCodes = candidates.pDetail[i].szLocalizerKey;
-        if (!m_finder->CanMatch(pCodes))
+        // CanMatch is faster than Find, but in vain where most names match, as all do that were
+        // selected by MayMatch.
+        const bool bRare = m_vMatches.size() < static_cast<size_t>(i) / 2;
+        if (bRare && !m_finder->CanMatch(pCodes))
         {
             continue;
         }
         const tag_NameMatch match = m_finder->Find(pCodes, i);
+        if (match.uFirstSplit == tag_NameMatch::NO_SPLIT)
+        {
+            continue;
+        }
         if (vFirstSplits.add(match.uFirstSplit) < 0 ||
             m_vMatches.add({i, match.iMatchType, match.iMatchPos, 0}) < 0)
         {

@@ -39,7 +39,9 @@ right after it.
 LARGE_HEAD = """# 1,000,000 contacts
 
 Written by `scripts/bench.sh --large`; do not edit by hand. Each figure beside that of 100,000 contacts in
-the same run; limit of the factor: 11. One changed contact also has the limit of its count query + 6 copy.
+the same run; limit of the factor: 11. One changed contact also has the limit of its count query + 6 copy,
+which does not contain the flush of the moved records to the disk (about 0.3 s), while its time does. Where a
+factor is larger: `docs/keystroke.md`.
 
 | figure | 100,000 | 1,000,000 | factor |
 |---|---|---|---|

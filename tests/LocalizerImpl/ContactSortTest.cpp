@@ -25,6 +25,7 @@ tag_ContactsStruct MakeRecord(std::mt19937& rng)
     const size_t uAlphabet = 1 + rng() % std::size(UNITS);
     std::generate_n(record.szName, rng() % 5 == 0 ? 31 : rng() % 15,
                     [&] { return static_cast<wchar_t>(UNITS[rng() % uAlphabet]); });
+    record.szName[rng() % 31] = L'\0'; // what lies behind the end does not count
     record.szLocalizerKey[0] = static_cast<wchar_t>(CODES[rng() % std::size(CODES)]);
     return record;
 }

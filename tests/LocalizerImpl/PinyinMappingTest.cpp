@@ -23,11 +23,8 @@ using Manager = CQVLocalizerManager;
 
 constexpr size_t TABLE_BYTES = 709412;
 
-// The part of the address space that the tests let handles lie in. Emulators of 32-bit systems
-// map below its end by themselves, so the tests that need a high first mapping take less.
-constexpr uintptr_t ROOM_BEGIN = 0x10000000;
+// Below this address the tests let handles lie.
 constexpr uintptr_t ROOM_END = 0x30000000;
-constexpr uintptr_t ROOM_STEP = 0x01000000;
 
 class PinyinTable : public LocalizerFixture
 {
@@ -87,30 +84,26 @@ TEST_F(PinyinTable, IsMappedBelowTheLimitWhereNothingElseIs)
               std::string(reinterpret_cast<const char*>(hFree), PY_FILE_SIZE));
     EXPECT_EQ(0, Manager::ReleasePinYinFileMapping(hFree));
     EXPECT_EQ(0, OtherMappings());
-
-    void* pTaken = mmap(reinterpret_cast<void*>(ROOM_BEGIN), ROOM_STEP, PROT_READ | PROT_WRITE,
-                        MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    // What lies there now stays, and a mapping that comes to lie elsewhere above the limit goes.
+    void* pTaken = mmap(reinterpret_cast<void*>(hFree), TABLE_BYTES, PROT_READ | PROT_WRITE,
+                        MAP_PRIVATE | MAP_ANONYMOUS | MAP_FIXED_NOREPLACE, -1, 0);
     ASSERT_NE(pTaken, MAP_FAILED);
-    std::memset(pTaken, 'm', ROOM_STEP);
-    if (reinterpret_cast<uintptr_t>(pTaken) != ROOM_BEGIN)
-    {
-        GTEST_SKIP() << "the system had the room taken already";
-    }
-    CLowMapping::SetLimit(ROOM_BEGIN + ROOM_STEP);
+    std::memset(pTaken, 'm', TABLE_BYTES);
+    const long hBeside = Manager::CreatePinYinFileMapping();
+    EXPECT_LT(hBeside, static_cast<long>(ROOM_END));
+    EXPECT_EQ(1, OtherMappings());
+    EXPECT_EQ(0, Manager::ReleasePinYinFileMapping(hBeside));
+    EXPECT_EQ(std::string(TABLE_BYTES, 'm'), std::string(static_cast<char*>(pTaken), TABLE_BYTES));
+    munmap(pTaken, TABLE_BYTES);
+    CLowMapping::SetLimit(1);
     const CLogCapture log;
-    // Nothing, or where an emulator answers a hint that is taken with an address below it.
-    const long hTaken = Manager::CreatePinYinFileMapping();
-    EXPECT_LT(hTaken, static_cast<long>(ROOM_BEGIN));
-    EXPECT_EQ(Manager::ReleasePinYinFileMapping(hTaken), hTaken == -1 ? -1005 : 0);
+    EXPECT_EQ(-1, Manager::CreatePinYinFileMapping());
+    EXPECT_EQ(-1005, Manager::ReleasePinYinFileMapping(-1));
     const std::string strManager = "CQVLocalizerManager::";
     const std::string strRelease = strManager + "ReleasePinYinFileMapping the input mapping is ";
-    const Lines vNothing = {strManager + "CreatePinYinFileMapping memInit error code = -1000",
-                            strRelease + "-1 ", strRelease + "wrong!"};
-    EXPECT_EQ(log.Texts(ERROR_LINE), hTaken == -1 ? vNothing : Lines());
-    EXPECT_EQ(0, OtherMappings());
-    EXPECT_EQ(std::string(ROOM_STEP, 'm'),
-              std::string(static_cast<const char*>(pTaken), ROOM_STEP));
-    munmap(pTaken, ROOM_STEP);
+    EXPECT_EQ(log.Texts(ERROR_LINE),
+              (Lines{strManager + "CreatePinYinFileMapping memInit error code = -1000",
+                     strRelease + "-1 ", strRelease + "wrong!"}));
 }
 
 // A file that was written just now could change once more without a trace, whatever its own time

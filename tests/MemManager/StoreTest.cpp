@@ -241,8 +241,17 @@ TEST_F(Store, MakesSetsAndPages)
     set = Own(pSet);
     EXPECT_EQ(EntryBytes(set->pDetail, set->iResultNum), EntryBytes(aEntries, 10));
     tag_LocalizerResult page = {};
+    EXPECT_EQ(m_store.GetSearchRecord(&source, 0, 10, &page), 0);
     EXPECT_EQ(m_store.GetSearchRecord(&source, 9, 1, &page), 0);
     EXPECT_EQ(page.iResultNum, 1);
+    int aiCounts[27] = {};
+    EXPECT_EQ(
+        (std::vector<int>{
+            m_store.NewSearchResult(nullptr, &pSet), m_store.CopySearchResult(nullptr, &pSet),
+            m_store.GetSearchRecord(nullptr, 0, 1, &page),
+            m_store.GetIndexByContactsId(nullptr, 100), m_store.GetFirstWordInfo(nullptr, aiCounts),
+            m_store.GetFirstWordInfo(&source, nullptr), m_store.FreeSearchResult(nullptr)}),
+        std::vector<int>(7, -1));
     const int PAGES[][2] = {{10, 0}, {5, 6}, {-1, 1}, {0, -1}, {5, INT32_MAX}, {INT32_MAX, 1}};
     for (const auto& [iStart, iCount] : PAGES)
     {

@@ -3,22 +3,14 @@
 // languages_test.py.
 
 #include "bindings/c/qvlocalize.h"
-#include "tests/Support/DataDirectory.h"
-#include "tests/Support/ProviderDatabase.h"
-#include "tests/Support/StoreImage.h"
-#include "tests/Support/WideText.h"
+#include "tests/Core/FacadeFixture.h"
 
 #include <filesystem>
-#include <gtest/gtest.h>
-#include <memory>
 #include <set>
-#include <string>
 #include <tuple>
 
 namespace
 {
-
-constexpr int64_t NOW = 1700000000000;
 
 using Index = std::unique_ptr<qv_index, decltype(&qv_close)>;
 using Result = std::unique_ptr<qv_result, decltype(&qv_result_free)>;
@@ -31,26 +23,13 @@ Index Open(const std::string& strDirectory)
 }
 
 // An index that is still to be built, of a database with contacts 1 to 6.
-class CInterfaceTest : public testing::Test
+class CInterfaceTest : public CFacadeTest
 {
 protected:
     CInterfaceTest()
     {
-        m_directory.InstallPinyinTable();
-        m_index = Open(m_directory.Root());
-        int iId = 0;
-        for (const char* szName : {"张三", "李四", "长孙无忌", "Tom", "", "王小明"})
-        {
-            ++iId;
-            m_provider.Put({iId, szName, Key(szName), "", "", NOW - iId, 0, iId});
-        }
-    }
-
-    std::string Key(const std::string& strName)
-    {
-        char szKey[QV_KEY_SIZE] = "?";
-        EXPECT_EQ(qv_localizer_key(m_index.get(), strName.c_str(), szKey, sizeof(szKey)), QV_OK);
-        return szKey;
+        Store({Contact(1, "张三"), Contact(2, "李四"), Contact(3, "长孙无忌"), Contact(4, "Tom"),
+               Contact(5, ""), Contact(6, "王小明")});
     }
 
     Result Search(const char* szText, const qv_result* pPrevious = nullptr)
@@ -61,13 +40,14 @@ protected:
         return {pResult, &qv_result_free};
     }
 
-    CDataDirectory m_directory;
-    CProviderDatabase m_provider;
-    Index m_index{nullptr, &qv_close};
+    Index m_index = Open(m_directory.Root());
 };
 
 TEST_F(CInterfaceTest, SearchesWithinAResultAndPages)
 {
+    char szKey[QV_KEY_SIZE] = "?";
+    EXPECT_EQ(qv_localizer_key(m_index.get(), "张三", szKey, sizeof(szKey)), QV_OK);
+    EXPECT_EQ(szKey, LocalizerKeyOf("张三"));
     EXPECT_EQ(qv_needs_build(m_index.get()), 1) << "names need no index and make none";
     ASSERT_EQ(qv_build(m_index.get(), 0), QV_OK);
     EXPECT_EQ(qv_needs_build(m_index.get()), 0);
@@ -87,8 +67,8 @@ TEST_F(CInterfaceTest, SearchesWithinAResultAndPages)
     const qv_match& match = qv_result_matches(found.get())[1];
     EXPECT_EQ(std::tie(match.contact_id, match.name_order, match.first, match.last),
               std::make_tuple(1, 4, 0, 1));
-    EXPECT_EQ(std::wstring(match.codes, match.codes + 3), Wide(Key("张三")) + L'\0');
-    EXPECT_EQ(match.last_contacted, NOW - 1);
+    EXPECT_EQ(std::wstring(match.codes, match.codes + 3), Wide(szKey) + L'\0');
+    EXPECT_EQ(match.last_contacted, Contact(1, "").llLastTime);
     EXPECT_EQ(qv_result_matches(Search("qqq").get()), nullptr);
     // A result outlives its index and the store's next build.
     EXPECT_EQ(qv_build(m_index.get(), 1), QV_OK);
@@ -100,25 +80,22 @@ TEST_F(CInterfaceTest, SearchesWithinAResultAndPages)
 TEST_F(CInterfaceTest, FollowsChangesOfTheDatabase)
 {
     ASSERT_EQ(qv_build(m_index.get(), 0), QV_OK);
-    const auto DifferenceFromFresh = [this] {
-        return DifferenceOf(ReadStore(), FreshBuild(m_directory.Root(), ReadStore().reg.iSortType));
-    };
-    m_provider.SetOnline(5, true);
+    m_provider.SetOnline(1005, true);
     EXPECT_EQ(qv_status_changed(m_index.get()), QV_OK);
     const int64_t aIds[] = {1, 2};
-    m_provider.SetName(1, "张红", Key("张红"));
+    m_provider.SetName(1, "张红", LocalizerKeyOf("张红"));
     m_provider.SetVisible(2, false);
     EXPECT_EQ(qv_contacts_changed(m_index.get(), aIds, 2), QV_OK);
     EXPECT_EQ(aIds[0], 1) << "the list stays the caller's";
     m_provider.SetStarred(3, true);
     EXPECT_EQ(qv_star_changed(m_index.get(), 3, 7), QV_OK);
-    m_provider.SetLastTime(4, NOW);
-    EXPECT_EQ(qv_time_changed(m_index.get(), 4, NOW), QV_OK);
-    EXPECT_EQ(DifferenceFromFresh(), "");
+    m_provider.SetLastTime(4, FIRST_TIME + 60'000);
+    EXPECT_EQ(qv_time_changed(m_index.get(), 4, FIRST_TIME + 60'000), QV_OK);
+    ExpectFresh();
     m_provider.SetVisible(2, true);
     EXPECT_EQ(qv_set_sort_type(m_index.get(), QV_SORT_TIME), QV_OK);
     EXPECT_EQ(qv_all_contacts_changed(m_index.get()), QV_OK);
-    EXPECT_EQ(DifferenceFromFresh(), "");
+    ExpectFresh();
     EXPECT_EQ(ReadStore().reg.iSortType, STORE_ORDER_TIME);
 }
 

@@ -4,6 +4,7 @@
 #include "Common/CommonQsort.h"
 
 #include "Core/Records/ContactRecords.h"
+#include "Core/Records/LocalizerCodes.h"
 
 #include <algorithm>
 #include <climits>
@@ -150,13 +151,10 @@ TEST(CommonQsort, OrdersNamesAndTimes)
         {SORT_TIME, Time(0), Time(-1)},
         {SORT_TIME, Time(-1), Time(INT64_MIN)},
     };
-    for (const auto& [eOrder, before, behind] : ROWS)
+    const auto ExpectOrder = [](Common_Sort_enum eOrder, char* pBefore, char* pBehind)
     {
         Common_Qsort sorter;
         sorter.InitInterData(eOrder);
-        Records vRecords = {before, behind};
-        char* const pBefore = Bytes(vRecords);
-        char* const pBehind = pBefore + sizeof(tag_ContactsStruct);
         EXPECT_EQ(sorter.QSORT_GT(pBehind, pBefore), 1);
         EXPECT_EQ(sorter.QSORT_LT(pBefore, pBehind), 1);
         EXPECT_EQ(sorter.QSORT_GT(pBefore, pBehind), 0);
@@ -164,7 +162,17 @@ TEST(CommonQsort, OrdersNamesAndTimes)
         EXPECT_EQ(sorter.QSORT_EQ(pBefore, pBehind), 0);
         EXPECT_EQ(sorter.QSORT_EQ(pBehind, pBehind), 1);
         EXPECT_EQ(sorter.QSORT_GT(pBehind, pBehind), 0);
+    };
+    for (const auto& [eOrder, before, behind] : ROWS)
+    {
+        Records vRecords = {before, behind};
+        ExpectOrder(eOrder, Bytes(vRecords), Bytes(vRecords) + sizeof(tag_ContactsStruct));
     }
+    PYOFWORDS aWords[] = {{"a", {}, {}}, {"三", {}, {}}, {"张", {}, {}}};
+    char* const pWords = reinterpret_cast<char*>(aWords);
+    ExpectOrder(SORT_PYWORD, pWords, pWords + sizeof(PYOFWORDS));
+    ExpectOrder(SORT_PYWORD, pWords + sizeof(PYOFWORDS), pWords + 2 * sizeof(PYOFWORDS));
+    EXPECT_EQ(Common_Qsort().Search_Bin(pWords, 3, aWords[2].szWord, SORT_PYWORD, 0), 2);
 }
 
 TEST(CommonQsort, RefusesEveryValueThatIsNoOrder)

@@ -96,6 +96,14 @@ TEST_F(NameConversion, MakesCodesAndKeysOfNames)
     EXPECT_EQ(log.Texts(DEBUG_LINE), Lines{"QV_Contacts: TranslateNameToLocal the char is digital: "
                                            "2 , the localize char is 0x5a02"});
     EXPECT_EQ(log.Texts(ERROR_LINE), (Lines{strCall + "-1!", strCall + "is wrong!"}));
+    for (int i = 0; i < 3; ++i) // without one of their arguments
+    {
+        PYOFWORDS* pMap = i == 0 ? nullptr : m_pMap;
+        wchar_t* pName = i == 1 ? nullptr : szName;
+        EXPECT_EQ(Manager::TranslateNameToLocal(pMap, pName, i == 2 ? nullptr : szCodes), 1);
+        EXPECT_EQ(
+            Manager::TranslateChineseToPinyin(nullptr, pMap, pName, i == 2 ? nullptr : szCodes), 1);
+    }
     RemoveTable();
     tag_ContactsInfo nobody = {0, nullptr};
     tag_ContactsStruct record = {};

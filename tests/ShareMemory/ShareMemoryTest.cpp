@@ -88,6 +88,7 @@ TEST_F(ShareMemory, TellsWhyNothingIsMappedOrClosed)
     CloseShareMemory(pInPage, 12);
     CloseWriteShareMemory(pInPage, 12, 0);
     EXPECT_NE(CloseReadShareMemory(pInPage, 12), 0);
+    EXPECT_EQ(CloseReadShareMemory(nullptr, 12), 0);
     const std::string strPipe = m_directory.File("pipe");
     ASSERT_EQ(mkfifo(strPipe.c_str(), 0700), 0); // is refused without waiting
     for (const std::string& strPath : {m_directory.File("no/such/directory"), strPipe})

@@ -104,17 +104,17 @@ void CWorkload::FillDatabase() const
     for (int i = 1; i <= m_iContacts; ++i)
     {
         const std::wstring strName = m_surname == 0 ? names.Next() : names.NextOf(m_surname);
-        tag_ProviderContact contact;
-        contact.iId = i;
+        tag_DatabaseContact contact;
+        contact.llID = i;
         contact.strName = Narrow(strName);
         contact.strKey = Narrow(keys.KeyOf(strName));
         contact.strGroups = std::to_string(1 + i % GROUPS);
         contact.strAccounts = std::to_string(1 + i % ACCOUNTS);
-        contact.llLastTime = FIRST_TIME_MS + (i * 7919LL % TIME_STEPS) * HOUR_MS;
-        contact.iStatusId = i;
+        contact.llLastTimeContacted = FIRST_TIME_MS + (i * 7919LL % TIME_STEPS) * HOUR_MS;
+        contact.llStatusUpdateID = i;
         contact.bPhone = true;
         contact.bStarred = i % GROUPS == 0;
-        contact.bOnline = i % ONLINE_EVERY == 0;
+        contact.strStatus = i % ONLINE_EVERY == 0 ? "online" : "";
         database.Put(contact);
     }
     database.Execute("commit");

@@ -7,10 +7,7 @@
 
 namespace fs = std::filesystem;
 
-namespace
-{
-
-constexpr const char* SCHEMA =
+const char* const PROVIDER_SCHEMA =
     "CREATE TABLE contacts (_id INTEGER PRIMARY KEY, times_contacted INTEGER NOT NULL DEFAULT 0,"
     " last_time_contacted INTEGER NOT NULL DEFAULT 0, starred INTEGER NOT NULL DEFAULT 0,"
     " has_phone_number INTEGER NOT NULL DEFAULT 0, single_is_secret INTEGER NOT NULL DEFAULT 0,"
@@ -20,6 +17,9 @@ constexpr const char* SCHEMA =
     " localizerkey TEXT, group_id TEXT, account_id TEXT, hasMail INTEGER NOT NULL DEFAULT 0,"
     " hasAddress INTEGER NOT NULL DEFAULT 0);"
     "CREATE TABLE status_updates (status_update_data_id INTEGER PRIMARY KEY, status TEXT);";
+
+namespace
+{
 
 // SQLite would replay a journal left beside the old file into the new one.
 void RemoveWithJournals(const std::string& strPath)
@@ -52,7 +52,7 @@ bool Begin(CSqliteDatabase& database, bool bNew)
     database.Execute("PRAGMA cache_spill = OFF; BEGIN IMMEDIATE");
     if (bNew)
     {
-        database.Execute(SCHEMA);
+        database.Execute(PROVIDER_SCHEMA);
     }
     return true;
 }

@@ -6,6 +6,9 @@
 
 #include <string>
 
+// Makes the provider's tables in an empty database.
+extern const char* const PROVIDER_SCHEMA;
+
 // Writes a provider database in one transaction: Commit makes all changes visible to others at
 // once; an object destroyed without Commit changes nothing. Every operation throws CToolError.
 class CContactDatabase

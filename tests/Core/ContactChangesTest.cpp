@@ -108,14 +108,14 @@ TEST_F(CContactChangesTest, RenewsAContactInItsSlot)
 {
     BuildStore(STORE_ORDER_TIME);
     const Records vBefore = ReadStore().vRecords;
-    tag_ProviderContact contact = Contact(4, "王小明");
+    tag_DatabaseContact contact = Contact(4, "王小明");
     contact.bPhone = true;
-    contact.llLastTime += 100'000; // told by no time notification
+    contact.llLastTimeContacted += 100'000; // told by no time notification
     Store({contact});
     Notify({4});
     const tag_ContactsStruct record = ReadStore().vRecords.at(4);
     EXPECT_EQ(vBefore.at(4).iContactID, 4);
-    EXPECT_EQ(record.llLastTimeContacted, contact.llLastTime);
+    EXPECT_EQ(record.llLastTimeContacted, contact.llLastTimeContacted);
     EXPECT_EQ(record.iFlags, CONTACT_FLAG_PHONE);
     EXPECT_EQ(record.iSortIndex, vBefore.at(4).iSortIndex) << "its place by name";
 }

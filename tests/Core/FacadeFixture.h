@@ -54,21 +54,21 @@ protected:
     CFacadeTest() { m_directory.InstallPinyinTable(); }
 
     // Last contacted in the order of their ids, as far as these are below 20.
-    static tag_ProviderContact Contact(int iId, const std::string& strName)
+    static tag_DatabaseContact Contact(int iId, const std::string& strName)
     {
-        tag_ProviderContact contact;
-        contact.iId = iId;
+        tag_DatabaseContact contact;
+        contact.llID = iId;
         contact.strName = strName;
-        contact.llLastTime = FIRST_TIME + iId % 20 * 1000LL;
-        contact.iStatusId = 1000 + iId;
+        contact.llLastTimeContacted = FIRST_TIME + iId % 20 * 1000LL;
+        contact.llStatusUpdateID = 1000 + iId;
         return contact;
     }
 
     // Stores contacts with their keys, without building the index.
-    void Store(std::vector<tag_ProviderContact> vContacts)
+    void Store(std::vector<tag_DatabaseContact> vContacts)
     {
         EXPECT_EQ(CQVLocalizerManager::InitMapFile(), 0);
-        for (tag_ProviderContact& contact : vContacts)
+        for (tag_DatabaseContact& contact : vContacts)
         {
             contact.strKey = LocalizerKeyOf(contact.strName);
         }
@@ -78,7 +78,7 @@ protected:
     // Stores contacts 1, 2, ... with these names and builds the index.
     void BuildNames(const std::vector<std::string>& vNames)
     {
-        std::vector<tag_ProviderContact> vContacts(vNames.size());
+        std::vector<tag_DatabaseContact> vContacts(vNames.size());
         std::transform(vNames.begin(), vNames.end(), vContacts.begin(),
                        [iId = 0](const std::string& strName) mutable
                        { return Contact(++iId, strName); });

@@ -105,12 +105,12 @@ TEST_F(CSearchTest, ListsUnderIndexCharacters)
 {
     constexpr long long DAY = 86400000;
     const long long llNow = static_cast<long long>(std::time(nullptr)) * 1000;
-    std::vector<tag_ProviderContact> vContacts = {{1, "Ann"},  {2, "zoe"}, {3, "长江"},
+    std::vector<tag_DatabaseContact> vContacts = {{1, "Ann"},  {2, "zoe"}, {3, "长江"},
                                                   {4, "张三"}, {5, "-x"},  {6, ""}};
     size_t uContact = 0;
     for (const int iDays : {29, 31, 89, 181, 361})
     {
-        vContacts[uContact++].llLastTime = llNow - iDays * DAY;
+        vContacts[uContact++].llLastTimeContacted = llNow - iDays * DAY;
     }
     Store(vContacts);
     ASSERT_EQ(m_logic.MemInit(true), 0);

@@ -163,9 +163,9 @@ TEST(IdTexts, HoldWhatFits)
 TEST_F(Reader, MakesRecordsOfRows)
 {
     const std::string strZhang = "张张张张张张张张张张";
-    tag_ProviderContact full = {-4, "安", "k", IdText(101), "6", 1'700'000'000'123, 2, 8};
+    tag_DatabaseContact full = {-4, "安", "k", IdText(101), "6", 1'700'000'000'123, 2, 8};
     full.bSecret = full.bMail = full.bPhone = true;
-    tag_ProviderContact secret = {1, "", "", "7.x.9", IdText(21)};
+    tag_DatabaseContact secret = {1, "", "", "7.x.9", IdText(21)};
     secret.bSecret = secret.bStarred = secret.bAddress = true;
     m_provider.PutAll({full,
                        secret,
@@ -366,16 +366,22 @@ TEST_F(Reader, WaitsForTheRecordQueriesAsLongAsItTakes)
     }
 }
 
-// The file is replaced by another: an operation that kept its connection still reads the old one.
-TEST_F(Reader, KeepsItsConnectionUntilAReadIsComplete)
+// The file is replaced by another: who kept his connection still reads the old one.
+TEST_F(Reader, KeepsItsConnectionUntilARecordReadIsComplete)
 {
     m_provider.Put({1});
     EXPECT_EQ(0, ReadOnline());
-    fs::remove(CDataPaths::Database());
-    CProviderDatabase().PutAll({{1}, {2}});
-    EXPECT_EQ(0, Count());
-    EXPECT_EQ(1, m_iCount);
-    EXPECT_EQ(0, ReadAll());
-    EXPECT_EQ(0, Count());
-    EXPECT_EQ(2, m_iCount);
+    for (const bool bAll : {true, false})
+    {
+        EXPECT_EQ(0, Count());
+        const int iOld = m_iCount;
+        fs::remove(CDataPaths::Database());
+        CProviderDatabase().PutAll({{1}, {2}, {3, "", "", "", "", 0, 0, 0, "", bAll}});
+        EXPECT_EQ(0, Count());
+        EXPECT_EQ(iOld, m_iCount);
+        tag_ContactsStruct record = {};
+        EXPECT_EQ(0, bAll ? ReadAll() : m_reader.ReadContactsByID(1, &record, m_iCount));
+        EXPECT_EQ(0, Count());
+        EXPECT_EQ(bAll ? 3 : 2, m_iCount);
+    }
 }

@@ -293,6 +293,7 @@ TEST_F(Store, TellsItsStates)
     CDataDirectory::WriteBytes(CDataPaths::ContactReg(), "");
     EXPECT_EQ(CStoreRegister::Inspect(&reg), STORE_MISSING);
     EXPECT_TRUE(m_log.Texts(ERROR_LINE).empty());
+    EXPECT_EQ(m_store.GetMemSize(nullptr), 0);
     CDataDirectory::WriteBytes(CDataPaths::ContactReg(), std::string("\0\0\0\0\1", 5));
     EXPECT_EQ(CStoreRegister::Inspect(&reg), STORE_DAMAGED);
     EXPECT_EQ(reg, (tag_ContactReg{0, 0, 0}));

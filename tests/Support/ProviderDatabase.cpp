@@ -1,52 +1,46 @@
 #include "tests/Support/ProviderDatabase.h"
 
 #include "Common/DataPaths.h"
+#include "tools/ContactDatabase.h"
+
+#include <filesystem>
 
 namespace
 {
-
-constexpr const char* SCHEMA =
-    "create table if not exists contacts(_id integer primary key, times_contacted integer, "
-    "starred integer, has_phone_number integer, last_time_contacted integer, "
-    "single_is_secret integer, photo_file_id integer, status_update_id integer);"
-    "create table if not exists visible_contacts(_id integer primary key);"
-    "create table if not exists localizer(contact_id integer primary key, display_name text, "
-    "localizerkey text, group_id text, account_id text, hasMail integer, hasAddress integer);"
-    "create table if not exists status_updates(status_update_data_id integer primary key, "
-    "status text);";
 
 // A change waits for readers in other processes.
 constexpr int BUSY_TIMEOUT_MS = 20000;
 
 } // namespace
 
-CProviderDatabase::CProviderDatabase(const std::string& strPath)
-    : m_database(CSqliteDatabase::Create(strPath.empty() ? CDataPaths::Database() : strPath))
+CProviderDatabase::CProviderDatabase()
+    : m_bNew(!std::filesystem::exists(CDataPaths::Database())),
+      m_database(CSqliteDatabase::Create(CDataPaths::Database()))
 {
     m_database.SetBusyWait(BUSY_TIMEOUT_MS);
     // No test outlives the machine: what the disk holds is of no interest.
     Execute("pragma synchronous=off");
-    Execute(SCHEMA);
+    Execute(m_bNew ? PROVIDER_SCHEMA : "");
 }
 
-void CProviderDatabase::Put(const tag_ProviderContact& contact)
+void CProviderDatabase::Put(const tag_DatabaseContact& contact)
 {
-    Change("insert or replace into contacts values(?,?,?,?,?,?,0,?)", contact.iId, contact.iTimes,
-           contact.bStarred, contact.bPhone, contact.llLastTime, contact.bSecret,
-           contact.iStatusId);
-    Change("insert or replace into localizer values(?,?,?,?,?,?,?)", contact.iId, contact.strName,
+    Change("insert or replace into contacts values(?,?,?,?,?,?,0,?)", contact.llID,
+           contact.iTimesContacted, contact.llLastTimeContacted, contact.bStarred, contact.bPhone,
+           contact.bSecret, contact.llStatusUpdateID);
+    Change("insert or replace into localizer values(?,?,?,?,?,?,?)", contact.llID, contact.strName,
            contact.strKey, contact.strGroups, contact.strAccounts, contact.bMail, contact.bAddress);
-    SetVisible(contact.iId, contact.bVisible);
-    if (contact.iStatusId != 0)
+    SetVisible(contact.llID, contact.bVisible);
+    if (contact.llStatusUpdateID != 0)
     {
-        SetOnline(contact.iStatusId, contact.bOnline);
+        SetOnline(contact.llStatusUpdateID, !contact.strStatus.empty());
     }
 }
 
-void CProviderDatabase::PutAll(const std::vector<tag_ProviderContact>& vContacts)
+void CProviderDatabase::PutAll(const std::vector<tag_DatabaseContact>& vContacts)
 {
     Execute("begin");
-    for (const tag_ProviderContact& contact : vContacts)
+    for (const tag_DatabaseContact& contact : vContacts)
     {
         Put(contact);
     }
@@ -66,11 +60,11 @@ void CProviderDatabase::SetName(int iId, const std::string& strName, const std::
            strKey, iId);
 }
 
-void CProviderDatabase::SetVisible(int iId, bool bVisible)
+void CProviderDatabase::SetVisible(int64_t llID, bool bVisible)
 {
     Change(bVisible ? "insert or replace into visible_contacts values(?)"
                     : "delete from visible_contacts where _id=?",
-           iId);
+           llID);
 }
 
 void CProviderDatabase::SetStarred(int iId, bool bStarred)
@@ -85,9 +79,9 @@ void CProviderDatabase::SetLastTime(int iId, long long llTime)
            llTime, iId);
 }
 
-void CProviderDatabase::SetOnline(int iStatusId, bool bOnline)
+void CProviderDatabase::SetOnline(int64_t llStatusID, bool bOnline)
 {
     Change(bOnline ? "insert or replace into status_updates values(?,'online')"
                    : "delete from status_updates where status_update_data_id=?",
-           iStatusId);
+           llStatusID);
 }

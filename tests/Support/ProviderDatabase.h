@@ -1,54 +1,34 @@
 #ifndef QV_TESTS_SUPPORT_PROVIDERDATABASE_H
 #define QV_TESTS_SUPPORT_PROVIDERDATABASE_H
 
+#include "tools/DatabaseContact.h"
 #include "tools/Sqlite.h"
 
 #include <string>
 #include <vector>
-
-// One contact as the provider keeps it. What is not set is what most contacts have.
-struct tag_ProviderContact
-{
-    int iId = 0;
-    std::string strName{}; // UTF-8
-    std::string strKey{};  // localizer codes in UTF-8
-    std::string strGroups{};
-    std::string strAccounts{};
-    long long llLastTime = 0;
-    int iTimes = 0;
-    int iStatusId = 0;
-    bool bStarred = false;
-    bool bPhone = false;
-    bool bSecret = false;
-    bool bMail = false;
-    bool bAddress = false;
-    bool bVisible = true;
-    bool bOnline = false; // writes the row of iStatusId into status_updates
-};
 
 // A provider database in a real file, changed through a connection of its own as the provider
 // would. Any error of SQLite is thrown.
 class CProviderDatabase
 {
 public:
-    // Makes the file (CDataPaths::Database() when no path is given) with its empty tables; an
-    // existing database is opened and its tables kept.
-    explicit CProviderDatabase(const std::string& strPath = std::string());
+    // Opens the library's database; makes it with empty tables where there is none.
+    CProviderDatabase();
 
-    // Inserts the contact, or replaces all its rows. The status row is set or removed too when
-    // iStatusId is not 0.
-    void Put(const tag_ProviderContact& contact);
+    // Inserts the contact, or replaces all its rows. Its status row is set or removed, too, when it
+    // has the id of one.
+    void Put(const tag_DatabaseContact& contact);
     // All of them in one transaction.
-    void PutAll(const std::vector<tag_ProviderContact>& vContacts);
+    void PutAll(const std::vector<tag_DatabaseContact>& vContacts);
     // Removes the contact from every table but status_updates.
     void Remove(int iId);
 
     void SetName(int iId, const std::string& strName, const std::string& strKey);
-    void SetVisible(int iId, bool bVisible);
+    void SetVisible(int64_t llID, bool bVisible);
     void SetStarred(int iId, bool bStarred);
     // Stores the time and raises times_contacted by one.
     void SetLastTime(int iId, long long llTime);
-    void SetOnline(int iStatusId, bool bOnline);
+    void SetOnline(int64_t llStatusID, bool bOnline);
 
     // Keeps every other connection from reading until Unlock.
     void LockExclusive() { Execute("begin exclusive"); }
@@ -63,6 +43,7 @@ private:
         CSqliteStatement(m_database, szSql).Run(values...);
     }
 
+    bool m_bNew;
     CSqliteDatabase m_database;
 };
 

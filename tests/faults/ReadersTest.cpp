@@ -30,7 +30,7 @@ protected:
     {
         m_directory.InstallPinyinTable();
         CLocalizerLogic().MemInit(true);
-        std::vector<tag_ProviderContact> vContacts;
+        std::vector<tag_DatabaseContact> vContacts;
         for (int iId = 1; iId <= CONTACTS; ++iId)
         {
             for (int i = 0; i < 3; ++i) // the last of them stays

@@ -19,12 +19,12 @@ constexpr int SINGLE_CHANGES = 4; // at the start of the list
 constexpr uint32_t DURABLE = ~CONTACT_FLAG_ONLINE;
 constexpr const char* NAMES[] = {"张安", "Tom", "王小明", "", "李四"};
 
-tag_ProviderContact Contact(int iId, const std::string& strName)
+tag_DatabaseContact Contact(int iId, const std::string& strName)
 {
-    tag_ProviderContact contact = {iId, strName, LocalizerKeyOf(strName)};
-    contact.llLastTime = FIRST_TIME + iId % 3 * 1000LL + iId;
-    contact.iStatusId = FIRST_STATUS + iId;
-    contact.bOnline = iId == 1 || iId == 5;
+    tag_DatabaseContact contact = {iId, strName, LocalizerKeyOf(strName)};
+    contact.llLastTimeContacted = FIRST_TIME + iId % 3 * 1000LL + iId;
+    contact.llStatusUpdateID = FIRST_STATUS + iId;
+    contact.strStatus = iId == 1 || iId == 5 ? "online" : "";
     return contact;
 }
 

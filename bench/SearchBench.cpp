@@ -18,7 +18,7 @@
 #include "bench/Queries.h"
 #include "bench/Workload.h"
 #include "tests/Support/ProviderDatabase.h"
-#include "tests/Support/WideText.h"
+#include "tools/Utf8Text.h"
 
 #include <algorithm>
 #include <benchmark/benchmark.h>
@@ -215,7 +215,7 @@ void CountKeystrokes(benchmark::State& state, const std::vector<tag_Keystroke>& 
         std::max_element(vKeystrokes.begin(), vKeystrokes.end(),
                          [](const tag_Keystroke& a, const tag_Keystroke& b)
                          { return a.dSeconds / a.dAllowed < b.dSeconds / b.dAllowed; });
-    const std::string strWorst = Narrow(std::wstring(worst->pQuery->szText, worst->uTyped));
+    const std::string strWorst = Utf8Text(std::wstring(worst->pQuery->szText, worst->uTyped));
     state.SetLabel("worst share: " + strWorst + ", " + std::to_string(worst->iAfter) + " found");
     state.counters["keystrokes"] = static_cast<double>(vKeystrokes.size());
     state.counters["p50_us"] = Percentile(vTimes, 50);

@@ -6,7 +6,7 @@
 #include "Platform/LogSink.h"
 #include "bench/NameSource.h"
 #include "tests/Support/ProviderDatabase.h"
-#include "tests/Support/WideText.h"
+#include "tools/Utf8Text.h"
 
 #include <chrono>
 #include <cstdlib>
@@ -106,8 +106,8 @@ void CWorkload::FillDatabase() const
         const std::wstring strName = m_surname == 0 ? names.Next() : names.NextOf(m_surname);
         tag_DatabaseContact contact;
         contact.llID = i;
-        contact.strName = Narrow(strName);
-        contact.strKey = Narrow(keys.KeyOf(strName));
+        contact.strName = Utf8Text(strName);
+        contact.strKey = Utf8Text(keys.KeyOf(strName));
         contact.strGroups = std::to_string(1 + i % GROUPS);
         contact.strAccounts = std::to_string(1 + i % ACCOUNTS);
         contact.llLastTimeContacted = FIRST_TIME_MS + (i * 7919LL % TIME_STEPS) * HOUR_MS;

@@ -6,7 +6,7 @@
 #include "Core/LocalizerLogic.h"
 #include "Filter/FilterChain.h"
 #include "LocalizerImpl/QVLocalizerManager.h"
-#include "tests/Support/WideText.h"
+#include "tools/Utf8Text.h"
 
 #include <chrono>
 #include <cstdio>
@@ -49,7 +49,7 @@ int main(int argc, char** argv)
     std::vector<std::wstring> vTexts;
     for (int i = 2; i < argc; ++i)
     {
-        vTexts.push_back(Wide(argv[i]));
+        vTexts.push_back(WideText(argv[i]));
     }
     CLocalizerLogic logic;
     CFilterChain chain;

@@ -3,7 +3,7 @@
 #include "Common/FileHelpers.h"
 #include "Common/SystemTime.h"
 #include "tests/Support/DataDirectory.h"
-#include "tests/Support/WideText.h"
+#include "tools/Utf8Text.h"
 
 #include <chrono>
 #include <csignal>
@@ -55,9 +55,9 @@ TEST_F(Files, HaveNamesThatAShellWouldMakeSomethingElseOf)
         Make(strName);
         EXPECT_EQ(1, _MoveFile(strName.c_str(), "moved"));
         EXPECT_EQ(strName, CDataDirectory::ReadBytes("moved"));
-        EXPECT_EQ(1, _wc_MoveFile(L"moved", Wide(strName).c_str()));
+        EXPECT_EQ(1, _wc_MoveFile(L"moved", WideText(strName).c_str()));
         EXPECT_EQ(strName, CDataDirectory::ReadBytes(strName));
-        EXPECT_EQ(1, _wc_DeleteFile(Wide(strName).c_str()));
+        EXPECT_EQ(1, _wc_DeleteFile(WideText(strName).c_str()));
         Make(strName);
         EXPECT_EQ(1, _DeleteFile(strName.c_str()));
         EXPECT_EQ(1, Entries());
@@ -78,7 +78,8 @@ TEST_F(Files, HaveNamesThatAShellWouldMakeSomethingElseOf)
     EXPECT_EQ(1, _wc_DeleteFile(nullptr));
     wchar_t szPath[5000] = {};
     EXPECT_EQ(0, GetModuleFileName(nullptr, szPath, 4096));
-    EXPECT_EQ(Wide(fs::read_symlink("/proc/self/exe").string()), szPath) << "linked into the test";
+    EXPECT_EQ(WideText(fs::read_symlink("/proc/self/exe").string()), szPath)
+        << "linked into the test";
 }
 
 TEST(SystemTime, PointsInTimeHaveTheirCalendarForm)

@@ -10,7 +10,7 @@
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/ProviderDatabase.h"
 #include "tests/Support/StoreImage.h"
-#include "tests/Support/WideText.h"
+#include "tools/Utf8Text.h"
 
 #include <gtest/gtest.h>
 #include <memory>
@@ -97,7 +97,7 @@ protected:
                      const Set& pLast = nullptr, CFilterChain* pChain = nullptr)
     {
         tag_Found found;
-        found.strInput = Wide(strInput);
+        found.strInput = WideText(strInput);
         wchar_t szWords[CN_WORD_MAX + 1] = {};
         tag_LocalizerResult* pResult = nullptr;
         found.iRet = m_logic.Search(pLast.get(), found.strInput.data(), eType,
@@ -109,7 +109,7 @@ protected:
                             { EXPECT_EQ(m_logic.FreeSearchResult(pSet), 0); });
         }
         EXPECT_EQ(szWords[CN_WORD_MAX], 0) << "more than the caller has room for";
-        found.strWords = Narrow(szWords);
+        found.strWords = Utf8Text(szWords);
         return found;
     }
 

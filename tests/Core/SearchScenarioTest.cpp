@@ -74,7 +74,7 @@ TEST_F(CSearchTest, RanksAndTellsWhatMayFollow)
     EXPECT_EQ(all.lMask, 0x800901) << "a, i, l or x";
     // The caller's text is changed in place.
     const std::string strCode = LocalizerKeyOf("李");
-    EXPECT_EQ(Narrow(Search("Z李# 9").strInput), "z" + strCode + "# 9");
+    EXPECT_EQ(Utf8Text(Search("Z李# 9").strInput), "z" + strCode + "# 9");
     EXPECT_EQ(Search(strCode).Contacts(), Ids{3}) << "codes stay codes";
     EXPECT_EQ(Search("ZHANGSAN12").lMask, 0);
     EXPECT_EQ(Search("ZHANGSAN123").iRet, LOC_ERR_PARAM);

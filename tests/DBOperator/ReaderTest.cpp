@@ -8,7 +8,7 @@
 #include "tests/Support/LogCapture.h"
 #include "tests/Support/MemoryFailure.h"
 #include "tests/Support/ProviderDatabase.h"
-#include "tests/Support/WideText.h"
+#include "tools/Utf8Text.h"
 
 #include <algorithm>
 #include <filesystem>
@@ -51,8 +51,8 @@ std::string TextOf(const tag_ContactsStruct& record)
 {
     std::ostringstream text;
     text << record.iContactID << ' ' << record.iFlags << ' ' << record.llLastTimeContacted << ' '
-         << record.iTimesContacted << ' ' << record.iStatusUpdateID << ' ' << Narrow(record.szName)
-         << ' ' << Narrow(record.szLocalizerKey) << " ";
+         << record.iTimesContacted << ' ' << record.iStatusUpdateID << ' '
+         << Utf8Text(record.szName) << ' ' << Utf8Text(record.szLocalizerKey) << " ";
     const char* szSeparator = "";
     for (const QVLong32 lId : record.lGroupID)
     {

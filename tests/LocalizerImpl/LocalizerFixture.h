@@ -4,7 +4,7 @@
 #include "LocalizerImpl/QVLocalizerManager.h"
 #include "tests/Support/DataDirectory.h"
 #include "tests/Support/LogCapture.h"
-#include "tests/Support/WideText.h"
+#include "tools/Utf8Text.h"
 
 #include <cstring>
 #include <gtest/gtest.h>
@@ -33,7 +33,7 @@ protected:
     // The code of a three-byte character, found by looking at every record; 0 without a record.
     wchar_t HanZi(wchar_t character) const
     {
-        const std::string strKey = Narrow({character});
+        const std::string strKey = Utf8Text({character});
         for (int i = 0; i < 15422; ++i)
         {
             if (strKey == m_pMap[i].szWord)

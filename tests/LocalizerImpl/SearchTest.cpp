@@ -115,7 +115,7 @@ private:
         const int iFits =
             TMatcher::CmpChineseWord(pMap, code, record, szPiece, pMask, bLastPiece, bFull);
         m_uMask = pMask->lMask;
-        const std::wstring strWord = Wide(record.szWord);
+        const std::wstring strWord = WideText(record.szWord);
         if (iFits != 0 && bLastPiece != 0 && szPiece[0] >= L'a' && szPiece[0] <= L'z' &&
             m_strWords.find(strWord) == std::wstring::npos && m_strWords.size() < CN_WORD_MAX)
         {
@@ -169,12 +169,12 @@ protected:
     template <class TMatcher>
     Details Compare(Details vNames, std::wstring strInput, bool bAnywhere)
     {
-        SCOPED_TRACE("typed " + Narrow(strInput));
+        SCOPED_TRACE("typed " + Utf8Text(strInput));
         const tag_Answer answer = DoSearch<TMatcher>(vNames, strInput, bAnywhere);
         CStepwise<TMatcher> stepwise(bAnywhere ? 1 : 0);
         const tag_Answer expected = stepwise.Search(m_pMap, vNames, strInput);
         EXPECT_EQ(answer.uMask, expected.uMask);
-        EXPECT_EQ(Narrow(answer.strWords), Narrow(expected.strWords));
+        EXPECT_EQ(Utf8Text(answer.strWords), Utf8Text(expected.strWords));
         EXPECT_TRUE(BytesOf(answer.vEntries) == BytesOf(expected.vEntries)) << "entries differ";
         return answer.vEntries;
     }
@@ -338,7 +338,7 @@ TEST_F(Search, FitsPiecesToCharacters)
     for (const auto& [bDigits, szName, vPieces, expected] : ROWS)
     {
         EXPECT_EQ(Do(bDigits, szName, vPieces), expected)
-            << Narrow(szName) << ' ' << testing::PrintToString(vPieces);
+            << Utf8Text(szName) << ' ' << testing::PrintToString(vPieces);
     }
     // Lengths that are handed in stay unless all is whole.
     EXPECT_EQ(Do(false, L"三", {L"s"}, 7, 0), (Compared{1, 7, 0}));
@@ -377,8 +377,8 @@ TEST_F(Search, TriesOnlyWhatCanEndAText)
         Pieces vPieces = {L"!", szPiece};
         android::Vector<wchar_t*> vLastFirst;
         FillLastFirst(vPieces, vLastFirst);
-        EXPECT_EQ(m_letters.IsValid(vLastFirst), bAsLetters) << Narrow(szPiece);
-        EXPECT_EQ(m_digits.IsValid(vLastFirst), bAsDigits) << Narrow(szPiece);
+        EXPECT_EQ(m_letters.IsValid(vLastFirst), bAsLetters) << Utf8Text(szPiece);
+        EXPECT_EQ(m_digits.IsValid(vLastFirst), bAsDigits) << Utf8Text(szPiece);
     }
 }
 

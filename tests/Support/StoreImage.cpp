@@ -2,7 +2,7 @@
 
 #include "Common/NameOrder.h"
 #include "Core/LocalizerLogic.h"
-#include "tests/Support/WideText.h"
+#include "tools/Utf8Text.h"
 
 #include <filesystem>
 #include <stdexcept>
@@ -86,11 +86,11 @@ std::string DifferenceOf(const tag_StoreImage& store, const tag_StoreImage& fres
 
 std::string LocalizerKeyOf(const std::string& strName)
 {
-    std::wstring strWide = Wide(strName).substr(0, CONTACT_MAX_NAME);
+    std::wstring strWide = WideText(strName).substr(0, CONTACT_MAX_NAME);
     wchar_t szKey[CONTACT_MAX_KEY + 1] = {};
     if (CLocalizerLogic().GetLocalizer(strWide.data(), szKey) != 0)
     {
         throw std::runtime_error("no key for the name " + strName);
     }
-    return Narrow(szKey);
+    return Utf8Text(szKey);
 }

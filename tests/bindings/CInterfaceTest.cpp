@@ -67,7 +67,7 @@ TEST_F(CInterfaceTest, SearchesWithinAResultAndPages)
     const qv_match& match = qv_result_matches(found.get())[1];
     EXPECT_EQ(std::tie(match.contact_id, match.name_order, match.first, match.last),
               std::make_tuple(1, 4, 0, 1));
-    EXPECT_EQ(std::wstring(match.codes, match.codes + 3), Wide(szKey) + L'\0');
+    EXPECT_EQ(std::wstring(match.codes, match.codes + 3), WideText(szKey) + L'\0');
     EXPECT_EQ(match.last_contacted, Contact(1, "").llLastTimeContacted);
     EXPECT_EQ(qv_result_matches(Search("qqq").get()), nullptr);
     // A result outlives its index and the store's next build.

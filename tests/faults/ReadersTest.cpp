@@ -3,8 +3,8 @@
 
 #include "tests/Support/ChildProcess.h"
 #include "tests/Support/LogCapture.h"
-#include "tests/Support/WideText.h"
 #include "tests/faults/StoreCase.h"
+#include "tools/Utf8Text.h"
 
 #include <chrono>
 #include <gtest/gtest.h>
@@ -37,7 +37,7 @@ protected:
             {
                 const std::string strName = STARTS[(iId + i) % 3] + std::to_string(iId);
                 vContacts.push_back({iId, strName, LocalizerKeyOf(strName)});
-                m_mapIds[Wide(vContacts.back().strKey)] = iId;
+                m_mapIds[WideText(vContacts.back().strKey)] = iId;
             }
         }
         CProviderDatabase().PutAll(vContacts);

@@ -2,7 +2,7 @@
 
 #include "Filter/Filter.h"
 #include "Filter/FilterChain.h"
-#include "tests/Support/WideText.h"
+#include "tools/Utf8Text.h"
 
 #include <cwchar>
 #include <filesystem>
@@ -155,7 +155,7 @@ std::string TextOf(CLocalizerLogic& logic, const tag_Answer& answer)
     std::string strText = std::to_string(answer.iRet);
     if (answer.pResult == nullptr)
     {
-        return answer.iRet == 0 ? strText + Narrow(answer.szText) : strText;
+        return answer.iRet == 0 ? strText + Utf8Text(answer.szText) : strText;
     }
     for (int i = 0; i < answer.pResult->iResultNum; ++i)
     {

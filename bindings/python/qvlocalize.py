@@ -16,6 +16,9 @@ A process has one data directory open at a time. Calls on one index, from any th
 other. Failures raise Error, with the library's description and a Status as its code. The module
 finds libqvlocalize.so.1 at QVLOCALIZE_LIBRARY, in its own installation, or in the system's library
 path.
+
+In the examples below, index is the index of the sample that "qvlocalize sample" makes, database is
+a connection to the sample's contacts2.db, and names has the contacts' names by their ids.
 """
 
 from __future__ import annotations
@@ -165,7 +168,17 @@ _lib = _load()
 
 
 class Error(Exception):
-    """A failure of the library, with its description."""
+    """A failure of the library, with its description and a Status.
+
+    >>> index.search("zhangsansan")
+    Traceback (most recent call last):
+    qvlocalize.Error: a text has too many characters
+    >>> try:
+    ...     index.search("zhangsansan")
+    ... except qvlocalize.Error as error:
+    ...     error.code
+    <Status.ERROR_TOO_LONG: -4>
+    """
 
     def __init__(self, code: int):
         super().__init__(_lib.qv_strerror(code).decode())
@@ -196,7 +209,15 @@ _log_function = _LogFunction(0)  # kept for as long as the library may call it
 def set_log(callback: Optional[Callable[[int, str, str], None]]) -> None:
     """Sends each line of the library's log to callback(priority, tag, text), priority 3 for
     progress and 6 for errors; None restores standard error for the errors. No other call of the
-    library may run meanwhile, and the callback must not call it."""
+    library may run meanwhile, and the callback must not call it.
+
+    >>> qvlocalize.set_log(lambda *line: print(line))
+    >>> result = index.search("zs")
+    (3, 'QV_Localize', 'QV_Contacts: Search Start')
+    ...
+    >>> qvlocalize.set_log(None)
+    >>> result = index.search("zs")
+    """
     global _log_function
     function = _LogFunction(0)
     if callback is not None:
@@ -232,7 +253,18 @@ def _match(entry: _Match) -> Match:
 
 class Result(Sequence):
     """What a search found, the best match first. Later changes of the index do not affect it, and
-    it may outlive the index. It is released with the object, by close, or at the end of a with."""
+    it may outlive the index. It is released with the object, by close, or at the end of a with.
+
+    >>> result = index.search("zhangsan")
+    >>> len(result)
+    4
+    >>> result[-1]
+    Match(contact_id=4, name_order=233, last_contacted=..., first=1, last=2, index_character='')
+    >>> [names[match.contact_id] for match in result]
+    ['张三', '張三豐', '章三', '李张三']
+    >>> [names[match.contact_id] for match in result[1:4:2]]
+    ['張三豐', '李张三']
+    """
 
     def __init__(self, pointer: ctypes.c_void_p, lock: threading.Lock):
         self._pointer = pointer
@@ -242,7 +274,14 @@ class Result(Sequence):
         self._matches = _lib.qv_result_matches(pointer)
 
     def close(self) -> None:
-        """Releases the matches; the result cannot be used any more."""
+        """Releases the matches; the result cannot be used any more.
+
+        >>> with index.search("zhangsan") as result:
+        ...     contact_ids = [match.contact_id for match in result]
+        >>> len(result)
+        Traceback (most recent call last):
+        ValueError: the result is closed
+        """
         with self._lock:
             self._release()
 
@@ -277,24 +316,47 @@ class Result(Sequence):
             yield self[place]
 
     def find(self, contact_id: int) -> Optional[int]:
-        """The place of a contact, None when it is not among the matches."""
+        """The place of a contact, None when it is not among the matches.
+
+        >>> result = index.search("zhangsan")
+        >>> result.find(6), result.find(54)
+        (2, None)
+        """
         place = _lib.qv_result_find(self._open(), _int32(contact_id))
         return place if place >= 0 else None
 
     @property
     def next_keys(self) -> str:
-        """The letters that can usefully be typed next, and "#" for digits and other characters."""
+        """The letters that can usefully be typed next, and "#" for digits and other characters.
+
+        >>> index.search("zha", starred=True).next_keys
+        'nosxy#'
+        """
         mask = _lib.qv_next_keys(self._open())
         return "".join(key for bit, key in enumerate(_LETTERS + _OTHER_KEYS) if mask >> bit & 1)
 
     @property
     def candidates(self) -> str:
-        """The Chinese characters that the last typed letters may stand for, at most 20."""
+        """The Chinese characters that the last typed letters may stand for, at most 20.
+
+        >>> index.search("zha", starred=True).candidates
+        '朝张赵涵'
+        """
         return _lib.qv_candidates(self._open()).decode()
 
     @property
     def sections(self) -> List[Section]:
-        """The sections of an empty text's matches; none for any other text."""
+        """The sections of an empty text's matches; none for any other text.
+
+        >>> result = index.search("", starred=True)
+        >>> section = result.sections[2]
+        >>> section
+        Section(label='C', first=7, count=2)
+        >>> [names[match.contact_id] for match in result[section.first:][:section.count]]
+        ['Carlos Dubois', '曹伟']
+        >>> result[section.first].index_character
+        'C'
+        """
         found = (_Section * _MAX_SECTIONS)()
         count = _lib.qv_result_sections(self._open(), found)
         return [Section(chr(section.label), section.first, section.count)
@@ -306,7 +368,12 @@ Ids = Union[int, Iterable[int], None]
 
 class Index:
     """The index of a data directory, None being the contacts provider's on Android. Closed by close
-    or at the end of a with."""
+    or at the end of a with. Before that the process opens no other data directory:
+
+    >>> qvlocalize.Index("/var")
+    Traceback (most recent call last):
+    qvlocalize.Error: the process has another data directory open
+    """
 
     def __init__(self, data_dir: Union[str, os.PathLike, None] = None):
         path = os.fsencode(data_dir) if data_dir is not None else None
@@ -335,7 +402,11 @@ class Index:
 
     @property
     def needs_build(self) -> bool:
-        """Whether there is no index to search yet."""
+        """Whether there is no index to search yet.
+
+        >>> index.needs_build
+        False
+        """
         return self._call(_lib.qv_needs_build) != 0
 
     def build(self, force: bool = False) -> None:
@@ -349,6 +420,19 @@ class Index:
         """Searches for at most ten characters, or lists all for an empty text, among the contacts
         that pass all filters, or within an earlier result, which is not changed and for which
         filters are ignored. Filters with an id take one or several; group -1: secret contacts.
+
+        >>> def found(*text, **filters):
+        ...     return [names[match.contact_id] for match in index.search(*text, **filters)]
+        >>> found("zhangsan", group=2)
+        ['张三', '李张三']
+        >>> found("张s", group=[1, 2], phone=True)
+        ['张三']
+        >>> found("94264726", qvlocalize.Kind.DIGITS, not_contact=[1, 4])
+        ['張三豐', '章三']
+        >>> found("zsf", within=index.search("zs"))
+        ['張三豐']
+        >>> found("zsf", within=index.search("zs", group=99))
+        []
         """
         filters = _filters(starred=starred, phone=phone, mail=mail, postal=postal, online=online,
                            group=group, account=account, not_group=not_group,
@@ -364,49 +448,102 @@ class Index:
         return Typing(self, kind, **filters)
 
     def localizer_key(self, name: str) -> str:
-        """The key of a name, which the database keeps in localizer.localizerkey."""
+        """The key of a name, which the database keeps in localizer.localizerkey.
+
+        >>> index.localizer_key("张三")
+        'ᰠစ'
+        """
         return self.localizer_keys([name])[0]
 
     def localizer_keys(self, names: Sequence[str]) -> List[str]:
-        """The keys of many names with one mapping of the pinyin table."""
+        """The keys of many names with one mapping of the pinyin table.
+
+        >>> index.localizer_keys(["张三", "Tom 2"])
+        ['ᰠစ', '伓伎伌倀娂']
+        """
         texts = (ctypes.c_char_p * len(names))(*[_utf8(name) for name in names])
         keys = ((ctypes.c_char * _KEY_SIZE) * len(names))()
         self._call(_lib.qv_localizer_keys, texts, len(names), keys)
         return [key.value.decode() for key in keys]
 
     def pick(self, text: str, position: int, character: str) -> str:
-        """The text that is searched after character was picked for the letters before position."""
+        """The text that is searched after character was picked for the letters before position.
+
+        >>> index.pick("zhangs", 6, "三")
+        'ZHANG三'
+        """
         buffer = ctypes.create_string_buffer(_PICK_SIZE)
         self._call(_lib.qv_pick, _utf8(text), _int32(position), _utf8(character), buffer,
                    _PICK_SIZE)
         return buffer.value.decode()
 
     def contacts_changed(self, ids: Iterable[int]) -> None:
-        """These contacts were added, changed or removed, and the database has the change."""
+        """These contacts were added, changed or removed, and the database has the change.
+
+        >>> with database:
+        ...     cursor = database.execute(
+        ...         "UPDATE localizer SET display_name = ?, localizerkey = ? WHERE contact_id = ?",
+        ...         ("张三", index.localizer_key("张三"), 54))
+        >>> index.contacts_changed([54])
+        >>> [match.contact_id for match in index.search("zhangsan")]
+        [54, 1, 5, 6, 4]
+        """
         changed = list(ids)
         self._call(_lib.qv_contacts_changed, (ctypes.c_int64 * len(changed))(*changed),
                    len(changed))
 
     def all_contacts_changed(self) -> None:
-        """Any contacts may have changed: rebuilds the index."""
+        """Any contacts may have changed: rebuilds the index.
+
+        >>> with database:
+        ...     cursor = database.execute("DELETE FROM visible_contacts WHERE _id IN (1, 6)")
+        >>> index.all_contacts_changed()
+        >>> [names[match.contact_id] for match in index.search("zhangsan")]
+        ['張三豐', '李张三']
+        """
         self._call(_lib.qv_all_contacts_changed)
 
     def status_changed(self) -> None:
-        """Who is online changed."""
+        """Who is online changed.
+
+        >>> with database:
+        ...     cursor = database.execute(
+        ...         "UPDATE status_updates SET status = 'online' "
+        ...         "WHERE status_update_data_id = 1005")
+        >>> index.status_changed()
+        >>> [names[match.contact_id] for match in index.search("zhangsan", online=True)]
+        ['章三']
+        """
         self._call(_lib.qv_status_changed)
 
     def time_changed(self, contact_id: int, time: int) -> None:
-        """The contact was contacted at time, in milliseconds since 1970."""
+        """The contact was contacted at time, in milliseconds since 1970.
+
+        >>> index.time_changed(54, 1_800_000_000_123)
+        >>> index.search("tom")[0].last_contacted
+        1800000000123
+        """
         self._call(_lib.qv_time_changed, _int32(contact_id), time)
 
     def star_changed(self, contact_id: int, starred: bool) -> None:
-        """The contact became a favourite or ceased to be one."""
+        """The contact became a favourite or ceased to be one.
+
+        >>> index.star_changed(54, True)
+        >>> [match.contact_id for match in index.search("tom", starred=True)]
+        [54]
+        """
         self._call(_lib.qv_star_changed, _int32(contact_id), starred)
 
     @property
     def sort_type(self) -> SortType:
         """The order of the index; a new one takes effect with the next build or notification of
-        contacts or status."""
+        contacts or status.
+
+        >>> index.sort_type = qvlocalize.SortType.TIME
+        >>> index.build(force=True)
+        >>> index.sort_type, names[index.search("")[0].contact_id]
+        (<SortType.TIME: 1>, '郭秀英')
+        """
         return SortType(self._call(_lib.qv_get_sort_type))
 
     @sort_type.setter
@@ -428,7 +565,20 @@ def _filters(**wanted: Union[bool, Ids]) -> List[_Filter]:
 
 class Typing:
     """A text that is typed key by key: each search narrows the matches before it, and keys can be
-    taken back."""
+    taken back.
+
+    >>> typing = index.typing(starred=True)
+    >>> [len(typing.type(key)) for key in "zhangs"]
+    [15, 15, 8, 5, 3, 1]
+    >>> typing.result.candidates
+    '三'
+    >>> [names[match.contact_id] for match in typing.pick("三")]
+    ['张三']
+    >>> typing.text
+    'zhang三'
+    >>> len(typing.back()), typing.text
+    (3, 'zhang')
+    """
 
     def __init__(self, index: Index, kind: Kind, **filters: Any):
         self._index = index
@@ -463,7 +613,13 @@ class Typing:
         return self.result
 
     def back(self) -> Result:
-        """Removes the last key; an empty text stays empty."""
+        """Removes the last key; an empty text stays empty.
+
+        >>> with index.typing() as typing:
+        ...     found = typing.back()
+        >>> len(found)
+        565
+        """
         if len(self._steps) > 1:
             self._steps.pop()
         return self.result
@@ -476,7 +632,16 @@ class Typing:
         return self.type(text[kept:])
 
     def close(self) -> None:
-        """Ends the session; results that the caller still holds stay valid."""
+        """Ends the session; results that the caller still holds stay valid.
+
+        >>> with index.typing() as typing:
+        ...     result = typing.type("zhangsan")
+        >>> typing.text
+        Traceback (most recent call last):
+        ValueError: the session is closed
+        >>> len(result)
+        4
+        """
         self._steps.clear()
 
     def __enter__(self) -> Typing:

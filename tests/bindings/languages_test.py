@@ -3,11 +3,13 @@
 languages_test.py TOOL PYFILE TestClass NAME=PLACE...
 """
 import ctypes
+import doctest
 import gc
 import os
 import pathlib
 import random
 import re
+import sqlite3
 import string
 import subprocess
 import sys
@@ -114,60 +116,32 @@ class PythonTest(ModuleTest):
                     with self.subTest(text=step["typed"], sort_type=sort_type, asked=asked):
                         self.assert_same(step, result)
 
-    def test_result_is_a_sequence_until_it_is_closed(self):
+    def test_examples_in_its_documentation(self):
+        def prepare(example):
+            self.doCleanups()
+            self.setUp()
+            database = sqlite3.connect(self.database)
+            self.addCleanup(database.close)
+            names = dict(self.sql("SELECT contact_id, display_name FROM localizer"))
+            example.globs.update(qvlocalize=qvlocalize, index=self.index, database=database,
+                                 names=names)
+
+        examples = doctest.DocTestSuite(qvlocalize, setUp=prepare, optionflags=doctest.ELLIPSIS)
+        outcome = unittest.TextTestRunner(verbosity=2).run(examples)
+        self.assertTrue(outcome.wasSuccessful() and outcome.testsRun > 10)
+
+    def test_refuses_what_it_cannot_take(self):
+        self.assertEqual(["", "\u5000" + self.index.localizer_key("张")[0], "\u4f17" * 10],
+                         self.index.localizer_keys(["", "\U0001F600张", "x" * 5000]))
         result = self.index.search("z")
-        matches = list(result)
-        with result:
-            self.assertEqual((matches[-1], matches[2:9:3]), (result[-1], result[2:9:3]))
-            self.assertEqual((3, None), (result.find(matches[3].contact_id), result.find(-1)))
-            self.assertRaises(IndexError, lambda: result[len(matches)])
-        nobody = self.index.search("z", group=99)
-        self.assertEqual([], list(self.index.search("z", within=nobody)), "an empty result counts")
-        self.assertRaises(ValueError, len, result)
+        self.assertRaises(IndexError, lambda: result[len(result)])
         result.close()
-        self.assertRaises(ValueError, self.index.search, "zs", within=result)
-
-    def test_typing_narrows_takes_back_and_picks(self):
-        with self.index.typing(phone=True) as typing:
-            everybody = len(typing.result)
-            for text in ("z", "zh", "zha", "zhan", "zhang", "zhangs"):
-                typing.type(text[-1])
-                self.assertEqual(list(self.index.search(text, phone=True)), list(typing.result))
-            self.assertIn("三", typing.result.candidates)
-            picked = list(typing.pick("三"))
-            self.assertEqual("zhang三", typing.text.lower())
-            self.assertEqual(list(self.index.search("zhang三", phone=True)), picked)
-            while typing.text:
-                typing.back()
-            self.assertEqual(everybody, len(typing.back()))
-        self.assertRaises(ValueError, lambda: typing.result)
-
-    def test_converts_names_and_refuses_what_is_no_text(self):
-        names = ["张三", "Tom 2", "", "\U0001F600张", "x" * 5000]
-        known = dict(self.sql("select display_name, localizerkey from localizer"))
-        self.assertEqual([known["张三"], known["Tom 2"], "", "\u5000" + known["张三"][0],
-                          "\u4f17" * 10], self.index.localizer_keys(names))
-        self.assertEqual("ZHANG三", self.index.pick("zhangs", 6, "三"))
-        for text, error in (("z\0", ValueError), ("\ud83d", UnicodeEncodeError),
-                            ("zhangsansix", qvlocalize.Error)):
-            self.assertRaises(error, self.index.search, text)
-        with self.assertRaisesRegex(qvlocalize.Error, "another data directory") as raised:
-            qvlocalize.Index(self.data / "files")
-        self.assertEqual(Status.ERROR_OTHER_DIRECTORY, raised.exception.code)
-        self.assertRaises(OverflowError, self.index.star_changed, 2**31, True)
-
-    def test_follows_changes_of_the_database(self):
-        self.sql("update localizer set (display_name, localizerkey) = (select display_name, "
-                 "localizerkey from localizer where contact_id = 1) where contact_id = 54")
-        self.index.contacts_changed([54])
-        self.index.star_changed(54, True)
-        self.index.time_changed(54, 1_800_000_000_123)
-        match, = [match for match in self.index.search("", starred=True) if match.contact_id == 54]
-        self.assertEqual(1_800_000_000_123, match.last_contacted)
-        self.assertIsNotNone(self.index.search("zhangsan").find(54))
-        self.index.status_changed()
-        self.index.all_contacts_changed()
-        self.assertFalse(self.index.needs_build)
+        result.close()
+        for wrong, error in ((lambda: self.index.search("z\0"), ValueError),
+                             (lambda: self.index.search("\ud83d"), UnicodeEncodeError),
+                             (lambda: self.index.search("zs", within=result), ValueError),
+                             (lambda: self.index.star_changed(2**31, True), OverflowError)):
+            self.assertRaises(error, wrong)
 
     def test_threads_share_an_index_and_forgotten_objects_are_released(self):
         expected = len(self.index.search("z"))
@@ -186,15 +160,6 @@ class PythonTest(ModuleTest):
         qvlocalize.Index(self.data)  # is forgotten
         gc.collect()
         qvlocalize.Index(self.data / "files").close()  # nothing is open any more
-
-    def test_hands_the_log_on(self):
-        lines = []
-        qvlocalize.set_log(lambda *line: lines.append(line))
-        self.index.search("z")
-        qvlocalize.set_log(None)
-        self.index.search("z")
-        self.assertEqual((3, "QV_Localize", "QV_Contacts: Search Start"), lines[0])
-        self.assertEqual(1, lines.count(lines[0]))
 
 
 class JavaTest(ModuleTest):

@@ -184,6 +184,7 @@ TEST(CommonQsort, RefusesEveryValueThatIsNoOrder)
         char szKey[] = "a";
         Common_Qsort sorter;
         EXPECT_EQ(-1, sorter.QuickSort(szRecords, 2, eKind));
+        EXPECT_EQ(-1, sorter.QuickSort(szRecords, 0, SORT_TIME));
         EXPECT_STREQ("ba", szRecords);
         EXPECT_EQ(-1, sorter.Search_Bin(szRecords, 2, szKey, eKind, 1));
         EXPECT_EQ(-1, sorter.QSORT_GT(szRecords, szKey));

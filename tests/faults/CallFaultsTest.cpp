@@ -16,9 +16,10 @@ namespace
 {
 
 constexpr tag_Failures FAILURES[] = {
-    {"NoDescriptor", CALLS_FILES, EMFILE, true}, {"InputOutput", CALLS_FILES, EIO, true},
-    {"DiskFull", CALLS_ROOM, ENOSPC, false},     {"Refused", CALLS_LOCK, EWOULDBLOCK, true},
-    {"NoMemory", CALLS_MEMORY, ENOMEM, true},    {"NoMoreMemory", CALLS_MEMORY, ENOMEM, false},
+    {"NoDescriptor", CALLS_FILES, EMFILE, true},   {"InputOutput", CALLS_FILES, EIO, true},
+    {"DiskFull", CALLS_ROOM, ENOSPC, false},       {"Refused", CALLS_LOCK, EWOULDBLOCK, true},
+    {"NoLocks", CALLS_LOCK, ENOLCK, false},        {"NoMemory", CALLS_MEMORY, ENOMEM, true},
+    {"NoMoreMemory", CALLS_MEMORY, ENOMEM, false},
 };
 
 // What is wrong after an operation that met a failure.

@@ -105,6 +105,7 @@ TEST(Utf8, PrintsAFormatAsItStandsAndFormatsBelowItsBuffer)
     EXPECT_STREQ(L"张=42张x002.5", szTarget);
     EXPECT_EQ(-1, _u_wsprintf(szTarget, L"%1024d", 1));
     EXPECT_STREQ(L"张=42张x002.5", szTarget);
+    EXPECT_EQ(1, _u_wsprintf(szTarget, L"%s", ""));
     EXPECT_EQ(1024, _u_wsprintf(szTarget, L"%1023d", 1));
     EXPECT_EQ(std::wstring(1022, L' ') + L'1', szTarget);
 }

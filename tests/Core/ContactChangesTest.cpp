@@ -164,6 +164,10 @@ TEST_F(CContactChangesTest, KnowTheSmallestStores)
     SetReg({1, 0, 1});
     m_logic.OnStatusUpdatesTableChanged(0, nullptr);
     EXPECT_EQ(Reg(), (tag_ContactReg{1, 0, 1})) << "full, not marked";
+    m_provider.Remove(1);
+    SetReg({1, 0, 0});
+    m_logic.OnStatusUpdatesTableChanged(0, nullptr);
+    EXPECT_EQ(Reg(), (tag_ContactReg{0, 0, STORE_SPARE_RECORDS})) << "everybody has gone";
     // What a rebuild leaves behind the last record is nobody's any more.
     BuildNames({"张", "李"});
     m_provider.Remove(1);

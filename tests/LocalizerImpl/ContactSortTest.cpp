@@ -51,8 +51,9 @@ TEST(ContactSort, LeavesAndNumbersWhatTheSorterLeaves)
             {
                 vExpected[static_cast<size_t>(i)].iSortIndex = i;
             }
-            CQVLocalizerManager::LocalizerQuickSort(vRecords.data(), iCount,
-                                                    type == SORT_NAME ? 0 : 1);
+            EXPECT_EQ(CQVLocalizerManager::LocalizerQuickSort(vRecords.data(), iCount,
+                                                              type == SORT_NAME ? 0 : 1),
+                      0);
             ASSERT_TRUE(BytesOf(vRecords) == BytesOf(vExpected)) << "round " << iRound;
         }
     }

@@ -100,9 +100,11 @@ TEST_F(NameConversion, MakesCodesAndKeysOfNames)
     {
         PYOFWORDS* pMap = i == 0 ? nullptr : m_pMap;
         wchar_t* pName = i == 1 ? nullptr : szName;
-        EXPECT_EQ(Manager::TranslateNameToLocal(pMap, pName, i == 2 ? nullptr : szCodes), 1);
-        EXPECT_EQ(
-            Manager::TranslateChineseToPinyin(nullptr, pMap, pName, i == 2 ? nullptr : szCodes), 1);
+        wchar_t* pOut = i == 2 ? nullptr : szCodes;
+        EXPECT_EQ(Manager::TranslateNameToLocal(pMap, pName, pOut), 1);
+        EXPECT_EQ(Manager::TranslateChineseToPinyin(nullptr, pMap, pName, pOut), 1);
+        EXPECT_EQ(Manager::GetLocalizerString(i == 0 ? nullptr : szName, 1, pName, pOut),
+                  LOC_ERR_PARAM);
     }
     RemoveTable();
     tag_ContactsInfo nobody = {0, nullptr};
@@ -158,8 +160,9 @@ TEST(NameFolding, IsTheFirstRowOfTheTable)
     for (wchar_t unit = 1; unit <= 0xFFFF; ++unit)
     {
         const size_t uRow = strTraditional.find(unit);
-        wchar_t szText[] = {unit, 0};
+        wchar_t szText[] = {unit, 0, L'張'};
         Ft2Jt(szText);
+        ASSERT_EQ(szText[2], L'張') << "behind the end";
         ASSERT_EQ(szText[0], uRow == std::wstring::npos ? unit : g_szSimplified[uRow]);
     }
 }

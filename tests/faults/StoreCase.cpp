@@ -24,6 +24,7 @@ tag_DatabaseContact Contact(int iId, const std::string& strName)
     tag_DatabaseContact contact = {iId, strName, LocalizerKeyOf(strName)};
     contact.llLastTimeContacted = FIRST_TIME + iId % 3 * 1000LL + iId;
     contact.llStatusUpdateID = FIRST_STATUS + iId;
+    contact.bPhone = iId < 3;
     contact.strStatus = iId == 1 || iId == 5 ? "online" : "";
     return contact;
 }
@@ -135,7 +136,7 @@ const std::vector<tag_Operation>& AllReadings()
         {"Letters",
          [](auto& logic, auto& answer) { Search(logic, answer, L"za", IME_SEARCH_WORD); }},
         {"Digits", [](auto& logic, auto& answer)
-         { Search(logic, answer, L"9", IME_SEARCH_NUM, FILTER_GROUP_EXPAND); }},
+         { Search(logic, answer, L"9", IME_SEARCH_NUM, FILTER_PHONE); }},
         {"LoggingFilter", [](auto& logic, auto& answer)
          { Search(logic, answer, L"", IME_SEARCH_NUM, FILTER_ACCOUNT_EXPAND); }},
         {"Special",

@@ -40,7 +40,7 @@ TEST_F(CMemInitTest, ReloadsWhenAFileIsMissingOrEmpty)
         ExpectBuilt();
     }
     std::filesystem::remove(CDataPaths::ContactReg());
-    EXPECT_TRUE(RunInChild([] { EXPECT_EQ(CLocalizerLogic().MemInit(false), 0); }));
+    EXPECT_TRUE(CChild([] { EXPECT_EQ(CLocalizerLogic().MemInit(false), 0); }).Passes());
     m_provider.Remove(9); // the other process's index is there: nothing is read
     EXPECT_EQ(m_logic.MemInit(false), 0);
     EXPECT_EQ(Search("").Contacts(), (Ids{9, 6}));

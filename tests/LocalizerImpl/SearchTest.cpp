@@ -2,7 +2,6 @@
 // over a small alphabet, long texts over many names, narrowed and not. The operations themselves
 // are held by tables.
 
-#include "Common/DataPaths.h"
 #include "LocalizerImpl/QVNumLocalizerManager.h"
 #include "LocalizerImpl/QVWordLocalizerManager.h"
 #include "tests/LocalizerImpl/LocalizerFixture.h"
@@ -271,40 +270,6 @@ TEST_F(Search, LongTextsOverRandomNamesTypedKeyByKey)
         {
             CheckKeyByKey(vNames, szText);
         }
-    }
-}
-
-// Spellings of two letters and two keys that no person has: nearly every character has readings
-// of its own, and texts are cut in ways that leave many different offsets reached.
-TEST_F(Search, ATableOfRandomReadings)
-{
-    std::string strTable = CDataDirectory::ReadBytes(m_data.File("pyfile.bin"));
-    std::wstring strCodes;
-    for (size_t i = 0; i < PY_WORD_COUNT; ++i)
-    {
-        strCodes += static_cast<wchar_t>(LOC_HANZI_BASE + i);
-        if (i % 9 == 0)
-        {
-            strTable[i * sizeof(PYOFWORDS)] = 0; // some lack their character
-        }
-        char* pSpelling = &strTable[i * sizeof(PYOFWORDS) + offsetof(PYOFWORDS, szPinyin)];
-        for (const char* szUnits : {"an", "an", "an", "26", "26", "26"})
-        {
-            const size_t uLength = Below(PY_MAX_LETTERS + 1);
-            for (size_t k = 0; k <= PY_MAX_LETTERS; ++k)
-            {
-                *pSpelling++ = k < uLength ? szUnits[Below(2)] : '\0';
-            }
-        }
-    }
-    CDataDirectory::WriteBytes(CDataPaths::PinyinMapping(), strTable);
-    const Details vNames = RandomNames(120, 1, strCodes);
-    for (int t = 0; t < 24; ++t)
-    {
-        std::wstring strText(10, L'\0');
-        std::generate(strText.begin(), strText.end(),
-                      [&] { return (t % 2 == 0 ? L"26" : L"an")[Below(2)]; });
-        CheckKeyByKey(vNames, strText);
     }
 }
 

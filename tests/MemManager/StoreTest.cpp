@@ -153,7 +153,7 @@ TEST_F(Store, ReleasesTheWriterLockOfForkedChildren)
 {
     CWriterLock lock;
     ASSERT_TRUE(lock.Take());
-    const CChild child([] { return std::to_string(pause()); }, 60);
+    const CChild child([] { pause(); }, 60);
     lock.Release();
     const CDescriptor directory(open(m_directory.File("").c_str(), O_RDONLY));
     EXPECT_EQ(flock(directory.Get(), LOCK_EX | LOCK_NB), 0);

@@ -3,13 +3,9 @@
 
 #include "MemManager/Files/Descriptor.h"
 
+#include <cstddef>
 #include <functional>
-#include <string>
 #include <sys/types.h>
-
-// Runs the body in a forked child and waits for it. True when the body came to its end and all
-// expectations in it held; what failed is printed by the child.
-bool RunInChild(const std::function<void()>& fnBody);
 
 // A forked child that runs the body. No database may be open when it starts: SQLite does not
 // outlive a fork.
@@ -17,17 +13,17 @@ class CChild
 {
 public:
     // An alarm ends a child that hangs for so many seconds; 0: it may hang.
-    CChild(const std::function<std::string()>& fnBody, unsigned int uSeconds);
-    // Kills a child whose text was not waited for.
+    explicit CChild(const std::function<void()>& fnBody, unsigned int uSeconds = 0);
+    // Kills a child that was not waited for.
     ~CChild();
     CChild(const CChild&) = delete;
     CChild& operator=(const CChild&) = delete;
 
-    // Waits for the child and returns what its body returned, or how else the child ended.
-    std::string Text();
+    // Waits for the child. True when the body came to its end and all expectations in it held;
+    // what failed is printed by the child.
+    bool Passes();
 
 private:
-    int m_iPipe = -1;
     pid_t m_iPid = -1;
 };
 

@@ -76,6 +76,7 @@ TEST_F(Files, HaveNamesThatAShellWouldMakeSomethingElseOf)
     EXPECT_EQ(1, _DeleteFile(nullptr));
     EXPECT_EQ(1, _wc_MoveFile(nullptr, L"file"));
     EXPECT_EQ(1, _wc_DeleteFile(nullptr));
+    EXPECT_EQ(-1, CDataPaths::SetRoot(strLong.c_str()));
     wchar_t szPath[5000] = {};
     EXPECT_EQ(0, GetModuleFileName(nullptr, szPath, 4096));
     EXPECT_EQ(WideText(fs::read_symlink("/proc/self/exe").string()), szPath)

@@ -74,9 +74,12 @@ protected:
     void ChangeOthers()
     {
         int iId = 1 + Pick(60);
-        m_llNow += 1000;
-        m_provider.SetLastTime(iId, m_llNow);
-        m_logic.OnContactTimeChanged(iId, m_llNow);
+        for (int i = 0; i < 2; ++i) // the second time at the start of the order by time
+        {
+            m_llNow += 1000;
+            m_provider.SetLastTime(iId, m_llNow);
+            m_logic.OnContactTimeChanged(iId, m_llNow);
+        }
         iId = 1 + Pick(60);
         const long lStarred = Pick(4) - 1; // only 1 marks a favourite
         m_provider.SetStarred(iId, lStarred == 1);

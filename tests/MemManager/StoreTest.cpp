@@ -51,7 +51,7 @@ protected:
             record.iContactID = iFirstID + i;
             record.iSortIndex = i;
             record.iFlags = static_cast<uint32_t>(i);
-            record.lGroupID[0] = i % 3;
+            record.lGroupID[0] = record.lAccountID[0] = i % 3;
             record.llLastTimeContacted = 5'000'000'000LL + i;
             record.szName[0] = static_cast<wchar_t>('a' + i % 26);
             std::fill_n(record.szLocalizerKey, i % (CONTACT_MAX_KEY + 2), 0x1000 + i);
@@ -210,7 +210,7 @@ TEST_F(Store, MakesEntriesOfItsRecords)
         std::copy_n(vRecords[i].szReserved, 4, expected.szReserved);
         EXPECT_EQ(EntryBytes(&all->pDetail[i], 1), EntryBytes(&expected, 1)) << i;
     }
-    for (int iKind : {FILTER_GROUP, FILTER_PHONE, FILTER_FAVOURITES, FILTER_GROUP_EXPAND})
+    for (int iKind : {FILTER_GROUP, FILTER_PHONE, FILTER_ACCOUNT_EXPAND, FILTER_GROUP_EXPAND})
     {
         QVLong32 lId = 1;
         CFilterChain* pChain = nullptr;

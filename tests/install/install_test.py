@@ -22,6 +22,7 @@ from programs import run
 
 CMAKE, GENERATOR, BUILD, SOURCE, COMPILER, C_COMPILER = sys.argv[2:8]
 TOOLCHAIN, EMULATOR, LIBRARIES = sys.argv[8:] or ("", "", "")
+CONSUMER = pathlib.Path(__file__).with_name("consumer")
 LINK_SEARCH = [f"-Wl,-rpath-link,{LIBRARIES}"] if LIBRARIES else []
 WARNINGS = ["-Wall", "-Wextra", "-Wpedantic", "-Wshadow", "-Wconversion", "-Wno-psabi"]
 if os.environ.get("QV_WARNINGS_AS_ERRORS") == "1":
@@ -30,16 +31,6 @@ LANGUAGES = {  # CMake's name and target, pkg-config's, and the compiler
     "cpp": ("CXX", "QV_Localize", "QV_Localize", [COMPILER, "-std=c++17"]),
     "c": ("C", "C", "qvlocalize", [C_COMPILER, "-std=c99", "-pedantic"]),
 }
-CONSUMER = """\
-cmake_minimum_required(VERSION 3.22)
-project(consumer LANGUAGES {name})
-find_package(QV_Localize 1.0 REQUIRED)
-if(NOT EXISTS "${{QV_Localize_PYFILE}}")
-  message(FATAL_ERROR "no pinyin table at ${{QV_Localize_PYFILE}}")
-endif()
-add_executable(consumer main.{language})
-target_link_libraries(consumer PRIVATE QV_Localize::{target})
-"""
 
 
 def run_built(program, *arguments, **options):
@@ -142,17 +133,17 @@ class EmbeddingTest(InstalledTest):
 
     def test_programs_built_with_cmake(self):
         for language, (name, target, _, (_, *standard)) in LANGUAGES.items():
-            project = self.source(language, f"main.{language}").parent
-            (project / "CMakeLists.txt").write_text(
-                CONSUMER.format(name=name, language=language, target=target))
+            program = self.source(language, f"main.{language}")
+            build = program.parent / "build"
             flags = " ".join(standard + WARNINGS + LINK_SEARCH)
             package = self.installed("**/QV_LocalizeConfig.cmake")[0].parent
-            run(CMAKE, "-G", GENERATOR, "-S", project, "-B", project / "build",
+            run(CMAKE, "-G", GENERATOR, "-S", CONSUMER, "-B", build, f"-DPROGRAM={program}",
+                f"-DLANGUAGE={name}", f"-DLIBRARY={target}", f"-DCMAKE_{name}_FLAGS={flags}",
                 f"-DCMAKE_C_COMPILER={C_COMPILER}", f"-DCMAKE_CXX_COMPILER={COMPILER}",
-                f"-DCMAKE_{name}_FLAGS={flags}", f"-DQV_Localize_DIR={package}",
-                "--no-warn-unused-cli", *[f"-DCMAKE_TOOLCHAIN_FILE={TOOLCHAIN}"] * bool(TOOLCHAIN))
-            run(CMAKE, "--build", project / "build")
-            self.check(run_built, project / "build/consumer")
+                f"-DQV_Localize_DIR={package}", "--no-warn-unused-cli",
+                *[f"-DCMAKE_TOOLCHAIN_FILE={TOOLCHAIN}"] * bool(TOOLCHAIN))
+            run(CMAKE, "--build", build)
+            self.check(run_built, build / "consumer")
 
     def test_programs_built_with_pkg_config(self):
         environment = {**os.environ, "PKG_CONFIG_PATH": str(self.installed("**/pkgconfig")[0])}

@@ -23,7 +23,7 @@ fi
 faults=$(diff --unified=0 --label reviewed --label exported "$list" - <<<"$exported") || [ $? = 1 ]
 looked_up=$("$readelf" --relocs --wide "$library" |
     awk '$3 ~ /^R_/ && $5 { sub("@.*", "", $5); print $5 }' | sort -u)
-elsewhere=$(comm -12 <(sed 's/@.*//' <<<"$symbols") <(echo "$looked_up"))
+elsewhere=$(comm -12 <(sed 's/@.*//' <<<"$symbols" | sort) <(echo "$looked_up"))
 if [ -n "$faults$elsewhere" ]; then
     printf '%s\n' "$faults" ${elsewhere:+"bound by the dynamic linker:" "$elsewhere"}
     echo "Update the list with --update if the difference is meant; see docs/embedding.md."

@@ -112,17 +112,17 @@ TEST_F(ShareMemory, TellsWhyNothingIsMappedOrClosed)
 TEST_F(ShareMemory, RefusesASizeAboveTheProcessLimit)
 {
     CDataDirectory::WriteBytes(m_strPath, std::string(6000, 'x'));
-    EXPECT_TRUE(CChild(
-                    [&]
-                    {
-                        rlimit limit = {4096, RLIM_INFINITY};
-                        ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &limit), 0);
-                        EXPECT_EQ(Open(5000), MAP_FAILED);
-                        EXPECT_NE(Open(4096), MAP_FAILED);
-                        limit.rlim_cur = RLIM_INFINITY;
-                        setrlimit(RLIMIT_FSIZE, &limit);
-                    })
-                    .Passes());
+    CChild child(
+        [&]
+        {
+            rlimit limit = {4096, RLIM_INFINITY};
+            ASSERT_EQ(setrlimit(RLIMIT_FSIZE, &limit), 0);
+            EXPECT_EQ(Open(5000), MAP_FAILED);
+            EXPECT_NE(Open(4096), MAP_FAILED);
+            limit.rlim_cur = RLIM_INFINITY;
+            setrlimit(RLIMIT_FSIZE, &limit);
+        });
+    EXPECT_TRUE(child.Passes());
 }
 
 // Where the system reserves space and where it does not.
@@ -144,29 +144,28 @@ TEST_F(ShareMemory, HoldsEveryByteOnTheDiskOrLeavesTheFileAlone)
         EXPECT_EQ(stat(m_strPath.c_str(), &info), 0);
         EXPECT_GE(info.st_blocks * 512, SIZE);
         // On a file system of 64 KiB that only the child sees, if this user can mount one.
-        EXPECT_TRUE(
-            CChild(
-                [&]
+        CChild child(
+            [&]
+            {
+                if (unshare(CLONE_NEWNS) != 0 ||
+                    mount("none", "/", nullptr, MS_REC | MS_PRIVATE, "") != 0 ||
+                    mount("none", m_directory.File("").c_str(), "tmpfs", 0, "size=64k") != 0)
                 {
-                    if (unshare(CLONE_NEWNS) != 0 ||
-                        mount("none", "/", nullptr, MS_REC | MS_PRIVATE, "") != 0 ||
-                        mount("none", m_directory.File("").c_str(), "tmpfs", 0, "size=64k") != 0)
-                    {
-                        return;
-                    }
-                    const std::string strOld(5000, 'x');
-                    CDataDirectory::WriteBytes(m_strPath, strOld);
-                    EXPECT_EQ(Open(200000), MAP_FAILED);
-                    EXPECT_NE(m_log.Texts(ERROR_LINE).back().find(": No space left"),
-                              std::string::npos);
-                    EXPECT_EQ(CDataDirectory::ReadBytes(m_strPath), strOld);
-                    // A file with holes is long enough and still has no place on the disk.
-                    ASSERT_EQ(truncate(m_strPath.c_str(), SIZE), 0);
-                    EXPECT_EQ(Open(200000), MAP_FAILED);
-                    ASSERT_EQ(truncate(m_strPath.c_str(), 5000), 0);
-                    EXPECT_NE(Open(40000), MAP_FAILED) << "what the failed attempts took is free";
-                })
-                .Passes());
+                    return;
+                }
+                const std::string strOld(5000, 'x');
+                CDataDirectory::WriteBytes(m_strPath, strOld);
+                EXPECT_EQ(Open(200000), MAP_FAILED);
+                EXPECT_NE(m_log.Texts(ERROR_LINE).back().find(": No space left"),
+                          std::string::npos);
+                EXPECT_EQ(CDataDirectory::ReadBytes(m_strPath), strOld);
+                // A file with holes is long enough and still has no place on the disk.
+                ASSERT_EQ(truncate(m_strPath.c_str(), SIZE), 0);
+                EXPECT_EQ(Open(200000), MAP_FAILED);
+                ASSERT_EQ(truncate(m_strPath.c_str(), 5000), 0);
+                EXPECT_NE(Open(40000), MAP_FAILED) << "what the failed attempts took is free";
+            });
+        EXPECT_TRUE(child.Passes());
     }
 }
 
@@ -201,18 +200,17 @@ TEST_F(SingleMutex, TakesAndReleases)
 // A holder knows descriptor 0 as none.
 TEST_F(SingleMutex, TakesNoDescriptorOfTheStandardStreams)
 {
-    EXPECT_TRUE(CChild(
-                    []
-                    {
-                        close(STDIN_FILENO);
-                        int iFd = 0;
-                        EXPECT_EQ(CSingleMutex::Lock(&iFd), 1);
-                        EXPECT_GT(iFd, STDERR_FILENO);
-                        EXPECT_NE(fcntl(iFd, F_GETFD) & FD_CLOEXEC, 0);
-                        EXPECT_EQ(fcntl(STDIN_FILENO, F_GETFD), -1)
-                            << "the first number is free again";
-                    })
-                    .Passes());
+    CChild child(
+        []
+        {
+            close(STDIN_FILENO);
+            int iFd = 0;
+            EXPECT_EQ(CSingleMutex::Lock(&iFd), 1);
+            EXPECT_GT(iFd, STDERR_FILENO);
+            EXPECT_NE(fcntl(iFd, F_GETFD) & FD_CLOEXEC, 0);
+            EXPECT_EQ(fcntl(STDIN_FILENO, F_GETFD), -1) << "the first number is free again";
+        });
+    EXPECT_TRUE(child.Passes());
 }
 
 TEST_F(SingleMutex, LeavesAloneWhatWasClosedBehindItsBack)

@@ -6,7 +6,6 @@
 #include "Core/Records/ContactRecords.h"
 #include "Core/Records/LocalizerCodes.h"
 
-#include <algorithm>
 #include <climits>
 #include <gtest/gtest.h>
 #include <sstream>

@@ -4,7 +4,6 @@
 #include "Common/Utf8.h"
 #include "Common/WideString.h"
 
-#include <algorithm>
 #include <climits>
 #include <cstdlib>
 #include <gtest/gtest.h>

@@ -17,14 +17,11 @@
 #include <iterator>
 #include <memory>
 #include <string>
-#include <type_traits>
 #include <utility>
 #include <vector>
 
 namespace
 {
-
-static_assert(!std::is_copy_constructible<CFilterChain>::value, "two chains would delete twice");
 
 using Chain = std::unique_ptr<CFilterChain>;
 using Kinds = std::vector<std::pair<int, QVLong32>>; // each with an id

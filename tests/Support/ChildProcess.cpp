@@ -13,19 +13,6 @@
 #include <sys/wait.h>
 #include <unistd.h>
 
-namespace
-{
-
-// What the body throws ends the child by a signal.
-[[noreturn]] void RunAndExit(const std::function<void()>& fnBody) noexcept
-{
-    fnBody();
-    std::exit(testing::Test::HasFailure() ? 1
-                                          : 0); // not _exit: a coverage build writes its counters
-}
-
-} // namespace
-
 CChild::CChild(const std::function<void()>& fnBody, unsigned int uSeconds)
 {
     (void)std::fflush(nullptr);
@@ -37,7 +24,8 @@ CChild::CChild(const std::function<void()>& fnBody, unsigned int uSeconds)
     if (m_iPid == 0)
     {
         alarm(uSeconds);
-        RunAndExit(fnBody);
+        [&fnBody]() noexcept { fnBody(); }();           // what it throws ends the child by a signal
+        std::exit(testing::Test::HasFailure() ? 1 : 0); // a coverage build writes its counters
     }
 }
 

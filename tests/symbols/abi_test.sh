@@ -1,8 +1,6 @@
 #!/usr/bin/env bash
-# Compares the binary interface of the library, types included, with the recorded one.
-#
-# abi_test.sh CMAKE BUILD_DIR LIBRARY RECORD [--update]
-#
+# Compares the binary interface of the library, types included, with the recorded one:
+#   abi_test.sh CMAKE BUILD_DIR LIBRARY RECORD [--update]
 # LIBRARY has debug information; BUILD_DIR is a build whose installed headers tell the interface
 # from the rest. RECORD is what libabigail's abidw writes, compressed. --update writes it; that is
 # for changes that are meant, and a change of the interface that breaks programs also needs another

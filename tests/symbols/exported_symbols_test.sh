@@ -1,9 +1,7 @@
 #!/usr/bin/env bash
 # Compares the dynamic symbols that a library defines with a reviewed list, and checks that no
-# reference of the library to one of them can be bound elsewhere.
-#
-# exported_symbols_test.sh NM READELF CXXFILT LIBRARY LIST [--update]
-#
+# reference of the library to one of them can be bound elsewhere:
+#   exported_symbols_test.sh NM READELF CXXFILT LIBRARY LIST [--update]
 # A line of the list is a symbol as the linker knows it, a tab, and the same for readers. --update
 # writes the list; look at its difference before it goes into the repository.
 set -euo pipefail

@@ -100,10 +100,10 @@ TEST(Utf8, PrintsAFormatAsItStandsAndFormatsBelowItsBuffer)
     EXPECT_EQ(std::string(128, 'x') + "\n", PrintedBy(std::wstring(128, L'x')));
     EXPECT_EQ(5000U * 3 + 1, PrintedBy(std::wstring(5000, L'张')).size());
     wchar_t szTarget[1100];
-    EXPECT_EQ(16, _u_wsprintf(szTarget, L"%s=%d张%c%05.1f", "\xE5\xBC\xA0", 42, 'x', 2.5));
-    EXPECT_STREQ(L"张=42张x002.5", szTarget);
+    EXPECT_EQ(25, _u_wsprintf(szTarget, L"%s=%d张张张张%c%05.1f", "\xE5\xBC\xA0", 42, 'x', 2.5));
+    EXPECT_STREQ(L"张=42张张张张x002.5", szTarget);
     EXPECT_EQ(-1, _u_wsprintf(szTarget, L"%1024d", 1));
-    EXPECT_STREQ(L"张=42张x002.5", szTarget);
+    EXPECT_STREQ(L"张=42张张张张x002.5", szTarget);
     EXPECT_EQ(1, _u_wsprintf(szTarget, L"%s", ""));
     EXPECT_EQ(1024, _u_wsprintf(szTarget, L"%1023d", 1));
     EXPECT_EQ(std::wstring(1022, L' ') + L'1', szTarget);

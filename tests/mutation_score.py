@@ -1,7 +1,6 @@
 #!/usr/bin/env python3
 """Measures what the tests catch: changes one token of the library at a time, rebuilds the test
-programs and runs them. Prints each change with the case that noticed it, and the share that some
-did.
+programs and runs them. Prints each change with the case that noticed it, and the share caught.
 
 Works in a clone of this checkout's last commit, below build/mutation; the same seed gives the same
 changes. Takes up to half a minute a change."""

@@ -230,13 +230,14 @@ TEST_F(CContactChangesTest, WaitForTheLock)
     for (const auto& row : ROWS)
     {
         CLockHolder holder;
+        const bool bMayRebuild = row.first == "OnContactsTableChanged1";
         int iRefusals = 0;
         m_log.AtLinesWith("QV_Contacts: " + row.first + " Lock share mem false",
                           [&]
                           {
                               if (++iRefusals == 7)
                               {
-                                  SetReg({8, 0, row.first.back() == '1' ? 7 : CAPACITY});
+                                  SetReg({8, 0, bMayRebuild ? 7 : CAPACITY});
                                   holder.Release();
                               }
                           });

@@ -1,5 +1,8 @@
 import java.util.ArrayList;
 import java.util.List;
+import java.util.concurrent.ExecutorService;
+import java.util.concurrent.Executors;
+import java.util.concurrent.Future;
 import org.qvlocalize.Index;
 import org.qvlocalize.Index.Filter;
 import org.qvlocalize.Index.Kind;
@@ -20,40 +23,32 @@ final class IndexTest {
         }
     }
 
-    private static void refuses(Class<? extends RuntimeException> type, Runnable call) {
+    private static <T extends RuntimeException> T refuses(Class<T> type, Runnable call) {
         try {
             call.run();
         } catch (RuntimeException exception) {
-            check(type.isInstance(exception), "not " + type + " but " + exception);
-            return;
+            return type.cast(exception);
         }
         throw new AssertionError("no " + type);
     }
 
     private static void fails(int code, Runnable call) {
-        try {
-            call.run();
-        } catch (QvException exception) {
-            check(exception.code() == code, "not " + code + " but " + exception.code());
-            check(exception.getMessage().length() > 5, "no words");
-            return;
-        }
-        throw new AssertionError("no failure " + code);
+        final QvException exception = refuses(QvException.class, call);
+        check(exception.code() == code, "not " + code + " but " + exception.code());
+        check(exception.getMessage().length() > 5, "no words");
     }
 
     private static void print(String text, Result result) {
-        final StringBuilder line = new StringBuilder(text + ":");
+        System.out.print(text + ":");
         for (int i = 0; i < result.size(); ++i) {
-            line.append(String.format(" %d,%d,%d,%d,%d,%d", result.contactId(i),
-                    result.nameOrder(i), result.lastContacted(i), result.first(i), result.last(i),
-                    (int) result.indexCharacter(i)));
+            System.out.printf(" %d,%d,%d,%d,%d,%d", result.contactId(i), result.nameOrder(i),
+                    result.lastContacted(i), result.first(i), result.last(i),
+                    (int) result.indexCharacter(i));
         }
-        line.append(" / ").append(result.nextKeys()).append(" / ").append(result.candidates());
-        for (Result.Section section : result.sections()) {
-            line.append(" ").append(section.label()).append(section.first()).append("+");
-            line.append(section.count());
-        }
-        System.out.println(line);
+        System.out.printf(" / %s / %s", result.nextKeys(), result.candidates());
+        result.sections().forEach(section -> System.out.printf(" %s%d+%d", section.label(),
+                section.first(), section.count()));
+        System.out.println();
     }
 
     private static void search(Index index, String text, Kind kind, Filter... filters) {
@@ -139,37 +134,30 @@ final class IndexTest {
     }
 
     // Searches of many threads on one index, and a result that is closed while it is read.
-    private static void checkThreads(Index index) throws InterruptedException {
+    private static void checkThreads(Index index) throws Exception {
         final Result shared = index.search("z", Kind.WORD);
         final int expected = shared.size();
-        final List<Thread> threads = new ArrayList<>();
-        final List<Throwable> faults = new ArrayList<>();
-        for (int i = 0; i < 4; ++i) {
-            threads.add(new Thread(() -> {
-                for (int round = 0; round < 50; ++round) {
-                    try (Result result = index.search("z", Kind.WORD)) {
-                        check(result.size() == expected, "size");
-                        shared.contactId(round % expected);
-                    } catch (IllegalStateException closed) {
-                        // by the main thread
-                    }
+        final ExecutorService threads = Executors.newFixedThreadPool(4);
+        final List<Future<?>> searches = new ArrayList<>();
+        for (int i = 0; i < 200; ++i) {
+            final int place = i % expected;
+            searches.add(threads.submit(() -> {
+                try (Result result = index.search("z", Kind.WORD)) {
+                    check(result.size() == expected, "size");
+                    shared.contactId(place);
+                } catch (IllegalStateException closed) {
+                    // by the main thread
                 }
             }));
-            threads.get(i).setUncaughtExceptionHandler((thread, fault) -> {
-                synchronized (faults) {
-                    faults.add(fault);
-                }
-            });
-            threads.get(i).start();
         }
         shared.close();
-        for (Thread thread : threads) {
-            thread.join();
+        for (Future<?> search : searches) {
+            search.get();
         }
-        check(faults.isEmpty(), faults.toString());
+        threads.shutdown();
     }
 
-    public static void main(String[] arguments) throws InterruptedException {
+    public static void main(String[] arguments) throws Exception {
         final String directory = arguments[0];
         final Index index = new Index(directory);
         check(index.needsBuild(), "needs no index");

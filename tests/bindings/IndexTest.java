@@ -150,11 +150,11 @@ final class IndexTest {
                 }
             }));
         }
+        threads.shutdown(); // once all have searched
         shared.close();
         for (Future<?> search : searches) {
             search.get();
         }
-        threads.shutdown();
     }
 
     public static void main(String[] arguments) throws Exception {

@@ -51,17 +51,11 @@ std::string Sorted(const std::string& strValues, Common_Sort_enum eOrder)
     return strPlaces;
 }
 
-tag_ContactsStruct Name(const std::wstring& strName, wchar_t code)
+tag_ContactsStruct Record(const std::wstring& strName, wchar_t code, int64_t llTime = 0)
 {
     tag_ContactsStruct record = {};
     strName.copy(record.szName, CONTACT_MAX_NAME + 1);
     record.szLocalizerKey[0] = code;
-    return record;
-}
-
-tag_ContactsStruct Time(int64_t llTime)
-{
-    tag_ContactsStruct record = {};
     record.llLastTimeContacted = llTime;
     return record;
 }
@@ -128,27 +122,27 @@ TEST(CommonQsort, OrdersNamesAndTimes)
     const std::wstring strEmpty(1, NAME_EMPTY_MARK);
     const std::wstring strLong(31, L'a');
     const std::tuple<Common_Sort_enum, tag_ContactsStruct, tag_ContactsStruct> ROWS[] = {
-        {SORT_NAME, Name(L"a", 0x4F00), Name(L"ab", 0x4F00)},
-        {SORT_NAME, Name(strLong.substr(1), 0x4F00), Name(strLong, 0x4F00)},
+        {SORT_NAME, Record(L"a", 0x4F00), Record(L"ab", 0x4F00)},
+        {SORT_NAME, Record(strLong.substr(1), 0x4F00), Record(strLong, 0x4F00)},
         // A letter goes before a Chinese character under one first letter only.
-        {SORT_NAME, Name(L"az", 0x4F00), Name(L"aa", 0x1000)},
-        {SORT_NAME, Name(L"az", 0x4F19), Name(L"aa", 0x4C3D)},
-        {SORT_NAME, Name(L"az", 0x1000), Name(L"bb", 0x4F00)},
-        {SORT_NAME, Name(L"aa", 0x4C3E), Name(L"az", 0x4F00)}, // no Chinese character's code
-        {SORT_NAME, Name(L"aa", 0x1000), Name(L"az", 0x4F1A)}, // no letter's code
+        {SORT_NAME, Record(L"az", 0x4F00), Record(L"aa", 0x1000)},
+        {SORT_NAME, Record(L"az", 0x4F19), Record(L"aa", 0x4C3D)},
+        {SORT_NAME, Record(L"az", 0x1000), Record(L"bb", 0x4F00)},
+        {SORT_NAME, Record(L"aa", 0x4C3E), Record(L"az", 0x4F00)}, // no Chinese character's code
+        {SORT_NAME, Record(L"aa", 0x1000), Record(L"az", 0x4F1A)}, // no letter's code
         // Nameless behind all others, then other characters, then digits.
-        {SORT_NAME, Name(L"z", 0x5000), Name(strEmpty, 0)},
-        {SORT_NAME, Name(L"z", 0x5A00), Name(L"a", 0x5000)},
-        {SORT_NAME, Name(L"z", 0x1000), Name(L"a", 0x5A00)},
-        {SORT_NAME, Name(L"z", 0x1000), Name(L"a", 0x5A09)},
-        {SORT_NAME, Name(L"a", 0x5A0A), Name(L"z", 0x5A0A)},
-        {SORT_NAME, Name(L"z", 0x15000), Name(L"a", 0x5000)},
-        {SORT_NAME, Name(L"z", 0x1000), Name(L"a", 0x15A00)},
-        {SORT_TIME, Time(INT64_MAX), Time(1LL << 32)},
-        {SORT_TIME, Time(1LL << 32), Time(1LL << 31)},
-        {SORT_TIME, Time(1), Time(0)},
-        {SORT_TIME, Time(0), Time(-1)},
-        {SORT_TIME, Time(-1), Time(INT64_MIN)},
+        {SORT_NAME, Record(L"z", 0x5000), Record(strEmpty, 0)},
+        {SORT_NAME, Record(L"z", 0x5A00), Record(L"a", 0x5000)},
+        {SORT_NAME, Record(L"z", 0x1000), Record(L"a", 0x5A00)},
+        {SORT_NAME, Record(L"z", 0x1000), Record(L"a", 0x5A09)},
+        {SORT_NAME, Record(L"a", 0x5A0A), Record(L"z", 0x5A0A)},
+        {SORT_NAME, Record(L"z", 0x15000), Record(L"a", 0x5000)},
+        {SORT_NAME, Record(L"z", 0x1000), Record(L"a", 0x15A00)},
+        {SORT_TIME, Record(L"", 0, INT64_MAX), Record(L"", 0, 1LL << 32)},
+        {SORT_TIME, Record(L"", 0, 1LL << 32), Record(L"", 0, 1LL << 31)},
+        {SORT_TIME, Record(L"", 0, 1), Record(L"", 0, 0)},
+        {SORT_TIME, Record(L"", 0, 0), Record(L"", 0, -1)},
+        {SORT_TIME, Record(L"", 0, -1), Record(L"", 0, INT64_MIN)},
     };
     const auto ExpectOrder = [](Common_Sort_enum eOrder, char* pBefore, char* pBehind)
     {

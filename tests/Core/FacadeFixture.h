@@ -1,7 +1,6 @@
 #ifndef QV_TESTS_CORE_FACADEFIXTURE_H
 #define QV_TESTS_CORE_FACADEFIXTURE_H
 
-#include "Common/DataPaths.h"
 #include "Core/LocalizerLogic.h"
 #include "Core/Records/LocalizerCodes.h"
 #include "Filter/FilterChain.h"

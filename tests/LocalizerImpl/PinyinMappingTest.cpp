@@ -99,11 +99,10 @@ TEST_F(PinyinTable, IsMappedBelowTheLimitWhereNothingElseIs)
     const CLogCapture log;
     EXPECT_EQ(-1, Manager::CreatePinYinFileMapping());
     EXPECT_EQ(-1005, Manager::ReleasePinYinFileMapping(-1));
-    const std::string strManager = "CQVLocalizerManager::";
-    const std::string strRelease = strManager + "ReleasePinYinFileMapping the input mapping is ";
+    const std::string strRelease = "CQVLocalizerManager::ReleasePinYinFileMapping the input ";
     EXPECT_EQ(log.Texts(ERROR_LINE),
-              (Lines{strManager + "CreatePinYinFileMapping memInit error code = -1000",
-                     strRelease + "-1 ", strRelease + "wrong!"}));
+              (Lines{"CQVLocalizerManager::CreatePinYinFileMapping memInit error code = -1000",
+                     strRelease + "mapping is -1 ", strRelease + "mapping is wrong!"}));
 }
 
 // A file that was written just now could change once more without a trace, whatever its own time

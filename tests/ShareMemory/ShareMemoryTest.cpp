@@ -22,12 +22,7 @@
 #include <sys/stat.h>
 #include <unistd.h>
 
-namespace
-{
-
-bool g_bReserves = true; // space on the disk
-
-} // namespace
+static bool g_bReserves = true; // space on the disk
 
 // Takes the C library's place in the test program; some file systems reserve nothing.
 extern "C" int fallocate(int iFd, int iMode, off_t iAt, off_t iSize)

@@ -4,10 +4,12 @@
 
 #include "tests/faults/CallFaults.h"
 
+#include "LocalizerImpl/QVLocalizerManager.h"
 #include "tests/Support/ChildProcess.h"
 #include "tests/faults/StoreCase.h"
 
 #include <cerrno>
+#include <filesystem>
 #include <functional>
 #include <gtest/gtest.h>
 #include <memory>
@@ -124,6 +126,26 @@ TEST(Faults, EveryCallFailsReading)
             FailEachCall(store, reading, failures, fnExamine);
         }
     }
+}
+
+// Searches keep what they read for as long as the shared table has the same time, which a write
+// through a mapping need not change.
+TEST(Faults, ACopiedTableHasANewTime)
+{
+    static const auto past = std::filesystem::file_time_type::clock::now() - std::chrono::hours(1);
+    const CDataDirectory directory;
+    directory.InstallPinyinTable();
+    WatchMappings(
+        [](MAP_EVENT eEvent, const tag_Mapping& mapping)
+        {
+            if (eEvent == MAP_FLUSHED && std::strcmp(mapping.szFile, "PyFileMappint.bin") == 0)
+            {
+                std::filesystem::last_write_time(CDataPaths::PinyinMapping(), past);
+            }
+        });
+    EXPECT_EQ(CQVLocalizerManager::InitMapFile(), 0);
+    WatchMappings(nullptr);
+    EXPECT_NE(std::filesystem::last_write_time(CDataPaths::PinyinMapping()), past);
 }
 
 } // namespace

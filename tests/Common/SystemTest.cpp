@@ -79,8 +79,7 @@ TEST_F(Files, HaveNamesThatAShellWouldMakeSomethingElseOf)
     EXPECT_EQ(-1, CDataPaths::SetRoot(strLong.c_str()));
     wchar_t szPath[5000] = {};
     EXPECT_EQ(0, GetModuleFileName(nullptr, szPath, 4096));
-    EXPECT_EQ(WideText(fs::read_symlink("/proc/self/exe").string()), szPath)
-        << "linked into the test";
+    EXPECT_EQ(WideText(fs::read_symlink("/proc/self/exe").string()), szPath);
 }
 
 TEST(SystemTime, PointsInTimeHaveTheirCalendarForm)

@@ -294,10 +294,8 @@ TEST_F(Reader, FailsWithoutContactsGoneSinceTheCountAndLeavesNewOnesOut)
 {
     m_provider.PutAll({{1, "a"}, {2, "b"}, {4, "d"}});
     bool bRemoves = true;
-    m_log.AtLinesWith("sqlstat_4",
-                      [&] {
-                          bRemoves ? m_provider.Remove(2) : m_provider.Put({3, "c"});
-                      });
+    const auto fnChange = [&] { bRemoves ? m_provider.Remove(2) : m_provider.Put({3, "c"}); };
+    m_log.AtLinesWith("sqlstat_4", fnChange);
     EXPECT_EQ(-1, ReadAll());
     EXPECT_EQ((Ids{1, 4, 0}), IdsRead());
     EXPECT_STREQ(L"d", m_set.pContacts[1].szName);

@@ -51,9 +51,8 @@ TEST(ContactSort, LeavesAndNumbersWhatTheSorterLeaves)
             {
                 vExpected[static_cast<size_t>(i)].iSortIndex = i;
             }
-            EXPECT_EQ(CQVLocalizerManager::LocalizerQuickSort(vRecords.data(), iCount,
-                                                              type == SORT_NAME ? 0 : 1),
-                      0);
+            const int iType = type == SORT_NAME ? 0 : 1;
+            EXPECT_EQ(CQVLocalizerManager::LocalizerQuickSort(vRecords.data(), iCount, iType), 0);
             ASSERT_TRUE(BytesOf(vRecords) == BytesOf(vExpected)) << "round " << iRound;
         }
     }

@@ -40,7 +40,7 @@ CChild::~CChild()
 
 bool CChild::Passes()
 {
-    int iStatus = 0;
+    int iStatus = -1; // also where there is no child to wait for
     waitpid(m_iPid, &iStatus, 0);
     m_iPid = -1;
     return iStatus == 0;
